@@ -1,0 +1,24 @@
+#pragma once
+
+#include <array>
+#include <cstdint>
+#include <string>
+
+#include "base/Namespace.h"
+
+namespace zelkor {
+
+// A 128-bit identifier.
+struct UUID {
+  std::array<std::uint8_t, 16> bytes{};
+
+  // Version 4, variant 1 (RFC 4122) from 16 random bytes.
+  static UUID fromRandomBytes(std::array<std::uint8_t, 16> random);
+
+  // Upper case, "XXXXXXXX-XXXX-XXXX-XXXX-XXXXXXXXXXXX".
+  std::string string() const;
+
+  friend bool operator==(const UUID&, const UUID&) = default;
+};
+
+}  // namespace zelkor

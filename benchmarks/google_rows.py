@@ -1,0 +1,45 @@
+#!/usr/bin/env python3
+"""Turns Google Benchmark's JSON into lines of the common table: name, ours, floor, ratio, target, verdict.
+
+usage: google_rows.py < JSON
+
+A benchmark that has a floor is shown against it; floors have no line of their own.
+"""
+
+import json
+import sys
+
+# What is measured -> what the same work costs at least; a missing counter means the time of one iteration.
+FLOORS = {
+    "SyncOnIdleSerialQueue": "LockFloor",
+    "SharedSync": "LockFloor",
+    "AsyncToIdleSerialQueue": "HandOverFloor",
+    "URLSessionRequest": "BareCurlRequest",
+    "BM_CurrentUserGUID": "BM_IdleSync",
+    "BM_InMemoryBag": "BM_IdleSync",
+    "BM_CurrentBag": "BM_IdleSync",
+    "BM_BuildSearchRequest": "BM_CopySearchRequest",
+    "BM_SearchRequest": "BM_CopyRequestFloor",
+}
+
+
+def microseconds(row):
+    scale = {"ns": 1e-3, "us": 1.0, "ms": 1e3, "s": 1e6}[row["time_unit"]]
+    return row.get("p50_us", row["real_time"] * scale)
+
+
+def main():
+    rows = [row for row in json.load(sys.stdin)["benchmarks"] if "error_occurred" not in row]
+    by_base = {}
+    for row in rows:
+        by_base.setdefault(row["name"].split("/")[0], microseconds(row))
+    for row in rows:
+        base = row["name"].split("/")[0]
+        if base in FLOORS.values():
+            continue
+        ours, floor = microseconds(row), by_base.get(FLOORS.get(base))
+        bare, ratio = (f"{floor:.4g} us", f"{ours / floor:.2f}") if floor else ("-", "-")
+        print(row["name"], f"{ours:.4g} us", bare, ratio, "-", "-", sep="\t")
+
+
+main()

@@ -1,0 +1,26 @@
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <string_view>
+
+#include "base/Error.h"
+
+namespace zelkor {
+
+// What went wrong between a program and the daemon. Errors of other domains come from the daemon.
+inline constexpr std::string_view kClientErrorDomain = "ZLKClientErrorDomain";
+
+enum class ClientErrorCode : std::int64_t {
+  NotReachable = 1,  // no daemon runs and none could be started
+  Disconnected = 2,  // the connection ended before the answer; calling again makes a new one
+  TimedOut = 3,      // no answer in time
+  Refused = 4,       // the daemon, or the library for it, does not take these arguments
+  BadReply = 5,      // the answer is not what the interface says
+  Cancelled = 6,     // the client object is gone
+};
+
+Error clientError(ClientErrorCode code, std::string reason);
+bool isClientError(const Error& error, ClientErrorCode code);
+
+}  // namespace zelkor

@@ -1,0 +1,29 @@
+#include "platform/api/SettingsStore.h"
+
+namespace zelkord {
+
+bool boolSetting(const SettingsStore& settings, std::string_view key, bool fallback) {
+  const auto value = settings.value(key);
+  if (!value) return fallback;
+  if (value->is_bool()) return value->get_bool();
+  const auto number = asNumber(*value);
+  return number ? *number != 0 : fallback;
+}
+
+std::string stringSetting(const SettingsStore& settings, std::string_view key) {
+  const auto value = settings.value(key);
+  return value && value->is_string() ? std::string(value->get_string()) : std::string();
+}
+
+std::uint64_t unsignedSetting(const SettingsStore& settings, std::string_view key,
+                              std::uint64_t fallback) {
+  const auto value = settings.value(key);
+  if (!value) return fallback;
+  if (const auto* number = value->if_uint64()) return *number;
+  const auto number = asNumber(*value);
+  if (!number) return fallback;
+  constexpr double kLimit = 9.2e18;
+  return *number <= 0 ? 0 : static_cast<std::uint64_t>(*number < kLimit ? *number : kLimit);
+}
+
+}  // namespace zelkord

@@ -1,0 +1,42 @@
+#pragma once
+
+#include <optional>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "base/Json.h"
+
+namespace zelkord {
+
+// The domain of the daemon's own settings; "" means it too.
+inline constexpr std::string_view kSettingsDomain = "com.quenta.zelkord";
+
+// Settings by domain and key: registered defaults, overridden by the system's file, overridden by
+// the user's store. A date is an object {"$date": seconds since 1970}.
+//
+// Threading: any thread; reads come from memory (well under a microsecond).
+// Errors: a store that cannot be read counts as empty, one that cannot be written is logged once;
+// the value then holds until the process ends.
+class SettingsStore {
+ public:
+  virtual ~SettingsStore() = default;
+  virtual std::optional<json::value> value(std::string_view key,
+                                           std::string_view domain = {}) const = 0;
+  virtual void set(std::string_view key, json::value value, std::string_view domain = {}) = 0;
+  virtual void remove(std::string_view key, std::string_view domain = {}) = 0;
+  virtual void registerDefaults(const json::object& values) = 0;
+  // Every key that has a value, with the value that counts.
+  virtual json::object all(std::string_view domain = {}) const = 0;
+  // Returns when everything set so far is on disk.
+  virtual void flush() = 0;
+};
+
+// The value when it has the type (numbers: non-zero is true for boolSetting; negative or fractional
+// values are clamped and truncated for unsignedSetting), else the fallback.
+bool boolSetting(const SettingsStore& settings, std::string_view key, bool fallback = false);
+std::string stringSetting(const SettingsStore& settings, std::string_view key);
+std::uint64_t unsignedSetting(const SettingsStore& settings, std::string_view key,
+                              std::uint64_t fallback = 0);
+
+}  // namespace zelkord

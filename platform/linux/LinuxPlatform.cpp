@@ -1,0 +1,264 @@
+#include "platform/linux/LinuxPlatform.h"
+
+#include <atomic>
+
+#include "base/SettingsLayout.h"
+#include "platform/api/CountedTransactions.h"
+#include "platform/api/LaunchEventStreams.h"
+#include "platform/linux/account/LinuxAccounts.h"
+#include "platform/linux/bus/SystemBus.h"
+#include "platform/linux/counters/LinuxCounters.h"
+#include "platform/linux/device_profile/DeviceProfileLoader.h"
+#include "platform/linux/device_profile/LinuxDevice.h"
+#include "platform/linux/files/LinuxFileManager.h"
+#include "platform/linux/files/StateLock.h"
+#include "platform/linux/ipc/SdBusInterprocess.h"
+#include "platform/linux/locale/HostLocaleWatcher.h"
+#include "platform/linux/locale/LinuxLocale.h"
+#include "platform/linux/location/GeoClueSource.h"
+#include "platform/linux/location/LinuxLocation.h"
+#include "platform/linux/log/LinuxLog.h"
+#include "platform/linux/management/LinuxManagement.h"
+#include "platform/linux/maps/LinuxMaps.h"
+#include "platform/linux/memory_pressure/LinuxMemoryPressure.h"
+#include "platform/linux/metered_network/MeteredNetwork.h"
+#include "platform/linux/notifications/BusNotifications.h"
+#include "platform/linux/process/ExitWhenIdle.h"
+#include "platform/linux/process/LinuxProcess.h"
+#include "platform/linux/process/LinuxSignals.h"
+#include "platform/linux/process/SystemRandom.h"
+#include "platform/linux/process/TraceMarker.h"
+#include "platform/linux/property_list/BinaryPropertyLists.h"
+#include "platform/linux/proxy/LinuxNetworkProxy.h"
+#include "platform/linux/queues/LinuxWorkQueues.h"
+#include "platform/linux/settings/LinuxSettings.h"
+#include "platform/linux/tagger/LinuxTagger.h"
+#include "platform/linux/text_input/LinuxTextInput.h"
+#include "platform/linux/url/CurlURLSessions.h"
+
+namespace zelkord {
+namespace {
+
+constexpr Duration kGeoClueRetry = 300s;
+
+LinuxSettings::Options settingsOptions(const LinuxFileManager& files,
+                                       const ConfigurationDirectories& configuration) {
+  LinuxSettings::Options options;
+  options.databasePath = files.directories().state + "/" + kSettingsFileName;
+  options.systemFolders = configuration.system;
+  return options;
+}
+
+std::vector<std::string> profileCandidates(const ConfigurationDirectories& configuration) {
+  std::vector<std::string> candidates = {configuration.user + "/device.json"};
+  for (const auto& folder : configuration.system) candidates.push_back(folder + "/device.json");
+  return candidates;
+}
+
+ipc::SdBusOptions busOptions(const LinuxPlatformOptions& options, const LinuxFileManager& files) {
+  ipc::SdBusOptions bus;
+  bus.runtimeDirectory = files.directories().runtime;
+  bus.usesSessionBus = options.usesSessionBus;
+  return bus;
+}
+
+CurlURLSessions::Services urlServices(const std::shared_ptr<LinuxSettings>& settings,
+                                      std::shared_ptr<const ProxyConfigurationSource> proxies,
+                                      const MeteredNetwork& network) {
+  CurlURLSessions::Services services;
+  services.isMetered = [&network] { return network.isMetered(); };
+  services.maximumResponseSize = [settings] {
+    return unsignedSetting(*settings, "ZLKMaximumResponseSize", 8'388'608);
+  };
+  services.proxies = std::move(proxies);
+  services.rootsFile = CurlURLSessions::rootsFileOfEnvironment();
+  return services;
+}
+
+LinuxDevice::Host hostDevice() {
+  LinuxDevice::Host host;
+  host.hardwareModel = [] {
+    const auto bus = openSystemBus(nullptr);
+    return bus ? readBusProperty(bus.get(), "org.freedesktop.hostname1",
+                                 "/org/freedesktop/hostname1", "org.freedesktop.hostname1",
+                                 "HardwareModel")
+               : std::string();
+  };
+  return host;
+}
+
+// GeoClue, whose absence is logged once. After a failure it is not asked again for a while:
+// location is wanted with every search, and each attempt costs a connection.
+LocationSourceFactory geoClueFactory(const Clock& clock, LogSink& log) {
+  struct Attempts {
+    std::atomic_flag complained;
+    std::atomic<Duration::rep> nextAt = 0;
+  };
+  auto attempts = std::make_shared<Attempts>();
+  return [&clock, &log, attempts](const LocationOptions& options,
+                                  LocationSourceEvents events) -> std::unique_ptr<LocationSource> {
+    const auto now = clock.realNow().time_since_epoch();
+    if (now.count() < attempts->nextAt) return nullptr;
+    return GeoClueSource::make(options, std::move(events), clock,
+                               [&log, &clock, attempts](const std::string& problem) {
+                                 const auto failedAt = clock.realNow().time_since_epoch();
+                                 attempts->nextAt = (failedAt + kGeoClueRetry).count();
+                                 if (attempts->complained.test_and_set()) return;
+                                 Logger(log, "").notice("no location service: {}", problem);
+                               });
+  };
+}
+
+std::optional<Error> makeDirectories(LinuxFileManager& files) {
+  const auto& directories = files.directories();
+  for (const auto& path : {directories.runtime, directories.caches, directories.state}) {
+    auto error = files.createDirectory(path);
+    LinuxFileManager::removeLeftovers(path);
+    // Without the others there is still something to serve.
+    if (error && path == directories.state) {
+      error->userInfo["reason"] = path + ": " + error->reason().value_or("");
+      return error;
+    }
+  }
+  return std::nullopt;
+}
+
+}  // namespace
+
+// In the order in which they need each other; destroyed the other way round.
+struct LinuxPlatform::Services {
+  Services(const LinuxPlatformOptions& options, StateLock stateLock, LinuxFileManager fileManager)
+      : lock(std::move(stateLock)),
+        files(std::move(fileManager)),
+        configuration(hostConfigurationDirectories(options.environment)),
+        clock(options.clockRate),
+        log(LinuxLog::makeOutput(options.logFile, files.directories().state + "/zelkord.log"),
+            clock, options.logLevel),
+        queues(clock),
+        settings(std::make_shared<LinuxSettings>(settingsOptions(files, configuration), files,
+                                                 queues, log)),
+        interprocess(queues, log, busOptions(options, files)),
+        urlSessions(queues, urlServices(settings, networkProxy, meteredNetwork)) {
+    log.showPrivateDataWhen([weak = std::weak_ptr(settings)] {
+      const auto alive = weak.lock();
+      return alive && boolSetting(*alive, "ZLKLogPrivateData");
+    });
+    process.atExit([this] { counters.save(); });
+    process.atExit([this] { settings->flush(); });
+    process.atExit([this] { log.flush(); });
+    if (options.exitWhenIdle) {
+      exitWhenIdle.emplace(queues, clock, transactions, *options.exitWhenIdle,
+                           [this] { process.exit(0); });
+    }
+  }
+
+  // No change is announced any more while the services that hear of it go.
+  ~Services() {
+    localeWatcher.reset();
+    profileLoader.reset();
+  }
+
+  const StateLock lock;
+  LinuxFileManager files;
+  const ConfigurationDirectories configuration;
+  LinuxClock clock;
+  LinuxLog log;
+  LinuxWorkQueues queues;
+  const std::shared_ptr<LinuxSettings> settings;
+  NotificationCenter notificationCenter;
+  CountedTransactions transactions{clock};
+  LinuxCounters counters{files, queues, log};
+  TraceMarker trace{Logger(log, "")};
+  LinuxSignals signals;
+  LinuxProcess process{queues};
+  LaunchEventStreams launchEvents;
+  BinaryPropertyLists propertyLists;
+  SystemRandom random;
+  LinuxTagger tagger;
+  LinuxMemoryPressure memoryPressure{log};
+  PathWatcher watcher{log};
+
+  const HostLocaleSources localeSources = HostLocaleSources::ofProcess();
+  const HostLocale hostLocale = readHostLocale(localeSources);
+  DeviceProfileStore profile{notificationCenter, hostLocale.locale};
+  std::optional<DeviceProfileLoader> profileLoader{
+      std::in_place, profileCandidates(configuration), profile, files, queues, &watcher, log};
+  LinuxDevice device{*profile.current(), hostDevice(), files};
+  LinuxLocale locale{profile, hostLocale, notificationCenter};
+  std::optional<HostLocaleWatcher> localeWatcher{std::in_place,
+                                                 localeSources,
+                                                 [this](HostLocale host) { locale.hostChanged(std::move(host)); },
+                                                 queues,
+                                                 watcher,
+                                                 log};
+  LinuxMaps maps{profile, locale, random};
+  LinuxAccounts accounts{profile};
+  LinuxManagement management{profile, files, log};
+  LinuxTextInput textInput{profile, locale};
+  LinuxLocation location{profile, *settings, clock, geoClueFactory(clock, log)};
+  const std::shared_ptr<LinuxNetworkProxy> networkProxy =
+      std::make_shared<LinuxNetworkProxy>(profile, log);
+
+  ipc::SdBusInterprocess interprocess;
+  BusNotifications notifications{[this](const BusSignal& signal) {
+                                   interprocess.postNotification(signal.argument);
+                                   return true;
+                                 },
+                                 log};
+  MeteredNetwork meteredNetwork;
+  CurlURLSessions urlSessions;
+  std::optional<ExitWhenIdle> exitWhenIdle;
+
+  Platform platform{.clock = clock,
+                    .queues = queues,
+                    .log = log,
+                    .settings = *settings,
+                    .files = files,
+                    .notificationCenter = notificationCenter,
+                    .systemNotifications = notifications,
+                    .transactions = transactions,
+                    .counters = counters,
+                    .trace = trace,
+                    .signals = signals,
+                    .process = process,
+                    .launchEvents = launchEvents,
+                    .propertyLists = propertyLists,
+                    .urlSessions = urlSessions,
+                    .interprocess = interprocess,
+                    .device = device,
+                    .locale = locale,
+                    .maps = maps,
+                    .accounts = accounts,
+                    .management = management,
+                    .location = location,
+                    .networkProxy = *networkProxy,
+                    .tagger = tagger,
+                    .textInput = textInput,
+                    .random = random,
+                    .memoryPressure = memoryPressure};
+};
+
+std::unique_ptr<LinuxPlatform> LinuxPlatform::make(const LinuxPlatformOptions& options,
+                                                   Error* error) {
+  LinuxFileManager files(hostDirectories(options.environment));
+  Error problem;
+  auto made = makeDirectories(files);
+  auto lock = made ? std::nullopt : StateLock::acquire(files.directories().state, &problem);
+  if (!lock) {
+    if (error) *error = made ? *made : problem;
+    return nullptr;
+  }
+  auto services = std::make_unique<Services>(options, std::move(*lock), std::move(files));
+  return std::unique_ptr<LinuxPlatform>(new LinuxPlatform(std::move(services)));
+}
+
+LinuxPlatform::LinuxPlatform(std::unique_ptr<Services> services) : services_(std::move(services)) {}
+LinuxPlatform::~LinuxPlatform() = default;
+
+Platform& LinuxPlatform::platform() { return services_->platform; }
+DeviceProfileStore& LinuxPlatform::deviceProfile() { return services_->profile; }
+PathWatcher& LinuxPlatform::pathWatcher() { return services_->watcher; }
+LaunchEventStreams& LinuxPlatform::launchEvents() { return services_->launchEvents; }
+LinuxWorkQueues& LinuxPlatform::queues() { return services_->queues; }
+
+}  // namespace zelkord

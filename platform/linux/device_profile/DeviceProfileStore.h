@@ -1,0 +1,47 @@
+#pragma once
+
+#include <functional>
+#include <map>
+#include <memory>
+#include <string>
+
+#include "base/Mutex.h"
+#include "base/Subscription.h"
+#include "platform/api/NotificationCenter.h"
+#include "platform/linux/device_profile/DeviceProfile.h"
+
+namespace zelkord {
+
+// The device profile that counts now. Replacing it announces what changed.
+//
+// Threading: any thread; `replace` one at a time. Observers and notifications come from the thread
+// that replaces, after the new profile counts. Ownership: the notification centre outlives it.
+class DeviceProfileStore final {
+ public:
+  using Snapshot = std::shared_ptr<const DeviceProfile>;
+  using Observer = std::function<void(const DeviceProfile& before, const DeviceProfile& after)>;
+
+  // `fallbackLocale`: the locale of a profile that names none.
+  DeviceProfileStore(NotificationCenter& center, std::string fallbackLocale)
+      : center_(center), fallbackLocale_(std::move(fallbackLocale)) {}
+
+  Snapshot current() const;
+  void replace(DeviceProfile profile);
+  // For changes that have no notification of their own.
+  Subscription observe(Observer observer);
+
+ private:
+  struct Observers {
+    Mutex mutex;
+    int nextId ZK_GUARDED_BY(mutex) = 0;
+    std::map<int, std::shared_ptr<const Observer>> byId ZK_GUARDED_BY(mutex);
+  };
+
+  NotificationCenter& center_;
+  const std::string fallbackLocale_;
+  const std::shared_ptr<Observers> observers_ = std::make_shared<Observers>();
+  mutable Mutex mutex_;
+  Snapshot current_ ZK_GUARDED_BY(mutex_) = std::make_shared<DeviceProfile>();
+};
+
+}  // namespace zelkord

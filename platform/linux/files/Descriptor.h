@@ -1,0 +1,47 @@
+#pragma once
+
+#include <unistd.h>
+
+#include <cerrno>
+#include <string_view>
+#include <utility>
+
+#include "base/Namespace.h"
+
+namespace zelkord {
+
+// An owned file descriptor; -1 is none.
+class Descriptor final {
+ public:
+  Descriptor() = default;
+  explicit Descriptor(int number) : number_(number) {}
+  Descriptor(Descriptor&& other) noexcept : number_(std::exchange(other.number_, -1)) {}
+  Descriptor& operator=(Descriptor&& other) noexcept {
+    std::swap(number_, other.number_);
+    return *this;
+  }
+  ~Descriptor() {
+    if (number_ >= 0) ::close(number_);
+  }
+
+  explicit operator bool() const { return number_ >= 0; }
+  int get() const { return number_; }
+  // The close's own result, which is where some file systems report a failed write.
+  bool close() { return ::close(std::exchange(number_, -1)) == 0; }
+
+ private:
+  int number_ = -1;
+};
+
+// False, with errno set, when not all bytes could be written.
+inline bool writeFully(int file, std::string_view bytes) {
+  while (!bytes.empty()) {
+    const auto count = ::write(file, bytes.data(), bytes.size());
+    if (count < 0 && errno == EINTR) continue;
+    if (count < 0) return false;
+    bytes.remove_prefix(static_cast<std::size_t>(count));
+  }
+  return true;
+}
+
+}  // namespace zelkord

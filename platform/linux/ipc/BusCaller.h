@@ -1,0 +1,72 @@
+#pragma once
+
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "platform/linux/ipc/BusOutlet.h"
+#include "platform/linux/ipc/BusPointers.h"
+#include "platform/linux/ipc/Dispatcher.h"
+#include "platform/linux/ipc/ServedConnection.h"
+
+namespace zelkord::ipc {
+
+class BusDoor;
+
+// One unique name that has called us, until it vanishes.
+//
+// States: Checking (the bus driver is asked who it is; calls wait), Known, Refused (another user:
+// every call is denied). Within Known there is at most one client connection, begun by a call of
+// the connection interface. Threading: the loop's thread. Ownership: the bus door.
+class BusCaller final : public Caller {
+ public:
+  BusCaller(BusDoor& door, IpcContext& context, sd_bus* bus, std::string name);
+  ~BusCaller() override;
+
+  // Asks the driver; the name's end is told to the door from then on.
+  void start();
+  void take(sd_bus_message* message);
+  // Ends what there is without a word to the client.
+  void end();
+
+  // Caller
+  Outlet& outlet() override { return *plain_; }
+  std::shared_ptr<ServedConnection> receiver(const std::string& interface) override;
+  FileHandle openPrivateConnection() override;
+  void cutOff(const std::string& reason) override;
+  bool isPrivate() const override { return false; }
+
+ private:
+  enum class State { Checking, Known, Refused };
+  // A connection and its way out.
+  struct Session {
+    std::shared_ptr<BusOutlet> outlet;
+    std::shared_ptr<ServedConnection> connection;
+  };
+
+  static int _onOwnerChanged(sd_bus_message* message, void* self, sd_bus_error* error);
+  static int _onCredentials(sd_bus_message* message, void* self, sd_bus_error* error);
+  static int _onMatched(sd_bus_message* message, void* self, sd_bus_error* error);
+  void _identified(sd_bus_message* answer);
+  Session _makeSession();
+  void _invalidateConnection();
+  void _endConnection();
+
+  // Fixed after construction.
+  BusDoor& door_;
+  IpcContext& context_;
+  sd_bus* const bus_;
+  const std::string name_;
+  const std::shared_ptr<BusOutlet> plain_;  // for what belongs to no connection
+
+  // Loop state.
+  State state_ = State::Checking;
+  Peer peer_;
+  std::vector<MessagePtr> waiting_;
+  Session connection_;
+  Session shared_;  // serves the shared handler
+  SlotPtr match_;
+  SlotPtr query_;
+};
+
+}  // namespace zelkord::ipc

@@ -1,0 +1,79 @@
+#pragma once
+
+#include <chrono>
+#include <cstdint>
+#include <functional>
+#include <map>
+#include <memory>
+#include <thread>
+#include <unordered_map>
+#include <vector>
+
+#include "base/FunctionRef.h"
+#include "base/Subscription.h"
+#include "base/Time.h"
+#include "platform/api/WorkQueue.h"
+#include "platform/linux/ipc/LoopInbox.h"
+#include "platform/linux/ipc/OwnedFd.h"
+
+namespace zelkord::ipc {
+
+// One thread around epoll: descriptors, timers (real time) and posted tasks. It sleeps while
+// nothing happens.
+//
+// Threading: `inbox`, `sync` and `isCurrent` on any thread; everything else on the loop's own.
+// Ownership: destroying it (not on its own thread) ends the thread; what was posted and has not
+// begun is dropped.
+class ZK_CAPABILITY("loop") EventLoop {
+ public:
+  using Ready = std::function<void(std::uint32_t events)>;
+
+  EventLoop();
+  ~EventLoop();
+  EventLoop(const EventLoop&) = delete;
+  EventLoop& operator=(const EventLoop&) = delete;
+
+  // Ends the thread; the destructor does it too.
+  void stop();
+
+  const std::shared_ptr<LoopInbox>& inbox() const { return inbox_; }
+  // Runs the task on the loop's thread and waits for it. False when the loop has ended.
+  bool sync(FunctionRef<void()> task);
+  bool isCurrent() const { return std::this_thread::get_id() == thread_.get_id(); }
+  void assertCurrent() const ZK_ASSERTS(this);
+
+  // Calls `ready` with epoll's events. The descriptor stays open until the subscription is gone.
+  Subscription watch(int fd, std::uint32_t events, Ready ready);
+  // Replaces the events of a watched descriptor.
+  void changeEvents(int fd, std::uint32_t events);
+  Subscription after(Duration delay, Task task);
+  // Runs the task after everything that is ready now has had its turn.
+  void soon(Task task);
+
+ private:
+  using Instant = std::chrono::steady_clock::time_point;
+  struct Watched {
+    int fd;
+    Ready ready;
+  };
+
+  void _run();
+  int _millisecondsToWait() const;
+  void _runDueTimers();
+  static void _runAll(std::vector<Task> tasks);
+
+  const OwnedFd epoll_;
+  const std::shared_ptr<LoopInbox> inbox_ = std::make_shared<LoopInbox>();
+
+  // Loop state.
+  bool stopping_ = false;
+  std::uint64_t lastId_ = 0;  // 0 is the inbox
+  std::unordered_map<std::uint64_t, std::shared_ptr<Watched>> watched_;
+  std::unordered_map<int, std::uint64_t> idOfDescriptor_;
+  std::multimap<std::pair<Instant, std::uint64_t>, Task> timers_;
+  std::vector<Task> soon_;
+
+  std::thread thread_;
+};
+
+}  // namespace zelkord::ipc

@@ -1,0 +1,44 @@
+#pragma once
+
+#include <functional>
+#include <string>
+
+#include "base/Subscription.h"
+#include "platform/linux/ipc/Authenticator.h"
+#include "platform/linux/ipc/EventLoop.h"
+#include "platform/linux/ipc/OwnedFd.h"
+
+namespace zelkord::ipc {
+
+// One admitted socket while it authenticates. Reads nothing beyond the end of the authentication.
+//
+// Threading: the loop's thread. Ownership: its listener, which lets go of it once it has finished.
+// Errors: garbage, a time-out and a peer that went away finish it without success; the socket is
+// then closed.
+class Handshake {
+ public:
+  // Called once, never from within `start`.
+  using Finished = std::function<void(bool succeeded)>;
+
+  Handshake(EventLoop& loop, OwnedFd socket, Authenticator authenticator, Finished finished);
+  void start(Duration limit);
+
+  OwnedFd takeSocket() { return std::move(socket_); }
+  bool passesDescriptors() const { return authenticator_.passesDescriptors(); }
+
+ private:
+  void _ready(std::uint32_t events);
+  // False when the peer has to send more first.
+  bool _step();
+  bool _reply(std::string_view text);
+  void _finish(bool succeeded);
+
+  EventLoop& loop_;
+  OwnedFd socket_;
+  Authenticator authenticator_;
+  Finished finished_;
+  Subscription watch_;
+  Subscription timer_;
+};
+
+}  // namespace zelkord::ipc

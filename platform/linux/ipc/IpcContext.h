@@ -1,0 +1,24 @@
+#pragma once
+
+#include <memory>
+
+#include "platform/api/Log.h"
+#include "platform/api/WorkQueues.h"
+#include "platform/linux/ipc/EventLoop.h"
+#include "platform/linux/ipc/SdBusOptions.h"
+#include "platform/linux/ipc/TransportCounts.h"
+
+namespace zelkord::ipc {
+
+// What all parts of the transport share; they end before it does.
+struct IpcContext {
+  EventLoop& loop;
+  WorkQueues& queues;
+  Logger log;
+  SdBusOptions options;
+  // Tasks that clean up after connections; the transport lets them end before it does.
+  std::shared_ptr<Group> cleaning;
+  std::shared_ptr<TransportCounts> counts = std::make_shared<TransportCounts>();
+};
+
+}  // namespace zelkord::ipc

@@ -1,0 +1,41 @@
+#include "platform/linux/ipc/PendingReply.h"
+
+#include <cstring>
+#include <string>
+#include <utility>
+
+namespace zelkord::ipc {
+
+PendingReply::PendingReply(Route route, CallOrigin origin, std::shared_ptr<const Method> method,
+                           CallFlow::Share share)
+    : route_(std::move(route)),
+      origin_(origin),
+      method_(std::move(method)),
+      share_(std::move(share)) {}
+
+PendingReply::~PendingReply() {
+  if (method_->noReply) send({});
+}
+
+bool PendingReply::_take() { return !answered_.exchange(true) && origin_.wantsReply; }
+
+void PendingReply::send(Values values) {
+  if (!_take()) return;
+  route_.inbox->post([outlet = route_.outlet, log = route_.log, origin = origin_, method = method_,
+                      values = std::move(values)] {
+    const auto open = outlet.lock();
+    if (!open) return;
+    const int r = sendReply(*open, origin, method->noReply ? "" : method->out, values);
+    if (r < 0) log.error("reply to {} not sent: {}", method->name, std::strerror(-r));
+  });
+}
+
+void PendingReply::fail(std::string_view errorName, std::string_view text) {
+  if (!_take()) return;
+  route_.inbox->post([outlet = route_.outlet, origin = origin_, name = std::string(errorName),
+                      reason = std::string(text)] {
+    if (const auto open = outlet.lock()) sendError(*open, origin, name, reason);
+  });
+}
+
+}  // namespace zelkord::ipc

@@ -1,0 +1,178 @@
+#include "platform/linux/ipc/PrivateLink.h"
+
+#include <sys/epoll.h>
+#include <sys/ioctl.h>
+#include <sys/socket.h>
+
+#include <cerrno>
+#include <cstring>
+#include <utility>
+
+#include "platform/linux/ipc/PrivateListener.h"
+
+namespace zelkord::ipc {
+namespace {
+
+constexpr int kMessagesInARow = 32;
+// Edge-triggered: half a header may stay in the socket.
+constexpr std::uint32_t kLinkEvents = EPOLLIN | EPOLLRDHUP | EPOLLET;
+// What stands for a message that sd-bus sent by itself.
+constexpr std::size_t kUnknownMessageBytes = 256;
+
+std::size_t bytesToRead(int fd) {
+  int bytes = 0;
+  return ::ioctl(fd, FIONREAD, &bytes) == 0 && bytes > 0 ? static_cast<std::size_t>(bytes) : 0;
+}
+
+}  // namespace
+
+PrivateLink::PrivateLink(PrivateListener& listener, IpcContext& context, BusPtr bus, Peer peer,
+                         Subscription place)
+    : listener_(listener),
+      context_(context),
+      peer_(peer),
+      bus_(std::move(bus)),
+      place_(std::move(place)),
+      gate_(context.options.messageBytes) {}
+
+void PrivateLink::start() {
+  sd_bus_slot* slot = nullptr;
+  sd_bus_add_filter(bus_.get(), &slot, &PrivateLink::_onMessage, this);
+  filter_.reset(slot);
+  connection_ = std::make_shared<ServedConnection>(context_, peer_, weak_from_this());
+  ++context_.counts->connections;
+  watch_ = context_.loop.watch(sd_bus_get_fd(bus_.get()), kLinkEvents,
+                               [weak = weak_from_this()](std::uint32_t events) {
+                                 const auto self = weak.lock();
+                                 if (!self) return;
+                                 self->hungUp_ |= (events & ~(EPOLLIN | EPOLLOUT)) != 0;
+                                 self->_pump();
+                               });
+}
+
+void PrivateLink::end() {
+  if (std::exchange(ended_, true)) return;
+  watch_.reset();
+  context_.counts->queuedBytes -= std::exchange(queuedBytes_, 0);
+  --context_.counts->connections;
+  connection_->end();
+  listener_.port().release(std::move(place_));
+  // sd-bus may be on the stack.
+  context_.loop.soon([self = shared_from_this()] {
+    self->filter_.reset();
+    self->bus_.reset();
+  });
+  listener_.forget(*this);
+}
+
+void PrivateLink::cutOff(const std::string& reason) {
+  if (ended_) return;
+  context_.log.error("connection of {} cut off: {}", peer_.pid, reason);
+  end();
+}
+
+FileHandle PrivateLink::openPrivateConnection() { return listener_.openConnection(peer_); }
+
+int PrivateLink::_onMessage(sd_bus_message* message, void* self, sd_bus_error*) {
+  auto& link = *static_cast<PrivateLink*>(self);
+  link.gate_.arrived();
+  link.arrived_ = true;
+  if (link.ended_) return 1;
+  const char* interface = sd_bus_message_get_interface(message);
+  if (interface && std::strcmp(interface, "org.freedesktop.DBus.Local") == 0) {
+    link.end();
+    return 1;
+  }
+  // sd-bus answers these by itself.
+  if (interface && std::strcmp(interface, "org.freedesktop.DBus.Peer") == 0) return 0;
+  link.listener_.dispatcher().dispatch(message, link);
+  return 1;
+}
+
+void PrivateLink::_pump() {
+  const auto self = shared_from_this();
+  for (int messages = 0; messages < kMessagesInARow;) {
+    if (ended_ || !_mayRead()) return;
+    const auto progress = _process();
+    if (ended_ || progress == Progress::Nothing) return;
+    if (progress == Progress::Message) ++messages;
+  }
+  context_.loop.soon([weak = weak_from_this()] {
+    if (const auto link = weak.lock()) link->_pump();
+  });
+}
+
+// Looks at the next message's header. False when sd-bus has nothing to do.
+bool PrivateLink::_mayRead() {
+  if (!gate_.isBetweenMessages()) return true;
+  MessageHeader header;
+  const auto seen =
+      ::recv(sd_bus_get_fd(bus_.get()), header.data(), header.size(), MSG_PEEK | MSG_DONTWAIT);
+  if (seen == static_cast<ssize_t>(header.size())) {
+    if (gate_.begin(header)) return true;
+    cutOff("not a message, or one that is too large");
+    return false;
+  }
+  const bool failed = seen < 0 && errno != EAGAIN && errno != EINTR;
+  if (seen == 0 || failed || hungUp_) {
+    end();
+    return false;
+  }
+  return waitsForWriting_;
+}
+
+PrivateLink::Progress PrivateLink::_process() {
+  const bool writesFirst = _queuedMessages() > 0;
+  const auto bytes = bytesToRead(sd_bus_get_fd(bus_.get()));
+  arrived_ = false;
+  const int r = sd_bus_process(bus_.get(), nullptr);
+  if (ended_) return Progress::Nothing;
+  _accountWrites(0);
+  if (r < 0) {
+    cutOff(std::strerror(-r));
+    return Progress::Nothing;
+  }
+  if (arrived_) return Progress::Message;
+  if (r == 0) {
+    if (hungUp_ && bytes == 0) end();
+    return Progress::Nothing;
+  }
+  if (!writesFirst && !gate_.readInVain(bytes)) cutOff("malformed message");
+  return Progress::Some;
+}
+
+void PrivateLink::send(MessagePtr message, std::size_t bytes) {
+  if (ended_) return;
+  const int r = sd_bus_send(bus_.get(), message.get(), nullptr);
+  if (r < 0) return end();
+  _accountWrites(bytes);
+}
+
+std::size_t PrivateLink::_queuedMessages() const {
+  std::uint64_t count = 0;
+  sd_bus_get_n_queued_write(bus_.get(), &count);
+  return count;
+}
+
+// Keeps the sizes of the messages that wait; beyond the limit the client is cut off. The one that
+// is being written does not count: a single answer may be larger than the limit.
+void PrivateLink::_accountWrites(std::size_t newestBytes) {
+  const auto count = _queuedMessages();
+  if (count == 0 && queued_.empty()) return;
+  if (newestBytes > 0 && count > 0) queued_.push_back(newestBytes);
+  while (queued_.size() < count) queued_.push_back(kUnknownMessageBytes);
+  while (queued_.size() > count) queued_.pop_front();
+  std::size_t bytes = 0;
+  for (const auto size : queued_) bytes += size;
+  context_.counts->queuedBytes += bytes - std::exchange(queuedBytes_, bytes);
+  if (waitsForWriting_ != (count > 0)) {
+    waitsForWriting_ = count > 0;
+    context_.loop.changeEvents(sd_bus_get_fd(bus_.get()),
+                               waitsForWriting_ ? kLinkEvents | EPOLLOUT : kLinkEvents);
+  }
+  if (count > 0 && bytes - queued_.front() > context_.options.queuedBytes) {
+    cutOff("the client does not read");
+  }
+}
+
+}  // namespace zelkord::ipc

@@ -1,0 +1,78 @@
+#pragma once
+
+#include <map>
+#include <memory>
+#include <optional>
+#include <string>
+#include <unordered_map>
+
+#include "platform/linux/ipc/DelegatePort.h"
+#include "platform/linux/ipc/Dispatcher.h"
+#include "platform/linux/ipc/Handshake.h"
+#include "platform/linux/ipc/IpcContext.h"
+#include "platform/linux/ipc/ListeningSocket.h"
+#include "platform/linux/ipc/PrivateLink.h"
+
+namespace zelkord::ipc {
+
+// A private door: accepts sockets, has each admitted by the delegate and authenticated, and holds
+// the connections.
+//
+// A socket goes through: accepted, the user checked, admitted, authenticated, open. What ends
+// earlier is closed without a byte, or with what the authentication said. Threading: the loop's
+// thread, except `port`. Ownership: the transport; `close` first, then destroy. Errors: out of
+// descriptors, it stops accepting for a moment.
+class PrivateListener final : public std::enable_shared_from_this<PrivateListener> {
+ public:
+  // `serviceInterface`: the interface with Open; empty for none.
+  PrivateListener(IpcContext& context, ListenerConfiguration configuration,
+                  std::shared_ptr<ListenerDelegate> delegate, std::string serviceInterface);
+
+  void serve(ListeningSocket socket);
+  void close();
+  // Serves one end of a new socket pair for that peer and gives the other.
+  FileHandle openConnection(Peer peer);
+  void broadcast(const std::string& interface, const std::string& member, const std::string& text);
+
+  // For its links.
+  Dispatcher& dispatcher() { return dispatcher_; }
+  DelegatePort& port() { return *port_; }
+  void forget(PrivateLink& link) { links_.erase(&link); }
+
+ private:
+  using Instant = std::chrono::steady_clock::time_point;
+  struct Arrival {
+    OwnedFd socket;
+    Peer peer;
+    Instant accepted;
+  };
+
+  void _accept();
+  void _pauseAccepting();
+  void _consider(OwnedFd socket, Peer peer);
+  void _admitted(Arrival arrival, Subscription place);
+  void _authenticated(std::uint64_t handshake, bool succeeded);
+  void _begin(BusPtr bus, Peer peer, Subscription place);
+
+  // Fixed after construction.
+  IpcContext& context_;
+  const std::shared_ptr<DelegatePort> port_;
+  const std::string serverId_;
+
+  // Loop state.
+  Dispatcher dispatcher_;
+  struct Guest {
+    std::unique_ptr<Handshake> handshake;
+    Peer peer;
+    Subscription place;
+  };
+  bool closed_ = false;
+  std::optional<ListeningSocket> socket_;
+  Subscription watch_;
+  Subscription pause_;
+  std::uint64_t lastHandshake_ = 0;
+  std::unordered_map<std::uint64_t, Guest> guests_;
+  std::unordered_map<PrivateLink*, std::shared_ptr<PrivateLink>> links_;
+};
+
+}  // namespace zelkord::ipc

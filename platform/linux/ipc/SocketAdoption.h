@@ -1,0 +1,16 @@
+#pragma once
+
+#include "platform/linux/ipc/BusPointers.h"
+#include "platform/linux/ipc/OwnedFd.h"
+
+namespace zelkord::ipc {
+
+// Makes the server's side of a peer-to-peer D-Bus connection out of a socket whose authentication
+// has ended and of which nothing beyond was read. Null when the system gives no descriptors.
+//
+// sd-bus insists on authenticating by itself, and reads beyond the end of it what then escapes our
+// look at the size of each message. So it authenticates a socket pair of ours, whose descriptor
+// then becomes the real socket.
+BusPtr adoptSocket(OwnedFd socket, bool passesDescriptors);
+
+}  // namespace zelkord::ipc

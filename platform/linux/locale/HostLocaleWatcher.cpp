@@ -1,0 +1,134 @@
+#include "platform/linux/locale/HostLocaleWatcher.h"
+
+#include <systemd/sd-bus.h>
+
+#include <set>
+
+namespace zelkord {
+namespace {
+
+constexpr Duration kHostLocaleSettleTime = 100ms;
+
+const std::set<std::string> kLocaleVariables = {"LC_ALL", "LC_MESSAGES", "LANG", "LANGUAGE"};
+
+std::vector<std::string> readTextArrayProperty(sd_bus_message* message) {
+  std::vector<std::string> texts;
+  if (::sd_bus_message_enter_container(message, 'v', "as") < 0 ||
+      ::sd_bus_message_enter_container(message, 'a', "s") < 0) {
+    return texts;
+  }
+  for (const char* text = nullptr; ::sd_bus_message_read(message, "s", &text) > 0;) {
+    texts.emplace_back(text);
+  }
+  return texts;
+}
+
+}  // namespace
+
+struct HostLocaleWatcher::BusCallbacks {
+  static int timeZoneChanged(sd_bus_message*, void* self, sd_bus_error*) {
+    static_cast<HostLocaleWatcher*>(self)->noteChange();
+    return 0;
+  }
+  static int localeChanged(sd_bus_message*, void* self, sd_bus_error*) {
+    static_cast<HostLocaleWatcher*>(self)->localeSignalled();
+    return 0;
+  }
+  static int localeRead(sd_bus_message* reply, void* self, sd_bus_error*) {
+    if (::sd_bus_message_is_method_error(reply, nullptr)) return 0;
+    static_cast<HostLocaleWatcher*>(self)->localeArrived(
+        localeVariables(readTextArrayProperty(reply)));
+    return 0;
+  }
+};
+
+std::map<std::string, std::string> localeVariables(const std::vector<std::string>& assignments) {
+  std::map<std::string, std::string> variables;
+  for (const auto& assignment : assignments) {
+    const auto equals = assignment.find('=');
+    if (equals == std::string::npos) continue;
+    const auto name = assignment.substr(0, equals);
+    if (kLocaleVariables.contains(name)) variables[name] = assignment.substr(equals + 1);
+  }
+  return variables;
+}
+
+HostLocaleWatcher::HostLocaleWatcher(HostLocaleSources sources,
+                                     std::function<void(HostLocale)> changed, WorkQueues& queues,
+                                     PathWatcher& watcher, LogSink& log)
+    : sources_(std::move(sources)),
+      changed_(std::move(changed)),
+      log_(log, ""),
+      queue_(queues.makeSerialQueue("com.quenta.zelkord.hostlocale")) {
+  for (const auto& path : {sources_.localtimePath, sources_.timezonePath}) {
+    watches_.push_back(watcher.watch(path, [this] { noteChange(); }));
+  }
+  listen();
+}
+
+HostLocaleWatcher::~HostLocaleWatcher() {
+  watches_.clear();
+  bus_.reset();
+  queue_->sync([this] {
+    queue_->assertCurrent();
+    timer_.reset();
+  });
+}
+
+void HostLocaleWatcher::listen() {
+  std::string problem;
+  auto connection = openSystemBus(&problem);
+  if (!connection) {
+    log_.notice("no system bus: changes of the system's locale are not seen ({})", problem);
+    return;
+  }
+  bus_ = std::make_unique<BusThread>(std::move(connection));
+  const auto match = [this](const char* path, sd_bus_message_handler_t handler) {
+    ::sd_bus_match_signal_async(bus_->bus(), nullptr, nullptr, path,
+                                "org.freedesktop.DBus.Properties", "PropertiesChanged", handler,
+                                nullptr, this);
+  };
+  match("/org/freedesktop/locale1", BusCallbacks::localeChanged);
+  match("/org/freedesktop/timedate1", BusCallbacks::timeZoneChanged);
+  bus_->start([] {});
+}
+
+void HostLocaleWatcher::localeSignalled() {
+  ::sd_bus_call_method_async(bus_->bus(), nullptr, "org.freedesktop.locale1",
+                             "/org/freedesktop/locale1", "org.freedesktop.DBus.Properties", "Get",
+                             BusCallbacks::localeRead, this, "ss", "org.freedesktop.locale1",
+                             "Locale");
+}
+
+void HostLocaleWatcher::localeArrived(std::map<std::string, std::string> variables) {
+  queue_->async([this, variables = std::move(variables)] {
+    queue_->assertCurrent();
+    variables_ = variables;
+  });
+  noteChange();
+}
+
+void HostLocaleWatcher::noteChange() {
+  queue_->async([this] {
+    queue_->assertCurrent();
+    if (timer_) return;
+    timer_ = queue_->after(
+        kHostLocaleSettleTime, [this] { reread(); }, TimeBase::Real);
+  });
+}
+
+void HostLocaleWatcher::reread() {
+  queue_->assertCurrent();
+  timer_.reset();
+  auto sources = sources_;
+  if (!variables_.empty()) {
+    sources.environment = [this, variables = variables_](const std::string& name) {
+      if (!kLocaleVariables.contains(name)) return sources_.environment(name);
+      const auto found = variables.find(name);
+      return found == variables.end() ? std::string() : found->second;
+    };
+  }
+  changed_(readHostLocale(sources));
+}
+
+}  // namespace zelkord

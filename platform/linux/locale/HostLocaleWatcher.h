@@ -1,0 +1,57 @@
+#pragma once
+
+#include <functional>
+#include <map>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "base/Mutex.h"
+#include "platform/api/Log.h"
+#include "platform/api/WorkQueues.h"
+#include "platform/linux/bus/SystemBus.h"
+#include "platform/linux/locale/HostLocale.h"
+#include "platform/linux/watch/PathWatcher.h"
+
+namespace zelkord {
+
+// Reads the host's locale and time zone anew when they may have changed: the time zone's files
+// (watched), the signals of org.freedesktop.timedate1, and those of org.freedesktop.locale1, whose
+// variables then stand for the environment's.
+//
+// Threading: `changed` runs on the watcher's queue.
+// Ownership: everything given outlives it.
+// Errors: without a system bus only the files are watched; logged once.
+class HostLocaleWatcher final {
+ public:
+  HostLocaleWatcher(HostLocaleSources sources, std::function<void(HostLocale)> changed,
+                    WorkQueues& queues, PathWatcher& watcher, LogSink& log);
+  ~HostLocaleWatcher();
+
+ private:
+  void listen();
+  void localeSignalled();
+  void localeArrived(std::map<std::string, std::string> variables);
+  void noteChange();
+  void reread();
+
+  // Fixed after construction.
+  const HostLocaleSources sources_;
+  const std::function<void(HostLocale)> changed_;
+  const Logger log_;
+  const std::unique_ptr<SerialQueue> queue_;
+
+  // Queue state.
+  Subscription timer_ ZK_ON(queue_);
+  // What locale1 said last; empty until it says something.
+  std::map<std::string, std::string> variables_ ZK_ON(queue_);
+
+  struct BusCallbacks;
+  std::vector<Subscription> watches_;
+  std::unique_ptr<BusThread> bus_;
+};
+
+// The variables of locale1's property, "LANG=de_DE.UTF-8" and the like.
+std::map<std::string, std::string> localeVariables(const std::vector<std::string>& assignments);
+
+}  // namespace zelkord

@@ -1,0 +1,47 @@
+#pragma once
+
+#include <functional>
+#include <memory>
+#include <string>
+
+#include "base/Mutex.h"
+#include "platform/api/Device.h"
+#include "platform/api/NotificationCenter.h"
+#include "platform/linux/device_profile/DeviceProfileStore.h"
+#include "platform/linux/locale/HostLocale.h"
+
+namespace zelkord {
+
+// Locale and time zone: the profile's over the host's. A change of the profile is announced by the
+// profile store, one of the host by `hostChanged`.
+//
+// Threading: any thread; reads come from memory.
+// Ownership: the store and the notification centre outlive it.
+class LinuxLocale final : public LocaleService {
+ public:
+  LinuxLocale(DeviceProfileStore& store, HostLocale host, NotificationCenter& center);
+
+  LocaleSnapshot current() const override;
+  std::string timeZoneName() const override;
+
+  // The host says something else now; announces what changed by it, on the caller's thread.
+  void hostChanged(HostLocale host);
+  HostLocale host() const;
+
+ private:
+  struct State {
+    HostLocale host;
+    LocaleSnapshot snapshot;
+    std::string timeZone;
+  };
+
+  void refresh(const DeviceProfile& profile);
+
+  NotificationCenter& center_;
+  DeviceProfileStore& store_;
+  mutable Mutex mutex_;
+  State state_ ZK_GUARDED_BY(mutex_);
+  Subscription profileChanges_;
+};
+
+}  // namespace zelkord

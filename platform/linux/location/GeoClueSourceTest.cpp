@@ -1,0 +1,199 @@
+#include <gmock/gmock.h>
+#include <systemd/sd-bus.h>
+
+#include <condition_variable>
+#include <mutex>
+
+#include "platform/linux/ipc/IpcTestSupport.h"
+#include "platform/linux/locale/HostLocaleWatcher.h"
+#include "platform/linux/location/GeoClueSource.h"
+
+namespace zelkord {
+namespace {
+
+using testing::HasSubstr;
+
+// A system bus of the test's own for as long as it lives.
+class PrivateSystemBus final {
+ public:
+  PrivateSystemBus() { ::setenv("DBUS_SYSTEM_BUS_ADDRESS", bus_.address().c_str(), 1); }
+  ~PrivateSystemBus() { ::unsetenv("DBUS_SYSTEM_BUS_ADDRESS"); }
+
+ private:
+  const ipc::IpcTestDirectory directory_;
+  const ipc::IpcTestBus bus_{directory_.path()};
+};
+
+// What the doubles say and were told; the bus reads and writes it in place.
+struct HostServicesState {
+  sd_bus* bus = nullptr;
+  bool denies = false;
+  char* desktopId = nullptr;
+  unsigned accuracyLevel = 0;
+  double latitude = 52.5;
+  double longitude = 13.4;
+  double accuracy = 400;
+};
+
+// GeoClue and locale1 as far as they matter here: one client, one location; one property.
+class HostServicesDouble final {
+ public:
+  explicit HostServicesDouble(const char* name, bool denies = false)
+      : thread_(openSystemBus(nullptr)) {
+    auto* bus = state_.bus = thread_.bus();
+    state_.denies = denies;
+    ::sd_bus_add_object_vtable(bus, nullptr, "/org/freedesktop/GeoClue2/Manager",
+                               "org.freedesktop.GeoClue2.Manager", kManager, &state_);
+    ::sd_bus_add_object_vtable(bus, nullptr, "/client", "org.freedesktop.GeoClue2.Client", kClient,
+                               &state_);
+    ::sd_bus_add_object_vtable(bus, nullptr, "/location", "org.freedesktop.GeoClue2.Location",
+                               kLocation, &state_);
+    ::sd_bus_add_object_vtable(bus, nullptr, "/org/freedesktop/locale1", "org.freedesktop.locale1",
+                               kLocale, &state_);
+    ::sd_bus_request_name(bus, name, 0);
+  }
+  ~HostServicesDouble() { ::free(state_.desktopId); }
+  void start() {
+    thread_.start([] {});
+  }
+  // Before `start`.
+  void announceLocale() {
+    ::sd_bus_emit_properties_changed(thread_.bus(), "/org/freedesktop/locale1",
+                                     "org.freedesktop.locale1", "Locale", nullptr);
+  }
+
+ private:
+  static int getClient(sd_bus_message* call, void*, sd_bus_error*) {
+    return ::sd_bus_reply_method_return(call, "o", "/client");
+  }
+  static int startClient(sd_bus_message* call, void* self, sd_bus_error* error) {
+    const auto& state = *static_cast<HostServicesState*>(self);
+    if (state.denies || !state.desktopId || state.accuracyLevel == 0) {
+      return ::sd_bus_error_set(error, "org.freedesktop.DBus.Error.AccessDenied", "no");
+    }
+    ::sd_bus_reply_method_return(call, "");
+    return ::sd_bus_emit_signal(state.bus, "/client", "org.freedesktop.GeoClue2.Client",
+                                "LocationUpdated", "oo", "/", "/location");
+  }
+  static int getLocale(sd_bus*, const char*, const char*, const char*, sd_bus_message* reply, void*,
+                       sd_bus_error*) {
+    return ::sd_bus_message_append(reply, "as", 2, "LANG=fr_FR.UTF-8", "LC_TIME=C");
+  }
+
+  static const sd_bus_vtable kManager[];
+  static const sd_bus_vtable kClient[];
+  static const sd_bus_vtable kLocation[];
+  static const sd_bus_vtable kLocale[];
+
+  HostServicesState state_;
+  BusThread thread_;
+};
+
+const sd_bus_vtable HostServicesDouble::kManager[] = {
+    SD_BUS_VTABLE_START(0),
+    SD_BUS_METHOD("GetClient", "", "o", getClient, SD_BUS_VTABLE_UNPRIVILEGED), SD_BUS_VTABLE_END};
+const sd_bus_vtable HostServicesDouble::kClient[] = {
+    SD_BUS_VTABLE_START(0), SD_BUS_METHOD("Start", "", "", startClient, SD_BUS_VTABLE_UNPRIVILEGED),
+    SD_BUS_WRITABLE_PROPERTY("DesktopId", "s", nullptr, nullptr,
+                             offsetof(HostServicesState, desktopId), SD_BUS_VTABLE_UNPRIVILEGED),
+    SD_BUS_WRITABLE_PROPERTY("RequestedAccuracyLevel", "u", nullptr, nullptr,
+                             offsetof(HostServicesState, accuracyLevel),
+                             SD_BUS_VTABLE_UNPRIVILEGED),
+    SD_BUS_VTABLE_END};
+const sd_bus_vtable HostServicesDouble::kLocation[] = {
+    SD_BUS_VTABLE_START(0),
+    SD_BUS_PROPERTY("Latitude", "d", nullptr, offsetof(HostServicesState, latitude), 0),
+    SD_BUS_PROPERTY("Longitude", "d", nullptr, offsetof(HostServicesState, longitude), 0),
+    SD_BUS_PROPERTY("Accuracy", "d", nullptr, offsetof(HostServicesState, accuracy), 0),
+    SD_BUS_VTABLE_END};
+const sd_bus_vtable HostServicesDouble::kLocale[] = {
+    SD_BUS_VTABLE_START(0),
+    SD_BUS_PROPERTY("Locale", "as", getLocale, 0, SD_BUS_VTABLE_PROPERTY_EMITS_CHANGE),
+    SD_BUS_VTABLE_END};
+
+// What a source tells, waited for.
+class HeardEvents final {
+ public:
+  LocationSourceEvents events() {
+    return {[this](const LocationFix& fix) {
+              note(fmt::format("{} {} {} type {}", fix.latitude, fix.longitude,
+                               fix.horizontalAccuracy, fix.type));
+            },
+            [this](const Error& error) { note(fmt::format("failure {}", error.code)); }};
+  }
+  void note(std::string text) {
+    const std::lock_guard lock(mutex_);
+    text_ = std::move(text);
+    arrived_.notify_all();
+  }
+  std::string wait() {
+    std::unique_lock lock(mutex_);
+    arrived_.wait_for(lock, 5s, [this] { return !text_.empty(); });
+    return text_;
+  }
+
+ private:
+  std::mutex mutex_;
+  std::condition_variable arrived_;
+  std::string text_;
+};
+
+class GeoClueSourceTest : public testing::Test {
+ protected:
+  std::unique_ptr<LocationSource> make() {
+    return GeoClueSource::make({}, heard_.events(), clock_, [this](const std::string& problem) {
+      heard_.note("missing: " + problem);
+    });
+  }
+
+  const LinuxClock clock_;
+  HeardEvents heard_;
+};
+
+TEST_F(GeoClueSourceTest, TellsTheLocationOfAStartedClient) {
+  const PrivateSystemBus bus;
+  HostServicesDouble services("org.freedesktop.GeoClue2");
+  services.start();
+  const auto source = make();
+  EXPECT_EQ(heard_.wait(), "52.5 13.4 400 type 4");
+}
+
+TEST_F(GeoClueSourceTest, ARefusalIsAFailureAndAMissingServiceIsNot) {
+  const PrivateSystemBus bus;
+  {
+    const auto source = make();
+    EXPECT_THAT(heard_.wait(), HasSubstr("missing: "));
+  }
+  heard_.note("");
+  HostServicesDouble services("org.freedesktop.GeoClue2", true);
+  services.start();
+  const auto source = make();
+  EXPECT_EQ(heard_.wait(), "failure 13");
+}
+
+TEST_F(GeoClueSourceTest, WithoutASystemBusThereIsNoSource) {
+  ::setenv("DBUS_SYSTEM_BUS_ADDRESS", "unix:path=/nowhere", 1);
+  EXPECT_EQ(make(), nullptr);
+  ::unsetenv("DBUS_SYSTEM_BUS_ADDRESS");
+  EXPECT_THAT(heard_.wait(), HasSubstr("missing: "));
+}
+
+TEST(HostLocaleWatcherTest, HearsOfTheSystemsLocale) {
+  const PrivateSystemBus bus;
+  const LinuxClock clock;
+  LinuxWorkQueues queues(clock, 2);
+  RecordingLog log;
+  PathWatcher files(log);
+  HeardEvents heard;
+  HostLocaleSources sources;
+  sources.environment = [](const std::string&) { return "de_DE"; };
+  HostLocaleWatcher watcher(
+      sources, [&](HostLocale host) { heard.note(host.locale); }, queues, files, log);
+  HostServicesDouble services("org.freedesktop.locale1");
+  services.announceLocale();
+  services.start();
+  EXPECT_EQ(heard.wait(), "fr_FR");
+}
+
+}  // namespace
+}  // namespace zelkord

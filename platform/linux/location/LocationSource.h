@@ -1,0 +1,26 @@
+#pragma once
+
+#include <functional>
+#include <memory>
+
+#include "platform/api/LocationService.h"
+
+namespace zelkord {
+
+// A provider of fixes, running from its making to its end. Its call-backs come on a thread of its
+// own.
+class LocationSource {
+ public:
+  virtual ~LocationSource() = default;
+};
+
+struct LocationSourceEvents {
+  std::function<void(const LocationFix&)> fix;
+  std::function<void(const Error&)> failure;
+};
+
+// Null when the host has no such provider.
+using LocationSourceFactory = std::function<std::unique_ptr<LocationSource>(
+    const LocationOptions& options, LocationSourceEvents events)>;
+
+}  // namespace zelkord

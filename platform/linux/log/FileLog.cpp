@@ -1,0 +1,71 @@
+#include "platform/linux/log/FileLog.h"
+
+#include <fcntl.h>
+#include <spdlog/sinks/rotating_file_sink.h>
+#include <sys/stat.h>
+
+#include <atomic>
+#include <cstdio>
+
+#include "platform/linux/files/Descriptor.h"
+#include "platform/linux/log/LogLine.h"
+
+namespace zelkord {
+namespace {
+
+constexpr std::size_t kLogFileSize = 8 << 20;
+constexpr std::size_t kOldLogFiles = 4;
+
+spdlog::file_event_handlers privateFileHandlers() {
+  spdlog::file_event_handlers handlers;
+  // Closed to others from its first moment on, whatever the umask is.
+  handlers.before_open = [](const std::string& path) {
+    const Descriptor made(::open(path.c_str(), O_CREAT | O_EXCL | O_WRONLY | O_CLOEXEC, 0600));
+  };
+  handlers.after_open = [](const std::string&, std::FILE* file) { ::fchmod(::fileno(file), 0600); };
+  return handlers;
+}
+
+}  // namespace
+
+struct FileLog::Complaint {
+  std::atomic_flag made;
+};
+
+FileLog::FileLog(const std::string& path) : complaint_(std::make_unique<Complaint>()) {
+  try {
+    sink_ = std::make_shared<spdlog::sinks::rotating_file_sink_mt>(path, kLogFileSize, kOldLogFiles,
+                                                                   false, privateFileHandlers());
+    sink_->set_pattern("%v");
+  } catch (const std::exception& error) {
+    complain(error.what());
+  }
+}
+
+FileLog::~FileLog() = default;
+
+void FileLog::complain(const char* problem) {
+  if (!complaint_->made.test_and_set()) std::fprintf(stderr, "zelkord: no log: %s\n", problem);
+}
+
+void FileLog::write(WallTime time, LogLevel level, std::string_view category,
+                    std::string_view text) {
+  if (!sink_) return;
+  const auto line = logLine(time, level, category, text);
+  try {
+    sink_->log(spdlog::details::log_msg({}, spdlog::level::info, {line.data(), line.size()}));
+    sink_->flush();
+  } catch (const std::exception& error) {
+    complain(error.what());
+  }
+}
+
+void FileLog::flush() {
+  try {
+    if (sink_) sink_->flush();
+  } catch (const std::exception& error) {
+    complain(error.what());
+  }
+}
+
+}  // namespace zelkord

@@ -1,0 +1,42 @@
+#pragma once
+
+#include <functional>
+#include <memory>
+#include <string>
+
+#include "platform/api/Clock.h"
+#include "platform/api/Log.h"
+#include "platform/linux/log/LogOutput.h"
+
+namespace zelkord {
+
+// The log of the daemon: a level, a rule about private data, and one output.
+//
+// Threading: any thread; `showPrivateDataWhen` before other threads write.
+// Ownership: the clock, and what the rule refers to, outlive it.
+class LinuxLog final : public LogSink {
+ public:
+  LinuxLog(std::unique_ptr<LogOutput> output, const Clock& clock, LogLevel level);
+
+  // A file when `path` is given, else the journal, else `fallbackPath`.
+  static std::unique_ptr<LogOutput> makeOutput(const std::string& path,
+                                               const std::string& fallbackPath);
+
+  // Asked at each entry. Without a rule nothing private shows: settings come later than the log.
+  void showPrivateDataWhen(std::function<bool()> rule) { rule_ = std::move(rule); }
+
+  bool isEnabled(LogLevel level) const override {
+    return level >= level_ || level == LogLevel::Fault;
+  }
+  bool showsPrivateData() const override { return rule_ && rule_(); }
+  void write(LogLevel level, std::string_view category, std::string_view text) override;
+  void flush() { output_->flush(); }
+
+ private:
+  const std::unique_ptr<LogOutput> output_;
+  const Clock& clock_;
+  const LogLevel level_;
+  std::function<bool()> rule_;
+};
+
+}  // namespace zelkord

@@ -1,0 +1,35 @@
+#pragma once
+
+#include <map>
+#include <memory>
+#include <string>
+
+#include "base/Mutex.h"
+#include "platform/api/Log.h"
+#include "platform/api/MemoryPressure.h"
+#include "platform/linux/memory_pressure/PressureWatch.h"
+
+namespace zelkord {
+
+// Critical memory pressure: the kernel's pressure-stall information, else the system bus's
+// LowMemoryMonitor, else none, which is logged once. Watches from the first listener on, asleep in
+// between; nothing polls.
+//
+// Threading: any thread. Ownership: subscriptions may outlive it.
+class LinuxMemoryPressure final : public MemoryPressure {
+ public:
+  explicit LinuxMemoryPressure(LogSink& log, std::string pressureFile = "/proc/pressure/memory");
+  ~LinuxMemoryPressure() override;
+
+  Subscription onCritical(WorkQueue& queue, Task task) override;
+
+ private:
+  struct Listeners;
+  void _watch();
+
+  const Logger log_;
+  const std::string pressureFile_;
+  const std::shared_ptr<Listeners> listeners_;
+};
+
+}  // namespace zelkord

@@ -1,0 +1,138 @@
+#include "platform/linux/process/LinuxSignals.h"
+
+#include <signal.h>
+#include <sys/eventfd.h>
+#include <unistd.h>
+
+#include <atomic>
+#include <cerrno>
+#include <cstdint>
+#include <map>
+#include <thread>
+#include <utility>
+#include <vector>
+
+#include "base/Check.h"
+#include "base/Mutex.h"
+#include "platform/linux/queues/ServiceThread.h"
+
+namespace zelkord {
+
+namespace {
+
+// All that a signal handler can reach. The descriptor is -1 while there is no LinuxSignals.
+constinit std::atomic<int> signalWakeUp{-1};
+constinit std::atomic<std::uint64_t> signalsSeen{0};
+static_assert(std::atomic<std::uint64_t>::is_always_lock_free);
+
+void wakeSignalThread(int descriptor) {
+  const std::uint64_t one = 1;
+  [[maybe_unused]] const auto written = ::write(descriptor, &one, sizeof one);
+}
+
+void noteSignal(int signal) {
+  const int error = errno;
+  signalsSeen.fetch_or(std::uint64_t{1} << signal);
+  const int descriptor = signalWakeUp.load();
+  if (descriptor >= 0) wakeSignalThread(descriptor);
+  errno = error;
+}
+
+}  // namespace
+
+struct LinuxSignals::State {
+  struct Registration {
+    int signal;
+    WorkQueue* queue;
+    std::shared_ptr<const Task> task;
+  };
+
+  void watch(int signal) ZK_REQUIRES(mutex) {
+    struct sigaction action {};
+    action.sa_handler = noteSignal;
+    action.sa_flags = SA_RESTART;
+    ::sigemptyset(&action.sa_mask);
+    struct sigaction former {};
+    ZK_CHECK(::sigaction(signal, &action, &former) == 0, "a signal that cannot be handled");
+    dispositions.emplace(signal, former);
+    if (!thread.joinable()) thread = std::thread([this] { run(); });
+  }
+
+  void remove(std::uint64_t id) {
+    std::map<std::uint64_t, Registration>::node_type released;
+    const MutexLock lock(mutex);
+    released = registrations.extract(id);
+    if (!released) return;
+    const int signal = released.mapped().signal;
+    for (const auto& [other, registration] : registrations) {
+      if (registration.signal == signal) return;
+    }
+    ::sigaction(signal, &dispositions.at(signal), nullptr);
+    dispositions.erase(signal);
+  }
+
+  void run() {
+    beginServiceThread("zk-signals");
+    for (;;) {
+      std::uint64_t count = 0;
+      if (::read(wakeUp, &count, sizeof count) < 0 && errno != EINTR) return;
+      const MutexLock lock(mutex);
+      if (stopped) return;
+      post(signalsSeen.exchange(0));
+    }
+  }
+
+  void post(std::uint64_t signals) ZK_REQUIRES(mutex) {
+    for (const auto& [id, registration] : registrations) {
+      if ((signals >> registration.signal & 1) == 0) continue;
+      registration.queue->async([weak = std::weak_ptr(registration.task)] {
+        if (const auto task = weak.lock()) (*task)();
+      });
+    }
+  }
+
+  void stop() {
+    std::thread running;
+    {
+      const MutexLock lock(mutex);
+      stopped = true;
+      running = std::move(thread);
+    }
+    wakeSignalThread(wakeUp);
+    if (running.joinable()) running.join();
+  }
+
+  const int wakeUp = ::eventfd(0, EFD_CLOEXEC);
+  Mutex mutex;
+  std::map<std::uint64_t, Registration> registrations ZK_GUARDED_BY(mutex);
+  std::map<int, struct sigaction> dispositions ZK_GUARDED_BY(mutex);  // of before
+  std::uint64_t lastId ZK_GUARDED_BY(mutex) = 0;
+  bool stopped ZK_GUARDED_BY(mutex) = false;
+  std::thread thread ZK_GUARDED_BY(mutex);
+};
+
+LinuxSignals::LinuxSignals() : state_(std::make_shared<State>()) {
+  ZK_CHECK(state_->wakeUp >= 0, "no event descriptor from the kernel");
+  int none = -1;
+  ZK_CHECK(signalWakeUp.compare_exchange_strong(none, state_->wakeUp),
+           "signals are handled already");
+  signalsSeen = 0;
+}
+
+LinuxSignals::~LinuxSignals() {
+  state_->stop();
+  signalWakeUp = -1;
+  ::close(state_->wakeUp);
+}
+
+Subscription LinuxSignals::on(int signal, WorkQueue& queue, Task task) {
+  ZK_CHECK(signal >= 1 && signal < 64, "a signal out of range");
+  const MutexLock lock(state_->mutex);
+  const auto id = ++state_->lastId;
+  state_->registrations.emplace(
+      id, State::Registration{signal, &queue, std::make_shared<const Task>(std::move(task))});
+  if (!state_->dispositions.contains(signal)) state_->watch(signal);
+  return Subscription([state = state_, id] { state->remove(id); });
+}
+
+}  // namespace zelkord

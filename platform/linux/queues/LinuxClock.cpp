@@ -1,0 +1,42 @@
+#include "platform/linux/queues/LinuxClock.h"
+
+#include <time.h>
+
+#include "base/Check.h"
+
+namespace zelkord {
+
+namespace {
+
+Duration readClock(clockid_t clock) {
+  timespec time{};
+  ::clock_gettime(clock, &time);
+  return std::chrono::seconds(time.tv_sec) + std::chrono::nanoseconds(time.tv_nsec);
+}
+
+}  // namespace
+
+LinuxClock::LinuxClock(double rate)
+    : rate_(rate), start_(readClock(CLOCK_BOOTTIME)), wallStart_(readClock(CLOCK_REALTIME)) {
+  ZK_CHECK(rate >= 1 && rate <= 100'000, "clock rate out of range");
+}
+
+SteadyTime LinuxClock::realNow() const { return SteadyTime(readClock(CLOCK_BOOTTIME)); }
+
+Duration LinuxClock::_scaledElapsed() const {
+  return durationOfSeconds(secondsOf(realNow() - start_) * rate_);
+}
+
+SteadyTime LinuxClock::now() const {
+  return rate_ == 1 ? realNow() : deadlineAfter(start_, _scaledElapsed());
+}
+
+WallTime LinuxClock::wallNow() const {
+  return rate_ == 1 ? WallTime(readClock(CLOCK_REALTIME)) : wallStart_ + _scaledElapsed();
+}
+
+Duration realDuration(Duration scaled, double rate) {
+  return rate == 1 ? scaled : durationOfSeconds(secondsOf(scaled) / rate);
+}
+
+}  // namespace zelkord

@@ -1,0 +1,54 @@
+#pragma once
+
+#include <array>
+#include <memory>
+#include <string>
+
+#include "platform/api/WorkQueues.h"
+#include "platform/linux/queues/LinuxClock.h"
+#include "platform/linux/queues/WorkerPool.h"
+
+namespace zelkord {
+
+class MainLoop;
+class TimerService;
+
+// The process's queues, on one pool of workers and one timer thread.
+//
+// Threading: any thread.
+// Ownership: outlives the tasks of its queues. Destroying it ends its threads, so every task that
+// runs must be able to end, and not on one of its own workers; what was made by it and is still
+// there then does nothing any more.
+class LinuxWorkQueues final : public WorkQueues {
+ public:
+  // `workers`: see WorkerPool.
+  explicit LinuxWorkQueues(const LinuxClock& clock, unsigned workers = 0);
+  ~LinuxWorkQueues() override;
+  LinuxWorkQueues(const LinuxWorkQueues&) = delete;
+  LinuxWorkQueues& operator=(const LinuxWorkQueues&) = delete;
+
+  std::unique_ptr<SerialQueue> makeSerialQueue(std::string label) override;
+  std::unique_ptr<ConcurrentQueue> makeConcurrentQueue(std::string label) override;
+  WorkQueue& global(QualityOfService quality) override;
+  SerialQueue& main() override;
+  std::unique_ptr<Semaphore> makeSemaphore(unsigned permits) override;
+  std::unique_ptr<Group> makeGroup() override;
+  // Requires a queue of this factory.
+  std::unique_ptr<Timer> makeTimer(WorkQueue& queue, Task task) override;
+
+  // Runs the main queue's tasks on the calling thread until `stopMainLoop`.
+  void runMainLoop();
+  void stopMainLoop();
+
+  WorkerPool::Counts workers() const { return pool_->counts(); }
+
+ private:
+  const double rate_;
+  const std::shared_ptr<WorkerPool> pool_;
+  const std::shared_ptr<MainLoop> mainLoop_;
+  const std::shared_ptr<TimerService> timers_;
+  const std::unique_ptr<SerialQueue> main_;
+  std::array<std::unique_ptr<WorkQueue>, 4> globals_;
+};
+
+}  // namespace zelkord

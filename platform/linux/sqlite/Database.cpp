@@ -1,0 +1,92 @@
+#include "platform/linux/sqlite/Database.h"
+
+#include <fcntl.h>
+#include <sqlite3.h>
+#include <unistd.h>
+
+namespace zelkord::sqlite {
+namespace {
+
+Failure failureOf(sqlite3* database, int code) {
+  return {code, database ? sqlite3_errmsg(database) : sqlite3_errstr(code)};
+}
+
+// SQLite makes a missing file readable for everybody; its side files take over the mode of the
+// file.
+void makePrivateFile(const std::string& path) {
+  const int file = ::open(path.c_str(), O_CREAT | O_EXCL | O_WRONLY | O_CLOEXEC, 0600);
+  if (file >= 0) ::close(file);
+}
+
+}  // namespace
+
+bool Failure::isDamage() const {
+  const int primary = code & 0xFF;
+  return primary == SQLITE_CORRUPT || primary == SQLITE_NOTADB;
+}
+
+bool Failure::isMisfit() const { return (code & 0xFF) == SQLITE_ERROR; }
+
+bool Failure::isBusy() const {
+  const int primary = code & 0xFF;
+  return primary == SQLITE_BUSY || primary == SQLITE_LOCKED;
+}
+
+void Database::Closer::operator()(sqlite3* database) const { sqlite3_close_v2(database); }
+
+std::optional<Database> Database::open(const std::string& path, Failure* failure,
+                                       const DatabaseOptions& options) {
+  makePrivateFile(path);
+  sqlite3* raw = nullptr;
+  constexpr int kFlags =
+      SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE | SQLITE_OPEN_FULLMUTEX | SQLITE_OPEN_NOFOLLOW;
+  const int code = sqlite3_open_v2(path.c_str(), &raw, kFlags, nullptr);
+  Database database(raw);
+  if (code != SQLITE_OK) {
+    if (failure) *failure = failureOf(raw, code);
+    return std::nullopt;
+  }
+  sqlite3_extended_result_codes(raw, 1);
+  sqlite3_busy_timeout(
+      raw, static_cast<int>(
+               std::chrono::duration_cast<std::chrono::milliseconds>(options.busyTimeout).count()));
+  auto problem = database.execute(options.writeAheadLog
+                                      ? "PRAGMA journal_mode=WAL; PRAGMA synchronous=NORMAL"
+                                      : "PRAGMA journal_mode=DELETE; PRAGMA synchronous=FULL");
+  if (!problem) return database;
+  if (failure) *failure = std::move(*problem);
+  return std::nullopt;
+}
+
+std::optional<Failure> Database::execute(const char* sql) {
+  const int code = sqlite3_exec(database_.get(), sql, nullptr, nullptr, nullptr);
+  return code == SQLITE_OK ? std::nullopt : std::optional(failureOf(database_.get(), code));
+}
+
+std::optional<Failure> Database::transaction(FunctionRef<std::optional<Failure>()> work) {
+  if (auto failure = execute("BEGIN IMMEDIATE")) return failure;
+  auto failure = work();
+  if (!failure) failure = execute("COMMIT");
+  if (failure) execute("ROLLBACK");
+  return failure;
+}
+
+std::int64_t Database::changes() const { return sqlite3_changes64(database_.get()); }
+
+std::int64_t Database::lastInsertId() const { return sqlite3_last_insert_rowid(database_.get()); }
+
+std::optional<std::string> setAside(const std::string& path) {
+  std::string aside;
+  for (int number = 1; number < 1000; ++number) {
+    aside = path + ".damaged-" + std::to_string(number);
+    if (::access(aside.c_str(), F_OK) != 0) break;
+  }
+  if (::rename(path.c_str(), aside.c_str()) != 0) return std::nullopt;
+  for (const char* side : {"-wal", "-journal"}) {
+    ::rename((path + side).c_str(), (aside + side).c_str());
+  }
+  ::unlink((path + "-shm").c_str());
+  return aside;
+}
+
+}  // namespace zelkord::sqlite

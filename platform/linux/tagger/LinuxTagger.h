@@ -1,0 +1,14 @@
+#pragma once
+
+#include "platform/api/Device.h"
+
+namespace zelkord {
+
+// Languages by CLD2. A text too short or too mixed to tell is "und".
+// Threading: any thread.
+class LinuxTagger final : public LinguisticTagger {
+ public:
+  std::string languageAtStart(const std::string& text) const override;
+};
+
+}  // namespace zelkord

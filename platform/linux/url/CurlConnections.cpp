@@ -1,0 +1,241 @@
+#include "platform/linux/url/CurlConnections.h"
+
+#include <sys/epoll.h>
+
+#include <algorithm>
+#include <utility>
+#include <variant>
+
+#include "base/Check.h"
+#include "platform/linux/url/RequestPolicy.h"
+
+namespace zelkord {
+namespace {
+
+constexpr long kMaximumIdleConnections = 32;
+constexpr std::size_t kMaximumIdleHandles = 32;
+constexpr Duration kMaximumIdleTime = 118s;
+
+}  // namespace
+
+CurlConnections::CurlConnections(IOLoop& loop, CurlSettings settings)
+    : loop_(loop), settings_(std::move(settings)) {}
+
+CurlConnections::~CurlConnections() { ZK_CHECK(!open_, "connections are closed before their end"); }
+
+void CurlConnections::begin(std::shared_ptr<CurlURLTask> task) {
+  if (closed_) return;
+  auto order = task->order();
+  if (!order) return task->finish({});
+  _open();
+  active_.push_back(_takeTransfer());
+  CurlTransfer& transfer = *active_.back();
+  transfer.place = active_.size() - 1;
+  const bool metered = settings_.isMetered();
+  transfer.setMaximumIdleTime(metered ? settings_.meteredIdleTime : kMaximumIdleTime);
+  transfer.begin(std::move(task), *std::move(order));
+  _start(transfer);
+}
+
+void CurlConnections::cancel(CurlURLTask& task) {
+  if (!task.transfer) return;
+  CurlTransfer& transfer = *task.transfer;
+  curl_multi_remove_handle(multi_, transfer.handle());
+  transfer.recordTiming(false);
+  _finish(transfer, {});
+}
+
+std::vector<std::shared_ptr<CurlURLTask>> CurlConnections::close() {
+  std::vector<std::shared_ptr<CurlURLTask>> dropped;
+  closed_ = true;
+  if (!std::exchange(open_, false)) return dropped;
+  loop_.assertCurrent();
+  while (!active_.empty()) {
+    curl_multi_remove_handle(multi_, active_.back()->handle());
+    dropped.push_back(_release(*active_.back()));
+  }
+  _closeMulti();
+  idle_.clear();
+  curl_share_cleanup(std::exchange(share_, nullptr));
+  loop_.remove(*this);
+  return dropped;
+}
+
+void CurlConnections::loopEnded() {
+  while (!active_.empty()) {
+    CurlTransfer& transfer = *active_.back();
+    curl_multi_remove_handle(multi_, transfer.handle());
+    _finish(transfer, {.error = urlError(URLErrorCode::Cancelled, "loading has ended")});
+  }
+  const auto dropped = close();
+  ZK_CHECK(dropped.empty(), "all tasks have ended");
+}
+
+void CurlConnections::_open() {
+  loop_.assertCurrent();
+  purgeDue_ = kNever;
+  if (!std::exchange(open_, true)) {
+    loop_.add(*this);
+    share_ = curl_share_init();
+    curl_share_setopt(share_, CURLSHOPT_SHARE, CURL_LOCK_DATA_SSL_SESSION);
+  }
+  if (multi_) return;
+  multi_ = curl_multi_init();
+  ZK_CHECK(multi_ && share_, "multi and share handles are made");
+  curl_multi_setopt(multi_, CURLMOPT_SOCKETFUNCTION, &CurlConnections::_onSocket);
+  curl_multi_setopt(multi_, CURLMOPT_SOCKETDATA, this);
+  curl_multi_setopt(multi_, CURLMOPT_TIMERFUNCTION, &CurlConnections::_onTimer);
+  curl_multi_setopt(multi_, CURLMOPT_TIMERDATA, this);
+  curl_multi_setopt(multi_, CURLMOPT_MAXCONNECTS, kMaximumIdleConnections);
+  curl_multi_setopt(multi_, CURLMOPT_PIPELINING,
+                    settings_.multiplexes ? CURLPIPE_MULTIPLEX : CURLPIPE_NOTHING);
+}
+
+void CurlConnections::_closeMulti() {
+  curl_multi_cleanup(std::exchange(multi_, nullptr));
+  loop_.assertCurrent();
+  loop_.unwatchAll(*this);
+  curlDue_ = overdueCheck_ = purgeDue_ = kNever;
+}
+
+std::unique_ptr<CurlTransfer> CurlConnections::_takeTransfer() {
+  if (idle_.empty()) return std::make_unique<CurlTransfer>(settings_, share_);
+  auto transfer = std::move(idle_.back());
+  idle_.pop_back();
+  return transfer;
+}
+
+void CurlConnections::_start(CurlTransfer& transfer) {
+  if (fastOpenFails_) transfer.disableFastOpen();
+  overdueCheck_ = std::min(overdueCheck_, transfer.deadline());
+  const CURLMcode code = curl_multi_add_handle(multi_, transfer.handle());
+  if (code == CURLM_OK) return;
+  _finish(transfer, {.error = urlError(URLErrorCode::Other, curl_multi_strerror(code))});
+}
+
+void CurlConnections::ready(int descriptor, unsigned events) {
+  int bits = (events & EPOLLIN ? CURL_CSELECT_IN : 0) | (events & EPOLLOUT ? CURL_CSELECT_OUT : 0);
+  if (events & (EPOLLERR | EPOLLHUP)) bits |= CURL_CSELECT_ERR;
+  int running = 0;
+  curl_multi_socket_action(multi_, descriptor, bits, &running);
+  _collectEnded();
+}
+
+SteadyTime CurlConnections::nextDue() const {
+  return std::min({curlDue_, overdueCheck_, purgeDue_});
+}
+
+void CurlConnections::runDue(SteadyTime now) {
+  if (curlDue_ <= now) {
+    curlDue_ = kNever;
+    int running = 0;
+    curl_multi_socket_action(multi_, CURL_SOCKET_TIMEOUT, 0, &running);
+    _collectEnded();
+  }
+  if (overdueCheck_ <= now) _endOverdue(now);
+  if (purgeDue_ <= now) _closeMulti();
+}
+
+void CurlConnections::_endOverdue(SteadyTime now) {
+  overdueCheck_ = kNever;
+  for (std::size_t i = active_.size(); i-- > 0;) {
+    CurlTransfer& transfer = *active_[i];
+    const SteadyTime deadline = transfer.deadline();
+    if (deadline > now) {
+      overdueCheck_ = std::min(overdueCheck_, deadline);
+      continue;
+    }
+    curl_multi_remove_handle(multi_, transfer.handle());
+    _ended(transfer, CURLE_OPERATION_TIMEDOUT);
+  }
+}
+
+void CurlConnections::_collectEnded() {
+  int left = 0;
+  while (const CURLMsg* message = curl_multi_info_read(multi_, &left)) {
+    if (message->msg != CURLMSG_DONE) continue;
+    const CURLcode code = message->data.result;
+    CurlTransfer& transfer = CurlTransfer::of(message->easy_handle);
+    curl_multi_remove_handle(multi_, message->easy_handle);
+    _ended(transfer, code);
+  }
+}
+
+void CurlConnections::_ended(CurlTransfer& transfer, CURLcode code) {
+  if (transfer.givesUpFastOpen(code)) {
+    transfer.restart(transfer.request());
+    return _start(transfer);
+  }
+  fastOpenFails_ = fastOpenFails_ || (code == CURLE_OK && transfer.hasGivenUpFastOpen());
+  URLResult result = transfer.takeResult(code);
+  transfer.recordTiming(result.response.has_value());
+  if (!result.error && isRedirect(*result.response) && _follow(transfer, result)) return;
+  _finish(transfer, std::move(result));
+}
+
+// False, with the error in the result, when the redirect is not followed.
+bool CurlConnections::_follow(CurlTransfer& transfer, URLResult& result) {
+  if (++transfer.redirects > kMaximumRedirects) {
+    result.error = urlError(URLErrorCode::TooManyRedirects, "too many redirects");
+    return false;
+  }
+  auto next = redirected(*transfer.request(), *result.response);
+  if (auto* error = std::get_if<Error>(&next)) {
+    result.error = std::move(*error);
+    return false;
+  }
+  const auto& accepts = transfer.request()->acceptsRedirect;
+  if (accepts && !accepts(std::get<URLRequest>(next).url)) {
+    result.error = urlError(URLErrorCode::UnsupportedURL, "redirect not accepted");
+    return false;
+  }
+  auto request = std::make_shared<const URLRequest>(std::move(std::get<URLRequest>(next)));
+  transfer.task().setRequest(request);
+  transfer.restart(std::move(request));
+  _start(transfer);
+  return true;
+}
+
+void CurlConnections::_finish(CurlTransfer& transfer, URLResult result) {
+  TimingData timing = transfer.timing();
+  auto information = transfer.connectionInformation();
+  const auto task = _release(transfer);
+  task->finish(std::move(result), std::move(timing), std::move(information));
+}
+
+// Takes the transfer, which the multi handle has no more, off the active ones.
+std::shared_ptr<CurlURLTask> CurlConnections::_release(CurlTransfer& transfer) {
+  auto task = transfer.endTask();
+  const std::size_t place = transfer.place;
+  std::swap(active_[place], active_.back());
+  active_[place]->place = place;
+  if (idle_.size() < kMaximumIdleHandles) idle_.push_back(std::move(active_.back()));
+  active_.pop_back();
+  if (active_.empty()) {
+    overdueCheck_ = kNever;
+    if (settings_.isMetered()) purgeDue_ = IOLoop::now() + settings_.meteredIdleTime;
+  }
+  return task;
+}
+
+int CurlConnections::_onSocket(CURL*, curl_socket_t socket, int what, void* self, void*) {
+  auto& connections = *static_cast<CurlConnections*>(self);
+  connections.loop_.assertCurrent();
+  if (what == CURL_POLL_REMOVE) {
+    connections.loop_.unwatch(socket);
+    return 0;
+  }
+  const std::uint32_t events =
+      (what & CURL_POLL_IN ? EPOLLIN : 0u) | (what & CURL_POLL_OUT ? EPOLLOUT : 0u);
+  connections.loop_.watch(socket, events, connections);
+  return 0;
+}
+
+int CurlConnections::_onTimer(CURLM*, long milliseconds, void* self) {
+  auto& connections = *static_cast<CurlConnections*>(self);
+  connections.curlDue_ =
+      milliseconds < 0 ? kNever : IOLoop::now() + std::chrono::milliseconds(milliseconds);
+  return 0;
+}
+
+}  // namespace zelkord

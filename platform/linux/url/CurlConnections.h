@@ -1,0 +1,75 @@
+#pragma once
+
+#include <curl/curl.h>
+
+#include <cstddef>
+#include <memory>
+#include <vector>
+
+#include "platform/linux/url/CurlSettings.h"
+#include "platform/linux/url/CurlTransfer.h"
+#include "platform/linux/url/CurlURLTask.h"
+#include "platform/linux/url/IOLoop.h"
+#include "platform/linux/url/IOLoopClient.h"
+
+namespace zelkord {
+
+// A session's connections: the multi handle with the transfers under way, easy handles to use
+// again, and the TLS sessions to resume.
+//
+// States: unused; open (from the first task; on a metered network the multi handle, and with it the
+// connections, goes when it has been idle for a while, and comes back with the next task); closed.
+//
+// Threading: the I/O thread; made and, once closed, destroyed on any.
+// Ownership: holds the tasks under way.
+class CurlConnections final : public IOLoopClient {
+ public:
+  CurlConnections(IOLoop& loop, CurlSettings settings);
+  ~CurlConnections() override;
+  CurlConnections(const CurlConnections&) = delete;
+  CurlConnections& operator=(const CurlConnections&) = delete;
+
+  void begin(std::shared_ptr<CurlURLTask> task);
+  void cancel(CurlURLTask& task);
+  // Gives up the tasks under way; the caller drops them.
+  std::vector<std::shared_ptr<CurlURLTask>> close();
+
+  // IOLoopClient
+  void ready(int descriptor, unsigned events) override;
+  SteadyTime nextDue() const override;
+  void runDue(SteadyTime now) override;
+  void loopEnded() override;
+
+ private:
+  void _open();
+  void _closeMulti();
+  std::unique_ptr<CurlTransfer> _takeTransfer();
+  void _start(CurlTransfer& transfer);
+  void _collectEnded();
+  void _ended(CurlTransfer& transfer, CURLcode code);
+  bool _follow(CurlTransfer& transfer, URLResult& result);
+  void _finish(CurlTransfer& transfer, URLResult result);
+  std::shared_ptr<CurlURLTask> _release(CurlTransfer& transfer);
+  void _endOverdue(SteadyTime now);
+
+  static int _onSocket(CURL*, curl_socket_t socket, int what, void* self, void*);
+  static int _onTimer(CURLM*, long milliseconds, void* self);
+
+  // Fixed after construction.
+  IOLoop& loop_;
+  const CurlSettings settings_;
+
+  // The I/O thread.
+  bool open_ = false;
+  bool closed_ = false;
+  CURLSH* share_ = nullptr;
+  CURLM* multi_ = nullptr;
+  std::vector<std::unique_ptr<CurlTransfer>> active_;
+  std::vector<std::unique_ptr<CurlTransfer>> idle_;
+  bool fastOpenFails_ = false;
+  SteadyTime curlDue_ = kNever;
+  SteadyTime overdueCheck_ = kNever;  // no transfer is overdue before
+  SteadyTime purgeDue_ = kNever;
+};
+
+}  // namespace zelkord

@@ -1,0 +1,48 @@
+#include "platform/linux/url/CurlURLSessions.h"
+
+#include <curl/curl.h>
+
+#include <cstdlib>
+#include <fstream>
+#include <utility>
+
+#include "base/Check.h"
+#include "platform/linux/url/CurlURLSession.h"
+
+namespace zelkord {
+namespace {
+
+// Bit 0 of the kernel's setting: clients may use fast open.
+bool readFastOpenOfKernel() {
+  std::ifstream file("/proc/sys/net/ipv4/tcp_fastopen");
+  unsigned bits = 0;
+  return (file >> bits) && (bits & 1) != 0;
+}
+
+}  // namespace
+
+CurlURLSessions::CurlURLSessions(WorkQueues& queues, Services services)
+    : queues_(queues), services_(std::move(services)), kernelHasFastOpen_(readFastOpenOfKernel()) {
+  ZK_CHECK(curl_global_init(CURL_GLOBAL_DEFAULT) == CURLE_OK, "libcurl initialises");
+}
+
+CurlURLSessions::~CurlURLSessions() { loop_->stop(); }
+
+std::shared_ptr<URLSession> CurlURLSessions::make(const URLSessionConfiguration& configuration) {
+  CurlSettings settings{.rootsFile = services_.rootsFile,
+                        .multiplexes = configuration.pipelining,
+                        .fastOpen = kernelHasFastOpen_ && configuration.tcpFastOpen.value_or(false),
+                        .tlsSessionTickets = configuration.tlsSessionTickets,
+                        .meteredIdleTime = configuration.cellularPurgeTimeout,
+                        .isMetered = services_.isMetered};
+  return std::make_shared<CurlURLSession>(
+      CurlURLSession::Services{loop_, services_.maximumResponseSize, services_.proxies},
+      std::move(settings), queues_.makeSerialQueue("url." + configuration.name));
+}
+
+std::string CurlURLSessions::rootsFileOfEnvironment() {
+  const char* file = std::getenv("SSL_CERT_FILE");
+  return file ? file : "";
+}
+
+}  // namespace zelkord

@@ -1,0 +1,12 @@
+#pragma once
+
+#include "platform/api/URLRequest.h"
+#include "platform/linux/files/Descriptor.h"
+
+namespace zelkord {
+
+// Turns the body of a result into a file that exists as long as the descriptor, and that no crash
+// leaves behind. On failure the result has an error and no body.
+Descriptor moveBodyToFile(URLResult& result);
+
+}  // namespace zelkord

@@ -1,0 +1,163 @@
+#include "platform/linux/watch/PathWatcher.h"
+
+#include <poll.h>
+#include <sys/eventfd.h>
+#include <sys/inotify.h>
+
+#include <cerrno>
+#include <cstring>
+#include <map>
+#include <set>
+#include <thread>
+#include <vector>
+
+#include "base/Mutex.h"
+#include "platform/linux/files/Descriptor.h"
+#include "platform/linux/watch/WatchPlan.h"
+
+namespace zelkord {
+
+// What the thread and the subscriptions share.
+//
+// Each watched path has places: inotify watches on itself, on its directory, and on what stands
+// above it. An event in one of them makes the plan anew, since directories may have come or gone,
+// and runs the handler.
+class PathWatcher::Loop final {
+ public:
+  explicit Loop(LogSink& log)
+      : log_(log, ""),
+        inotify_(::inotify_init1(IN_NONBLOCK | IN_CLOEXEC)),
+        stop_(::eventfd(0, EFD_CLOEXEC)) {
+    if (!inotify_) log_.error("files are not watched: {}", std::strerror(errno));
+  }
+
+  void start() {
+    if (inotify_ && stop_) thread_ = std::thread([this] { run(); });
+  }
+
+  void stop() {
+    const std::uint64_t one = 1;
+    if (stop_ && ::write(stop_.get(), &one, sizeof one) < 0) return;
+    if (thread_.joinable()) thread_.join();
+  }
+
+  int add(const std::string& path, std::function<void()> handler) {
+    const MutexLock lock(mutex_);
+    const int id = nextId_++;
+    auto& entry = entries_[id];
+    entry.path = path;
+    entry.handler = std::make_shared<const std::function<void()>>(std::move(handler));
+    place(id, entry);
+    return id;
+  }
+
+  void remove(int id) {
+    forget(id);
+    // Whoever cancels may go now: a handler that was already taken has ended.
+    if (std::this_thread::get_id() == thread_.get_id()) return;
+    const MutexLock turn(handling_);
+  }
+
+ private:
+  void forget(int id) {
+    const MutexLock lock(mutex_);
+    entries_.erase(id);
+    for (auto place = places_.begin(); place != places_.end();) {
+      place->second.forget(id);
+      if (!place->second.names.empty()) {
+        ++place;
+        continue;
+      }
+      ::inotify_rm_watch(inotify_.get(), place->first);
+      place = places_.erase(place);
+    }
+  }
+
+  using Handler = std::shared_ptr<const std::function<void()>>;
+  struct Entry {
+    std::string path;
+    Handler handler;
+  };
+  // Who is interested in a watch, and in which name there; "" is every name.
+  struct Place {
+    std::set<std::pair<int, std::string>> names;
+    void forget(int id) {
+      std::erase_if(names, [id](const auto& name) { return name.first == id; });
+    }
+  };
+
+  void place(int id, const Entry& entry) ZK_REQUIRES(mutex_) {
+    for (const auto& spot : watchPlan(entry.path)) {
+      const int watch = ::inotify_add_watch(inotify_.get(), spot.path.c_str(), kWatchedEvents);
+      if (watch >= 0) places_[watch].names.emplace(id, spot.name);
+    }
+  }
+
+  void run() {
+    pollfd polled[] = {{inotify_.get(), POLLIN, 0}, {stop_.get(), POLLIN, 0}};
+    while (true) {
+      const int ready = ::poll(polled, 2, -1);
+      if (ready < 0 && errno == EINTR) continue;
+      if (ready < 0 || polled[1].revents) return;
+      const MutexLock turn(handling_);
+      for (const auto& handler : takeChanged()) (*handler)();
+    }
+  }
+
+  std::vector<Handler> takeChanged() {
+    alignas(inotify_event) char buffer[16 * 1024];
+    std::vector<Handler> handlers;
+    const MutexLock lock(mutex_);
+    std::set<int> changed;
+    for (ssize_t size; (size = ::read(inotify_.get(), buffer, sizeof buffer)) > 0;) {
+      for (const char* at = buffer; at < buffer + size;) {
+        inotify_event event;
+        std::memcpy(&event, at, sizeof event);
+        note(event, event.len > 0 ? at + sizeof event : "", changed);
+        at += sizeof event + event.len;
+      }
+    }
+    for (const int id : changed) {
+      place(id, entries_.at(id));
+      handlers.push_back(entries_.at(id).handler);
+    }
+    return handlers;
+  }
+
+  void note(const inotify_event& event, std::string_view name, std::set<int>& changed)
+      ZK_REQUIRES(mutex_) {
+    if (event.mask & IN_Q_OVERFLOW) {
+      for (const auto& entry : entries_) changed.insert(entry.first);
+    }
+    const auto place = places_.find(event.wd);
+    if (place == places_.end()) return;
+    for (const auto& [id, wanted] : place->second.names) {
+      if (wanted.empty() || name.empty() || wanted == name) changed.insert(id);
+    }
+    if (event.mask & IN_IGNORED)
+      places_.erase(place);  // the kernel dropped it; its number is not used again
+  }
+
+  const Logger log_;
+  const Descriptor inotify_;
+  const Descriptor stop_;
+  Mutex handling_;  // held while handlers run; before mutex_
+  Mutex mutex_;
+  int nextId_ ZK_GUARDED_BY(mutex_) = 1;
+  std::map<int, Entry> entries_ ZK_GUARDED_BY(mutex_);
+  std::map<int, Place> places_ ZK_GUARDED_BY(mutex_);  // by inotify watch
+  std::thread thread_;
+};
+
+PathWatcher::PathWatcher(LogSink& log) : loop_(std::make_shared<Loop>(log)) { loop_->start(); }
+
+PathWatcher::~PathWatcher() { loop_->stop(); }
+
+Subscription PathWatcher::watch(const std::string& path, std::function<void()> handler) {
+  const int id = loop_->add(path, std::move(handler));
+  return Subscription([weak = std::weak_ptr(loop_), id] {
+    if (const auto loop = weak.lock()) loop->remove(id);
+  });
+}
+
+}  // namespace zelkord

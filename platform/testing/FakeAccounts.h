@@ -1,0 +1,14 @@
+#pragma once
+
+#include "platform/api/Device.h"
+
+namespace zelkord {
+
+class FakeAccounts final : public AccountService {
+ public:
+  bool managed = false;
+
+  bool primaryAccountIsManaged() const override { return managed; }
+};
+
+}  // namespace zelkord

@@ -1,0 +1,33 @@
+#pragma once
+
+#include <map>
+#include <string>
+
+#include "base/Mutex.h"
+#include "platform/api/URLCache.h"
+
+namespace zelkord {
+
+// Keeps by URL what is stored, and nothing by itself. Threading: any thread.
+class FakeURLCache final : public URLCache {
+ public:
+  std::optional<CachedResponse> lookup(const URLRequest& request) override {
+    const MutexLock lock(mutex_);
+    const auto found = kept_.find(request.url);
+    return found == kept_.end() ? std::nullopt : std::optional(found->second);
+  }
+  void store(const URLRequest& request, CachedResponse response) override {
+    const MutexLock lock(mutex_);
+    kept_[request.url] = std::move(response);
+  }
+  std::size_t count() const {
+    const MutexLock lock(mutex_);
+    return kept_.size();
+  }
+
+ private:
+  mutable Mutex mutex_;
+  std::map<std::string, CachedResponse> kept_ ZK_GUARDED_BY(mutex_);
+};
+
+}  // namespace zelkord

@@ -1,0 +1,40 @@
+#pragma once
+
+#include "platform/api/Platform.h"
+
+namespace zelkord {
+
+// The platform with another clock and other queues, and sessions that run on those: for stress
+// tests and benchmarks of components on real threads. The references stay the caller's.
+inline Platform onQueues(const Platform& base, Clock& clock, WorkQueues& queues,
+                         URLSessions& sessions, ProcessTransactions& transactions) {
+  return {.clock = clock,
+          .queues = queues,
+          .log = base.log,
+          .settings = base.settings,
+          .files = base.files,
+          .notificationCenter = base.notificationCenter,
+          .systemNotifications = base.systemNotifications,
+          .transactions = transactions,
+          .counters = base.counters,
+          .trace = base.trace,
+          .signals = base.signals,
+          .process = base.process,
+          .launchEvents = base.launchEvents,
+          .propertyLists = base.propertyLists,
+          .urlSessions = sessions,
+          .interprocess = base.interprocess,
+          .device = base.device,
+          .locale = base.locale,
+          .maps = base.maps,
+          .accounts = base.accounts,
+          .management = base.management,
+          .location = base.location,
+          .networkProxy = base.networkProxy,
+          .tagger = base.tagger,
+          .textInput = base.textInput,
+          .random = base.random,
+          .memoryPressure = base.memoryPressure};
+}
+
+}  // namespace zelkord

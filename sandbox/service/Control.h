@@ -1,0 +1,39 @@
+#pragma once
+
+#include "sandbox/http/Message.h"
+#include "sandbox/search/AnswerCache.h"
+#include "sandbox/service/Bag.h"
+#include "sandbox/service/Misbehaviour.h"
+#include "sandbox/service/RequestLog.h"
+#include "sandbox/service/UploadStore.h"
+
+namespace sandbox {
+
+// The requests under /control/, by which tests and people steer this service and see what it
+// received.
+//
+// Threading: any thread. Ownership: borrows what it steers. Errors: a 400 with {"error"} says what
+// was wrong.
+class Control final {
+ public:
+  Control(Bag& bag, Misbehaviours& misbehaviours, RequestLog& log, UploadStore& uploads)
+      : bag_(bag), misbehaviours_(misbehaviours), log_(log), uploads_(uploads) {}
+
+  // `request.path` begins with "/control/".
+  Reply answer(const Request& request);
+
+ private:
+  Reply requests(const Request& request);
+  Reply uploads(const Request& request);
+  Reply misbehave(const Request& request);
+  Reply behave();
+  Reply patchBag(const Request& request);
+  Reply reset();
+
+  Bag& bag_;
+  Misbehaviours& misbehaviours_;
+  RequestLog& log_;
+  UploadStore& uploads_;
+};
+
+}  // namespace sandbox

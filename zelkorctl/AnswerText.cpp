@@ -1,0 +1,153 @@
+#include "zelkorctl/AnswerText.h"
+
+#include <fmt/format.h>
+
+#include <algorithm>
+#include <array>
+#include <utility>
+
+#include "zelkorctl/Printable.h"
+
+namespace zelkorctl {
+namespace {
+
+constexpr std::size_t kLongestTitle = 40;
+constexpr std::size_t kLongestType = 16;
+
+struct Row {
+  std::string title;
+  std::string type;
+  std::string description;
+};
+
+std::string memberText(const json::object& object, std::string_view key) {
+  return printable(stringIn(object, key).value_or(""));
+}
+
+void appendRows(const json::object& set, std::size_t limit, std::vector<Row>& rows) {
+  const auto* results = arrayIn(set, "results");
+  if (!results) return;
+  for (const auto& result : *results) {
+    if (rows.size() >= limit) return;
+    const auto* object = result.if_object();
+    if (!object) continue;
+    rows.push_back({memberText(*object, "title"), memberText(*object, "type"),
+                    memberText(*object, "description")});
+  }
+}
+
+// The width of the longest text in a column, up to `most`.
+std::size_t columnWidth(const std::vector<Row>& rows, std::string Row::*column, std::size_t most) {
+  std::size_t width = 0;
+  for (const auto& row : rows) width = std::max(width, displayWidth(row.*column));
+  return std::min(width, most);
+}
+
+std::string trimmed(std::string line) {
+  line.erase(line.find_last_not_of(' ') + 1);
+  return line;
+}
+
+std::vector<std::string> rowLines(const std::vector<Row>& rows, std::size_t width) {
+  const auto titles = columnWidth(rows, &Row::title, std::min(kLongestTitle, width / 2));
+  const auto types = columnWidth(rows, &Row::type, kLongestType);
+  std::vector<std::string> lines;
+  for (const auto& row : rows) {
+    const auto line =
+        "  " + padded(row.title, titles) + "  " + padded(row.type, types) + "  " + row.description;
+    lines.push_back(fitted(trimmed(line), width));
+  }
+  return lines;
+}
+
+json::value headersJson(const HeaderFields& headers) {
+  json::object object;
+  for (const auto& [name, value] : headers) object[name] = value;
+  return object;
+}
+
+json::object replyJson(const ZLKReply& reply) {
+  json::object object{{"scale", reply.scale}};
+  if (auto data = parseJson(reply.data.view())) {
+    object["data"] = std::move(*data);
+  } else {
+    object["text"] = printable(reply.data.view());  // not JSON
+  }
+  if (reply.geoSessionEntityString)
+    object["geoSessionEntityString"] = *reply.geoSessionEntityString;
+  if (const auto& request = reply.httpRequest) {
+    object["httpRequest"] = {{"url", request->url}, {"headers", headersJson(request->headers)}};
+  }
+  if (const auto& response = reply.httpResponse) {
+    object["httpResponse"] = {{"url", response->url},
+                              {"status", response->status},
+                              {"headers", headersJson(response->headers)}};
+  }
+  return object;
+}
+
+void appendHeaders(const HeaderFields& headers, std::vector<std::string>& lines) {
+  for (const auto& [name, value] : headers) {
+    lines.push_back("  " + printable(name) + ": " + printable(value));
+  }
+}
+
+}  // namespace
+
+std::vector<std::string> resultLines(std::string_view data, std::size_t limit, std::size_t width) {
+  const auto parsed = parseJson(data);
+  const auto* sets = parsed ? parsed->if_array() : nullptr;
+  if (!sets) return {fmt::format("  ({} bytes that are no list of result sets)", data.size())};
+  std::vector<Row> rows;
+  for (const auto& set : *sets) {
+    if (const auto* object = set.if_object()) appendRows(*object, limit, rows);
+  }
+  return rowLines(rows, width);
+}
+
+std::string outcomeLine(const Outcome& outcome, std::size_t width) {
+  constexpr std::size_t kTextColumn = 24;
+  auto line = padded("\"" + printable(outcome.text) + "\"", std::min(kTextColumn, width / 3)) +
+              "  " + padded(nameOf(outcome.kind), 8) +
+              fmt::format(" {:9.1f} ms", outcome.milliseconds);
+  if (outcome.answer.reply) line += fmt::format(" {:8} bytes", outcome.answer.reply->data.size());
+  if (outcome.answer.error) line += "  " + errorText(*outcome.answer.error);
+  return fitted(line, width);
+}
+
+std::vector<std::string> exchangeLines(const ZLKReply& reply) {
+  std::vector<std::string> lines;
+  if (const auto& request = reply.httpRequest) {
+    lines.push_back("request " + printable(request->url));
+    appendHeaders(request->headers, lines);
+  }
+  if (const auto& response = reply.httpResponse) {
+    lines.push_back(fmt::format("response {} {}", response->status, printable(response->url)));
+    appendHeaders(response->headers, lines);
+  }
+  return lines;
+}
+
+json::object outcomeJson(const Outcome& outcome) {
+  json::object object{{"queryId", outcome.answer.queryId},
+                      {"query", outcome.text},
+                      {"outcome", nameOf(outcome.kind)},
+                      {"milliseconds", outcome.milliseconds}};
+  if (outcome.answer.reply) object["reply"] = replyJson(*outcome.answer.reply);
+  if (outcome.answer.error) object["error"] = errorJson(*outcome.answer.error);
+  return object;
+}
+
+json::value errorJson(const Error& error) {
+  json::object object{{"domain", error.domain}, {"code", error.code}};
+  if (const auto reason = error.reason()) object["reason"] = *reason;
+  return object;
+}
+
+std::string errorText(const Error& error) {
+  const auto origin = fmt::format("{} {}", printable(error.domain), error.code);
+  const auto reason = error.reason();
+  return reason ? printable(*reason) + " (" + origin + ")" : origin;
+}
+
+}  // namespace zelkorctl

@@ -1,0 +1,31 @@
+#pragma once
+
+#include <cstddef>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "base/Json.h"
+#include "zelkorctl/QueryRun.h"
+
+namespace zelkorctl {
+
+// The best results of a service response, one line each, at most `limit` in all and `width` columns
+// wide: title, type and description under each other. What is not a list of result sets is said in
+// one line. Nothing in the lines can steer a terminal.
+std::vector<std::string> resultLines(std::string_view data, std::size_t limit, std::size_t width);
+
+// The query, what became of it and how long it took.
+std::string outcomeLine(const Outcome& outcome, std::size_t width);
+
+// For a verbose reply: the request that went out and the response's head.
+std::vector<std::string> exchangeLines(const ZLKReply& reply);
+
+// Everything about an outcome. The service's response is embedded as JSON when it is JSON.
+json::object outcomeJson(const Outcome& outcome);
+
+json::value errorJson(const Error& error);
+// "reason (domain code)", printable.
+std::string errorText(const Error& error);
+
+}  // namespace zelkorctl

@@ -1,0 +1,130 @@
+#include "zelkorctl/Help.h"
+
+namespace zelkorctl {
+namespace {
+
+constexpr std::string_view kOverview = R"(usage: zelkorctl COMMAND [OPTION...]
+
+Asks and inspects zelkord, the broker of search suggestions.
+
+Commands:
+  search TEXT...   send a query and show its results
+  type             search while you type
+  bag              show the configuration document
+  defaults         read and write settings
+  sessions         list the clients that the daemon knows
+  metrics          show the daemon's counters
+  status           show the daemon's state
+  version          show this tool's version
+  help [COMMAND]   this text, or a command's
+
+Options of every command:
+  --json               machine-readable output
+  --client IDENTIFIER  speak as this client (default: lanthe)
+  --user-agent TEXT    with this user agent (default: zelkorctl/1.0)
+  --address ADDRESS    D-Bus address of the daemon's private door
+  --socket PATH        the same, as a socket's path
+  --timeout SECONDS    for every call (default: 60)
+  --verbose            say more, on standard error
+  --help               the command's help
+
+Without --address and --socket the session bus is asked, which starts the daemon when needed;
+without a session bus the socket in the runtime directory is used.
+
+Exit status: 0 answered, 1 an error came back, 2 wrong usage, 3 the daemon cannot be reached.
+)";
+
+constexpr std::string_view kSearch = R"(usage: zelkorctl search [OPTION...] TEXT...
+
+Sends TEXT as a query and shows the best results. Words are joined by a space.
+
+  --kind KIND          search (default), zeroKeyword, moreResults, card, lookup, flightLookup
+                       or flightSearch
+  --url URL            where further results or a card are fetched from (default: the bag's)
+  --item NAME=VALUE    add a query item; may be repeated
+  --count N            send the query N times, one after the other
+  --limit N            show at most N results of an answer (default: 5)
+  --as-typed           send every prefix of TEXT as a keystroke; tell which were answered,
+                       stale or dropped, and how long each took
+  --delay-per-key MS   between two keystrokes (default: 120)
+  --verbose            also show the request that went to the service and its response
+)";
+
+constexpr std::string_view kType = R"(usage: zelkorctl type [OPTION...]
+
+Searches on every keystroke and shows the results under the line, with how long the answer took.
+Backspace deletes, Ctrl-U clears, Enter starts afresh, Ctrl-C or Ctrl-D ends.
+
+When standard input is no terminal, each of its characters is a keystroke and each line a query;
+every answer is one line.
+
+  --item NAME=VALUE    add a query item; may be repeated
+  --limit N            show at most N results (default: 5)
+  --delay-per-key MS   between two keystrokes of such input (default: 120)
+)";
+
+constexpr std::string_view kDefaults = R"(usage: zelkorctl defaults read KEY [--domain DOMAIN]
+       zelkorctl defaults write KEY JSON [--domain DOMAIN]
+       zelkorctl defaults delete KEY [--domain DOMAIN]
+       zelkorctl defaults list [--domain DOMAIN]
+
+Reads and writes settings. Values are JSON; a text has its quotes. The daemon is asked; when none
+runs and none can be started, the user's store is opened instead.
+
+`list` shows all settings that have a value; from the store alone, those that were written.
+
+  --domain DOMAIN      instead of the daemon's own settings
+)";
+
+constexpr std::string_view kBag = R"(usage: zelkorctl bag [OPTION...]
+
+Shows the configuration document that the service gave, as the client sees it.
+)";
+
+constexpr std::string_view kSessions = R"(usage: zelkorctl sessions [OPTION...]
+
+Lists the clients that the daemon knows, with their user agents.
+)";
+
+constexpr std::string_view kMetrics = R"(usage: zelkorctl metrics [OPTION...]
+
+Shows the daemon's counters, cumulative over its restarts.
+)";
+
+constexpr std::string_view kStatus = R"(usage: zelkorctl status [OPTION...]
+
+Shows what the daemon says of itself.
+)";
+
+constexpr std::string_view kVersion = R"(usage: zelkorctl version
+
+Shows this tool's version.
+)";
+
+}  // namespace
+
+std::string_view helpText(Command command) {
+  switch (command) {
+    case Command::Search:
+      return kSearch;
+    case Command::Type:
+      return kType;
+    case Command::Bag:
+      return kBag;
+    case Command::Defaults:
+      return kDefaults;
+    case Command::Sessions:
+      return kSessions;
+    case Command::Metrics:
+      return kMetrics;
+    case Command::Status:
+      return kStatus;
+    case Command::Version:
+      return kVersion;
+    case Command::Help:
+      break;
+  }
+  return kOverview;
+}
+
+}  // namespace zelkorctl

@@ -1,0 +1,20 @@
+#pragma once
+
+#include <cstddef>
+#include <ostream>
+
+namespace zelkorctl {
+
+// Where the tool reads and writes.
+struct Surroundings {
+  std::ostream& out;
+  std::ostream& err;
+  int input = 0;  // file descriptor
+  bool inputIsTerminal = false;
+  bool outputIsTerminal = false;
+  std::size_t columns = 100;  // of the output
+};
+
+enum ExitStatus { kAnswered = 0, kErrorReply = 1, kWrongUsage = 2, kNotReachable = 3 };
+
+}  // namespace zelkorctl

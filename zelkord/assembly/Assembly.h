@@ -1,0 +1,115 @@
+#pragma once
+
+#include <atomic>
+#include <memory>
+
+#include "platform/api/Platform.h"
+#include "zelkord/ZelkorLogging/Tracing.h"
+#include "zelkord/ZelkorLogging/ZelkorLogging.h"
+#include "zelkord/assembly/ServiceSessions.h"
+#include "zelkord/assembly/ZelkorDiagnosticDataReporter.h"
+
+namespace zelkord {
+
+class ClientStateManager;
+class FeedbackSessions;
+class SessionManager;
+class UserGUIDSource;
+class ZLKNetworkRequestFactory;
+class ZelkorBagController;
+
+// The daemon's object graph: every long-lived service, and the way in which they find each other.
+// Built once, in the order that `Daemon` gives; an accessor answers null before its service has
+// been made.
+//
+// Threading: setters on the thread that builds the graph; everything else on any thread.
+// Ownership: owns every service for its own life. The platform outlives it.
+class Assembly final {
+ public:
+  explicit Assembly(Platform& platform)
+      : platform_(platform),
+        logging_(platform.log),
+        tracing_(ZLKTracingSetup(platform.settings, platform.trace, logging_.defaultLog())),
+        reporter_(platform.counters),
+        sessions_(platform.urlSessions, platform.settings) {}
+
+  Platform& platform() const { return platform_; }
+  SettingsStore& userDefaults() const { return platform_.settings; }
+  FileManager& fileManager() const { return platform_.files; }
+  NotificationCenter& notificationCenter() const { return platform_.notificationCenter; }
+  const Logger& log(Category category) const { return logging_[category]; }
+  const Logger& defaultLog() const { return logging_.defaultLog(); }
+  const Tracing& tracing() const { return tracing_; }
+  const ZelkorDiagnosticDataReporter& reporter() const { return reporter_; }
+
+  URLSession& urlSession() { return sessions_.urlSession(); }
+  URLSession& bagSession() { return sessions_.bagSession(); }
+
+  ZLKNetworkRequestFactory* requestFactory() const { return requestFactory_.get(); }
+  ZelkorBagController* bagController() const { return bagController_.get(); }
+  ClientStateManager* clientStateManager() const { return clientStateManager_.get(); }
+  UserGUIDSource* guidController() const { return guidController_.get(); }
+  SessionManager* clientSessionManager() const { return clientSessionManager_.get(); }
+  FeedbackSessions* feedbackSessions() const { return feedbackSessions_.get(); }
+
+  void setRequestFactory(std::shared_ptr<ZLKNetworkRequestFactory> factory) {
+    requestFactory_.set(std::move(factory));
+  }
+  void setBagController(std::shared_ptr<ZelkorBagController> controller) {
+    bagController_.set(std::move(controller));
+  }
+  void setClientStateManager(std::shared_ptr<ClientStateManager> manager) {
+    clientStateManager_.set(std::move(manager));
+  }
+  void setGuidController(std::shared_ptr<UserGUIDSource> controller) {
+    guidController_.set(std::move(controller));
+  }
+  void setClientSessionManager(std::shared_ptr<SessionManager> manager) {
+    clientSessionManager_.set(std::move(manager));
+  }
+  void setFeedbackSessions(std::shared_ptr<FeedbackSessions> sessions) {
+    feedbackSessions_.set(std::move(sessions));
+  }
+
+  // One feedback session shared by all clients; "ZLKSharedSession" as it was when the service
+  // began.
+  bool sharedSession() const { return sharedSession_; }
+  void setSharedSession(bool shared) { sharedSession_ = shared; }
+  bool diskBagCacheEnabled() const { return diskBagCacheEnabled_; }
+  // For tests; always on in the daemon.
+  void disableDiskBagCache() { diskBagCacheEnabled_ = false; }
+  // The setting "ZLKUseMorvane", read on every call.
+  bool useMorvane() const { return boolSetting(platform_.settings, "ZLKUseMorvane"); }
+
+ private:
+  template <typename Service>
+  class Slot {
+   public:
+    Service* get() const { return published_.load(std::memory_order_acquire); }
+    void set(std::shared_ptr<Service> service) {
+      owner_ = std::move(service);
+      published_.store(owner_.get(), std::memory_order_release);
+    }
+
+   private:
+    std::shared_ptr<Service> owner_;
+    std::atomic<Service*> published_ = nullptr;
+  };
+
+  Platform& platform_;
+  const ZelkorLogging logging_;
+  const Tracing tracing_;
+  const ZelkorDiagnosticDataReporter reporter_;
+  ServiceSessions sessions_;
+  // In the order in which they are made; released in the reverse one.
+  Slot<FeedbackSessions> feedbackSessions_;
+  Slot<ZLKNetworkRequestFactory> requestFactory_;
+  Slot<ZelkorBagController> bagController_;
+  Slot<ClientStateManager> clientStateManager_;
+  Slot<UserGUIDSource> guidController_;
+  Slot<SessionManager> clientSessionManager_;
+  std::atomic<bool> sharedSession_ = true;
+  std::atomic<bool> diskBagCacheEnabled_ = true;
+};
+
+}  // namespace zelkord

@@ -1,0 +1,208 @@
+#include "zelkord/core/ClientConnection.h"
+
+#include <array>
+
+#include "base/UUID.h"
+#include "corezelkor/Constants.h"
+#include "zelkord/assembly/Assembly.h"
+#include "zelkord/core/ClientStateManager.h"
+#include "zelkord/core/ErrorFeedback.h"
+#include "zelkord/feedback/SessionManager.h"
+#include "zelkord/network/UserAgent.h"
+#include "zelkord/query/ErrorCodes.h"
+
+namespace zelkord {
+namespace {
+
+std::string newUuid(RandomSource& random) {
+  std::array<std::uint8_t, 16> bytes{};
+  random.fill(bytes.data(), bytes.size());
+  return UUID::fromRandomBytes(bytes).string();
+}
+
+}  // namespace
+
+ClientConnection::ClientConnection(Assembly& assembly, std::shared_ptr<ipc::Connection> connection,
+                                   OtherCalls otherCalls)
+    : assembly_(assembly),
+      clientStateManager_(*assembly.clientStateManager()),
+      connection_(std::move(connection)),
+      otherCalls_(std::move(otherCalls)),
+      bagTeller_(std::make_shared<BagTeller>(assembly, connection_)),
+      transaction_(assembly.platform().transactions.open("clientConnection")) {}
+
+ClientConnection::~ClientConnection() = default;
+
+void ClientConnection::start() {
+  timer_ =
+      IdleTimer::make(assembly_.platform().queues,
+                      [&assembly = assembly_, weak = std::weak_ptr<ipc::Connection>(connection_)] {
+                        const auto connection = weak.lock();
+                        if (!connection) return;
+                        assembly.log(Category::Connection).debug("timing out idle xpc connection");
+                        connection->invalidate();
+                      });
+}
+
+void ClientConnection::invalidated() {
+  timer_->cancel();
+  bagTeller_->end();
+}
+
+void ClientConnection::handle(ipc::Call call) {
+  timer_->rearm();
+  if (call.interface == kDaemonInterface) {
+    _handleDaemonCall(call);
+  } else if (otherCalls_) {
+    otherCalls_->handle(std::move(call));
+  }
+}
+
+void ClientConnection::_handleDaemonCall(const ipc::Call& call) {
+  if (call.member == "Configure") return _handleConfigure(call);
+  if (call.member == "Bag") return bag(call.reply);
+  if (call.member == "Request") return _handleRequest(call);
+  if (call.member == "ListSessions") return listSessions(call.reply);
+}
+
+void ClientConnection::_handleConfigure(const ipc::Call& call) {
+  auto decoded = decodeConfiguration(*call.arguments.at(0).get<ipc::Dictionary>());
+  if (const auto* fault = std::get_if<WireFault>(&decoded)) return _refuse(call, *fault);
+  configure(std::get<ZLKSessionConfiguration>(std::move(decoded)), call);
+}
+
+void ClientConnection::_handleRequest(const ipc::Call& call) {
+  auto decoded = decodeRequest(*call.arguments.at(0).get<std::string>(),
+                               *call.arguments.at(1).get<ipc::Dictionary>());
+  if (const auto* fault = std::get_if<WireFault>(&decoded)) return _refuse(call, *fault);
+  request(std::get<MutableRequest>(std::move(decoded)), call.reply);
+}
+
+void ClientConnection::_refuse(const ipc::Call& call, const WireFault& fault) {
+  assembly_.log(Category::Connection)
+      .error("(pid:{}) {} refused: {}", peer().pid, call.member, fault.text);
+  call.reply->fail(fault.errorName, fault.text);
+}
+
+void ClientConnection::configure(ZLKSessionConfiguration configuration, const ipc::Call& call) {
+  assembly_.log(Category::Connection)
+      .notice("client configuration {}", configuration.description());
+  configuration_.set(std::move(configuration));
+  _ensureState();
+  const auto state = state_.get();
+  if (!state) return _refuseConfiguration();
+  state->adoptUserAgent(userAgent_.get());
+  call.reply->send({clientStateManager_.endpoint()});
+  bagTeller_->clientConfigured(state, userAgent_.get());
+}
+
+void ClientConnection::_refuseConfiguration() {
+  reportErrorAsZelkordFeedback(zelkorError(kConnectionFault, "invalid configuration"), assembly_);
+  assembly_.log(Category::Session).fault("invalid configuration, closing connection");
+  connection_->invalidate();
+}
+
+void ClientConnection::_ensureState() {
+  const auto& log = assembly_.log(Category::Session);
+  const auto configuration = configuration_.get();
+  if (!configuration) return log.fault("configuration must not be nil");
+  const auto userAgent =
+      createUserAgentString(configuration->userAgent, assembly_.platform().device);
+  if (configuration->identifier.empty() || !userAgent) {
+    return log.fault("configuration requires identifier and agent");
+  }
+  userAgent_.set(userAgent);
+  if (const auto bound = state_.get()) {
+    if (bound->identifier() != configuration->identifier) {
+      log.fault("session identifier must match");
+    }
+    return;
+  }
+  if (const auto state = clientStateManager_.stateForClientIdentifier(configuration->identifier)) {
+    state->setConfiguration(*configuration);
+    state_.set(state);
+  }
+}
+
+void ClientConnection::bag(const std::shared_ptr<ipc::Reply>& reply) {
+  _ensureState();
+  const auto state = state_.get();
+  if (!state) return;
+  state->bag(userAgent_.get(),
+             [&reply, mark = timer_->callBegan()](const auto& bag, const auto& error) {
+               reply->send({encodeBag(bag.get()), encodeError(error)});
+             });
+}
+
+void ClientConnection::request(std::shared_ptr<ZLKRequest> request,
+                               const std::shared_ptr<ipc::Reply>& reply) {
+  _ensureState();
+  if (!request) return;
+  _fillMissing(*request);
+  if (auto searched = std::dynamic_pointer_cast<const ZLKSearchRequest>(request)) {
+    search(std::move(searched), _replyTo(reply));
+  }
+}
+
+void ClientConnection::_fillMissing(ZLKRequest& request) {
+  auto& textInput = assembly_.platform().textInput;
+  if (request.keyboardInputMode.empty()) {
+    request.keyboardInputMode = textInput.currentInputMode();
+    assembly_.defaultLog().debug("keyboardInputMode property not set, using {}",
+                                 request.keyboardInputMode);
+  }
+  if (request.scale == 0) {
+    request.scale = textInput.mainScreenScale();
+    assembly_.defaultLog().debug("request scale property not set, using {:.6f}", request.scale);
+  }
+  if (request.uuid.empty()) request.uuid = newUuid(assembly_.platform().random);
+}
+
+ReplyCallback ClientConnection::_replyTo(const std::shared_ptr<ipc::Reply>& reply) {
+  return [reply, mark = timer_->callBegan()](std::int64_t queryId, const auto& answer,
+                                             const auto& error) {
+    reply->send({queryId, encodeReply(answer), encodeError(error)});
+  };
+}
+
+void ClientConnection::search(std::shared_ptr<const ZLKSearchRequest> request,
+                              ReplyCallback reply) {
+  const auto& tracing = assembly_.tracing();
+  tracing.emit(TraceCode::SearchStart);
+  const auto queryId = request->queryId;
+  if (!_accepts(queryId)) {
+    tracing.emit(TraceCode::SearchEnd);
+    reply(queryId, std::nullopt, std::nullopt);
+    return;
+  }
+  const auto state = state_.get();
+  if (!state) return;
+  state->search(std::move(request), [self = shared_from_this(), queryId, reply = std::move(reply)](
+                                        std::int64_t answered, auto answer, auto error) {
+    self->assembly_.tracing().emit(TraceCode::SearchEnd);
+    if (self->currentQueryId_ > queryId) {
+      reply(answered, std::nullopt, std::nullopt);
+    } else {
+      reply(answered, std::move(answer), std::move(error));
+    }
+  });
+}
+
+// Makes `queryId` the current one when it is newer; false when it is stale, also when another
+// thread was faster.
+bool ClientConnection::_accepts(std::int64_t queryId) {
+  auto current = currentQueryId_.load();
+  return queryId > current && currentQueryId_.compare_exchange_strong(current, queryId);
+}
+
+void ClientConnection::listSessions(const std::shared_ptr<ipc::Reply>& reply) {
+  reply->send({clientStateManager_.sessions()});
+}
+
+void ClientConnection::flushSessionInvalidation(std::function<void(bool flushed)> callback) {
+  const auto state = state_.get();
+  if (!state) return callback(false);
+  state->sessionManager().flushSessionInvalidation(userAgent_.get(), std::move(callback));
+}
+
+}  // namespace zelkord

@@ -1,0 +1,91 @@
+#pragma once
+
+#include <atomic>
+#include <memory>
+#include <optional>
+#include <string>
+
+#include "base/Guarded.h"
+#include "corezelkor/Messages.h"
+#include "platform/api/Interprocess.h"
+#include "platform/api/ProcessTransactions.h"
+#include "zelkord/core/BagTeller.h"
+#include "zelkord/core/IdleTimer.h"
+#include "zelkord/core/Wire.h"
+#include "zelkord/query/ClientState.h"
+
+namespace zelkord {
+
+class Assembly;
+class ClientStateManager;
+
+// One client's connection: what the client calls, and the way back to it.
+//
+// Unbound until a valid configuration arrives; then bound to the state of its client identifier for
+// its life. It ends when the client goes away, when it is silent for too long, or after an invalid
+// first configuration. While it lives it holds a transaction.
+//
+// Threading: calls arrive one at a time on the connection's queue; `currentQueryId`, the
+// configuration and the state are read from others too. Ownership: the transport owns it through
+// the connection; calls under way hold it. Errors: wrong arguments are answered with a D-Bus error;
+// of an unbound connection queries are dropped.
+class ClientConnection final : public ipc::CallHandler,
+                               public std::enable_shared_from_this<ClientConnection> {
+ public:
+  // Gets the calls of the interfaces that are not about a client, such as diagnostics.
+  using OtherCalls = std::shared_ptr<ipc::CallHandler>;
+
+  ClientConnection(Assembly& assembly, std::shared_ptr<ipc::Connection> connection,
+                   OtherCalls otherCalls);
+  ~ClientConnection() override;
+
+  // Arms the idle timer. Right after construction.
+  void start();
+  // No call-back into the client and no time-out follows.
+  void invalidated();
+
+  void handle(ipc::Call call) override;
+
+  std::optional<ZLKSessionConfiguration> configuration() const { return configuration_.get(); }
+  std::shared_ptr<ClientState> state() const { return state_.get(); }
+  std::int64_t currentQueryId() const { return currentQueryId_; }
+  ipc::Peer peer() const { return connection_->peer(); }
+
+  // Ends the client's feedback session as far as it is its own; `callback` gets whether one was
+  // ended.
+  void flushSessionInvalidation(std::function<void(bool flushed)> callback);
+
+ private:
+  void configure(ZLKSessionConfiguration configuration, const ipc::Call& call);
+  void bag(const std::shared_ptr<ipc::Reply>& reply);
+  void request(std::shared_ptr<ZLKRequest> request, const std::shared_ptr<ipc::Reply>& reply);
+  void search(std::shared_ptr<const ZLKSearchRequest> request, ReplyCallback reply);
+  void listSessions(const std::shared_ptr<ipc::Reply>& reply);
+
+  void _handleConfigure(const ipc::Call& call);
+  void _handleRequest(const ipc::Call& call);
+  void _handleDaemonCall(const ipc::Call& call);
+  void _refuse(const ipc::Call& call, const WireFault& fault);
+  void _ensureState();
+  void _refuseConfiguration();
+  void _fillMissing(ZLKRequest& request);
+  ReplyCallback _replyTo(const std::shared_ptr<ipc::Reply>& reply);
+  bool _accepts(std::int64_t queryId);
+
+  // Fixed after construction.
+  Assembly& assembly_;
+  ClientStateManager& clientStateManager_;
+  const std::shared_ptr<ipc::Connection> connection_;
+  const OtherCalls otherCalls_;
+  const std::shared_ptr<BagTeller> bagTeller_;
+  const Transaction transaction_;
+  std::shared_ptr<IdleTimer> timer_;
+
+  // Own synchronisation.
+  std::atomic<std::int64_t> currentQueryId_ = 0;
+  Guarded<std::optional<ZLKSessionConfiguration>> configuration_;
+  Guarded<std::shared_ptr<ClientState>> state_;
+  Guarded<std::optional<std::string>> userAgent_;
+};
+
+}  // namespace zelkord

@@ -1,0 +1,181 @@
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include "corezelkor/Constants.h"
+#include "zelkord/core/ClientConnection.h"
+#include "zelkord/core/ClientStateManager.h"
+#include "zelkord/core/DaemonTestSupport.h"
+
+namespace zelkord {
+namespace {
+
+class ClientConnectionTest : public testing::Test {
+ protected:
+  std::string address(const DaemonBed::Answer& answer) {
+    return *answer->values.at(0).get<std::string>();
+  }
+  void answerTask(std::size_t index, const std::string& body = "[]") {
+    bed_.urlSession().tasks().at(index)->succeed(200, body);
+    bed_.run();
+  }
+
+  DaemonBed bed_;
+};
+
+TEST_F(ClientConnectionTest, ConfigureAnswersBeforeTheBagDoes) {
+  const auto client = bed_.connect();
+  const auto answer =
+      client->call(std::string(kDaemonInterface), "Configure",
+                   {ipc::Dictionary{{"identifier", "lanthe"}, {"userAgent", "Lanthe/9"}}});
+  ASSERT_TRUE(bed_.fakes.timeline.runUntil([&] { return answer->answered; }, 100ms));
+  EXPECT_EQ(address(answer), bed_.daemon.assembly().clientStateManager()->endpoint());
+  EXPECT_TRUE(client->callbacks().empty());
+  bed_.fakes.timeline.advance(1s);
+  ASSERT_EQ(client->callbacks().size(), 1u);
+  EXPECT_EQ(client->callbacks()[0].member, "BagDidLoad");
+  EXPECT_TRUE(client->callbacks()[0].values[0].get<ipc::Dictionary>()->empty());
+  EXPECT_FALSE(client->callbacks()[0].values[1].get<ipc::Dictionary>()->empty());
+}
+
+TEST_F(ClientConnectionTest, TellsEachBagOnceHoweverOftenItIsConfigured) {
+  bed_.installBag(kServedBag);
+  const auto client = bed_.connectAndConfigure();
+  bed_.configure(client);
+  client->takeCallbacks();
+  bed_.installBag(R"({"version":"5"})");
+  ASSERT_EQ(client->callbacks().size(), 1u);
+  const auto& bag = *client->callbacks()[0].values[0].get<ipc::Dictionary>();
+  EXPECT_EQ(*bag.at("version").get<std::string>(), "5");
+  EXPECT_EQ(*bag.at("enabled").get<bool>(), true);
+}
+
+TEST_F(ClientConnectionTest, AnInvalidFirstConfigurationClosesTheConnection) {
+  const std::vector<std::pair<std::string, std::string>> cases = {{"", "Lanthe/9"}, {"lanthe", ""}};
+  for (const auto& [identifier, agent] : cases) {
+    SCOPED_TRACE(identifier);
+    const auto client = bed_.connect();
+    EXPECT_FALSE(bed_.configure(client, identifier, agent)->answered);
+    EXPECT_EQ(client->state(), ipc::FakeClient::State::Ended);
+  }
+  EXPECT_TRUE(bed_.fakes.log.contains("invalid configuration, closing connection"));
+}
+
+TEST_F(ClientConnectionTest, AnInvalidLaterConfigurationIsAnsweredAndKeepsTheState) {
+  const auto client = bed_.connectAndConfigure();
+  EXPECT_TRUE(bed_.configure(client, "", "")->answered);
+  EXPECT_TRUE(bed_.configure(client, "brelin", "Brelin/1")->answered);
+  EXPECT_TRUE(bed_.fakes.log.contains("session identifier must match"));
+  EXPECT_EQ(client->state(), ipc::FakeClient::State::Open);
+}
+
+TEST_F(ClientConnectionTest, AnswersOnlyTheNewestSearch) {
+  bed_.installBag(kServedBag);
+  const auto client = bed_.connectAndConfigure();
+  const auto five = bed_.search(client, 5);
+  const auto three = bed_.search(client, 3);
+  ASSERT_TRUE(three->answered);
+  EXPECT_EQ(*three->values[0].get<std::int64_t>(), 3);
+  EXPECT_TRUE(isNothing(*three, 1) && isNothing(*three, 2));
+  const auto six = bed_.search(client, 6);
+  answerTask(0);
+  ASSERT_TRUE(five->answered);
+  EXPECT_TRUE(isNothing(*five, 1) && isNothing(*five, 2));
+  answerTask(1);
+  ASSERT_TRUE(six->answered);
+  const auto& reply = *six->values[1].get<ipc::Dictionary>();
+  EXPECT_EQ(reply.at("data").get<Data>()->view(), "[]");
+  EXPECT_EQ(*reply.at("scale").get<double>(), bed_.fakes.textInput.mainScreenScale());
+}
+
+TEST_F(ClientConnectionTest, AnUnboundConnectionGetsNoAnswersButForStaleSearches) {
+  bed_.installBag(kServedBag);
+  const auto client = bed_.connect();
+  EXPECT_FALSE(bed_.call(client, "Bag")->answered);
+  EXPECT_FALSE(bed_.search(client, 1)->answered);
+  EXPECT_TRUE(bed_.search(client, 0)->answered);
+  EXPECT_TRUE(bed_.search(client, 1)->answered);
+  EXPECT_TRUE(bed_.call(client, "ListSessions")->answered);
+  EXPECT_TRUE(bed_.fakes.log.contains("configuration must not be nil"));
+}
+
+TEST_F(ClientConnectionTest, RefusesWhatItCannotMean) {
+  struct Case {
+    const char* name;
+    ipc::Dictionary request;
+    std::string_view error;
+  };
+  const std::vector<Case> cases = {
+      {"a text as number", {{"queryId", "1"}}, ipc::kInvalidArgs},
+      {"trigger event 20", {{"triggerEvent", std::uint32_t{20}}}, ipc::kInvalidArgs},
+      {"negative scale", {{"scale", -1.0}}, ipc::kInvalidArgs},
+      {"scale not a number", {{"scale", std::nan("")}}, ipc::kInvalidArgs},
+      {"control character", {{"queryItems", ipc::StringPairs{{"a", "b\n"}}}}, ipc::kInvalidArgs},
+      {"C1 control character",
+       {{"queryItems", ipc::StringPairs{{"\xC2\x85", ""}}}},
+       ipc::kInvalidArgs},
+      {"257 items", {{"queryItems", ipc::StringPairs(257)}}, ipc::kLimitsExceeded},
+      {"nothing wrong", {{"queryId", std::int64_t{0}}, {"unknown", ipc::Unsupported{"(xx)"}}}, ""},
+  };
+  const auto client = bed_.connectAndConfigure();
+  for (const auto& wanted : cases) {
+    SCOPED_TRACE(wanted.name);
+    bed_.fakes.log.clear();
+    const auto answer = bed_.call(client, "Request", {"search", wanted.request});
+    EXPECT_TRUE(answer->answered);
+    EXPECT_EQ(answer->errorName, wanted.error);
+    EXPECT_EQ(bed_.fakes.log.count(LogLevel::Error), wanted.error.empty() ? 0 : 1);
+  }
+  EXPECT_EQ(bed_.call(client, "Configure", {ipc::Dictionary{{"identifier", "a\x01"}}})->errorName,
+            ipc::kInvalidArgs);
+}
+
+TEST_F(ClientConnectionTest, DropsKindsThatDoNotExist) {
+  const auto client = bed_.connectAndConfigure();
+  EXPECT_FALSE(bed_.call(client, "Request", {"nonsense", ipc::Dictionary{}})->answered);
+  EXPECT_EQ(client->state(), ipc::FakeClient::State::Open);
+}
+
+TEST_F(ClientConnectionTest, EndsAfterThreeSilentMinutesButNotWhileACallWaits) {
+  bed_.installBag(kServedBag);
+  const auto silent = bed_.connectAndConfigure("brelin", 1);
+  const auto waiting = bed_.connectAndConfigure("lanthe", 2);
+  bed_.search(waiting, 1);
+  bed_.fakes.timeline.advance(179s);
+  EXPECT_EQ(silent->state(), ipc::FakeClient::State::Open);
+  bed_.fakes.timeline.advance(61s);
+  EXPECT_EQ(silent->state(), ipc::FakeClient::State::Ended);
+  bed_.fakes.timeline.advance(600s);
+  EXPECT_EQ(waiting->state(), ipc::FakeClient::State::Open);
+  answerTask(0);
+  bed_.fakes.timeline.advance(179s);
+  EXPECT_EQ(waiting->state(), ipc::FakeClient::State::Open);
+  bed_.fakes.timeline.advance(61s);
+  EXPECT_EQ(waiting->state(), ipc::FakeClient::State::Ended);
+  EXPECT_TRUE(bed_.fakes.log.contains("timing out idle xpc connection"));
+}
+
+TEST_F(ClientConnectionTest, EveryMessageBeginsTheSilenceAnew) {
+  const auto client = bed_.connectAndConfigure();
+  for (int i = 0; i < 5; ++i) {
+    bed_.fakes.timeline.advance(170s);
+    bed_.call(client, "ListSessions");
+  }
+  EXPECT_EQ(client->state(), ipc::FakeClient::State::Open);
+}
+
+TEST_F(ClientConnectionTest, FillsInWhatTheClientLeftOut) {
+  bed_.installBag(kServedBag);
+  bed_.fakes.textInput.inputMode = "de_DE@keyboard";
+  bed_.fakes.textInput.scale = 3;
+  const auto client = bed_.connectAndConfigure();
+  bed_.search(client, 1);
+  bed_.search(client, 2, "snow", {{"keyboardInputMode", "fr"}, {"scale", 2.0}});
+  const auto tasks = bed_.urlSession().tasks();
+  EXPECT_THAT(tasks[0]->request().url, testing::HasSubstr("kb_ime=de_DE@keyboard"));
+  EXPECT_EQ(tasks[0]->request().header("X-Quenta-UI-Scale"), "3.0");
+  EXPECT_THAT(tasks[1]->request().url, testing::HasSubstr("kb_ime=fr"));
+  EXPECT_EQ(tasks[1]->request().header("X-Quenta-UI-Scale"), "2.0");
+}
+
+}  // namespace
+}  // namespace zelkord

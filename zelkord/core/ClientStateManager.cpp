@@ -1,0 +1,139 @@
+#include "zelkord/core/ClientStateManager.h"
+
+#include "zelkord/assembly/Assembly.h"
+#include "zelkord/core/EndpointListener.h"
+#include "zelkord/core/ServiceInterfaces.h"
+#include "zelkord/query/ErrorCodes.h"
+
+namespace zelkord {
+namespace {
+
+constexpr std::string_view kSessionsKey = "sessions";
+
+}  // namespace
+
+ClientStateManager::ClientStateManager(Assembly& assembly)
+    : assembly_(assembly),
+      stateCacheQueue_(assembly.platform().queues.makeSerialQueue("com.quenta.zelkord.stateCache")),
+      persistSessions_(boolSetting(assembly.userDefaults(), "ZLKPersistSessions")) {}
+
+ClientStateManager::~ClientStateManager() = default;
+
+void ClientStateManager::start() {
+  endpointListener_ = std::make_shared<EndpointListener>(assembly_, weak_from_this());
+  ipc::ListenerConfiguration configuration;
+  configuration.interfaces = {endpointInterface()};
+  configuration.connectionInterface = configuration.interfaces.front().name;
+  listener_ = assembly_.platform().interprocess.makeAnonymousListener(std::move(configuration),
+                                                                      endpointListener_);
+  stateCacheQueue_->sync([this] { loadState(); });
+}
+
+const std::string& ClientStateManager::endpoint() const {
+  static const std::string kNone;
+  return listener_ ? listener_->address() : kNone;
+}
+
+std::shared_ptr<ClientState> ClientStateManager::stateForClientIdentifier(
+    const std::string& identifier) {
+  if (!_isUsable(identifier)) return nullptr;
+  std::shared_ptr<ClientState> state;
+  stateCacheQueue_->sync([&] {
+    stateCacheQueue_->assertCurrent();
+    auto& place = stateCache_[identifier];
+    if (!place) place = std::make_shared<ClientState>(identifier, assembly_);
+    state = place;
+  });
+  assembly_.log(Category::Session).info("using client state: {}", identifier);
+  return state;
+}
+
+bool ClientStateManager::_isUsable(const std::string& identifier) const {
+  if (!identifier.empty()) return true;
+  assembly_.log(Category::Session).fault("client session identifier cannot be nil or empty");
+  return false;
+}
+
+std::shared_ptr<ClientState> ClientStateManager::configuredState(const std::string& identifier) {
+  if (!_isUsable(identifier)) return nullptr;
+  std::shared_ptr<ClientState> state;
+  stateCacheQueue_->sync([&] {
+    stateCacheQueue_->assertCurrent();
+    const auto found = stateCache_.find(identifier);
+    if (found != stateCache_.end() && found->second->configuration()) state = found->second;
+  });
+  return state;
+}
+
+void ClientStateManager::loadState() {
+  stateCacheQueue_->assertCurrent();
+  if (!persistSessions_) return;
+  const auto stored = assembly_.userDefaults().value(kSessionsKey);
+  const auto* entries = stored ? stored->if_array() : nullptr;
+  if (!entries) return;
+  for (const auto& entry : *entries) {
+    const auto* fields = entry.if_object();
+    const auto identifier = fields ? stringIn(*fields, "identifier") : std::nullopt;
+    if (!identifier || identifier->empty()) continue;
+    auto state = std::make_shared<ClientState>(*identifier, assembly_);
+    state->setUserAgent(stringIn(*fields, "agent"));
+    stateCache_[*identifier] = std::move(state);
+  }
+}
+
+void ClientStateManager::saveState() {
+  if (!persistSessions_) return;
+  stateCacheQueue_->async([weak = weak_from_this()] {
+    if (const auto self = weak.lock()) self->_save();
+  });
+}
+
+void ClientStateManager::_save() {
+  stateCacheQueue_->assertCurrent();
+  json::array entries;
+  for (const auto& session : _sessions()) {
+    json::object entry;
+    for (const auto& [key, value] : session) entry[key] = value;
+    entries.push_back(std::move(entry));
+  }
+  assembly_.userDefaults().set(kSessionsKey, std::move(entries));
+  assembly_.userDefaults().flush();
+}
+
+std::vector<ipc::StringMap> ClientStateManager::sessions() {
+  std::vector<ipc::StringMap> sessions;
+  stateCacheQueue_->sync([&] {
+    stateCacheQueue_->assertCurrent();
+    sessions = _sessions();
+  });
+  return sessions;
+}
+
+std::vector<ipc::StringMap> ClientStateManager::_sessions() const {
+  stateCacheQueue_->assertCurrent();
+  std::vector<ipc::StringMap> sessions;
+  for (const auto& [identifier, state] : stateCache_) {
+    const auto agent = state->userAgent();
+    if (agent) sessions.push_back({{"identifier", identifier}, {"agent", *agent}});
+  }
+  return sessions;
+}
+
+std::vector<std::shared_ptr<ClientState>> ClientStateManager::states() {
+  std::vector<std::shared_ptr<ClientState>> states;
+  stateCacheQueue_->sync([&] {
+    stateCacheQueue_->assertCurrent();
+    for (const auto& [identifier, state] : stateCache_) states.push_back(state);
+  });
+  return states;
+}
+
+void ClientStateManager::request(const std::shared_ptr<ZLKRequest>& request,
+                                 const ZLKSessionConfiguration& configuration,
+                                 const ReplyCallback& reply) {
+  if (!request || configuredState(configuration.identifier)) return;
+  reply(request->queryId, std::nullopt,
+        zelkorError(kConnectionFault, "invalid configuration " + configuration.description()));
+}
+
+}  // namespace zelkord

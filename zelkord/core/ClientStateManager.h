@@ -1,0 +1,69 @@
+#pragma once
+
+#include <map>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "corezelkor/Messages.h"
+#include "platform/api/Interprocess.h"
+#include "platform/api/WorkQueues.h"
+#include "zelkord/query/ClientState.h"
+
+namespace zelkord {
+
+class Assembly;
+class EndpointListener;
+
+// All client states by client identifier; what one is made for, it is made once and kept. With the
+// setting "ZLKPersistSessions" the clients' identifiers and user agents survive the process
+// (setting "sessions").
+//
+// Also owns the endpoint: a private socket through which clients ask without going through their
+// own connection.
+//
+// Threading: any thread; the states belong to `stateCacheQueue_`.
+// Ownership: owned by the assembly.
+class ClientStateManager final : public std::enable_shared_from_this<ClientStateManager> {
+ public:
+  explicit ClientStateManager(Assembly& assembly);
+  ~ClientStateManager();
+
+  // Opens the endpoint and loads the known clients. Right after construction.
+  void start();
+
+  // The state of that client, made when there is none; null for an empty identifier.
+  std::shared_ptr<ClientState> stateForClientIdentifier(const std::string& identifier);
+  // The state of that client if some connection has configured it, else null.
+  std::shared_ptr<ClientState> configuredState(const std::string& identifier);
+  void saveState();
+  // {"identifier", "agent"} of every state that has a user agent.
+  std::vector<ipc::StringMap> sessions();
+  // D-Bus address of the endpoint.
+  const std::string& endpoint() const;
+  std::vector<std::shared_ptr<ClientState>> states();
+
+  // A query that came through the endpoint; `request` is null for a kind that does not exist.
+  void request(const std::shared_ptr<ZLKRequest>& request,
+               const ZLKSessionConfiguration& configuration, const ReplyCallback& reply);
+
+ private:
+  using States = std::map<std::string, std::shared_ptr<ClientState>>;
+  // False, after a log line, for an empty identifier.
+  bool _isUsable(const std::string& identifier) const;
+  void loadState();
+  void _save();
+  std::vector<ipc::StringMap> _sessions() const;
+
+  // Fixed after construction.
+  Assembly& assembly_;
+  const std::unique_ptr<SerialQueue> stateCacheQueue_;
+  const bool persistSessions_;
+  std::shared_ptr<EndpointListener> endpointListener_;
+  std::unique_ptr<ipc::AnonymousListener> listener_;
+
+  // Queue state.
+  States stateCache_ ZK_ON(stateCacheQueue_);
+};
+
+}  // namespace zelkord

@@ -1,0 +1,107 @@
+#include "zelkord/core/Daemon.h"
+
+#include <csignal>
+
+#include "corezelkor/Constants.h"
+#include "zelkord/assembly/Assembly.h"
+#include "zelkord/core/ClientStateManager.h"
+#include "zelkord/core/Diagnostics.h"
+#include "zelkord/core/ServiceInterfaces.h"
+#include "zelkord/core/ZelkorService.h"
+#include "zelkord/feedback/InMemorySessions.h"
+#include "zelkord/network/NotificationNames.h"
+#include "zelkord/network/ZLKNetworkRequestFactory.h"
+#include "zelkord/network/ZelkorBagController.h"
+
+namespace zelkord {
+
+Daemon::Daemon(Platform& platform) : platform_(platform) {}
+Daemon::~Daemon() = default;
+
+std::optional<Error> Daemon::start() {
+  _registerDefaults();
+  assembly_ = std::make_unique<Assembly>(platform_);
+  _makeServices();
+  if (auto error = _listen()) return error;
+  _handleLaunchEvents();
+  _warm();
+  _handleSignals();
+  return std::nullopt;
+}
+
+void Daemon::_registerDefaults() {
+  platform_.settings.registerDefaults({
+      {"ZLKSharedSession", true},
+      {"ZLKSessionSizeLimit", 2'097'152},
+      {"ZLKSessionMaxAge", 172'800},
+      {"ZLKUseMorvane", true},
+      {"ZLKLogPrivateData", false},
+      {"ZLKMaximumResponseSize", 8'388'608},
+      {"ZLKMaximumResourceSize", 268'435'456},
+      {"ZLKMaximumBagSize", 1'048'576},
+  });
+}
+
+// The order is required: a service finds earlier ones in the assembly.
+void Daemon::_makeServices() {
+  auto& assembly = *assembly_;
+  assembly.setFeedbackSessions(
+      std::make_shared<InMemorySessions>(boolSetting(platform_.settings, "ZLKSharedSession")));
+  const auto factory = std::make_shared<ZLKNetworkRequestFactory>(assembly);
+  assembly.setRequestFactory(factory);
+  factory->start();
+  assembly.reporter().addValue(1, "com.quenta.zelkord.launch");
+  const auto bagController = std::make_shared<ZelkorBagController>(assembly, *factory);
+  assembly.setBagController(bagController);
+  bagController->start();
+  const auto states = std::make_shared<ClientStateManager>(assembly);
+  assembly.setClientStateManager(states);
+  states->start();
+}
+
+std::optional<Error> Daemon::_listen() {
+  diagnostics_ = std::make_shared<Diagnostics>(*assembly_, [this] {
+    return service_ ? service_->getClientConnections()
+                    : std::vector<std::shared_ptr<ClientConnection>>();
+  });
+  service_ = std::make_shared<ZelkorService>(*assembly_, diagnostics_);
+  ipc::ListenerConfiguration configuration;
+  configuration.interfaces = {daemonInterface(), diagnosticsInterface()};
+  configuration.connectionInterface = std::string(kDaemonInterface);
+  configuration.sharedHandler = diagnostics_;
+  return platform_.interprocess.listen(std::string(kServiceName), std::move(configuration),
+                                       service_);
+}
+
+void Daemon::_handleLaunchEvents() {
+  eventQueue_ = platform_.queues.makeSerialQueue("com.quenta.zelkord.xpc_event");
+  const auto handler = [&log = assembly_->defaultLog()](const std::string& name) {
+    log.info("launch event for {}", name);
+  };
+  launchEvents_ = platform_.launchEvents.handle(kURLSessionLaunchStream, *eventQueue_, handler);
+  notifyEvents_ = platform_.launchEvents.handle(kNotifyMatchingStream, *eventQueue_, handler);
+}
+
+void Daemon::_warm() {
+  platform_.queues.global(QualityOfService::Background).async([&assembly = *assembly_] {
+    assembly.bagController()->currentBag();
+  });
+  platform_.queues.global(QualityOfService::Default).async([&assembly = *assembly_] {
+    assembly.notificationCenter().post(std::string(kZLKStartup));
+  });
+}
+
+void Daemon::_handleSignals() {
+  auto& queue = platform_.queues.global(QualityOfService::Default);
+  const auto leaveOn = [&](int number, const char* name) {
+    return platform_.signals.on(number, queue,
+                                [&platform = platform_, &assembly = *assembly_, name] {
+                                  assembly.defaultLog().debug("{}", name);
+                                  platform.process.exit(0);
+                                });
+  };
+  interrupt_ = leaveOn(SIGINT, "SIGINT");
+  terminate_ = leaveOn(SIGTERM, "SIGTERM");
+}
+
+}  // namespace zelkord

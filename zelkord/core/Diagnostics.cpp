@@ -1,0 +1,120 @@
+#include "zelkord/core/Diagnostics.h"
+
+#include <unistd.h>
+
+#include "corezelkor/Constants.h"
+#include "zelkord/assembly/Assembly.h"
+#include "zelkord/core/ClientConnection.h"
+#include "zelkord/core/ClientStateManager.h"
+#include "zelkord/network/BagRefreshRule.h"
+#include "zelkord/network/ZelkorBagController.h"
+
+namespace zelkord {
+namespace {
+
+json::value textOrNull(const std::optional<std::string>& text) {
+  if (!text) return nullptr;
+  return json::string(*text);
+}
+
+json::array transactionsOf(const ProcessTransactions& transactions) {
+  json::array names;
+  for (const auto& name : transactions.openNames()) names.emplace_back(name);
+  return names;
+}
+
+json::array connectionsOf(const std::vector<std::shared_ptr<ClientConnection>>& connections) {
+  json::array list;
+  for (const auto& connection : connections) {
+    const auto configuration = connection->configuration();
+    list.push_back(
+        {{"pid", connection->peer().pid},
+         {"identifier", configuration ? json::value(configuration->identifier) : nullptr},
+         {"current_query_id", connection->currentQueryId()}});
+  }
+  return list;
+}
+
+json::array statesOf(ClientStateManager& manager) {
+  json::array list;
+  for (const auto& state : manager.states()) {
+    list.push_back({{"identifier", state->identifier()},
+                    {"agent", textOrNull(state->userAgent())},
+                    {"short_name", textOrNull(state->clientShortName())},
+                    {"has_bag", state->currentBag() != nullptr}});
+  }
+  return list;
+}
+
+json::value bagOf(const ZelkorBagController& controller) {
+  const auto bag = controller.inMemoryBag();
+  if (!bag) return nullptr;
+  const auto expiration = numberIn(*bag->rawBag(), kBagExpirationKey);
+  return {{"version", textOrNull(bag->version())},
+          {"enabled", bag->isEnabled()},
+          {"expiration", expiration ? json::value(*expiration) : nullptr}};
+}
+
+json::object transportOf(const ipc::Statistics& statistics) {
+  return {{"connections", statistics.connections},
+          {"calls", statistics.calls},
+          {"refused", statistics.refused},
+          {"queued_bytes", statistics.queuedBytes}};
+}
+
+}  // namespace
+
+Diagnostics::Diagnostics(Assembly& assembly, Connections connections)
+    : assembly_(assembly), connections_(std::move(connections)) {}
+
+void Diagnostics::handle(ipc::Call call) {
+  if (call.interface != kDiagnosticsInterface) return;
+  if (call.member == "Status") return call.reply->send({status()});
+  if (call.member == "Metrics") {
+    const auto counters = assembly_.platform().counters.all();
+    return call.reply->send({ipc::IntegerMap(counters.begin(), counters.end())});
+  }
+  if (call.member == "ReadDefault") return _readDefault(call);
+  if (call.member == "WriteDefault") return _writeDefault(call);
+}
+
+std::string Diagnostics::status() const {
+  const auto& platform = assembly_.platform();
+  json::object status;
+  status["pid"] = ::getpid();
+  status["version"] = std::string(kZLKZelkordNameVersion);
+  status["transactions"] = transactionsOf(platform.transactions);
+  status["connections"] = connectionsOf(connections_());
+  status["states"] = statesOf(*assembly_.clientStateManager());
+  status["bag"] = bagOf(*assembly_.bagController());
+  status["interprocess"] = transportOf(platform.interprocess.statistics());
+  return json::serialize(status);
+}
+
+void Diagnostics::_readDefault(const ipc::Call& call) const {
+  const auto& domain = *call.arguments.at(0).get<std::string>();
+  const auto& key = *call.arguments.at(1).get<std::string>();
+  if (key.empty()) {
+    return call.reply->send({json::serialize(assembly_.userDefaults().all(domain))});
+  }
+  const auto value = assembly_.userDefaults().value(key, domain);
+  call.reply->send({value ? json::serialize(*value) : std::string()});
+}
+
+void Diagnostics::_writeDefault(const ipc::Call& call) const {
+  const auto& domain = *call.arguments.at(0).get<std::string>();
+  const auto& key = *call.arguments.at(1).get<std::string>();
+  const auto& text = *call.arguments.at(2).get<std::string>();
+  if (key.empty()) return call.reply->fail(ipc::kInvalidArgs, "a setting needs a key");
+  if (text.empty()) {
+    assembly_.userDefaults().remove(key, domain);
+  } else if (auto value = parseJson(text)) {
+    assembly_.userDefaults().set(key, *std::move(value), domain);
+  } else {
+    return call.reply->fail(ipc::kInvalidArgs, "the value is not JSON");
+  }
+  assembly_.userDefaults().flush();
+  call.reply->send({});
+}
+
+}  // namespace zelkord

@@ -1,0 +1,18 @@
+#include "zelkord/core/ErrorFeedback.h"
+
+#include "zelkord/assembly/Assembly.h"
+#include "zelkord/feedback/SessionManager.h"
+#include "zelkord/feedback/UserGUIDSource.h"
+#include "zelkord/network/UserAgent.h"
+
+namespace zelkord {
+
+void reportErrorAsZelkordFeedback(const Error& error, Assembly& assembly) {
+  auto* manager = assembly.clientSessionManager();
+  auto* guid = assembly.guidController();
+  if (!manager || !guid) return;
+  manager->addZelkorFeedback({std::make_shared<HVErrorFeedback>(error), 0, guid->currentUserGUID(),
+                              zelkordUserAgent(assembly.platform().device), 0});
+}
+
+}  // namespace zelkord

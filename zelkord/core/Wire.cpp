@@ -1,0 +1,181 @@
+#include "zelkord/core/Wire.h"
+
+#include <fmt/core.h>
+
+#include <cmath>
+
+#include "base/Text.h"
+
+namespace zelkord {
+namespace {
+
+constexpr std::uint32_t kLastTriggerEvent = 19;
+constexpr std::size_t kMaximumQueryItems = 256;
+
+// Reads the members of a dictionary, each once; the first fault is kept.
+class DictionaryReader {
+ public:
+  explicit DictionaryReader(const ipc::Dictionary& dictionary) : dictionary_(dictionary) {}
+
+  template <typename T>
+  void read(std::string_view key, T& value) {
+    const auto found = dictionary_.find(key);
+    if (found == dictionary_.end()) return;
+    if (const auto* typed = found->second.get<T>()) {
+      value = *typed;
+    } else {
+      refuse(ipc::kInvalidArgs, fmt::format("\"{}\" has the wrong type", key));
+    }
+  }
+
+  void refuse(std::string_view errorName, std::string text) {
+    if (!fault_) fault_ = WireFault{errorName, std::move(text)};
+  }
+
+  template <typename T>
+  Decoded<T> finish(T value) && {
+    if (fault_) return *std::move(fault_);
+    return value;
+  }
+
+ private:
+  const ipc::Dictionary& dictionary_;
+  std::optional<WireFault> fault_;
+};
+
+template <typename Request>
+MutableRequest make() {
+  return std::make_shared<Request>();
+}
+
+MutableRequest makeRequest(std::string_view kind) {
+  constexpr std::pair<std::string_view, MutableRequest (*)()> kKinds[] = {
+      {"search", make<ZLKSearchRequest>},
+      {"moreResults", make<ZLKMoreResultsRequest>},
+      {"card", make<ZLKCardRequest>},
+      {"zeroKeyword", make<ZLKZeroKeywordRequest>},
+      {"lookup", make<ZLKLookupRequest>},
+      {"flightLookup", make<ZLKFlightLookupRequest>},
+      {"flightSearch", make<ZLKFlightSearchRequest>}};
+  for (const auto& [name, makeOne] : kKinds) {
+    if (kind == name) return makeOne();
+  }
+  return nullptr;
+}
+
+void readQueryItems(DictionaryReader& reader, ZLKRequest& request) {
+  reader.read("queryItems", request.queryItems);
+  if (request.queryItems.size() > kMaximumQueryItems) {
+    reader.refuse(ipc::kLimitsExceeded, "more than 256 \"queryItems\"");
+  }
+  for (const auto& [name, value] : request.queryItems) {
+    if (hasControlCharacters(name) || hasControlCharacters(value)) {
+      reader.refuse(ipc::kInvalidArgs, "control characters in \"queryItems\"");
+    }
+  }
+}
+
+void readCommonFields(DictionaryReader& reader, ZLKRequest& request) {
+  reader.read("queryId", request.queryId);
+  reader.read("clientQueryId", request.clientQueryId);
+  reader.read("queryString", request.queryString);
+  reader.read("triggerEvent", request.triggerEvent);
+  reader.read("keyboardInputMode", request.keyboardInputMode);
+  reader.read("scale", request.scale);
+  reader.read("topics", request.topics);
+  reader.read("uuid", request.uuid);
+  reader.read("verboseReply", request.verboseReply);
+  readQueryItems(reader, request);
+  if (request.triggerEvent > kLastTriggerEvent) {
+    reader.refuse(ipc::kInvalidArgs, "\"triggerEvent\" is above 19");
+  }
+  if (!std::isfinite(request.scale) || request.scale < 0) {
+    reader.refuse(ipc::kInvalidArgs, "\"scale\" is not a finite number of 0 or more");
+  }
+}
+
+void readOwnFields(DictionaryReader& reader, ZLKRequest& request) {
+  if (auto* more = dynamic_cast<ZLKMoreResultsRequest*>(&request)) {
+    reader.read("moreResultsURL", more->moreResultsURL);
+  } else if (auto* card = dynamic_cast<ZLKCardRequest*>(&request)) {
+    reader.read("cardURL", card->cardURL);
+  } else if (auto* lookup = dynamic_cast<ZLKLookupRequest*>(&request)) {
+    reader.read("appBundleId", lookup->appBundleId);
+    reader.read("domain", lookup->domain);
+    reader.read("lookupSelectionType", lookup->lookupSelectionType);
+    reader.read("queryContext", lookup->queryContext);
+  }
+}
+
+ipc::StringMap headerMap(const HeaderFields& headers) {
+  ipc::StringMap map;
+  for (const auto& [name, value] : headers) map[name] = value;
+  return map;
+}
+
+}  // namespace
+
+Decoded<ZLKSessionConfiguration> decodeConfiguration(const ipc::Dictionary& dictionary) {
+  DictionaryReader reader(dictionary);
+  ZLKSessionConfiguration configuration;
+  reader.read("identifier", configuration.identifier);
+  reader.read("userAgent", configuration.userAgent);
+  if (hasControlCharacters(configuration.identifier) ||
+      hasControlCharacters(configuration.userAgent)) {
+    reader.refuse(ipc::kInvalidArgs, "control characters in the configuration");
+  }
+  return std::move(reader).finish(std::move(configuration));
+}
+
+Decoded<MutableRequest> decodeRequest(const std::string& kind, const ipc::Dictionary& dictionary) {
+  auto request = makeRequest(kind);
+  if (!request) return MutableRequest();
+  DictionaryReader reader(dictionary);
+  readCommonFields(reader, *request);
+  readOwnFields(reader, *request);
+  return std::move(reader).finish(std::move(request));
+}
+
+ipc::Dictionary encodeBag(const ZLKBag* bag) {
+  ipc::Dictionary dictionary;
+  if (!bag) return dictionary;
+  if (auto version = bag->version()) dictionary["version"] = *std::move(version);
+  dictionary["enabled"] = bag->isEnabled();
+  dictionary["feedbackEnabled"] = bag->feedbackEnabled();
+  dictionary["rawBag"] = json::serialize(*bag->rawBag());
+  return dictionary;
+}
+
+ipc::Dictionary encodeError(const std::optional<Error>& error) {
+  ipc::Dictionary dictionary;
+  if (!error) return dictionary;
+  ipc::Dictionary info;
+  for (const auto& [key, value] : error->userInfo) info[key] = value;
+  dictionary["domain"] = error->domain;
+  dictionary["code"] = error->code;
+  dictionary["userInfo"] = std::move(info);
+  return dictionary;
+}
+
+ipc::Dictionary encodeReply(const std::optional<ZLKReply>& reply) {
+  ipc::Dictionary dictionary;
+  if (!reply) return dictionary;
+  dictionary["scale"] = reply->scale;
+  dictionary["data"] = reply->data;
+  if (reply->geoSessionEntityString) {
+    dictionary["geoSessionEntityString"] = *reply->geoSessionEntityString;
+  }
+  if (reply->httpRequest) {
+    dictionary["httpRequest"] = ipc::Dictionary{
+        {"url", reply->httpRequest->url}, {"headers", headerMap(reply->httpRequest->headers)}};
+  }
+  if (reply->httpResponse) {
+    dictionary["httpResponse"] =
+        ipc::Dictionary{{"url", reply->httpResponse->url},
+                        {"status", reply->httpResponse->status},
+                        {"headers", headerMap(reply->httpResponse->headers)}};
+  }
+  return dictionary;
+}
+
+}  // namespace zelkord

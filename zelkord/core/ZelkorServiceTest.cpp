@@ -1,0 +1,275 @@
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <csignal>
+
+#include "corezelkor/Constants.h"
+#include "zelkord/core/ClientStateManager.h"
+#include "zelkord/core/CommandLine.h"
+#include "zelkord/core/DaemonTestSupport.h"
+#include "zelkord/core/ZelkorService.h"
+#include "zelkord/network/NotificationNames.h"
+
+namespace zelkord {
+namespace {
+
+TEST(ZelkorServiceTest, CountsConnectionsOfOneProcess) {
+  DaemonBed bed;
+  const auto first = bed.connect();
+  EXPECT_FALSE(bed.fakes.log.contains("too many connections"));
+  const auto second = bed.connect();
+  EXPECT_TRUE(bed.fakes.log.contains("too many connections 2 from pid 100"));
+  EXPECT_EQ(second->state(), ipc::FakeClient::State::Open);
+  EXPECT_EQ(bed.fakes.counters.all()["com.quenta.zelkord.clientconnection"], 2);
+}
+
+TEST(ZelkorServiceTest, NamesTheClientByItsProgram) {
+  DaemonBed bed;
+  bed.connect(100);
+  bed.connect(101);
+  EXPECT_TRUE(bed.fakes.log.contains("new connection from shell (100)"));
+  EXPECT_TRUE(bed.fakes.log.contains("error getting path for pid [101] No such file or directory"));
+}
+
+TEST(ZelkorServiceTest, PurgesTheURLCacheWhenTheLastConnectionGoes) {
+  DaemonBed bed;
+  const auto first = bed.connectAndConfigure("lanthe", 1);
+  const auto second = bed.connectAndConfigure("brelin", 2);
+  first->disconnect();
+  bed.run();
+  EXPECT_EQ(bed.urlSession().purges(), 0);
+  second->disconnect();
+  bed.run();
+  EXPECT_EQ(bed.urlSession().purges(), 1);
+  EXPECT_TRUE(bed.fakes.log.contains("connection from (null) (2) invalidated"));
+  EXPECT_EQ(bed.fakes.counters.all()["com.quenta.zelkord.brelin.xcpinvalidation"], 1);
+  EXPECT_THAT(bed.fakes.transactions.openNames(),
+              testing::Not(testing::Contains("clientConnection")));
+}
+
+TEST(ZelkorServiceTest, TellsWhetherAClientsSessionEndedWithIt) {
+  for (const bool shared : {true, false}) {
+    SCOPED_TRACE(shared);
+    DaemonBed bed(json::object{{"ZLKSharedSession", shared}});
+    bed.connectAndConfigure()->disconnect();
+    bed.run();
+    EXPECT_TRUE(bed.fakes.log.contains(shared ? "session not flushed on invalidation"
+                                              : "session flushed on invalidation"));
+  }
+}
+
+TEST(ClientStateManagerTest, ConnectionsOfOneClientShareItsState) {
+  DaemonBed bed;
+  bed.connectAndConfigure("lanthe", 1);
+  bed.connectAndConfigure("lanthe", 2);
+  auto& manager = *bed.daemon.assembly().clientStateManager();
+  EXPECT_EQ(manager.states().size(), 1u);
+  EXPECT_EQ(manager.sessions().size(), 1u);
+  EXPECT_EQ(manager.sessions()[0].at("identifier"), "lanthe");
+}
+
+TEST(ClientStateManagerTest, RemembersClientsOnlyWhenToldTo) {
+  for (const bool persists : {false, true}) {
+    SCOPED_TRACE(persists);
+    FakePlatform fakes;
+    if (persists) fakes.settings.set("ZLKPersistSessions", true);
+    fakes.settings.set("sessions", json::array{{{"identifier", "brelin"}, {"agent", "Brelin/1"}},
+                                               {{"identifier", "silent"}},
+                                               7,
+                                               {{"agent", "nobody"}}});
+    Daemon daemon(fakes.platform());
+    daemon.start();
+    fakes.timeline.runUntilIdle();
+    auto& manager = *daemon.assembly().clientStateManager();
+    EXPECT_EQ(manager.states().size(), persists ? 2u : 0u);
+    EXPECT_EQ(manager.sessions().size(), persists ? 1u : 0u);
+    manager.stateForClientIdentifier("lanthe")->setUserAgent("Lanthe/9");
+    manager.saveState();
+    fakes.timeline.runUntilIdle();
+    EXPECT_EQ(fakes.settings.value("sessions")->as_array().size(), persists ? 2u : 4u);
+  }
+}
+
+TEST(EndpointTest, AdmitsTenAtATimeAndLetsTheNextWaitShortly) {
+  DaemonBed bed;
+  const auto address = bed.daemon.assembly().clientStateManager()->endpoint();
+  std::vector<DaemonBed::Client> clients;
+  for (int i = 0; i < 10; ++i) clients.push_back(bed.fakes.interprocess.connect(address));
+  bed.run();
+  const auto refused = bed.fakes.interprocess.connect(address);
+  bed.fakes.timeline.advance(99ms);
+  EXPECT_EQ(refused->state(), ipc::FakeClient::State::Deciding);
+  bed.fakes.timeline.advance(1ms);
+  EXPECT_EQ(refused->state(), ipc::FakeClient::State::Refused);
+  EXPECT_TRUE(bed.fakes.log.contains("endpoint semaphore timeout"));
+
+  const auto waiting = bed.fakes.interprocess.connect(address);
+  bed.fakes.timeline.advance(50ms);
+  clients.front()->disconnect();
+  bed.run();
+  EXPECT_EQ(waiting->state(), ipc::FakeClient::State::Open);
+  EXPECT_TRUE(bed.fakes.log.contains("endpoint connection invalidated"));
+}
+
+TEST(EndpointTest, KnowsOnlyClientsThatConfiguredThemselves) {
+  DaemonBed bed;
+  bed.connectAndConfigure("lanthe");
+  auto& manager = *bed.daemon.assembly().clientStateManager();
+  const auto client = bed.fakes.interprocess.connect(manager.endpoint());
+  bed.run();
+  const auto ask = [&](const std::string& kind, const std::string& identifier) {
+    auto answer = client->call(std::string(kEndpointInterface), "Request",
+                               {kind, ipc::Dictionary{{"queryId", std::int64_t{9}}},
+                                ipc::Dictionary{{"identifier", identifier}, {"userAgent", "x"}}});
+    bed.run();
+    return answer;
+  };
+  for (const auto* identifier : {"", "unknown"}) {
+    for (const auto* kind : {"search", "moreResults", "card", "zeroKeyword", "lookup",
+                             "flightLookup", "flightSearch"}) {
+      SCOPED_TRACE(kind);
+      const auto answer = ask(kind, identifier);
+      ASSERT_TRUE(answer->answered);
+      EXPECT_EQ(*answer->values[0].get<std::int64_t>(), 9);
+      EXPECT_THAT(reasonIn(*answer, 2), testing::StartsWith("invalid configuration {"));
+    }
+    EXPECT_FALSE(ask("nonsense", identifier)->answered);
+  }
+  EXPECT_TRUE(bed.fakes.log.contains("client session identifier cannot be nil or empty"));
+  EXPECT_FALSE(ask("search", "lanthe")->answered);
+  EXPECT_EQ(manager.states().size(), 1u);
+}
+
+TEST(DaemonTest, BuildsTheGraphAnnouncesItselfAndLeavesOnSignals) {
+  for (const auto& [number, text] : {std::pair{SIGTERM, "SIGTERM"}, {SIGINT, "SIGINT"}}) {
+    SCOPED_TRACE(text);
+    FakePlatform fakes;
+    int started = 0;
+    const auto observation = fakes.notificationCenter.observe(
+        std::string(kZLKStartup), [&](const Notification&) { ++started; });
+    Daemon daemon(fakes.platform());
+    EXPECT_FALSE(daemon.start());
+    EXPECT_EQ(started, 0);
+    fakes.timeline.runUntilIdle();
+    EXPECT_EQ(started, 1);
+    EXPECT_EQ(fakes.counters.all()["com.quenta.zelkord.launch"], 1);
+    EXPECT_TRUE(daemon.assembly().useMorvane());
+    EXPECT_TRUE(daemon.assembly().sharedSession());
+    EXPECT_EQ(fakes.urlSessions.find("bagSession")->tasks().size(), 1u);
+    fakes.signals.raise(number);
+    fakes.timeline.runUntilIdle();
+    EXPECT_EQ(fakes.process.exitStatus(), 0);
+    EXPECT_TRUE(fakes.log.contains(text));
+  }
+}
+
+TEST(DaemonTest, DoesNotServeWithoutItsName) {
+  FakePlatform fakes;
+  fakes.interprocess.setListenError(zelkorError(500, "taken"));
+  Daemon daemon(fakes.platform());
+  EXPECT_EQ(daemon.start(), zelkorError(500, "taken"));
+}
+
+TEST(DaemonTest, SetsTheSwitchesOfTheQuerySession) {
+  for (const bool noParallax : {false, true}) {
+    FakePlatform fakes;
+    fakes.settings.set("ZLKNoParallax", noParallax);
+    Assembly assembly(fakes.platform());
+    EXPECT_EQ(&assembly.urlSession(), &assembly.urlSession());
+    assembly.bagSession();
+    const auto& query = fakes.urlSessions.find("urlSession")->configuration();
+    EXPECT_EQ(query.tcpFastOpen, noParallax ? std::nullopt : std::optional(true));
+    EXPECT_EQ(query.tlsSessionTickets, noParallax ? std::nullopt : std::optional(true));
+    const auto& bag = fakes.urlSessions.find("bagSession")->configuration();
+    EXPECT_FALSE(bag.tcpFastOpen || bag.tlsSessionTickets || bag.cache);
+  }
+}
+
+TEST(DaemonTest, TracesOnlyWhenSwitchedOn) {
+  for (const bool enabled : {false, true}) {
+    FakePlatform fakes;
+    fakes.settings.set("TraceEnabled", enabled);
+    Daemon daemon(fakes.platform());
+    daemon.start();
+    fakes.timeline.runUntilIdle();
+    const auto client = fakes.interprocess.connect();
+    fakes.timeline.runUntilIdle();
+    client->call(std::string(kDaemonInterface), "Request", {"search", ipc::Dictionary{}});
+    fakes.timeline.runUntilIdle();
+    const auto expected =
+        enabled ? std::vector<std::uint32_t>{0x2B000004, 0x2B000008} : std::vector<std::uint32_t>{};
+    EXPECT_EQ(fakes.trace.take(), expected);
+    EXPECT_TRUE(fakes.log.contains(enabled ? "ZLKTraceEnabled flag set to 1"
+                                           : "ZLKTraceEnabled flag set to 0"));
+    fakes.interprocess.disconnectAll();
+    fakes.timeline.runUntilIdle();
+  }
+}
+
+TEST(ZelkorLoggingDeathTest, RefusesACategoryOutsideTheTable) {
+  RecordingLog log;
+  const ZelkorLogging logging(log);
+  EXPECT_EQ(ZelkorLogForCategory(logging, 9).category(), "Zelkor_LookUp");
+  EXPECT_EQ(ZelkorLogForCategory(logging, 18).category(), "Zelkor_Feedback_Storage");
+  EXPECT_DEATH(ZelkorLogForCategory(logging, 19), "category < ZelkorLoggingCategoryCount");
+}
+
+TEST(CommandLineTest, ReadsEachOptionAndRefusesTheRest) {
+  struct Case {
+    std::vector<std::string> arguments;
+    bool valid;
+  };
+  const std::vector<Case> cases = {
+      {{}, true},
+      {{"--log-file", "/tmp/x", "--log-level=debug", "--exit-when-idle", "2.5", "--clock-rate",
+        "100000"},
+       true},
+      {{"--no-session-bus", "--version"}, true},
+      {{"--log-level", "fault"}, false},
+      {{"--clock-rate", "0.5"}, false},
+      {{"--clock-rate", "100001"}, false},
+      {{"--clock-rate", "1e3"}, false},
+      {{"--clock-rate", "nan"}, false},
+      {{"--exit-when-idle", "inf"}, false},
+      {{"--exit-when-idle", "-1"}, false},
+      {{"--exit-when-idle"}, false},
+      {{"--log-file", ""}, false},
+      {{"--unknown"}, false},
+      {{"word"}, false},
+  };
+  for (const auto& [arguments, valid] : cases) {
+    SCOPED_TRACE(testing::PrintToString(arguments));
+    EXPECT_EQ(std::holds_alternative<CommandLine>(parseCommandLine(arguments)), valid);
+  }
+  const auto line =
+      std::get<CommandLine>(parseCommandLine({"--exit-when-idle", "2.5", "--log-level", "error"}));
+  EXPECT_EQ(line.exitWhenIdle, 2500ms);
+  EXPECT_EQ(line.logLevel, LogLevel::Error);
+}
+
+TEST(DiagnosticsTest, ReadsAndWritesSettingsAndTellsTheStatus) {
+  DaemonBed bed;
+  bed.installBag(kServedBag);
+  const auto client = bed.connectAndConfigure();
+  const auto ask = [&](const std::string& member, ipc::Values values) {
+    auto answer = client->call(std::string(kDiagnosticsInterface), member, std::move(values));
+    bed.run();
+    return answer;
+  };
+  EXPECT_TRUE(ask("WriteDefault", {"", "ZLKNoParallax", "true"})->succeeded());
+  EXPECT_EQ(
+      *ask("ReadDefault", {"com.quenta.zelkord", "ZLKNoParallax"})->values[0].get<std::string>(),
+      "true");
+  EXPECT_TRUE(ask("WriteDefault", {"", "ZLKNoParallax", ""})->succeeded());
+  EXPECT_EQ(*ask("ReadDefault", {"", "ZLKNoParallax"})->values[0].get<std::string>(), "");
+  EXPECT_EQ(ask("WriteDefault", {"", "key", "{"})->errorName, ipc::kInvalidArgs);
+  EXPECT_EQ(ask("Metrics", {})->values[0].get<ipc::IntegerMap>()->at("com.quenta.zelkord.launch"),
+            1);
+  const auto status = parseJson(*ask("Status", {})->values[0].get<std::string>())->as_object();
+  EXPECT_EQ(status.at("connections").as_array().size(), 1u);
+  EXPECT_EQ(status.at("bag").at("version"), "4");
+  EXPECT_EQ(status.at("transactions").as_array(), (json::array{"bagFetch", "clientConnection"}));
+}
+
+}  // namespace
+}  // namespace zelkord

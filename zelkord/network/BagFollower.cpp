@@ -1,0 +1,40 @@
+#include "zelkord/network/BagFollower.h"
+
+#include <utility>
+
+#include "zelkord/assembly/Assembly.h"
+#include "zelkord/network/LocationController.h"
+#include "zelkord/network/NotificationNames.h"
+#include "zelkord/network/VisibilityRestrictions.h"
+
+namespace zelkord {
+
+BagFollower::BagFollower(Assembly& assembly, std::shared_ptr<RequestContextStore> context,
+                         std::shared_ptr<LocationController> location)
+    : assembly_(assembly),
+      context_(std::move(context)),
+      location_(std::move(location)),
+      restrictions_(std::make_shared<VisibilityRestrictions>(assembly)) {}
+
+BagFollower::~BagFollower() = default;
+
+void BagFollower::start() {
+  observer_ = assembly_.notificationCenter().observe(
+      std::string(kZLKBagChangeNotification),
+      [weak = weak_from_this()](const Notification& notification) {
+        const auto self = weak.lock();
+        const auto* bag = notification.value<std::shared_ptr<const ZLKBag>>("bag");
+        if (self && bag && *bag) self->_didGetBag(*bag);
+      });
+}
+
+void BagFollower::_didGetBag(const std::shared_ptr<const ZLKBag>& bag) {
+  const auto sources = bag->supportedGeoLocationSources();
+  context_->update(
+      [sources](RequestContext& context) { context.location.supportedSources = sources; });
+  if (!locationIsSetUp_.exchange(true)) location_->setupLocationServices(!sources.empty());
+  restrictions_->update(bag);
+  assembly_.platform().networkProxy.setConfiguration(bag->morvaneConfiguration(), "zelkord");
+}
+
+}  // namespace zelkord

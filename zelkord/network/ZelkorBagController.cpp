@@ -1,0 +1,285 @@
+#include "zelkord/network/ZelkorBagController.h"
+
+#include <utility>
+
+#include "base/Text.h"
+#include "corezelkor/Constants.h"
+#include "zelkord/assembly/Assembly.h"
+#include "zelkord/network/BagFetchFeedback.h"
+#include "zelkord/network/BagRefreshRule.h"
+#include "zelkord/network/BagRequests.h"
+#include "zelkord/network/BagResponse.h"
+#include "zelkord/network/NotificationNames.h"
+#include "zelkord/network/RequestLogText.h"
+#include "zelkord/network/URLComponents.h"
+#include "zelkord/network/UserAgent.h"
+#include "zelkord/network/ZLKRetryableNetworkRequest.h"
+
+namespace zelkord {
+namespace {
+
+constexpr unsigned kBagFetchRetries = 5;
+constexpr std::string_view kBagURLSetting = "ZLKBagURL";
+
+// How the news application sees a bag; the numbers are what the log says.
+enum class NewsState : unsigned { Disabled = 0, Enabled = 1, Unknown = 2 };
+
+NewsState newsState(const BagPointer& bag) {
+  if (!bag) return NewsState::Unknown;
+  return ZLKBag(bag->rawBag(), "news/1.0").isEnabled() ? NewsState::Enabled : NewsState::Disabled;
+}
+
+// The version as an installed bag with that value would tell it; none unless it is a number.
+std::optional<std::string> reportedVersion(const json::object& response) {
+  if (!numberIn(response, "bag")) return std::nullopt;
+  auto bag = std::make_shared<json::object>();
+  (*bag)["version"] = response.at("bag");
+  auto version = ZLKBag(std::move(bag), std::nullopt).version();
+  return version && !version->empty() ? std::move(version) : std::nullopt;
+}
+
+}  // namespace
+
+// What a fetch keeps until it has ended.
+struct ZelkorBagController::Fetch {
+  Transaction transaction;
+  BagFetchFeedback feedback;
+  FetchCallback callback;
+};
+
+ZelkorBagController::ZelkorBagController(Assembly& assembly, BagRequests& requests)
+    : assembly_(assembly),
+      requests_(requests),
+      disk_(assembly),
+      userAgent_(zelkordUserAgent(assembly.platform().device)),
+      inMemoryBagCacheAccessQueue_(assembly.platform().queues.makeConcurrentQueue(
+          "com.quenta.zelkord.bagcontroller.cacheaccess")),
+      cacheURL_(assembly, requests) {}
+
+ZelkorBagController::~ZelkorBagController() = default;
+
+void ZelkorBagController::start() {
+  if (auto dictionary = diskCachedBagDictionary()) {
+    cacheBagState(std::make_shared<const ZLKBag>(std::move(dictionary), userAgent_),
+                  BagOrigin::Disk);
+  }
+  refreshRequired_ = assembly_.notificationCenter().observe(
+      std::string(kZLKBagRefreshRequired),
+      [weak = weak_from_this()](const Notification&) {
+        if (const auto self = weak.lock()) self->_handleRefreshNotification();
+      },
+      &requests_);
+}
+
+std::string ZelkorBagController::bagFetchURLWithCountry(std::string_view country) const {
+  auto chosen = stringSetting(assembly_.userDefaults(), kBagURLSetting);
+  if (!chosen.empty()) {
+    if (URLComponents::parse(chosen)) return chosen;
+    assembly_.log(Category::Bag)
+        .error("Malformed zelkor bag URL in user defaults key {}", kBagURLSetting);
+  }
+  return uppercased(country) == "CN" ? ZK_BAG_URL_CN : ZK_BAG_URL;
+}
+
+BagPointer ZelkorBagController::currentBag() {
+  auto bag = cachedBagState();
+  if (!bag) _fetchBagStateWithVersion(std::nullopt);
+  return bag;
+}
+
+BagPointer ZelkorBagController::cachedBagState() {
+  auto bag = inMemoryBag();
+  if (bag && _isRefreshRequiredForCachedBag(bag->rawBag().get())) {
+    auto& queue = assembly_.platform().queues.global(QualityOfService::Default);
+    queue.async([weak = weak_from_this()] {
+      if (const auto self = weak.lock()) self->_fetchBagStateWithVersion(std::nullopt);
+    });
+  }
+  return bag;
+}
+
+BagPointer ZelkorBagController::inMemoryBag() const {
+  BagPointer bag;
+  inMemoryBagCacheAccessQueue_->sync([this, &bag] {
+    inMemoryBagCacheAccessQueue_->assertReading();
+    bag = inMemoryBag_;
+  });
+  return bag;
+}
+
+std::optional<std::string> ZelkorBagController::warmURL() {
+  const auto bag = currentBag();
+  return bag ? bag->warmURL() : std::nullopt;
+}
+
+void ZelkorBagController::forceFetchBag(const json::object& response) {
+  const auto bag = inMemoryBag();
+  const auto reported = reportedVersion(response);
+  if (!reported) return;
+  const auto current = bag ? bag->version() : std::nullopt;
+  if (!current || compareNumerically(*current, *reported) < 0) _fetchBagStateWithVersion(reported);
+}
+
+void ZelkorBagController::cacheBagState(BagPointer bag, BagOrigin origin) {
+  if (!bag) return;
+  inMemoryBagCacheAccessQueue_->barrierSync([this, &bag, origin] { _install(bag, origin); });
+}
+
+void ZelkorBagController::_install(const BagPointer& bag, BagOrigin origin) {
+  inMemoryBagCacheAccessQueue_->assertBarrier();
+  // The fetch that a due file begins may be faster than its own installation.
+  if (origin == BagOrigin::Disk && inMemoryBag_) return;
+  const auto oldState = newsState(inMemoryBag_);
+  const auto newState = newsState(bag);
+  inMemoryBag_ = bag;
+  assembly_.notificationCenter().post(
+      {std::string(kZLKBagChangeNotification), nullptr, {{"bag", bag}}});
+  if (oldState == newState || origin == BagOrigin::Disk) return;
+  assembly_.log(Category::Bag)
+      .info("setting Zelkor News Available status to {}", static_cast<unsigned>(newState));
+  assembly_.platform().systemNotifications.post(
+      newState == NewsState::Enabled ? kZLKNotifyEnabled : kZLKNotifyDisabled);
+}
+
+std::shared_ptr<const json::object> ZelkorBagController::cacheBagDictionary(
+    json::object dictionary) {
+  auto cached = std::make_shared<const json::object>(_dictionaryToCacheBag(std::move(dictionary)));
+  disk_.write(*cached);
+  return cached;
+}
+
+json::object ZelkorBagController::_dictionaryToCacheBag(json::object dictionary) {
+  const auto now = assembly_.platform().clock.wallNow();
+  dictionary[kBagExpirationKey] = secondsSince1970(now) + secondsOf(kBagLifetime);
+  dictionary[kBagURLKey] = *cacheURL_.get(*this, userAgent_);
+  return dictionary;
+}
+
+std::shared_ptr<const json::object> ZelkorBagController::diskCachedBagDictionary() {
+  auto dictionary = disk_.read();
+  if (!dictionary) return nullptr;
+  if (_isRefreshRequiredForCachedBag(&*dictionary)) _fetchBagStateWithVersion(std::nullopt);
+  return std::make_shared<const json::object>(std::move(*dictionary));
+}
+
+bool ZelkorBagController::_isRefreshRequiredForCachedBag(const json::object* dictionary) {
+  using Reason = BagRefreshDecision::Reason;
+  const auto& log = assembly_.log(Category::Bag);
+  std::shared_ptr<const std::string> url;
+  const auto decision =
+      decideBagRefresh(dictionary, assembly_.platform().clock.wallNow(), [this, &url] {
+        url = cacheURL_.get(*this, userAgent_);
+        return std::string_view(*url);
+      });
+  switch (decision.reason) {
+    case Reason::Disabled:
+      log.debug("Bag refresh is disabled.");
+      break;
+    case Reason::Expired:
+      log.info("bag expired: {:f}", decision.remaining);
+      assembly_.reporter().addValue(1, "com.quenta.zelkord.bag.expired");
+      break;
+    case Reason::URLChanged:
+      if (log.isEnabled(LogLevel::Info)) {
+        const bool shows = assembly_.platform().log.showsPrivateData();
+        log.info("bag url changed from: {} to {}", urlForLog(decision.storedURL, shows),
+                 urlForLog(*url, shows));
+      }
+      break;
+    case Reason::NoURL:
+      log.info("no bag URL found in cache");
+      break;
+    case Reason::UpToDate:
+      break;
+  }
+  return decision.isRequired();
+}
+
+void ZelkorBagController::_handleRefreshNotification() {
+  assembly_.log(Category::Bag)
+      .info("something significant changed (locale, geo). checking to see if bag needs update");
+  const auto bag = inMemoryBag();
+  if (_isRefreshRequiredForCachedBag(bag ? bag->rawBag().get() : nullptr)) {
+    _fetchBagStateWithVersion(std::nullopt);
+  }
+}
+
+void ZelkorBagController::_fetchBagStateWithVersion(const std::optional<std::string>& version) {
+  if (fetchInProgress_.exchange(true)) return;
+  _fetchBagStateWithVersion(version, nullptr);
+}
+
+void ZelkorBagController::_fetchBagStateWithVersion(const std::optional<std::string>& version,
+                                                    FetchCallback callback) {
+  auto transaction = assembly_.platform().transactions.open("bagFetch");
+  auto request = requests_.bagFetchRequest(*this, userAgent_, version);
+  _logRequest(request);
+  auto fetch = std::make_shared<Fetch>(Fetch{std::move(transaction),
+                                             BagFetchFeedback(assembly_, request, userAgent_),
+                                             std::move(callback)});
+  _taskOf(std::move(request), std::move(fetch))->resume();
+}
+
+std::shared_ptr<URLTask> ZelkorBagController::_taskOf(URLRequest request,
+                                                      std::shared_ptr<Fetch> fetch) {
+  auto completion = [weak = weak_from_this(), log = assembly_.log(Category::Bag),
+                     fetch = std::move(fetch)](const std::shared_ptr<URLTask>& task,
+                                               const URLResult& result) {
+    if (const auto self = weak.lock()) {
+      self->_finishFetch(*fetch, *task, result);
+    } else {
+      log.error(
+          "Error fetching bag, bag fetch task completed after BagFetchController was cleaned up");
+    }
+    fetch->transaction.reset();
+  };
+  const auto retryable = std::make_shared<const ZLKRetryableNetworkRequest>(
+      ZLKRetryableNetworkRequest{std::move(request), std::nullopt, true});
+  const auto& platform = assembly_.platform();
+  return dataTaskWithRetryableRequest(assembly_.bagSession(), retryable, 1, kBagFetchRetries,
+                                      std::move(completion), {platform.clock, platform.queues});
+}
+
+void ZelkorBagController::_finishFetch(Fetch& fetch, const URLTask& task, const URLResult& result) {
+  _logResponse(result);
+  fetch.feedback.recordEnd(result, task.timingData());
+  auto response =
+      readBagResponse(result, maximumBagSize(assembly_.userDefaults()),
+                      assembly_.log(Category::Bag), assembly_.platform().log.showsPrivateData());
+  BagPointer bag;
+  if (response.dictionary) {
+    bag = std::make_shared<const ZLKBag>(cacheBagDictionary(std::move(*response.dictionary)),
+                                         userAgent_);
+    cacheBagState(bag, BagOrigin::Network);
+    assembly_.reporter().addValue(1, "com.quenta.zelkord.bag.fetches");
+  } else {
+    _failFetch(fetch, *response.error);
+  }
+  fetch.feedback.sessionComplete();
+  if (fetch.callback) fetch.callback(bag, response.error);
+  fetchInProgress_ = false;
+}
+
+void ZelkorBagController::_failFetch(Fetch& fetch, const Error& error) {
+  fetch.feedback.recordError(error);
+  assembly_.notificationCenter().post(
+      {std::string(kZLKBagChangeNotification), nullptr, {{"bagError", error}}});
+  assembly_.reporter().addValue(1, "com.quenta.zelkord.bag.fetchesfailed");
+}
+
+void ZelkorBagController::_logRequest(const URLRequest& request) const {
+  const auto& log = assembly_.log(Category::Bag);
+  if (!log.isEnabled(LogLevel::Info)) return;
+  const auto url = urlForLog(request.url, assembly_.platform().log.showsPrivateData());
+  log.info("Initiating bag fetch attempt with request {} header {}", url,
+           priv(headersForLog(request.headers)));
+}
+
+void ZelkorBagController::_logResponse(const URLResult& result) const {
+  const auto& log = assembly_.log(Category::Bag);
+  if (!log.isEnabled(LogLevel::Debug)) return;
+  log.debug("resp: {}",
+            responseForLog(result.response, assembly_.platform().log.showsPrivateData()));
+}
+
+}  // namespace zelkord

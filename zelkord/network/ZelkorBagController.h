@@ -1,0 +1,103 @@
+#pragma once
+
+#include <atomic>
+#include <functional>
+#include <memory>
+#include <optional>
+#include <string>
+#include <string_view>
+
+#include "base/Error.h"
+#include "base/Json.h"
+#include "corezelkor/ZLKBag.h"
+#include "platform/api/URLSession.h"
+#include "platform/api/WorkQueue.h"
+#include "zelkord/network/BagCacheURL.h"
+#include "zelkord/network/BagDiskCache.h"
+
+namespace zelkord {
+
+class Assembly;
+class BagFetchFeedback;
+class BagRequests;
+
+using BagPointer = std::shared_ptr<const ZLKBag>;
+
+enum class BagOrigin { Network, Disk };
+
+// Owns the bag: fetches it, keeps it on disk, and has it fetched anew when it nears its end, when
+// its URL changes, when the device's context does, or when the service reports a newer version.
+//
+// No bag, a bag, or a bag that is due (the next read begins a fetch). At most one fetch is under
+// way; further ones asked for meanwhile are dropped. The installed bag serves until another
+// replaces it: a failed fetch changes nothing, and nothing but the next read repeats it.
+//
+// Each install posts "ZLKBagChangeNotification" with "bag", each failed fetch one with "bagError".
+// A bag from the network that changes whether news is available posts that system-wide.
+//
+// Threading: every operation on any thread but the request factory's queue. Observers of an install
+// run in its exclusive task: they ask this controller nothing, and wait for nobody who might.
+// Ownership: the assembly and the request factory outlive it. A fetch holds it weakly.
+// Errors: logged; a fetch's also counted, posted and recorded as feedback.
+class ZelkorBagController final : public std::enable_shared_from_this<ZelkorBagController> {
+ public:
+  ZelkorBagController(Assembly& assembly, BagRequests& requests);
+  ~ZelkorBagController();
+
+  // Loads the bag on disk and listens to the request factory; once, right after construction.
+  void start();
+
+  // Where a device in that country (ISO code, any case) gets the bag from.
+  std::string bagFetchURLWithCountry(std::string_view country) const;
+
+  // Null while there is none; a fetch is then under way.
+  BagPointer currentBag();
+  // The same without beginning the first fetch.
+  BagPointer cachedBagState();
+  // The same without looking whether it is due.
+  BagPointer inMemoryBag() const;
+  std::optional<std::string> warmURL();
+
+  // What the service says it serves: {"bag": version}. Fetches when that is newer.
+  void forceFetchBag(const json::object& response);
+
+  // Null is ignored. A bag from disk never replaces one that is installed.
+  void cacheBagState(BagPointer bag, BagOrigin origin);
+  // Adds the daemon's keys, writes the file, returns what it wrote.
+  std::shared_ptr<const json::object> cacheBagDictionary(json::object dictionary);
+  // The file's content, null when there is none; begins a fetch when it is due.
+  std::shared_ptr<const json::object> diskCachedBagDictionary();
+
+ private:
+  using FetchCallback = std::function<void(const BagPointer&, const std::optional<Error>&)>;
+  struct Fetch;
+
+  bool _isRefreshRequiredForCachedBag(const json::object* dictionary);
+  json::object _dictionaryToCacheBag(json::object dictionary);
+  void _handleRefreshNotification();
+  void _fetchBagStateWithVersion(const std::optional<std::string>& version);
+  void _fetchBagStateWithVersion(const std::optional<std::string>& version, FetchCallback callback);
+  std::shared_ptr<URLTask> _taskOf(URLRequest request, std::shared_ptr<Fetch> fetch);
+  void _finishFetch(Fetch& fetch, const URLTask& task, const URLResult& result);
+  void _failFetch(Fetch& fetch, const Error& error);
+  void _install(const BagPointer& bag, BagOrigin origin);
+  void _logRequest(const URLRequest& request) const;
+  void _logResponse(const URLResult& result) const;
+
+  // Fixed after construction.
+  Assembly& assembly_;
+  BagRequests& requests_;
+  const BagDiskCache disk_;
+  const std::optional<std::string> userAgent_;
+  const std::unique_ptr<ConcurrentQueue> inMemoryBagCacheAccessQueue_;
+  Subscription refreshRequired_;  // set by `start`
+
+  // Own synchronisation.
+  std::atomic<bool> fetchInProgress_ = false;
+  BagCacheURL cacheURL_;
+
+  // Queue state: replaced in exclusive tasks only.
+  BagPointer inMemoryBag_ ZK_ON(inMemoryBagCacheAccessQueue_);
+};
+
+}  // namespace zelkord

@@ -1,0 +1,51 @@
+#include "zelkord/network/ZelkorUserGUIDController.h"
+
+#include <array>
+
+#include "zelkord/assembly/Assembly.h"
+#include "zelkord/network/NotificationNames.h"
+
+namespace zelkord {
+namespace {
+
+constexpr Duration kUserGUIDLifetime = 900s;
+
+}  // namespace
+
+ZelkorUserGUIDController::ZelkorUserGUIDController(Assembly& assembly)
+    : assembly_(assembly),
+      queue_(assembly.platform().queues.makeSerialQueue("com.quenta.zelkor.guid")),
+      lastKnownUserGUID_(_randomUUID()),
+      lastKnownUserGUIDExpirationDate_(assembly.platform().clock.now() + kUserGUIDLifetime) {}
+
+UUID ZelkorUserGUIDController::currentUserGUID() {
+  UUID current;
+  queue_->sync([this, &current] {
+    queue_->assertCurrent();
+    if (assembly_.platform().clock.now() >= lastKnownUserGUIDExpirationDate_) _rollGUID();
+    current = lastKnownUserGUID_;
+  });
+  return current;
+}
+
+void ZelkorUserGUIDController::reset() {
+  queue_->async([this] { _rollGUID(); });
+}
+
+UUID ZelkorUserGUIDController::_randomUUID() const {
+  std::array<std::uint8_t, 16> bytes{};
+  assembly_.platform().random.fill(bytes.data(), bytes.size());
+  return UUID::fromRandomBytes(bytes);
+}
+
+void ZelkorUserGUIDController::_rollGUID() {
+  queue_->assertCurrent();
+  lastKnownUserGUID_ = _randomUUID();
+  lastKnownUserGUIDExpirationDate_ = assembly_.platform().clock.now() + kUserGUIDLifetime;
+  queue_->async([&assembly = assembly_] {
+    assembly.reporter().addValue(1, "com.quenta.zelkord.userguid");
+    assembly.notificationCenter().post(std::string(kZLKUserGUIDChangeNotification));
+  });
+}
+
+}  // namespace zelkord

@@ -1,0 +1,144 @@
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include "zelkord/feedback/UserGUIDSource.h"
+#include "zelkord/network/NotificationNames.h"
+#include "zelkord/query/ClientShortName.h"
+#include "zelkord/query/ClientState.h"
+#include "zelkord/query/QueryCache.h"
+#include "zelkord/query/QueryTestSupport.h"
+
+namespace zelkord {
+namespace {
+
+TEST(ClientShortNameTest, IsTheFirstKnownNameInTheIdentifier) {
+  const std::vector<std::pair<std::string, std::optional<std::string>>> cases = {
+      {"lanthe", "lanthe"},       {"com.quenta.BRELIN", "brelin"}, {"news-brelin", "brelin"},
+      {"zelkordtool", "zelkord"}, {"other", std::nullopt},         {"", std::nullopt}};
+  for (const auto& [identifier, expected] : cases)
+    EXPECT_EQ(clientShortName(identifier), expected) << identifier;
+}
+
+class ClientStateTest : public testing::Test {
+ protected:
+  struct BagAnswer {
+    int count = 0;
+    std::shared_ptr<const ZLKBag> bag;
+    std::optional<Error> error;
+  };
+  BagAnswer askForBag(ClientState& state, const std::optional<std::string>& userAgent) {
+    BagAnswer answer;
+    state.bag(userAgent, [&](auto bag, auto error) { answer = {answer.count + 1, bag, error}; });
+    return answer;
+  }
+
+  QueryBed bed_;
+};
+
+TEST_F(ClientStateTest, SeesTheBagWithItsOwnUserAgent) {
+  bed_.installBag(R"({"enabled":true,"agents":{"brelin":{"enabled":false}}})");
+  const auto state = bed_.makeState("brelin", "Brelin/2");
+  EXPECT_FALSE(askForBag(*state, "Brelin/2").bag->isEnabled());
+  EXPECT_TRUE(askForBag(*state, "Other/1").bag->isEnabled());
+  EXPECT_EQ(state->userAgent(), "Other/1");
+}
+
+TEST_F(ClientStateTest, WaitsASecondForABagAndIsWokenByOne) {
+  const auto state = bed_.makeState();
+  const auto begin = bed_.fakes.timeline.now();
+  EXPECT_EQ(askForBag(*state, std::nullopt).error, zelkorError(1, "timeout"));
+  EXPECT_EQ(bed_.fakes.timeline.now() - begin, 1s);
+
+  const auto arrival = bed_.fakes.timeline.global(QualityOfService::Default).after(300ms, [&] {
+    bed_.assembly.bagController()->cacheBagState(
+        std::make_shared<const ZLKBag>(std::make_shared<const json::object>(), "daemon"),
+        BagOrigin::Network);
+  });
+  const auto second = bed_.fakes.timeline.now();
+  EXPECT_TRUE(askForBag(*state, std::nullopt).bag);
+  EXPECT_EQ(bed_.fakes.timeline.now() - second, 300ms);
+}
+
+TEST_F(ClientStateTest, AFetchThatFailsEndsTheWait) {
+  const auto state = bed_.makeState();
+  const auto failure = bed_.fakes.timeline.global(QualityOfService::Default).after(200ms, [&] {
+    bed_.fakes.urlSessions.find("bagSession")->tasks().back()->succeed(500, "");
+  });
+  const auto begin = bed_.fakes.timeline.now();
+  EXPECT_EQ(askForBag(*state, std::nullopt).error, zelkorError(1, "timeout"));
+  EXPECT_EQ(bed_.fakes.timeline.now() - begin, 200ms);
+}
+
+TEST_F(ClientStateTest, WithoutAUserAgentThereIsNoBag) {
+  bed_.installBag(kTestBag);
+  const auto state = std::make_shared<ClientState>("lanthe", bed_.assembly);
+  EXPECT_EQ(askForBag(*state, std::nullopt).error, zelkorError(1, "no UserAgent"));
+  EXPECT_EQ(askForBag(*state, "").error, zelkorError(1, "no UserAgent"));
+}
+
+TEST_F(ClientStateTest, ANewUserAgentEmptiesTheCache) {
+  bed_.installBag(kTestBag);
+  const auto state = bed_.makeState();
+  bed_.search(*state, "s");
+  bed_.urlSession().tasks().back()->succeed(200, R"([{"query":"snow"}])");
+  bed_.fakes.timeline.runUntilIdle();
+  ASSERT_EQ(state->queryCache()->count(), 1u);
+  state->adoptUserAgent("Lanthe/9");
+  bed_.fakes.timeline.runUntilIdle();
+  EXPECT_EQ(state->queryCache()->count(), 1u);
+  state->adoptUserAgent("Lanthe/10");
+  bed_.fakes.timeline.runUntilIdle();
+  EXPECT_EQ(state->queryCache()->count(), 0u);
+}
+
+TEST_F(ClientStateTest, WarmsOnceInThirtySeconds) {
+  const auto state = bed_.makeState();
+  state->warm();  // no bag yet
+  EXPECT_TRUE(bed_.urlSession().tasks().empty());
+  bed_.installBag(kTestBag);
+  state->warm();
+  bed_.fakes.timeline.advance(29s);
+  state->warm();
+  EXPECT_EQ(bed_.urlSession().tasks().size(), 1u);
+  bed_.fakes.timeline.advance(1s);
+  state->warm();
+  ASSERT_EQ(bed_.urlSession().tasks().size(), 2u);
+  EXPECT_EQ(bed_.urlSession().tasks()[0]->request().url, "https://search.example/w");
+  bed_.urlSession().tasks()[0]->succeed(204);
+  bed_.fakes.timeline.runUntilIdle();
+  EXPECT_EQ(bed_.recordedClasses().back(), "HVEndNetworkSearchFeedback");
+  const auto records = bed_.records();
+  EXPECT_FALSE(records.back().userGuid);
+  EXPECT_THAT(*records.back().userAgent, testing::StartsWith("Zelkord/1.0 ("));
+}
+
+TEST_F(ClientStateTest, MessagesAskForRequestsWithoutLocation) {
+  for (const auto& [agent, mask] : std::vector<std::pair<std::string, FieldMask>>{
+           {"Lanthe/9", kFieldMaskNone}, {"com.quenta.MESSAGES/2", kFieldMaskWithholdLocation}}) {
+    EXPECT_EQ(bed_.makeState("x", agent)->fieldMask(), mask) << agent;
+  }
+}
+
+TEST_F(ClientStateTest, IndividualSessionsHaveTheirOwnIdentifier) {
+  const auto shared = bed_.makeState();
+  EXPECT_EQ(&shared->guidController(), bed_.assembly.guidController());
+  bed_.assembly.setSharedSession(false);
+  const auto own = bed_.makeState("brelin");
+  EXPECT_NE(own->guidController().currentUserGUID(), shared->guidController().currentUserGUID());
+  EXPECT_EQ(own->sessionManager().identifier(), "brelin");
+}
+
+TEST_F(ClientStateTest, TheCacheCanBeSwitchedOff) {
+  bed_.fakes.settings.set("ZLKNoQueryCache", true);
+  bed_.installBag(kTestBag);
+  const auto state = bed_.makeState();
+  EXPECT_EQ(state->queryCache(), nullptr);
+  EXPECT_TRUE(bed_.fakes.log.contains("query cache OFF for lanthe"));
+  bed_.search(*state, "s");
+  bed_.urlSession().tasks().back()->succeed(200, R"([{"query":"snow"}])");
+  bed_.fakes.timeline.runUntilIdle();
+  EXPECT_EQ(bed_.search(*state, "sn")->count, 0);
+}
+
+}  // namespace
+}  // namespace zelkord

@@ -1,0 +1,293 @@
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include "zelkord/feedback/DaemonFeedback.h"
+#include "zelkord/network/NotificationNames.h"
+#include "zelkord/query/QueryCache.h"
+#include "zelkord/query/QueryTestSupport.h"
+#include "zelkord/query/SearchFlow.h"
+
+namespace zelkord {
+namespace {
+
+using testing::ElementsAre;
+
+constexpr const char* kOneResultSet =
+    R"([{"status":"OK","query":"snowman","completion_score":0.5,"fbq":"f","partial_client_ip":"10.0","duration":12.5,"results":[]}])";
+
+class SearchFlowTest : public testing::Test {
+ protected:
+  FakeURLTask& lastTask() { return *bed_.urlSession().tasks().back(); }
+  void answer(int status, const std::string& body, HTTPHeaders headers = {}) {
+    lastTask().succeed(status, body, std::move(headers));
+    bed_.fakes.timeline.runUntilIdle();
+  }
+
+  QueryBed bed_;
+};
+
+TEST_F(SearchFlowTest, HandsTheServicesBytesToTheClientAndRecordsBothEnds) {
+  bed_.installBag(kTestBag);
+  const auto state = bed_.makeState();
+  const auto answered = bed_.search(*state, "snow", 7);
+  ASSERT_EQ(answered->count, 0);
+  answer(200, kOneResultSet);
+
+  ASSERT_EQ(answered->count, 1);
+  EXPECT_EQ(answered->queryId, 7);
+  ASSERT_TRUE(answered->reply);
+  EXPECT_EQ(answered->reply->data.view(), kOneResultSet);
+  EXPECT_FALSE(answered->error);
+  EXPECT_FALSE(answered->reply->httpRequest);
+  EXPECT_THAT(bed_.recordedClasses(),
+              ElementsAre("HVStartNetworkSearchFeedback", "ZLKEndNetworkSearchFeedback"));
+  const auto records = bed_.records();
+  const auto& end = dynamic_cast<const ZLKEndNetworkSearchFeedback&>(*records[1].feedback);
+  EXPECT_EQ(end.zelkorStatus, "OK");
+  EXPECT_EQ(end.fbq, "f");
+  EXPECT_EQ(end.partialClientIp, "10.0");
+  EXPECT_EQ(end.zelkorDuration, 12.5);
+  EXPECT_EQ(end.statusCode, 200);
+  EXPECT_EQ(bed_.counter("com.quenta.zelkord.search"), 1);
+  EXPECT_EQ(bed_.counter("com.quenta.zelkord.lanthe.keystrokes"), 1);
+  EXPECT_EQ(bed_.counter("com.quenta.zelkord.lanthe.fedapicall.serverstatus.200"), 1);
+}
+
+// Every way in which a search ends without a result set.
+TEST_F(SearchFlowTest, AnswersEachFailureWithItsErrorAndRecords) {
+  struct Case {
+    const char* name;
+    const char* bag;  // null: none
+    const char* text;
+    std::function<void(FakeURLTask&)> service;
+    std::optional<Error> error;
+    bool hasReply;
+    std::vector<std::string> records;
+  };
+  const auto transport = urlError(URLErrorCode::TimedOut);
+  const std::vector<Case> cases = {
+      {"no bag",
+       nullptr,
+       "snow",
+       nullptr,
+       zelkorError(1, "timeout"),
+       false,
+       {"ZLKSkipSearchFeedback"}},
+      {"bag disabled",
+       R"({"enabled":false})",
+       "snow",
+       nullptr,
+       std::nullopt,
+       false,
+       {"ZLKSkipSearchFeedback"}},
+      {"too short",
+       R"({"minimum_query_length":3})",
+       "sn",
+       nullptr,
+       std::nullopt,
+       false,
+       {"ZLKSkipSearchFeedback"}},
+      {"no URL", R"({"version":"1"})", "snow", nullptr, zelkorError(1, "no URL"), false, {}},
+      {"transport error",
+       kTestBag,
+       "snow",
+       [&](FakeURLTask& task) { task.fail(transport); },
+       transport,
+       false,
+       {"HVStartNetworkSearchFeedback", "HVErrorFeedback", "HVEndNetworkSearchFeedback"}},
+      {"not HTTP",
+       kTestBag,
+       "snow",
+       [](FakeURLTask& task) { task.nonHTTP("x"); },
+       zelkorError(500, "invalid response class"),
+       false,
+       {"HVStartNetworkSearchFeedback", "HVErrorFeedback", "HVEndNetworkSearchFeedback"}},
+      {"not JSON",
+       kTestBag,
+       "snow",
+       [](FakeURLTask& task) { task.succeed(200, "{broken"); },
+       std::nullopt,
+       true,
+       {"HVStartNetworkSearchFeedback", "HVEndNetworkSearchFeedback"}},
+      {"an object",
+       kTestBag,
+       "snow",
+       [](FakeURLTask& task) { task.succeed(200, "{}"); },
+       std::nullopt,
+       true,
+       {"HVStartNetworkSearchFeedback", "HVEndNetworkSearchFeedback"}},
+      {"status 500",
+       kTestBag,
+       "snow",
+       [](FakeURLTask& task) { task.succeed(500, "[]"); },
+       std::nullopt,
+       true,
+       {"HVStartNetworkSearchFeedback", "HVEndNetworkSearchFeedback"}},
+  };
+  for (const auto& wanted : cases) {
+    SCOPED_TRACE(wanted.name);
+    QueryBed bed;
+    if (wanted.bag) bed.installBag(wanted.bag);
+    const auto state = bed.makeState();
+    const auto answered = bed.search(*state, wanted.text, 3);
+    if (wanted.service) {
+      wanted.service(*bed.urlSession().tasks().back());
+      bed.fakes.timeline.runUntilIdle();
+    }
+    EXPECT_EQ(answered->count, 1);
+    EXPECT_EQ(answered->queryId, 3);
+    EXPECT_EQ(answered->error, wanted.error);
+    EXPECT_EQ(answered->reply.has_value(), wanted.hasReply);
+    EXPECT_EQ(bed.recordedClasses(), wanted.records);
+    EXPECT_EQ(state->queryCache()->count(), 0u);
+  }
+}
+
+TEST_F(SearchFlowTest, TellsWhyAQueryWasSkipped) {
+  const std::vector<std::pair<const char*, std::uint32_t>> cases = {
+      {R"({"minimum_query_length":5})", 1}, {R"({"enabled":false})", 2}, {nullptr, 3}};
+  for (const auto& [bag, reason] : cases) {
+    SCOPED_TRACE(reason);
+    QueryBed bed;
+    if (bag) bed.installBag(bag);
+    bed.search(*bed.makeState(), "snow");
+    const auto records = bed.records();
+    ASSERT_EQ(records.size(), 1u);
+    const auto& skip = dynamic_cast<const ZLKSkipSearchFeedback&>(*records[0].feedback);
+    EXPECT_EQ(skip.triggerEvent, reason);
+    EXPECT_EQ(skip.input, "snow");
+    EXPECT_TRUE(records[0].userGuid);
+  }
+}
+
+TEST_F(SearchFlowTest, CountsTheLengthOfAQueryInUtf16Units) {
+  bed_.installBag(R"({"search_url":"https://s.example/","minimum_query_length":2})");
+  const auto state = bed_.makeState();
+  EXPECT_EQ(bed_.search(*state, "\xC3\xA9")->count, 1);          // one unit: too short
+  EXPECT_EQ(bed_.search(*state, "\xF0\x9F\x98\x80")->count, 0);  // a surrogate pair: sent
+}
+
+TEST_F(SearchFlowTest, AnswersALaterKeystrokeFromTheCache) {
+  bed_.installBag(kTestBag);
+  const auto state = bed_.makeState();
+  bed_.search(*state, "sno", 1);
+  answer(200, kOneResultSet);
+  bed_.fakes.maps.session = "maps-session";
+
+  const auto cached = bed_.search(*state, "SNOWM", 2);
+  EXPECT_EQ(cached->count, 1);
+  ASSERT_TRUE(cached->reply);
+  EXPECT_EQ(cached->reply->data.view(), kOneResultSet);
+  EXPECT_EQ(bed_.urlSession().tasks().size(), 1u);
+  EXPECT_EQ(bed_.recordedClasses().back(), "ZLKCacheHitFeedback");
+  EXPECT_EQ(bed_.counter("com.quenta.zelkord.lanthe.ondevicecachehits"), 1);
+
+  ZLKSearchRequest withItems;
+  withItems.queryString = "snowm";
+  withItems.queryItems = {{"a", "b"}};
+  EXPECT_EQ(bed_.search(*state, withItems)->count, 0);
+  EXPECT_EQ(bed_.urlSession().tasks().size(), 2u);
+}
+
+TEST_F(SearchFlowTest, CachesEveryEntryButThoseInError) {
+  bed_.installBag(kTestBag);
+  const auto state = bed_.makeState();
+  bed_.search(*state, "s");
+  answer(
+      200,
+      R"([{"status":"ERROR","query":"sad"},{"query":"snow"},{"status":"OK","query":"sun"},7,{"query":5}])");
+  EXPECT_EQ(state->queryCache()->count(), 2u);
+}
+
+TEST_F(SearchFlowTest, FetchesTheBagThatAResponseNames) {
+  const std::vector<std::pair<std::string, bool>> cases = {{R"({"bag": 12})", true},
+                                                           {R"({"bag": 1})", false},
+                                                           {"[1]", false},
+                                                           {"{", false},
+                                                           {"\xFF", false}};
+  for (const auto& [header, fetches] : cases) {
+    SCOPED_TRACE(header);
+    QueryBed bed;
+    bed.installBag(kTestBag);
+    bed.search(*bed.makeState(), "snow");
+    bed.urlSession().tasks().back()->succeed(200, "[]", {{"x-quenta-forcefetch", header}});
+    bed.fakes.timeline.runUntilIdle();
+    const auto session = bed.fakes.urlSessions.find("bagSession");
+    EXPECT_EQ(session && !session->tasks().empty(), fetches);
+    const bool isDictionary = header.front() == '{' && header.size() > 1;
+    EXPECT_EQ(
+        bed.fakes.log.contains("X-Quenta-ForceFetch header data into a dictionary: <private>"),
+        !isDictionary);
+  }
+}
+
+TEST_F(SearchFlowTest, ShowsTheExchangeToAClientThatAsks) {
+  bed_.installBag(kTestBag);
+  const auto state = bed_.makeState();
+  ZLKSearchRequest request;
+  request.queryString = "snow";
+  request.verboseReply = true;
+  const auto answered = bed_.search(*state, request);
+  answer(200, "[]", {{"Server", "a"}, {"Vary", "x"}, {"vary", "y"}});
+  ASSERT_TRUE(answered->reply && answered->reply->httpRequest && answered->reply->httpResponse);
+  EXPECT_EQ(answered->reply->httpRequest->url, lastTask().request().url);
+  EXPECT_EQ(answered->reply->httpResponse->status, 200);
+  EXPECT_THAT(answered->reply->httpResponse->headers,
+              ElementsAre(std::pair<std::string, std::string>("Server", "a"),
+                          std::pair<std::string, std::string>("Vary", "x, y")));
+}
+
+TEST_F(SearchFlowTest, GoesThroughTheProxyOnlyWhenItIsInUse) {
+  struct Case {
+    bool use;
+    bool enabled;
+    bool proxyFails;
+    bool proxied;
+  };
+  for (const auto& wanted : std::vector<Case>{{true, true, false, true},
+                                              {false, true, false, false},
+                                              {true, false, false, false},
+                                              {true, true, true, false}}) {
+    SCOPED_TRACE(testing::Message() << wanted.use << wanted.enabled << wanted.proxyFails);
+    QueryBed bed;
+    bed.fakes.settings.set("ZLKUseMorvane", wanted.use);
+    bed.fakes.networkProxy.enabled = wanted.enabled;
+    if (wanted.proxyFails) bed.urlSession().setProxyError(urlError(URLErrorCode::CannotConnect));
+    bed.installBag(kTestBag);
+    bed.search(*bed.makeState(), "snow");
+    const auto task = bed.urlSession().tasks().back();
+    EXPECT_EQ(task->isProxyEnabled(), wanted.proxied);
+    EXPECT_TRUE(task->isResumed());
+    EXPECT_EQ(bed.fakes.log.contains("Enabling Morvane for request failed."), wanted.proxyFails);
+  }
+}
+
+TEST_F(SearchFlowTest, AddsWhatTheProxyKnowsToTheRecordOfARoutedRequest) {
+  bed_.fakes.settings.set("ZLKUseMorvane", true);
+  bed_.fakes.networkProxy.enabled = true;
+  bed_.installBag(kTestBag);
+  bed_.search(*bed_.makeState(), "snow");
+  lastTask().setConnectionInformation({{"proxy", "https://proxy.example:8443"}});
+  answer(200, kOneResultSet);
+  const auto records = bed_.records();
+  const auto& end = dynamic_cast<const HVEndNetworkSearchFeedback&>(*records.back().feedback);
+  ASSERT_TRUE(end.networkTimingData->contains("Morvane"));
+  EXPECT_EQ(end.networkTimingData->at("Morvane").at("proxy"), "https://proxy.example:8443");
+}
+
+TEST_F(SearchFlowTest, KeepsTypedTextOutOfTheLog) {
+  bed_.installBag(kTestBag);
+  const auto state = bed_.makeState();
+  bed_.search(*state, "secret words", 1);
+  answer(200, R"([{"query":"secret words of mine"}])");
+  bed_.search(*state, "secret words", 2);
+  bed_.search(*state, "other secret", 3);
+  lastTask().fail(urlError(URLErrorCode::ConnectionLost));
+  bed_.fakes.timeline.runUntilIdle();
+  EXPECT_FALSE(bed_.fakes.log.contains("secret"));
+  EXPECT_TRUE(
+      bed_.fakes.log.contains("session lanthe performing query[1] <private>, reply (callback)"));
+}
+
+}  // namespace
+}  // namespace zelkord
