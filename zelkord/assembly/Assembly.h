@@ -13,6 +13,7 @@ namespace zelkord {
 
 class ClientStateManager;
 class FeedbackSessions;
+class ResponseImages;
 class SessionManager;
 class UserGUIDSource;
 class ZLKNetworkRequestFactory;
@@ -47,6 +48,7 @@ class Assembly final {
 
   ZLKNetworkRequestFactory* requestFactory() const { return requestFactory_.get(); }
   ZelkorBagController* bagController() const { return bagController_.get(); }
+  ResponseImages* responseImages() const { return responseImages_.get(); }
   ClientStateManager* clientStateManager() const { return clientStateManager_.get(); }
   UserGUIDSource* guidController() const { return guidController_.get(); }
   SessionManager* clientSessionManager() const { return clientSessionManager_.get(); }
@@ -57,6 +59,9 @@ class Assembly final {
   }
   void setBagController(std::shared_ptr<ZelkorBagController> controller) {
     bagController_.set(std::move(controller));
+  }
+  void setResponseImages(std::shared_ptr<ResponseImages> images) {
+    responseImages_.set(std::move(images));
   }
   void setClientStateManager(std::shared_ptr<ClientStateManager> manager) {
     clientStateManager_.set(std::move(manager));
@@ -105,6 +110,7 @@ class Assembly final {
   Slot<FeedbackSessions> feedbackSessions_;
   Slot<ZLKNetworkRequestFactory> requestFactory_;
   Slot<ZelkorBagController> bagController_;
+  Slot<ResponseImages> responseImages_;
   Slot<ClientStateManager> clientStateManager_;
   Slot<UserGUIDSource> guidController_;
   Slot<SessionManager> clientSessionManager_;

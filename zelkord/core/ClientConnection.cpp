@@ -6,8 +6,8 @@
 #include "corezelkor/Constants.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/core/ClientStateManager.h"
-#include "zelkord/core/ErrorFeedback.h"
 #include "zelkord/feedback/SessionManager.h"
+#include "zelkord/network/ErrorFeedback.h"
 #include "zelkord/network/UserAgent.h"
 #include "zelkord/query/ErrorCodes.h"
 

@@ -4,6 +4,7 @@
 #include "zelkord/core/EndpointListener.h"
 #include "zelkord/core/ServiceInterfaces.h"
 #include "zelkord/query/ErrorCodes.h"
+#include "zelkord/query/ResponseImages.h"
 
 namespace zelkord {
 namespace {
@@ -126,6 +127,10 @@ std::vector<std::shared_ptr<ClientState>> ClientStateManager::states() {
     for (const auto& [identifier, state] : stateCache_) states.push_back(state);
   });
   return states;
+}
+
+void ClientStateManager::processImagesFromResponse(const json::value& response, const ZLKBag* bag) {
+  if (auto* images = assembly_.responseImages()) images->processImagesFromResponse(response, bag);
 }
 
 void ClientStateManager::request(const std::shared_ptr<ZLKRequest>& request,

@@ -47,6 +47,9 @@ class ClientStateManager final : public std::enable_shared_from_this<ClientState
   void request(const std::shared_ptr<ZLKRequest>& request,
                const ZLKSessionConfiguration& configuration, const ReplyCallback& reply);
 
+  // As ResponseImages.
+  void processImagesFromResponse(const json::value& response, const ZLKBag* bag);
+
  private:
   using States = std::map<std::string, std::shared_ptr<ClientState>>;
   // False, after a log line, for an empty identifier.

@@ -12,6 +12,7 @@
 #include "zelkord/network/NotificationNames.h"
 #include "zelkord/network/ZLKNetworkRequestFactory.h"
 #include "zelkord/network/ZelkorBagController.h"
+#include "zelkord/query/ResponseImages.h"
 
 namespace zelkord {
 
@@ -54,6 +55,7 @@ void Daemon::_makeServices() {
   const auto bagController = std::make_shared<ZelkorBagController>(assembly, *factory);
   assembly.setBagController(bagController);
   bagController->start();
+  assembly.setResponseImages(std::make_shared<ResponseImages>(assembly));
   const auto states = std::make_shared<ClientStateManager>(assembly);
   assembly.setClientStateManager(states);
   states->start();

@@ -1,4 +1,4 @@
-#include "zelkord/core/ErrorFeedback.h"
+#include "zelkord/network/ErrorFeedback.h"
 
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/feedback/SessionManager.h"
