@@ -1,0 +1,31 @@
+#pragma once
+
+#include <cstdint>
+
+#include "zelkord/query/QueryFlow.h"
+
+namespace zelkord {
+
+// A query that needs an enabled bag, for which it waits a second at most, and whose answer goes to
+// the client as it came whatever its status and whether or not it is JSON: search, zero keyword,
+// lookup.
+class BagGatedFlow : public QueryFlow {
+ protected:
+  using QueryFlow::QueryFlow;
+
+  // Why a query is not sent; the numbers are recorded.
+  enum class SkipReason : std::uint32_t { TooShort = 1, BagDisabled = 2, NoBag = 3 };
+
+  bool _passesGates() override;
+  void _logDispatch() const override;
+  void _logAnswer() const override;
+  std::optional<Refusal> _refusalOf(const URLResult& result) const override;
+  using QueryFlow::_refusalOf;
+
+  virtual void _logStart() const;
+  virtual void _logNoBag() const;
+  // Records why the query is not sent and replies.
+  void _skip(SkipReason reason, std::optional<Error> error = std::nullopt);
+};
+
+}  // namespace zelkord

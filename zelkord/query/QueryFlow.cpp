@@ -1,0 +1,127 @@
+#include "zelkord/query/QueryFlow.h"
+
+#include "zelkord/assembly/Assembly.h"
+#include "zelkord/feedback/UserGUIDSource.h"
+#include "zelkord/network/RequestLogText.h"
+#include "zelkord/network/ZLKNetworkRequestFactory.h"
+#include "zelkord/network/ZLKRetryableNetworkRequest.h"
+#include "zelkord/query/ErrorCodes.h"
+#include "zelkord/query/NetworkRecords.h"
+#include "zelkord/query/RoutingProxy.h"
+#include "zelkord/query/VerboseReply.h"
+
+namespace zelkord {
+namespace {
+
+constexpr unsigned kFirstAttempt = 1;
+constexpr unsigned kRetries = 3;
+
+}  // namespace
+
+QueryFlow::QueryFlow(const QueryTraits& traits, std::shared_ptr<ClientState> state,
+                     std::shared_ptr<const ZLKRequest> request, ReplyCallback reply)
+    : traits_(traits),
+      state_(std::move(state)),
+      request_(std::move(request)),
+      assembly_(state_->assembly()),
+      reply_(std::move(reply)) {}
+
+void QueryFlow::start() {
+  if (_passesGates()) _send();
+}
+
+void QueryFlow::_send() {
+  _logDispatch();
+  const auto bag = state_->currentBag();
+  const auto guid = state_->guidController().currentUserGUID();
+  auto request = _makeRequest(bag.get(), guid);
+  if (!request) return _reply(std::nullopt, zelkorError(kBagFault, "no URL"));
+  httpRequest_ = *std::move(request);
+  _logRequest();
+  start_ = _makeStart(httpRequest_);
+  state_->record(start_, *request_, guid);
+  const auto task = _makeTask(bag.get());
+  if (traits_.routing == QueryRouting::ThroughProxy) useRoutingProxy(assembly_, *task);
+  task->resume();
+  _didSend();
+  state_->_markNetworkRequest();
+}
+
+void QueryFlow::_logRequest() const {
+  if (traits_.exchangeLog == ExchangeLog::Silent || !_log().isEnabled(LogLevel::Debug)) return;
+  const bool show = assembly_.platform().log.showsPrivateData();
+  _log().debug("request: {} header: {}", urlForLog(httpRequest_.url, show),
+               priv(headersForLog(httpRequest_.headers)));
+}
+
+std::shared_ptr<const HVStartNetworkSearchFeedback> QueryFlow::_makeStart(
+    const URLRequest& request) const {
+  return startNetworkFeedback(request, _input(), request_->triggerEvent, traits_.endpoint);
+}
+
+std::shared_ptr<URLTask> QueryFlow::_makeTask(const ZLKBag* bag) {
+  auto completion = [self = shared_from_this()](const auto& task, const URLResult& result) {
+    self->_finish(task, result);
+  };
+  auto& session = assembly_.urlSession();
+  if (traits_.transport == QueryTransport::Plain) {
+    return session.dataTask(httpRequest_, std::move(completion));
+  }
+  const auto retryable = std::make_shared<const ZLKRetryableNetworkRequest>(
+      ZLKRetryableNetworkRequest{httpRequest_, _deadline(bag)});
+  const auto& platform = assembly_.platform();
+  return dataTaskWithRetryableRequest(session, retryable, kFirstAttempt, kRetries,
+                                      std::move(completion), {platform.clock, platform.queues});
+}
+
+void QueryFlow::_finish(const std::shared_ptr<URLTask>& task, const URLResult& result) {
+  if (result.response && result.response->status) state_->recordSearchResult(result.status());
+  _logAnswer();
+  if (traits_.exchangeLog != ExchangeLog::Silent && _log().isEnabled(LogLevel::Debug)) {
+    _log().debug("resp: {}", _responseForLog(result));
+  }
+  if (const auto refusal = _refusalOf(result)) {
+    _fail(*task, result, *refusal);
+  } else {
+    _accept(task, result);
+  }
+}
+
+void QueryFlow::_accept(const std::shared_ptr<URLTask>& task, const URLResult& result) {
+  Body body{.data = result.data.value_or(Data())};
+  body.parsed = parseJson(body.data.view(), &body.problem);
+  if (const auto refusal = _refusalOf(body)) return _fail(*task, result, *refusal);
+  if (body.parsed) _didParse(*body.parsed, body.data);
+  endNetworkFeedback(state_, start_, body.parsed ? &*body.parsed : nullptr, result, task,
+                     request_->queryId);
+  auto reply = _makeReply(body.data);
+  if (request_->verboseReply) addHTTPExchange(reply, httpRequest_, *result.response);
+  _willReply(*result.response);
+  _reply(std::move(reply), std::nullopt);
+}
+
+void QueryFlow::_fail(const URLTask& task, const URLResult& result, const Refusal& refusal) {
+  failSearchFeedback(*state_, refusal.error, *request_, start_, result, task.timingData());
+  _reply(std::nullopt, refusal.error);
+}
+
+ZLKReply QueryFlow::_makeReply(Data data) const {
+  ZLKReply reply;
+  reply.scale = request_->scale;
+  reply.data = std::move(data);
+  const auto session = assembly_.requestFactory()->getMapsUserSessionEntityAndReset(false);
+  if (session) reply.geoSessionEntityString = session->sessionEntityString();
+  return reply;
+}
+
+void QueryFlow::_reply(std::optional<ZLKReply> reply, std::optional<Error> error) {
+  reply_(request_->queryId, std::move(reply), std::move(error));
+}
+
+const Logger& QueryFlow::_log() const { return assembly_.log(traits_.category); }
+
+std::string QueryFlow::_responseForLog(const URLResult& result) const {
+  return responseForLog(result.response, assembly_.platform().log.showsPrivateData());
+}
+
+}  // namespace zelkord
