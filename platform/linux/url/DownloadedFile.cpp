@@ -9,7 +9,7 @@
 namespace zelkord {
 Descriptor moveBodyToFile(URLResult& result) {
   const auto body = std::exchange(result.data, std::nullopt);
-  if (!body) return {};
+  if (!body || result.error) return {};
   Descriptor file(::memfd_create("download", MFD_CLOEXEC));
   if (!file || !writeFully(file.get(), body->view())) {
     result.error = posixError(errno);

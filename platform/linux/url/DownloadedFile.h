@@ -5,8 +5,8 @@
 
 namespace zelkord {
 
-// Turns the body of a result into a file that exists as long as the descriptor, and that no crash
-// leaves behind. On failure the result has an error and no body.
+// Turns the body of a result without an error into a file that exists as long as the descriptor,
+// and that no crash leaves behind. On failure the result has an error and no body.
 Descriptor moveBodyToFile(URLResult& result);
 
 }  // namespace zelkord
