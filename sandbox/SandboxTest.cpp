@@ -146,6 +146,7 @@ TEST_F(SandboxTest, MisbehavesOnTheWire) {
            {R"({"path":"/search","kind":"close_after_headers"})", CURLE_PARTIAL_FILE},
            {R"({"path":"/search","kind":"truncated"})", CURLE_PARTIAL_FILE},
            {R"({"path":"/search","kind":"not_http"})", CURLE_UNSUPPORTED_PROTOCOL},
+           {R"({"path":"/search","kind":"wrong_length","bytes":100})", CURLE_OK},
            {R"({"path":"/search","kind":"slow","interval_ms":1,"body":"[1,2]"})", CURLE_OK},
            {R"({"path":"/search","kind":"gzip_bomb","bytes":10000000})", CURLE_OK},
            {R"({"path":"/search","delay_ms":1})", CURLE_OK}}) {
@@ -156,6 +157,16 @@ TEST_F(SandboxTest, MisbehavesOnTheWire) {
     client.post(url("/control/behave"), "");
     EXPECT_EQ(client.get(url("/search?q=sno&key=harbor4817")).status, 200);
   }
+}
+
+TEST_F(SandboxTest, AfterABodyShorterThanAnnouncedNothingComes) {
+  Client client(certificate());
+  client.post(url("/control/misbehave"),
+              R"({"path":"/warm","kind":"wrong_length","body":"[1]","bytes":4})");
+  client.set(CURLOPT_TIMEOUT_MS, 300);
+  const Fetched fetched = client.get(url("/warm"));
+  EXPECT_EQ(fetched.code, CURLE_OPERATION_TIMEDOUT);
+  EXPECT_EQ(fetched.body, "[1]");
 }
 
 TEST_F(SandboxTest, AnEndlessBodyGoesOnUntilTheClientHasEnough) {

@@ -20,6 +20,7 @@ constexpr std::chrono::seconds kShutdownTime{2};
 constexpr std::uint32_t kLargestHead = 4U << 20U;
 constexpr std::uint64_t kLargestBody = 64U << 20U;
 constexpr std::chrono::seconds kEndlessTime{60};
+constexpr std::chrono::seconds kStillTime{60};
 constexpr std::size_t kEndlessBytes = 100U << 20U;
 constexpr std::size_t kChunkBytes = 16384;
 constexpr std::chrono::milliseconds kChunkInterval{10};
@@ -103,9 +104,10 @@ void Connection::send(Reply reply) {
 void Connection::deliver() {
   const bool endless = reply_.delivery == Delivery::Endless;
   const bool ordinary = reply_.delivery == Delivery::Ordinary || reply_.delivery == Delivery::Slow;
+  const bool lies = reply_.delivery == Delivery::WrongLength;
   const std::size_t size = reply_.bodyText().size();
-  head_ =
-      responseHead(reply_, endless ? std::nullopt : std::optional(size), keepAlive_ && ordinary);
+  const auto announced = std::optional(lies ? reply_.announcedLength : size);
+  head_ = responseHead(reply_, endless ? std::nullopt : announced, keepAlive_ && ordinary);
   sent_ = 0;
   begun_ = std::chrono::steady_clock::now();
   switch (reply_.delivery) {
@@ -123,6 +125,8 @@ void Connection::deliver() {
       return write(0, &Connection::waitAndDrip);
     case Delivery::NotHttp:
       return sendGarbage();
+    case Delivery::WrongLength:
+      return sendMisannounced();
   }
 }
 
@@ -137,6 +141,17 @@ void Connection::sendHeadThenClose(std::size_t bodyBytes) {
 void Connection::sendGarbage() {
   head_.clear();
   write(reply_.bodyText().size(), &Connection::abandon);
+}
+
+void Connection::sendMisannounced() {
+  const std::size_t size = reply_.bodyText().size();
+  const bool missing = reply_.announcedLength > size;
+  write(size, missing ? &Connection::stayStill : &Connection::abandon);
+}
+
+void Connection::stayStill() {
+  timer_.expires_after(kStillTime);
+  timer_.async_wait([self = shared_from_this()](ErrorCode) { self->abandon(); });
 }
 
 // A short body goes out with the head in one piece; a longer one follows it without being copied.

@@ -46,6 +46,8 @@ class Connection final : public std::enable_shared_from_this<Connection> {
   void sendOrdinary();
   void sendHeadThenClose(std::size_t bodyBytes);
   void sendGarbage();
+  void sendMisannounced();
+  void stayStill();
   void sendNextByte();
   void sendChunk();
   void waitAndDrip();

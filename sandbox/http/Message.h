@@ -51,6 +51,7 @@ enum class Delivery {
   Endless,            // chunks without end, up to 60 s or 100 MB
   Slow,               // headers, then one byte each `interval`
   NotHttp,            // the body alone, then the end
+  WrongLength,        // as if `announcedLength` bytes came; after too few of them, silence for 60 s
 };
 
 // What is sent back.
@@ -65,6 +66,7 @@ struct Reply {
   Delivery delivery = Delivery::Ordinary;
   std::chrono::milliseconds delay{0};
   std::chrono::milliseconds interval{0};
+  std::size_t announcedLength = 0;
 
   const std::string& bodyText() const;
 

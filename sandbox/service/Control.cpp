@@ -45,6 +45,7 @@ Reply Control::answer(const Request& request) {
   if (path == "/control/misbehave" && post) return misbehave(request);
   if (path == "/control/behave" && post) return behave();
   if (path == "/control/bag" && post) return patchBag(request);
+  if (path == "/control/images" && post) return embedImages(request);
   if (path == "/control/reset" && post) return reset();
   return Reply::error(404, "no such control request");
 }
@@ -54,11 +55,11 @@ Reply Control::requests(const Request& request) {
   query.since = numberItem(request, "since", 0);
   query.path = request.itemOr("path");
   query.limit = numberItem(request, "limit", query.limit);
-  return listReply("requests", log_.read(query));
+  return listReply("requests", it_.log.read(query));
 }
 
 Reply Control::uploads(const Request& request) {
-  return listReply("uploads", uploads_.list(numberItem(request, "since", 0)));
+  return listReply("uploads", it_.uploads.list(numberItem(request, "since", 0)));
 }
 
 Reply Control::misbehave(const Request& request) {
@@ -66,27 +67,36 @@ Reply Control::misbehave(const Request& request) {
   if (!body) return Reply::error(400, "the body is not a JSON object");
   auto rule = parseMisbehaviour(*body);
   if (!rule) return Reply::error(400, rule.reason());
-  misbehaviours_.add(std::move(*rule));
+  it_.misbehaviours.add(std::move(*rule));
   return doneReply();
 }
 
 Reply Control::behave() {
-  misbehaviours_.clear();
+  it_.misbehaviours.clear();
+  it_.embeddedImages.clear();
   return doneReply();
 }
 
 Reply Control::patchBag(const Request& request) {
   const auto body = controlBody(request);
   if (!body) return Reply::error(400, "the body is not a JSON object");
-  bag_.patch(*body);
+  it_.bag.patch(*body);
+  return doneReply();
+}
+
+Reply Control::embedImages(const Request& request) {
+  const auto body = controlBody(request);
+  if (!body) return Reply::error(400, "the body is not a JSON object");
+  if (const auto failure = it_.embeddedImages.set(*body)) return Reply::error(400, failure->reason);
   return doneReply();
 }
 
 Reply Control::reset() {
-  misbehaviours_.clear();
-  bag_.reset();
-  log_.clear();
-  uploads_.clear();
+  it_.misbehaviours.clear();
+  it_.embeddedImages.clear();
+  it_.bag.reset();
+  it_.log.clear();
+  it_.uploads.clear();
   return doneReply();
 }
 

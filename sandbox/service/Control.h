@@ -3,6 +3,7 @@
 #include "sandbox/http/Message.h"
 #include "sandbox/search/AnswerCache.h"
 #include "sandbox/service/Bag.h"
+#include "sandbox/service/EmbeddedImages.h"
 #include "sandbox/service/Misbehaviour.h"
 #include "sandbox/service/RequestLog.h"
 #include "sandbox/service/UploadStore.h"
@@ -16,8 +17,14 @@ namespace sandbox {
 // was wrong.
 class Control final {
  public:
-  Control(Bag& bag, Misbehaviours& misbehaviours, RequestLog& log, UploadStore& uploads)
-      : bag_(bag), misbehaviours_(misbehaviours), log_(log), uploads_(uploads) {}
+  struct Steered {
+    Bag& bag;
+    Misbehaviours& misbehaviours;
+    EmbeddedImages& embeddedImages;
+    RequestLog& log;
+    UploadStore& uploads;
+  };
+  explicit Control(const Steered& steered) : it_(steered) {}
 
   // `request.path` begins with "/control/".
   Reply answer(const Request& request);
@@ -28,12 +35,10 @@ class Control final {
   Reply misbehave(const Request& request);
   Reply behave();
   Reply patchBag(const Request& request);
+  Reply embedImages(const Request& request);
   Reply reset();
 
-  Bag& bag_;
-  Misbehaviours& misbehaviours_;
-  RequestLog& log_;
-  UploadStore& uploads_;
+  const Steered it_;
 };
 
 }  // namespace sandbox

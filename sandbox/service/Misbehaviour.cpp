@@ -5,6 +5,7 @@
 #include <utility>
 
 #include "sandbox/core/Gzip.h"
+#include "sandbox/service/KeyReader.h"
 
 namespace sandbox {
 
@@ -19,7 +20,7 @@ constexpr std::uint64_t kStandardDepth = 100'000;
 constexpr std::uint64_t kStandardIntervalMs = 50;
 constexpr std::uint64_t kLongestMs = 3'600'000;
 
-constexpr std::array<std::pair<std::string_view, MisbehaviourKind>, 13> kKindNames = {{
+constexpr std::array<std::pair<std::string_view, MisbehaviourKind>, 14> kKindNames = {{
     {"broken_json", MisbehaviourKind::BrokenJson},
     {"truncated", MisbehaviourKind::Truncated},
     {"endless", MisbehaviourKind::Endless},
@@ -33,56 +34,8 @@ constexpr std::array<std::pair<std::string_view, MisbehaviourKind>, 13> kKindNam
     {"big", MisbehaviourKind::Big},
     {"deep_json", MisbehaviourKind::DeepJson},
     {"pad", MisbehaviourKind::Pad},
+    {"wrong_length", MisbehaviourKind::WrongLength},
 }};
-
-// Reads the keys of one object; the first wrong one is remembered.
-class KeyReader final {
- public:
-  explicit KeyReader(const json::object& object) : object_(object) {}
-
-  std::uint64_t number(std::string_view key, std::uint64_t otherwise, std::uint64_t most) {
-    const auto* value = object_.if_contains(key);
-    if (value == nullptr) return otherwise;
-    boost::system::error_code error;
-    const auto number = value->to_number<std::uint64_t>(error);
-    if (error || number > most) fail(key);
-    return number;
-  }
-
-  std::optional<std::string> text(std::string_view key) {
-    const auto* value = object_.if_contains(key);
-    if (value == nullptr) return std::nullopt;
-    if (value->is_string()) return std::string(value->get_string());
-    fail(key);
-    return std::nullopt;
-  }
-
-  Headers headers(std::string_view key) {
-    Headers headers;
-    const auto* value = object_.if_contains(key);
-    if (value == nullptr) return headers;
-    if (!value->is_object())
-      fail(key);
-    else
-      for (const auto& [name, text] : value->get_object()) {
-        if (text.is_string())
-          headers.emplace_back(std::string(name), std::string(text.get_string()));
-        else
-          fail(key);
-      }
-    return headers;
-  }
-
-  bool has(std::string_view key) const { return object_.contains(key); }
-  void fail(std::string_view key) {
-    if (wrong_.empty()) wrong_ = key;
-  }
-  const std::string& wrong() const { return wrong_; }
-
- private:
-  const json::object& object_;
-  std::string wrong_;
-};
 
 MisbehaviourKind readKind(KeyReader& reader) {
   const auto name = reader.text("kind");
@@ -151,6 +104,8 @@ Delivery deliveryOfKind(MisbehaviourKind kind) {
       return Delivery::Slow;
     case MisbehaviourKind::NotHttp:
       return Delivery::NotHttp;
+    case MisbehaviourKind::WrongLength:
+      return Delivery::WrongLength;
     default:
       return Delivery::Ordinary;
   }
@@ -204,6 +159,7 @@ void distort(const Misbehaviour& misbehaviour, Reply& reply) {
   reply.delay = misbehaviour.delay;
   reply.interval = misbehaviour.interval;
   reply.delivery = deliveryOfKind(misbehaviour.kind);
+  reply.announcedLength = misbehaviour.bytes;
   for (const auto& [name, value] : misbehaviour.headers) setHeader(reply.headers, name, value);
 }
 

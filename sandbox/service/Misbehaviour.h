@@ -30,6 +30,7 @@ enum class MisbehaviourKind {
   Big,                // a JSON body of `bytes`
   DeepJson,           // arrays nested `depth` deep
   Pad,                // the ordinary answer, padded to about `bytes`
+  WrongLength,        // the ordinary answer under a Content-Length of `bytes`
 };
 
 // How some requests are to be answered.

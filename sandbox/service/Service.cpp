@@ -17,6 +17,10 @@ bool isUploadPath(const std::string& path) {
   return path == "/feedback" || path == "/crowdsourcing";
 }
 
+bool isResultPath(const std::string& path) {
+  return path == "/search" || path == "/more" || path == "/related" || path == "/card";
+}
+
 bool isReadMethod(const Request& request) {
   return request.method == "GET" || request.method == "HEAD";
 }
@@ -54,7 +58,7 @@ Service::Service(const Stores& stores, const DataSources& sources, const std::st
     : log_(stores.log),
       uploads_(stores.uploads),
       bag_(baseUrl),
-      control_(bag_, misbehaviours_, log_, uploads_),
+      control_({bag_, misbehaviours_, embeddedImages_, log_, uploads_}),
       queries_(stores.index, baseUrl),
       images_(sources.flags()),
       resources_(baseUrl) {}
@@ -92,14 +96,25 @@ Reply Service::route(const Request& request) {
   if (isUploadPath(path))
     return request.method == "POST" ? uploads_.accept(request) : methodNotAllowed("POST");
   if (!isReadMethod(request)) return methodNotAllowed("GET, HEAD");
-  if (path == "/search") return search(request);
+  return routeRead(request);
+}
+
+Reply Service::routeRead(const Request& request) {
+  const std::string& path = request.path;
+  if (isResultPath(path)) return results(request);
   if (path == "/bag") return bag_.answer(request);
   if (path.starts_with("/image/")) return images_.answer(request);
-  if (path == "/more" || path == "/related") return queries_.more(request);
-  if (path == "/card") return queries_.card(request);
   if (path == "/warm") return Reply::empty(204);
   if (path.starts_with("/resource/")) return resources_.answer(request);
   return Reply::error(404, "no such path");
+}
+
+Reply Service::results(const Request& request) {
+  Reply reply = request.path == "/search" ? search(request)
+                : request.path == "/card" ? queries_.card(request)
+                                          : queries_.more(request);
+  embeddedImages_.addTo(reply);
+  return reply;
 }
 
 Reply Service::search(const Request& request) {

@@ -8,6 +8,7 @@
 #include "sandbox/search/SuggestionIndex.h"
 #include "sandbox/service/Bag.h"
 #include "sandbox/service/Control.h"
+#include "sandbox/service/EmbeddedImages.h"
 #include "sandbox/service/Images.h"
 #include "sandbox/service/Misbehaviour.h"
 #include "sandbox/service/Queries.h"
@@ -38,6 +39,8 @@ class Service final {
  private:
   Reply respond(const Request& request);
   Reply route(const Request& request);
+  Reply routeRead(const Request& request);
+  Reply results(const Request& request);
   Reply search(const Request& request);
   void log(Request request, const Reply& reply, double arrival, std::int64_t microseconds);
 
@@ -45,6 +48,7 @@ class Service final {
   UploadStore& uploads_;
   Bag bag_;
   Misbehaviours misbehaviours_;
+  EmbeddedImages embeddedImages_;
   Control control_;
   Queries queries_;
   const Images images_;

@@ -4,6 +4,7 @@
 #include <boost/json/serialize.hpp>
 
 #include "sandbox/TestData.h"
+#include "sandbox/core/Gzip.h"
 #include "sandbox/service/Service.h"
 
 namespace sandbox {
@@ -120,6 +121,36 @@ TEST_F(ServiceTest, MisbehavesAsToldAndLogsWhatItDid) {
   ASSERT_EQ(logged.at("requests").get_array().size(), 3U);
   EXPECT_EQ(logged.at("requests").at(0).at("status"), 503);
   EXPECT_EQ(logged.at("last"), 3);
+}
+
+TEST_F(ServiceTest, EmbedsImageDescriptorsAnywhereInItsAnswers) {
+  EXPECT_EQ(control("/control/images", R"({"keys":"icon"})").status, 400U);
+  EXPECT_EQ(control("/control/images", R"({"per_key":0})").status, 400U);
+  struct Case {
+    const char* wish;
+    const char* value;
+  };
+  for (const auto& [wish, value] : std::initializer_list<Case>{
+           {R"({"ids":["word"]})", R"([{"image":{"id":"word"}}])"},
+           {R"({"count":3,"keys":["icon","posters"],"urls":["https://a/{n}"]})",
+            R"([{"icon":{"url":"https://a/0"}},{"posters":{"url":"https://a/1"}},
+                {"icon":{"url":"https://a/2"}}])"},
+           {R"({"count":3,"per_key":2,"depth":3,"ids":["a\"{n}"]})",
+            R"({"inner":[{"inner":[{"image":[{"id":"a\"0"},{"id":"a\"1"}]},
+                {"image":[{"id":"a\"2"}]}]}]})"},
+           {R"({"count":0})", "[]"}}) {
+    SCOPED_TRACE(wish);
+    EXPECT_EQ(control("/control/images", wish).status, 200U);
+    for (const char* target : {"/search?q=sno", "/more?q=sn", "/card?id=1"}) {
+      const Reply reply = ask(std::string(target) + "&key=harbor4817");
+      EXPECT_EQ(json::parse(reply.bodyText()).at(0).at("embedded_images"), json::parse(value));
+    }
+  }
+  const Reply packed = ask("/search?q=sno&key=harbor4817", {{"Accept-Encoding", "gzip"}});
+  EXPECT_EQ(packed.bodyText(), gzip(ask("/search?q=sno&key=harbor4817").bodyText()));
+  control("/control/behave", "");
+  const Reply reply = ask("/search?q=sno&key=harbor4817");
+  EXPECT_FALSE(json::parse(reply.bodyText()).at(0).get_object().contains("embedded_images"));
 }
 
 TEST_F(ServiceTest, ResetPutsEverythingBack) {
