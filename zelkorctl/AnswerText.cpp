@@ -60,21 +60,48 @@ std::vector<std::string> rowLines(const std::vector<Row>& rows, std::size_t widt
   return lines;
 }
 
+std::string notAList(std::string_view data, std::string_view ofWhat) {
+  return fmt::format("  ({} bytes that are no list of {})", data.size(), ofWhat);
+}
+
+// The objects of a list, whatever else it holds.
+std::vector<const json::object*> objectsIn(const json::object& object, std::string_view key) {
+  std::vector<const json::object*> objects;
+  const auto* list = arrayIn(object, key);
+  if (!list) return objects;
+  for (const auto& element : *list) {
+    if (const auto* member = element.if_object()) objects.push_back(member);
+  }
+  return objects;
+}
+
+void appendFacts(const json::object& section, std::vector<std::string>& lines) {
+  const auto rows = objectsIn(section, "rows");
+  std::size_t widest = 0;
+  for (const auto* row : rows) widest = std::max(widest, displayWidth(memberText(*row, "label")));
+  const auto labels = std::min(widest, kLongestTitle);
+  for (const auto* row : rows) {
+    lines.push_back("    " + padded(memberText(*row, "label"), labels) + "  " +
+                    memberText(*row, "value"));
+  }
+}
+
+void appendCard(const json::object& card, std::vector<std::string>& lines) {
+  lines.push_back("  " + memberText(card, "title"));
+  for (const auto* section : objectsIn(card, "sections")) {
+    const auto subtitle = memberText(*section, "subtitle");
+    if (!subtitle.empty()) lines.push_back("  " + subtitle);
+    appendFacts(*section, lines);
+  }
+}
+
 json::value headersJson(const HeaderFields& headers) {
   json::object object;
   for (const auto& [name, value] : headers) object[name] = value;
   return object;
 }
 
-json::object replyJson(const ZLKReply& reply) {
-  json::object object{{"scale", reply.scale}};
-  if (auto data = parseJson(reply.data.view())) {
-    object["data"] = std::move(*data);
-  } else {
-    object["text"] = printable(reply.data.view());  // not JSON
-  }
-  if (reply.geoSessionEntityString)
-    object["geoSessionEntityString"] = *reply.geoSessionEntityString;
+void addExchange(const ZLKReply& reply, json::object& object) {
   if (const auto& request = reply.httpRequest) {
     object["httpRequest"] = {{"url", request->url}, {"headers", headersJson(request->headers)}};
   }
@@ -83,6 +110,18 @@ json::object replyJson(const ZLKReply& reply) {
                               {"status", response->status},
                               {"headers", headersJson(response->headers)}};
   }
+}
+
+json::object replyJson(const ZLKReply& reply, Exchange exchange) {
+  json::object object{{"scale", reply.scale}};
+  if (auto data = parseJson(reply.data.view())) {
+    object["data"] = std::move(*data);
+  } else {
+    object["text"] = printable(reply.data.view());  // not JSON
+  }
+  if (reply.geoSessionEntityString)
+    object["geoSessionEntityString"] = *reply.geoSessionEntityString;
+  if (exchange == Exchange::Told) addExchange(reply, object);
   return object;
 }
 
@@ -97,7 +136,7 @@ void appendHeaders(const HeaderFields& headers, std::vector<std::string>& lines)
 std::vector<std::string> resultLines(std::string_view data, std::size_t limit, std::size_t width) {
   const auto parsed = parseJson(data);
   const auto* sets = parsed ? parsed->if_array() : nullptr;
-  if (!sets) return {fmt::format("  ({} bytes that are no list of result sets)", data.size())};
+  if (!sets) return {notAList(data, "result sets")};
   std::vector<Row> rows;
   for (const auto& set : *sets) {
     if (const auto* object = set.if_object()) appendRows(*object, limit, rows);
@@ -105,10 +144,22 @@ std::vector<std::string> resultLines(std::string_view data, std::size_t limit, s
   return rowLines(rows, width);
 }
 
+std::vector<std::string> cardLines(std::string_view data, std::size_t width) {
+  const auto parsed = parseJson(data);
+  const auto* cards = parsed ? parsed->if_array() : nullptr;
+  if (!cards) return {notAList(data, "cards")};
+  std::vector<std::string> lines;
+  for (const auto& card : *cards) {
+    if (const auto* object = card.if_object()) appendCard(*object, lines);
+  }
+  for (auto& line : lines) line = fitted(trimmed(line), width);
+  return lines;
+}
+
 std::string outcomeLine(const Outcome& outcome, std::size_t width) {
   constexpr std::size_t kTextColumn = 24;
   auto line = padded("\"" + printable(outcome.text) + "\"", std::min(kTextColumn, width / 3)) +
-              "  " + padded(nameOf(outcome.kind), 8) +
+              "  " + padded(nameOf(outcome.kind), 8) + " " + padded(sourceOf(outcome), 7) +
               fmt::format(" {:9.1f} ms", outcome.milliseconds);
   if (outcome.answer.reply) line += fmt::format(" {:8} bytes", outcome.answer.reply->data.size());
   if (outcome.answer.error) line += "  " + errorText(*outcome.answer.error);
@@ -128,12 +179,15 @@ std::vector<std::string> exchangeLines(const ZLKReply& reply) {
   return lines;
 }
 
-json::object outcomeJson(const Outcome& outcome) {
+json::object outcomeJson(const Outcome& outcome, Exchange exchange) {
   json::object object{{"queryId", outcome.answer.queryId},
                       {"query", outcome.text},
                       {"outcome", nameOf(outcome.kind)},
                       {"milliseconds", outcome.milliseconds}};
-  if (outcome.answer.reply) object["reply"] = replyJson(*outcome.answer.reply);
+  if (outcome.answer.reply) {
+    object["source"] = sourceOf(outcome);
+    object["reply"] = replyJson(*outcome.answer.reply, exchange);
+  }
   if (outcome.answer.error) object["error"] = errorJson(*outcome.answer.error);
   return object;
 }

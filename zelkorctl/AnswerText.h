@@ -15,14 +15,20 @@ namespace zelkorctl {
 // one line. Nothing in the lines can steer a terminal.
 std::vector<std::string> resultLines(std::string_view data, std::size_t limit, std::size_t width);
 
-// The query, what became of it and how long it took.
+// The cards of a service response: titles, and the facts as labels and values; each at most `width`
+// columns wide. What is not a list of cards is said in one line, as above.
+std::vector<std::string> cardLines(std::string_view data, std::size_t width);
+
+// The query, what became of it, where the answer is from and how long it took.
 std::string outcomeLine(const Outcome& outcome, std::size_t width);
 
 // For a verbose reply: the request that went out and the response's head.
 std::vector<std::string> exchangeLines(const ZLKReply& reply);
 
-// Everything about an outcome. The service's response is embedded as JSON when it is JSON.
-json::object outcomeJson(const Outcome& outcome);
+// Everything about an outcome. The service's response is embedded as JSON when it is JSON; the HTTP
+// exchange is only there when asked for.
+enum class Exchange { LeftOut, Told };
+json::object outcomeJson(const Outcome& outcome, Exchange exchange);
 
 json::value errorJson(const Error& error);
 // "reason (domain code)", printable.

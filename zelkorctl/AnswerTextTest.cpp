@@ -1,6 +1,7 @@
 #include <gtest/gtest.h>
 
 #include "zelkorctl/AnswerText.h"
+#include "zelkorctl/FollowUps.h"
 #include "zelkorctl/LineEditor.h"
 #include "zelkorctl/Printable.h"
 
@@ -58,13 +59,64 @@ TEST(ResultLinesTest, AlignsTheBestResultsAndSurvivesAnything) {
   EXPECT_EQ(displayWidth(resultLines(wide, 3, 80).front()), 42u);
 }
 
+TEST(CardLinesTest, AlignsTheFactsAndSurvivesAnything) {
+  const struct {
+    const char* data;
+    Lines lines;
+  } cases[] = {
+      {R"([{"title":"France","sections":[{"title":"France","subtitle":"Country"},
+          {"rows":[{"label":"Code","value":"FR"},{"label":"Number","value":"250"}]}]}])",
+       {"  France", "  Country", "    Code    FR", "    Number  250"}},
+      {R"([{"title":"\u001b[2J","sections":[7,{"rows":[8,{"label":9}]}]},"x"])",
+       {"  \\x1b[2J", ""}},
+      {R"({"title":"France"})", {"  (18 bytes that are no list of cards)"}},
+  };
+  for (const auto& [data, lines] : cases) {
+    SCOPED_TRACE(data);
+    EXPECT_EQ(cardLines(data, 40), lines);
+  }
+}
+
+TEST(FollowUpsTest, FindWhereAResponseLeads) {
+  const struct {
+    const char* data;
+    std::optional<std::string> more;
+    std::optional<std::string> second;  // the second result's card
+  } cases[] = {
+      {R"([{"results":[{"card_url":"a"}]},{"more_results_url":"m","results":[{"card_url":"b"}]}])",
+       "m", "b"},
+      {R"([7,{"more_results_url":8,"results":[{},9,{"card_url":"b"}]}])", {}, "b"},
+      {R"([{"results":[{"card_url":"a"},{"title":"b"}]}])", {}, {}},
+      {"{}", {}, {}},
+      {"<", {}, {}},
+  };
+  for (const auto& [data, more, second] : cases) {
+    SCOPED_TRACE(data);
+    EXPECT_EQ(moreResultsURL(data), more);
+    EXPECT_EQ(cardURL(data, 2), second);
+  }
+}
+
+TEST(OutcomeJsonTest, TellsTheSourceAndTheExchangeOnlyWhenAsked) {
+  Outcome outcome;
+  EXPECT_EQ(sourceOf(outcome), "");
+  outcome.answer.reply.emplace();
+  EXPECT_EQ(sourceOf(outcome), "cache");
+  outcome.answer.reply->httpResponse.emplace().status = 200;
+  const auto brief = outcomeJson(outcome, Exchange::LeftOut);
+  EXPECT_EQ(brief.at("source"), "network");
+  EXPECT_FALSE(brief.at("reply").as_object().contains("httpResponse"));
+  const auto full = outcomeJson(outcome, Exchange::Told);
+  EXPECT_EQ(full.at("reply").at("httpResponse").at("status"), 200);
+}
+
 TEST(OutcomeJsonTest, EmbedsTheResponseWhenItIsJson) {
   Outcome outcome{"a", Outcome::Kind::Answered, 1.5, {}};
   outcome.answer.queryId = 4;
   outcome.answer.reply.emplace().data = Data("[1]");
-  EXPECT_EQ(outcomeJson(outcome).at("reply").at("data"), parseJson("[1]"));
+  EXPECT_EQ(outcomeJson(outcome, Exchange::LeftOut).at("reply").at("data"), parseJson("[1]"));
   outcome.answer.reply->data = Data("\xff");
-  EXPECT_EQ(outcomeJson(outcome).at("reply").at("text"), "\\xff");
+  EXPECT_EQ(outcomeJson(outcome, Exchange::LeftOut).at("reply").at("text"), "\\xff");
 }
 
 TEST(LineEditorTest, FollowsTheKeys) {

@@ -19,6 +19,11 @@ struct Invocation {
 // Each gives the exit status.
 int runSearch(const Invocation& invocation);
 int runType(const Invocation& invocation);
+int runMore(const Invocation& invocation);
+int runCard(const Invocation& invocation);
+int runLookup(const Invocation& invocation);
+int runZeroKeyword(const Invocation& invocation);
+int runImages(const Invocation& invocation);
 int runBag(const Invocation& invocation);
 int runDefaults(const Invocation& invocation);
 int runSessions(const Invocation& invocation);

@@ -10,6 +10,11 @@ Asks and inspects zelkord, the broker of search suggestions.
 Commands:
   search TEXT...   send a query and show its results
   type             search while you type
+  more TEXT...     further results of a query
+  card TEXT...     the details of a result
+  lookup TEXT...   what a selected text means
+  zkw              suggestions before anything is typed
+  images TEXT...   load the images of a query's results
   bag              show the configuration document
   defaults         read and write settings
   sessions         list the clients that the daemon knows
@@ -36,7 +41,8 @@ Exit status: 0 answered, 1 an error came back, 2 wrong usage, 3 the daemon canno
 
 constexpr std::string_view kSearch = R"(usage: zelkorctl search [OPTION...] TEXT...
 
-Sends TEXT as a query and shows the best results. Words are joined by a space.
+Sends TEXT as a query and shows the best results. Words are joined by a space. Beside the time
+stands where the answer is from: the daemon's cache, or the network.
 
   --kind KIND          search (default), zeroKeyword, moreResults, card, lookup, flightLookup
                        or flightSearch
@@ -52,8 +58,9 @@ Sends TEXT as a query and shows the best results. Words are joined by a space.
 
 constexpr std::string_view kType = R"(usage: zelkorctl type [OPTION...]
 
-Searches on every keystroke and shows the results under the line, with how long the answer took.
-Backspace deletes, Ctrl-U clears, Enter starts afresh, Ctrl-C or Ctrl-D ends.
+Searches on every keystroke and shows the results under the line, with how long the answer took
+and whether it is from the daemon's cache or the network. Backspace deletes, Ctrl-U
+clears, Enter starts afresh, Ctrl-C or Ctrl-D ends.
 
 When standard input is no terminal, each of its characters is a keystroke and each line a query;
 every answer is one line.
@@ -61,6 +68,67 @@ every answer is one line.
   --item NAME=VALUE    add a query item; may be repeated
   --limit N            show at most N results (default: 5)
   --delay-per-key MS   between two keystrokes of such input (default: 120)
+)";
+
+constexpr std::string_view kMore = R"(usage: zelkorctl more [OPTION...] TEXT...
+       zelkorctl more [OPTION...] --url URL
+
+Searches for TEXT and fetches the further results that the answer names.
+
+  --url URL            fetch these, without a search
+  --pages N            follow up to N pages (default: 1)
+  --endpoint           ask on the daemon's second connection
+  --item NAME=VALUE    add a query item; may be repeated
+  --limit N            show at most N results of a page (default: 5)
+  --verbose            also show the request that went to the service and its response
+)";
+
+constexpr std::string_view kCard = R"(usage: zelkorctl card [OPTION...] TEXT...
+       zelkorctl card [OPTION...] --url URL
+
+Searches for TEXT and shows the card of a result.
+
+  --result N           of the N-th result of the answer (default: 1)
+  --url URL            fetch this card, without a search
+  --endpoint           ask on the daemon's second connection
+  --item NAME=VALUE    add a query item; may be repeated
+  --verbose            also show the request that went to the service and its response
+)";
+
+constexpr std::string_view kLookup = R"(usage: zelkorctl lookup [OPTION...] TEXT...
+
+Looks up TEXT as if it was selected in a text. The daemon keeps the results that fit the context.
+
+  --context TEXT       the text around it (default: the selected text alone)
+  --selection TYPE     default, explicit (default) or hint
+  --app IDENTIFIER     the application in which it was selected
+  --hint-domain NAME   domain of the hint
+  --item NAME=VALUE    add a query item; may be repeated
+  --limit N            show at most N results (default: 5)
+  --verbose            also show the request that went to the service and its response
+)";
+
+constexpr std::string_view kZeroKeyword = R"(usage: zelkorctl zkw [OPTION...]
+
+Shows what the service suggests before anything is typed.
+
+  --item NAME=VALUE    add a query item; may be repeated
+  --limit N            show at most N results (default: 5)
+  --verbose            also show the request that went to the service and its response
+)";
+
+constexpr std::string_view kImages = R"(usage: zelkorctl images [OPTION...] TEXT...
+       zelkorctl images [OPTION...] [--url URL]... [--id IDENTIFIER]...
+
+Searches for TEXT and loads the images that the answer describes, or loads the images that are
+named. The exit status is 1 when one of them does not come. On a terminal that shows images those
+that are PNG are shown.
+
+  --url URL            load this image; may be repeated
+  --id IDENTIFIER      load the image that the bag has under this name; may be repeated
+  --save DIR           save them in DIR, under the last part of their URL or their identifier
+  --deadline MS        take what is there by then (default: 5000)
+  --item NAME=VALUE    add a query item to the search; may be repeated
 )";
 
 constexpr std::string_view kDefaults = R"(usage: zelkorctl defaults read KEY [--domain DOMAIN]
@@ -109,6 +177,16 @@ std::string_view helpText(Command command) {
       return kSearch;
     case Command::Type:
       return kType;
+    case Command::More:
+      return kMore;
+    case Command::Card:
+      return kCard;
+    case Command::Lookup:
+      return kLookup;
+    case Command::ZeroKeyword:
+      return kZeroKeyword;
+    case Command::Images:
+      return kImages;
     case Command::Bag:
       return kBag;
     case Command::Defaults:

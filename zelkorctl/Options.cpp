@@ -4,6 +4,7 @@
 #include <array>
 #include <charconv>
 #include <cmath>
+#include <initializer_list>
 
 namespace zelkorctl {
 namespace {
@@ -11,11 +12,24 @@ namespace {
 // What is wrong with a value; empty when nothing is.
 using Problem = std::string;
 
-enum class Group { Every, Query, Settings };
+// Commands as bits.
+using CommandSet = std::uint32_t;
+
+constexpr CommandSet setOf(std::initializer_list<Command> commands) {
+  CommandSet set = 0;
+  for (const auto command : commands) set |= CommandSet{1} << static_cast<unsigned>(command);
+  return set;
+}
+
+constexpr CommandSet kEvery = ~CommandSet{0};
+constexpr CommandSet kQueries = setOf({Command::Search, Command::Type, Command::More, Command::Card,
+                                       Command::Lookup, Command::ZeroKeyword, Command::Images});
+constexpr CommandSet kLists =
+    setOf({Command::Search, Command::Type, Command::More, Command::Lookup, Command::ZeroKeyword});
 
 struct OptionRule {
   std::string_view name;
-  Group group;
+  CommandSet commands;  // that take it
   bool takesValue;
   Problem (*apply)(Options&, const std::string& value);
 };
@@ -23,19 +37,16 @@ struct OptionRule {
 struct CommandRule {
   std::string_view name;
   Command command;
-  Group group;  // whose options it takes, besides everybody's
 };
 
 constexpr std::array kCommands{
-    CommandRule{"search", Command::Search, Group::Query},
-    CommandRule{"type", Command::Type, Group::Query},
-    CommandRule{"bag", Command::Bag, Group::Every},
-    CommandRule{"defaults", Command::Defaults, Group::Settings},
-    CommandRule{"sessions", Command::Sessions, Group::Every},
-    CommandRule{"metrics", Command::Metrics, Group::Every},
-    CommandRule{"status", Command::Status, Group::Every},
-    CommandRule{"version", Command::Version, Group::Every},
-    CommandRule{"help", Command::Help, Group::Every},
+    CommandRule{"search", Command::Search},     CommandRule{"type", Command::Type},
+    CommandRule{"more", Command::More},         CommandRule{"card", Command::Card},
+    CommandRule{"lookup", Command::Lookup},     CommandRule{"zkw", Command::ZeroKeyword},
+    CommandRule{"images", Command::Images},     CommandRule{"bag", Command::Bag},
+    CommandRule{"defaults", Command::Defaults}, CommandRule{"sessions", Command::Sessions},
+    CommandRule{"metrics", Command::Metrics},   CommandRule{"status", Command::Status},
+    CommandRule{"version", Command::Version},   CommandRule{"help", Command::Help},
 };
 
 constexpr std::array kKinds{
@@ -71,18 +82,27 @@ Problem readSeconds(Duration& target, const std::string& text) {
   return {};
 }
 
-Problem readDelay(Duration& target, const std::string& text) {
+Problem readMilliseconds(Duration& target, const std::string& text, std::int64_t most) {
   std::int64_t milliseconds = 0;
-  auto problem = readCount(milliseconds, text, 0, 60'000);
+  auto problem = readCount(milliseconds, text, 0, most);
   if (problem.empty()) target = std::chrono::milliseconds(milliseconds);
   return problem;
 }
 
-Problem readKind(QueryKind& target, const std::string& text) {
+constexpr std::array kSelections{
+    std::pair{std::string_view("default"), std::uint32_t{0}},
+    std::pair{std::string_view("explicit"), std::uint32_t{1}},
+    std::pair{std::string_view("hint"), std::uint32_t{2}},
+};
+
+// One of the table's names.
+template <typename Value, std::size_t size>
+Problem readNamed(Value& target, const std::string& text,
+                  const std::array<std::pair<std::string_view, Value>, size>& table) {
   std::string names;
-  for (const auto& [name, kind] : kKinds) {
+  for (const auto& [name, value] : table) {
     if (name == text) {
-      target = kind;
+      target = value;
       return {};
     }
     names += (names.empty() ? "one of " : ", ") + std::string(name);
@@ -102,6 +122,12 @@ Problem readText(std::string& target, const std::string& text) {
   return {};
 }
 
+Problem readTexts(std::vector<std::string>& target, const std::string& text) {
+  if (text.empty()) return "a text";
+  target.push_back(text);
+  return {};
+}
+
 Problem setFlag(bool& target) {
   target = true;
   return {};
@@ -109,37 +135,62 @@ Problem setFlag(bool& target) {
 
 // One line each: the table is the reference of all options.
 const std::array kOptions{
-    OptionRule{"--help", Group::Every, false,
+    OptionRule{"--help", kEvery, false,
                [](Options& o, const std::string&) { return setFlag(o.help); }},
-    OptionRule{"--json", Group::Every, false,
+    OptionRule{"--json", kEvery, false,
                [](Options& o, const std::string&) { return setFlag(o.json); }},
-    OptionRule{"--verbose", Group::Every, false,
+    OptionRule{"--verbose", kEvery, false,
                [](Options& o, const std::string&) { return setFlag(o.verbose); }},
-    OptionRule{"--client", Group::Every, true,
+    OptionRule{"--client", kEvery, true,
                [](Options& o, const std::string& v) { return readText(o.client, v); }},
-    OptionRule{"--user-agent", Group::Every, true,
+    OptionRule{"--user-agent", kEvery, true,
                [](Options& o, const std::string& v) { return readText(o.userAgent, v); }},
-    OptionRule{"--address", Group::Every, true,
+    OptionRule{"--address", kEvery, true,
                [](Options& o, const std::string& v) { return readText(o.address, v); }},
-    OptionRule{"--socket", Group::Every, true,
+    OptionRule{"--socket", kEvery, true,
                [](Options& o, const std::string& v) { return readText(o.socket, v); }},
-    OptionRule{"--timeout", Group::Every, true,
+    OptionRule{"--timeout", kEvery, true,
                [](Options& o, const std::string& v) { return readSeconds(o.timeout, v); }},
-    OptionRule{"--kind", Group::Query, true,
-               [](Options& o, const std::string& v) { return readKind(o.kind, v); }},
-    OptionRule{"--item", Group::Query, true,
+    OptionRule{"--kind", setOf({Command::Search}), true,
+               [](Options& o, const std::string& v) { return readNamed(o.kind, v, kKinds); }},
+    OptionRule{"--item", kQueries, true,
                [](Options& o, const std::string& v) { return readItem(o, v); }},
-    OptionRule{"--url", Group::Query, true,
-               [](Options& o, const std::string& v) { return readText(o.url, v); }},
-    OptionRule{"--count", Group::Query, true,
+    OptionRule{"--url", setOf({Command::Search, Command::More, Command::Card, Command::Images}),
+               true, [](Options& o, const std::string& v) { return readTexts(o.urls, v); }},
+    OptionRule{"--count", setOf({Command::Search}), true,
                [](Options& o, const std::string& v) { return readCount(o.count, v, 1, 100'000); }},
-    OptionRule{"--limit", Group::Query, true,
+    OptionRule{"--limit", kLists, true,
                [](Options& o, const std::string& v) { return readCount(o.limit, v, 0, 1'000); }},
-    OptionRule{"--as-typed", Group::Query, false,
+    OptionRule{"--as-typed", setOf({Command::Search}), false,
                [](Options& o, const std::string&) { return setFlag(o.asTyped); }},
-    OptionRule{"--delay-per-key", Group::Query, true,
-               [](Options& o, const std::string& v) { return readDelay(o.delayPerKey, v); }},
-    OptionRule{"--domain", Group::Settings, true,
+    OptionRule{"--delay-per-key", setOf({Command::Search, Command::Type}), true,
+               [](Options& o, const std::string& v) {
+                 return readMilliseconds(o.delayPerKey, v, 60'000);
+               }},
+    OptionRule{"--endpoint", setOf({Command::More, Command::Card}), false,
+               [](Options& o, const std::string&) { return setFlag(o.endpoint); }},
+    OptionRule{"--pages", setOf({Command::More}), true,
+               [](Options& o, const std::string& v) { return readCount(o.pages, v, 1, 1'000); }},
+    OptionRule{"--result", setOf({Command::Card}), true,
+               [](Options& o, const std::string& v) { return readCount(o.result, v, 1, 1'000); }},
+    OptionRule{"--context", setOf({Command::Lookup}), true,
+               [](Options& o, const std::string& v) { return readText(o.context.emplace(), v); }},
+    OptionRule{"--selection", setOf({Command::Lookup}), true,
+               [](Options& o, const std::string& v) {
+                 return readNamed(o.selectionType, v, kSelections);
+               }},
+    OptionRule{"--app", setOf({Command::Lookup}), true,
+               [](Options& o, const std::string& v) { return readText(o.appBundleId, v); }},
+    OptionRule{"--hint-domain", setOf({Command::Lookup}), true,
+               [](Options& o, const std::string& v) { return readText(o.hintDomain, v); }},
+    OptionRule{"--id", setOf({Command::Images}), true,
+               [](Options& o, const std::string& v) { return readTexts(o.identifiers, v); }},
+    OptionRule{"--save", setOf({Command::Images}), true,
+               [](Options& o, const std::string& v) { return readText(o.folder, v); }},
+    OptionRule{
+        "--deadline", setOf({Command::Images}), true,
+        [](Options& o, const std::string& v) { return readMilliseconds(o.deadline, v, 600'000); }},
+    OptionRule{"--domain", setOf({Command::Defaults}), true,
                [](Options& o, const std::string& v) { return readText(o.domain, v); }},
 };
 
@@ -208,13 +259,13 @@ class Parsing {
   void apply(const OptionRule& rule, const std::string& value) {
     const auto wanted = rule.apply(options_, value);
     if (!wanted.empty()) problem_ = std::string(rule.name) + " takes " + wanted;
-    if (rule.group != Group::Every) special_.push_back(&rule);
+    if (rule.commands != kEvery) special_.push_back(&rule);
   }
 
   void checkOptions() {
-    const auto group = command_ ? command_->group : Group::Every;
+    const auto own = command_ ? setOf({command_->command}) : CommandSet{0};
     for (const auto* rule : special_) {
-      if (rule->group == group) continue;
+      if ((rule->commands & own) != 0) continue;
       problem_ = std::string(rule->name) + " is for other commands";
     }
     if (!options_.address.empty() && !options_.socket.empty()) {
@@ -223,19 +274,32 @@ class Parsing {
   }
 
   void checkArguments() {
-    const auto count = options_.arguments.size();
     if (!command_) {
       problem_ = "no command given";
-    } else if (options_.command == Command::Search) {
-      const bool needsText = options_.kind != QueryKind::ZeroKeyword && options_.url.empty();
-      if (count == 0 && needsText) problem_ = "search needs a text";
-    } else if (options_.command == Command::Defaults) {
+      return;
+    }
+    const auto count = options_.arguments.size();
+    if (options_.command == Command::Defaults) {
       checkDefaults();
     } else if (options_.command == Command::Help) {
       if (count > 1) problem_ = "help takes one command";
+    } else if (takesText()) {
+      if (count == 0 && needsText()) problem_ = std::string(command_->name) + " needs a text";
     } else if (count > 0) {
       problem_ = std::string(command_->name) + " takes no arguments";
     }
+  }
+
+  bool takesText() const {
+    constexpr auto kTakers =
+        setOf({Command::Search, Command::More, Command::Card, Command::Lookup, Command::Images});
+    return (kTakers & setOf({options_.command})) != 0;
+  }
+
+  // Something that the query is made from is there already.
+  bool needsText() const {
+    return options_.kind != QueryKind::ZeroKeyword && options_.urls.empty() &&
+           options_.identifiers.empty();
   }
 
   void checkDefaults() {
@@ -266,6 +330,10 @@ std::variant<Options, UsageError> parseArguments(const std::vector<std::string>&
 std::optional<Command> commandNamed(std::string_view name) {
   const auto* rule = findCommand(name);
   return rule ? std::optional(rule->command) : std::nullopt;
+}
+
+std::string urlOf(const Options& options) {
+  return options.urls.empty() ? std::string() : options.urls.back();
 }
 
 ClientOptions clientOptions(const Options& options) {

@@ -15,7 +15,22 @@ namespace zelkorctl {
 
 using namespace zelkor;
 
-enum class Command { Search, Type, Bag, Defaults, Sessions, Metrics, Status, Version, Help };
+enum class Command {
+  Search,
+  Type,
+  More,
+  Card,
+  Lookup,
+  ZeroKeyword,
+  Images,
+  Bag,
+  Defaults,
+  Sessions,
+  Metrics,
+  Status,
+  Version,
+  Help,
+};
 
 enum class QueryKind { Search, ZeroKeyword, MoreResults, Card, Lookup, FlightLookup, FlightSearch };
 
@@ -37,11 +52,25 @@ struct Options {
   // Of queries.
   QueryKind kind = QueryKind::Search;
   std::vector<std::pair<std::string, std::string>> items;
-  std::string url;         // of further results and cards
-  std::int64_t count = 1;  // how often the query is sent
-  std::int64_t limit = 5;  // results that are shown of each answer
+  std::vector<std::string> urls;  // of images; the last one of further results or a card
+  std::int64_t count = 1;         // how often the query is sent
+  std::int64_t limit = 5;         // results that are shown of each answer
   bool asTyped = false;
   Duration delayPerKey = 120ms;
+  bool endpoint = false;    // asked on the second connection
+  std::int64_t pages = 1;   // of further results
+  std::int64_t result = 1;  // whose card is shown
+
+  // Of lookups.
+  std::optional<std::string> context;  // the text around; by default the selected text itself
+  std::uint32_t selectionType = 1;
+  std::string appBundleId;
+  std::string hintDomain;
+
+  // Of images.
+  std::vector<std::string> identifiers;
+  std::string folder;  // where they are saved; empty: they are not
+  Duration deadline = 5s;
 
   // Of settings.
   std::string domain;
@@ -56,6 +85,9 @@ std::variant<Options, UsageError> parseArguments(const std::vector<std::string>&
 
 // Nothing for a name that no command has.
 std::optional<Command> commandNamed(std::string_view name);
+
+// The address that was given for further results or a card; empty for none.
+std::string urlOf(const Options& options);
 
 ClientOptions clientOptions(const Options& options);
 

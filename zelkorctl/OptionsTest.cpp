@@ -38,6 +38,14 @@ TEST(OptionsTest, RefusesWhatItCannotDo) {
       {{"search", "a", "--item", "=v"}, "--item takes NAME=VALUE"},
       {{"search", "a", "--json=1"}, "--json takes no value"},
       {{"bag", "--count", "2"}, "--count is for other commands"},
+      {{"more"}, "more needs a text"},
+      {{"images", "--save", "d"}, "images needs a text"},
+      {{"zkw", "x"}, "zkw takes no arguments"},
+      {{"more", "a", "--result", "2"}, "--result is for other commands"},
+      {{"card", "a", "--domain", "d"}, "--domain is for other commands"},
+      {{"lookup", "a", "--selection", "x"}, "--selection takes one of default, explicit, hint"},
+      {{"images", "a", "--deadline", "600001"}, "--deadline takes a number from 0 to 600000"},
+      {{"images", "--url", ""}, "--url takes a text"},
       {{"bag", "x"}, "bag takes no arguments"},
       {{"bag", "--socket", "a", "--address", "b"}, "--address and --socket exclude each other"},
       {{"defaults", "write", "k"}, "defaults takes read KEY, write KEY JSON, delete KEY or list"},
@@ -52,7 +60,9 @@ TEST(OptionsTest, RefusesWhatItCannotDo) {
 
 TEST(OptionsTest, AsksForNoTextWhereNoneIsNeeded) {
   for (const auto& words : {Words{"search", "--kind", "zeroKeyword"}, Words{"search", "--help"},
-                            Words{"search", "--kind=card", "--url", "https://a/"}}) {
+                            Words{"search", "--kind=card", "--url", "https://a/"}, Words{"zkw"},
+                            Words{"more", "--url", "https://a/", "--endpoint"},
+                            Words{"images", "--id", "word", "--url", "a", "--id=b"}}) {
     EXPECT_TRUE(std::holds_alternative<Options>(parseArguments(words)));
   }
 }

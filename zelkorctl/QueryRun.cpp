@@ -10,6 +10,7 @@
 #include "base/Check.h"
 #include "base/Mutex.h"
 #include "corezelkor/client/ClientError.h"
+#include "corezelkor/client/EndpointClient.h"
 
 namespace zelkorctl {
 namespace {
@@ -19,8 +20,17 @@ std::shared_ptr<Request> newRequest() {
   return std::make_shared<Request>();
 }
 
-std::shared_ptr<ZLKRequest> requestOfKind(const Options& options, const std::string& text) {
-  switch (options.kind) {
+std::shared_ptr<ZLKRequest> lookupRequest(const Options& options, const std::string& text) {
+  auto request = newRequest<ZLKLookupRequest>();
+  request->lookupSelectionType = options.selectionType;
+  request->queryContext = options.context.value_or(text);
+  request->appBundleId = options.appBundleId;
+  request->domain = options.hintDomain;
+  return request;
+}
+
+std::shared_ptr<ZLKRequest> requestFor(const Query& query, const Options& options) {
+  switch (query.kind) {
     case QueryKind::ZeroKeyword:
       return newRequest<ZLKZeroKeywordRequest>();
     case QueryKind::FlightLookup:
@@ -29,20 +39,16 @@ std::shared_ptr<ZLKRequest> requestOfKind(const Options& options, const std::str
       return newRequest<ZLKFlightSearchRequest>();
     case QueryKind::MoreResults: {
       auto request = newRequest<ZLKMoreResultsRequest>();
-      request->moreResultsURL = options.url;
+      request->moreResultsURL = query.url;
       return request;
     }
     case QueryKind::Card: {
       auto request = newRequest<ZLKCardRequest>();
-      request->cardURL = options.url;
+      request->cardURL = query.url;
       return request;
     }
-    case QueryKind::Lookup: {
-      auto request = newRequest<ZLKLookupRequest>();
-      request->lookupSelectionType = 1;
-      request->queryContext = text;
-      return request;
-    }
+    case QueryKind::Lookup:
+      return lookupRequest(options, query.text);
     case QueryKind::Search:
       break;
   }
@@ -74,6 +80,11 @@ std::string_view nameOf(Outcome::Kind kind) {
   return {};
 }
 
+std::string_view sourceOf(const Outcome& outcome) {
+  if (!outcome.answer.reply) return {};
+  return outcome.answer.reply->httpResponse ? "network" : "cache";
+}
+
 // Outlives the run in the call-backs of answers that are still to come.
 struct QueryRun::Shared {
   Shared() { ZK_CHECK(wakeUp >= 0, "a run needs one event descriptor"); }
@@ -98,26 +109,33 @@ QueryRun::~QueryRun() = default;
 
 int QueryRun::descriptor() const { return shared_->wakeUp; }
 
-std::shared_ptr<const ZLKRequest> QueryRun::_request(const std::string& text) const {
-  auto request = requestOfKind(options_, text);
+std::shared_ptr<const ZLKRequest> QueryRun::_request(const Query& query) const {
+  auto request = requestFor(query, options_);
   request->queryId = lastQueryId_;
   request->clientQueryId = static_cast<std::uint64_t>(lastQueryId_);
-  request->queryString = text;
+  request->queryString = query.text;
   request->queryItems = options_.items;
-  request->verboseReply = options_.verbose;
+  request->verboseReply = true;
   return request;
 }
 
-void QueryRun::send(const std::string& text) {
+ZLKFuture<ClientAnswer> QueryRun::_ask(std::shared_ptr<const ZLKRequest> request) {
+  const bool follows = dynamic_cast<const ZLKMoreResultsRequest*>(request.get()) != nullptr ||
+                       dynamic_cast<const ZLKCardRequest*>(request.get()) != nullptr;
+  if (options_.endpoint && follows) return EndpointClient(client_).request(std::move(request));
+  return client_.request(std::move(request));
+}
+
+void QueryRun::send(const Query& query) {
   const auto queryId = ++lastQueryId_;
   ++outstanding_;
   shared_->newest = queryId;
   const auto start = std::chrono::steady_clock::now();
-  client_.request(_request(text))
-      .then([shared = shared_, queryId, start, text](const ClientAnswer& answer) {
+  _ask(_request(query))
+      .then([shared = shared_, queryId, start, name = query.name()](const ClientAnswer& answer) {
         const std::chrono::duration<double, std::milli> time =
             std::chrono::steady_clock::now() - start;
-        shared->add({text, kindOf(answer, shared->newest == queryId), time.count(), answer});
+        shared->add({name, kindOf(answer, shared->newest == queryId), time.count(), answer});
       });
 }
 
@@ -141,6 +159,12 @@ std::vector<Outcome> QueryRun::takeAll() {
     for (auto& outcome : take()) all.push_back(std::move(outcome));
   }
   return all;
+}
+
+Outcome QueryRun::ask(const Query& query) {
+  ZK_CHECK(!hasOutstanding(), "one query at a time is asked and waited for");
+  send(query);
+  return std::move(takeAll().front());
 }
 
 }  // namespace zelkorctl

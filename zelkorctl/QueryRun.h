@@ -12,6 +12,16 @@
 
 namespace zelkorctl {
 
+// One query.
+struct Query {
+  QueryKind kind = QueryKind::Search;
+  std::string text;
+  std::string url;  // of further results or a card; empty: the bag's
+
+  // What people call it by.
+  const std::string& name() const { return text.empty() ? url : text; }
+};
+
 // What became of one query.
 struct Outcome {
   enum class Kind {
@@ -22,13 +32,18 @@ struct Outcome {
     Dropped,   // not at all, in the time given
   };
 
-  std::string text;
+  std::string text;  // the query's name
   Kind kind = Kind::Nothing;
   double milliseconds = 0;
   ClientAnswer answer;
 };
 
 std::string_view nameOf(Outcome::Kind kind);
+
+// "cache" for an answer that the daemon gave out of its query cache, "network" for one that came
+// from the service, nothing without an answer. Every query is sent as one that wants a verbose
+// reply: the daemon then tells the response that it got, and has none to tell on a cache hit.
+std::string_view sourceOf(const Outcome& outcome);
 
 // Sends queries of one client and collects what becomes of them.
 //
@@ -39,7 +54,7 @@ class QueryRun {
   QueryRun(Client& client, const Options& options);
   ~QueryRun();
 
-  void send(const std::string& text);
+  void send(const Query& query);
   bool hasOutstanding() const { return outstanding_ > 0; }
   // Readable while outcomes wait to be taken.
   int descriptor() const;
@@ -47,11 +62,14 @@ class QueryRun {
   std::vector<Outcome> take();
   // Waits for all; gives what came, in that order too.
   std::vector<Outcome> takeAll();
+  // Sends it and waits. Nothing else may be outstanding.
+  Outcome ask(const Query& query);
 
  private:
   struct Shared;
 
-  std::shared_ptr<const ZLKRequest> _request(const std::string& text) const;
+  std::shared_ptr<const ZLKRequest> _request(const Query& query) const;
+  ZLKFuture<ClientAnswer> _ask(std::shared_ptr<const ZLKRequest> request);
 
   Client& client_;
   const Options& options_;

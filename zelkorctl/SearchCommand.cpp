@@ -1,21 +1,12 @@
-#include <poll.h>
-
 #include <algorithm>
 #include <thread>
 
-#include "corezelkor/client/ClientError.h"
-#include "zelkorctl/AnswerText.h"
 #include "zelkorctl/Commands.h"
+#include "zelkorctl/QueryOutput.h"
 #include "zelkorctl/QueryRun.h"
 
 namespace zelkorctl {
 namespace {
-
-std::string joinedWords(const std::vector<std::string>& words) {
-  std::string text;
-  for (const auto& word : words) text += (text.empty() ? "" : " ") + word;
-  return text;
-}
 
 // Every beginning of the text that ends with a whole character.
 std::vector<std::string> prefixesOf(const std::string& text) {
@@ -27,43 +18,10 @@ std::vector<std::string> prefixesOf(const std::string& text) {
   return prefixes;
 }
 
-void showOutcome(const Invocation& invocation, const Outcome& outcome) {
-  const auto& [options, surroundings] = invocation;
-  auto& out = surroundings.out;
-  if (options.json) {
-    out << json::serialize(outcomeJson(outcome)) << std::endl;
-    return;
-  }
-  out << outcomeLine(outcome, surroundings.columns) << '\n';
-  if (!outcome.answer.reply) return;
-  if (options.verbose) {
-    for (const auto& line : exchangeLines(*outcome.answer.reply)) surroundings.err << line << '\n';
-  }
-}
-
-void showResults(const Invocation& invocation, const Outcome& outcome) {
-  const auto& [options, surroundings] = invocation;
-  if (options.json || !outcome.answer.reply) return;
-  const auto lines = resultLines(outcome.answer.reply->data.view(),
-                                 static_cast<std::size_t>(options.limit), surroundings.columns);
-  for (const auto& line : lines) surroundings.out << line << '\n';
-}
-
-int statusOf(const std::vector<Outcome>& outcomes) {
-  int status = kAnswered;
-  for (const auto& outcome : outcomes) {
-    const auto& error = outcome.answer.error;
-    if (!error) continue;
-    if (isClientError(*error, ClientErrorCode::NotReachable)) return kNotReachable;
-    status = kErrorReply;
-  }
-  return status;
-}
-
-int searchOneByOne(const Invocation& invocation, QueryRun& run, const std::string& text) {
+int searchOneByOne(const Invocation& invocation, QueryRun& run, const Query& query) {
   std::vector<Outcome> all;
   for (std::int64_t i = 0; i < invocation.options.count; ++i) {
-    run.send(text);
+    run.send(query);
     for (auto& outcome : run.takeAll()) {
       showOutcome(invocation, outcome);
       if (i + 1 == invocation.options.count) showResults(invocation, outcome);
@@ -75,12 +33,12 @@ int searchOneByOne(const Invocation& invocation, QueryRun& run, const std::strin
   return statusOf(all);
 }
 
-int searchAsTyped(const Invocation& invocation, QueryRun& run, const std::string& text) {
-  const auto prefixes = prefixesOf(text);
+int searchAsTyped(const Invocation& invocation, QueryRun& run, const Query& query) {
+  const auto prefixes = prefixesOf(query.text);
   for (std::int64_t i = 0; i < invocation.options.count; ++i) {
     for (const auto& prefix : prefixes) {
       if (&prefix != &prefixes.front()) std::this_thread::sleep_for(invocation.options.delayPerKey);
-      run.send(prefix);
+      run.send({query.kind, prefix, query.url});
     }
   }
   auto outcomes = run.takeAll();
@@ -91,14 +49,32 @@ int searchAsTyped(const Invocation& invocation, QueryRun& run, const std::string
   return statusOf(outcomes);
 }
 
+int askOnce(const Invocation& invocation, const Query& query) {
+  Client client(clientOptions(invocation.options));
+  QueryRun run(client, invocation.options);
+  const auto outcome = run.ask(query);
+  showOutcome(invocation, outcome);
+  showResults(invocation, outcome);
+  return statusOf(outcome);
+}
+
 }  // namespace
 
 int runSearch(const Invocation& invocation) {
-  const auto text = joinedWords(invocation.options.arguments);
-  Client client(clientOptions(invocation.options));
-  QueryRun run(client, invocation.options);
-  return invocation.options.asTyped ? searchAsTyped(invocation, run, text)
-                                    : searchOneByOne(invocation, run, text);
+  const auto& options = invocation.options;
+  const Query query{options.kind, joinedWords(options.arguments), urlOf(options)};
+  Client client(clientOptions(options));
+  QueryRun run(client, options);
+  return options.asTyped ? searchAsTyped(invocation, run, query)
+                         : searchOneByOne(invocation, run, query);
+}
+
+int runLookup(const Invocation& invocation) {
+  return askOnce(invocation, {QueryKind::Lookup, joinedWords(invocation.options.arguments), {}});
+}
+
+int runZeroKeyword(const Invocation& invocation) {
+  return askOnce(invocation, {QueryKind::ZeroKeyword, {}, {}});
 }
 
 }  // namespace zelkorctl

@@ -12,6 +12,7 @@ struct Surroundings {
   int input = 0;  // file descriptor
   bool inputIsTerminal = false;
   bool outputIsTerminal = false;
+  bool showsImages = false;   // the output is a terminal that can
   std::size_t columns = 100;  // of the output
 };
 

@@ -38,6 +38,16 @@ int runCommand(const Invocation& invocation) {
       return runSearch(invocation);
     case Command::Type:
       return runType(invocation);
+    case Command::More:
+      return runMore(invocation);
+    case Command::Card:
+      return runCard(invocation);
+    case Command::Lookup:
+      return runLookup(invocation);
+    case Command::ZeroKeyword:
+      return runZeroKeyword(invocation);
+    case Command::Images:
+      return runImages(invocation);
     case Command::Bag:
       return runBag(invocation);
     case Command::Defaults:

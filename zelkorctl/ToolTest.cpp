@@ -1,7 +1,9 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <filesystem>
+#include <map>
 #include <sstream>
 
 #include "corezelkor/client/TinyDaemonTestSupport.h"
@@ -12,53 +14,98 @@ namespace zelkorctl {
 namespace {
 
 using testing::HasSubstr;
+using testing::Not;
 using zelkor::TinyDaemon;
 
-// Answers a search with its own query identifier and text; "slow" never, "bad" with an error.
-void answerSearch(sd_bus_message* call) {
+// What a request asks for.
+struct Asked {
+  std::string kind;
   std::int64_t queryId = 0;
-  std::string text;
-  sd_bus_message_skip(call, "s");
+  std::map<std::string, std::string> texts;
+  bool verbose = false;
+};
+
+Asked readCall(sd_bus_message* call) {
+  Asked asked;
+  const char* text = nullptr;
+  sd_bus_message_read(call, "s", &text);
+  asked.kind = text;
   sd_bus_message_enter_container(call, 'a', "{sv}");
   while (sd_bus_message_enter_container(call, 'e', "sv") > 0) {
     const char* key = nullptr;
-    const char* value = nullptr;
+    const char* type = nullptr;
+    int flag = 0;
     sd_bus_message_read(call, "s", &key);
+    sd_bus_message_peek_type(call, nullptr, &type);
     if (std::string(key) == "queryId") {
-      sd_bus_message_read(call, "v", "x", &queryId);
-    } else if (std::string(key) == "queryString") {
-      sd_bus_message_read(call, "v", "s", &value);
-      text = value;
+      sd_bus_message_read(call, "v", "x", &asked.queryId);
+    } else if (std::string(key) == "verboseReply") {
+      sd_bus_message_read(call, "v", "b", &flag);
+      asked.verbose = flag != 0;
+    } else if (std::string(type) == "s") {
+      sd_bus_message_read(call, "v", "s", &text);
+      asked.texts[key] = text;
     } else {
       sd_bus_message_skip(call, "v");
     }
     sd_bus_message_exit_container(call);
   }
-  if (text == "slow") return;
-  if (text == "bad") {
-    sd_bus_reply_method_return(call, "xa{sv}a{sv}", queryId, 0, 2, "domain", "s", "D\x1b", "code",
-                               "x", std::int64_t{5});
-    return;
-  }
-  const char body[] = R"([{"results":[{"title":"T","description":"d"}]}])";
+  return asked;
+}
+
+// Answers with a body; with `status`, as one that came from the service.
+void answerWith(sd_bus_message* call, std::int64_t queryId, std::string_view body, int status) {
   sd_bus_message* reply = nullptr;
   sd_bus_message_new_method_return(call, &reply);
   sd_bus_message_append(reply, "x", queryId);
   sd_bus_message_open_container(reply, 'a', "{sv}");
+  if (status != 0) {
+    sd_bus_message_append(reply, "{sv}", "httpResponse", "a{sv}", 1, "status", "i", status);
+  }
   sd_bus_message_open_container(reply, 'e', "sv");
   sd_bus_message_append(reply, "s", "data");
   sd_bus_message_open_container(reply, 'v', "ay");
-  sd_bus_message_append_array(reply, 'y', body, sizeof body - 1);
+  sd_bus_message_append_array(reply, 'y', body.data(), body.size());
   for (int i = 0; i < 3; ++i) sd_bus_message_close_container(reply);
   sd_bus_message_append(reply, "a{sv}", 0);
   sd_bus_send(nullptr, reply, nullptr);
   sd_bus_message_unref(reply);
 }
 
+// Answers with the query's own identifier; "slow" never, "bad" with an error, "kept" as if from a
+// cache. A search leads on to further results, cards and images.
+void answerSearch(sd_bus_message* call) {
+  auto asked = readCall(call);
+  const auto text = asked.texts["queryString"];
+  if (text == "slow") return;
+  if (text == "bad") {
+    sd_bus_reply_method_return(call, "xa{sv}a{sv}", asked.queryId, 0, 2, "domain", "s", "D\x1b",
+                               "code", "x", std::int64_t{5});
+    return;
+  }
+  std::string body = R"([{"more_results_url":"m1","results":[{"title":"T","description":"d",)"
+                     R"("card_url":"c1","icon":{"url":"https://a/fr.png"}},)"
+                     R"({"card_url":"c2","icon":{"id":"word"}}]}])";
+  if (text == "plain") body = R"([{"results":[{"title":"T"}]}])";
+  if (asked.kind == "moreResults") {
+    const auto url = asked.texts["moreResultsURL"];
+    body = url == "m1" ? R"([{"more_results_url":"m2","results":[{"title":"page 1"}]}])"
+                       : R"([{"results":[{"title":"last )" + url + R"("}]}])";
+  }
+  if (asked.kind == "card") body = R"([{"title":"card )" + asked.texts["cardURL"] + R"("}])";
+  if (asked.kind == "lookup") {
+    body = R"([{"results":[{"title":"in )" + asked.texts["queryContext"] + R"("}]}])";
+  }
+  if (asked.kind == "zeroKeyword") body = R"([{"results":[{"title":"popular"}]}])";
+  answerWith(call, asked.queryId, body, text == "kept" || !asked.verbose ? 0 : 200);
+}
+
 class ToolTest : public testing::Test {
  protected:
   ToolTest() {
-    daemon_.reply("Configure", "s", "unix:path=/nowhere");
+    daemon_.on("Configure", [this](sd_bus_message* call) {
+      sd_bus_reply_method_return(call, "s", daemon_.address().c_str());
+    });
     daemon_.on("Request", answerSearch);
   }
 
@@ -70,6 +117,11 @@ class ToolTest : public testing::Test {
     out_.str("");
     err_.str("");
     return runTool(arguments, {.out = out_, .err = err_, .input = input});
+  }
+
+  std::size_t requests() {
+    const auto calls = daemon_.calls();
+    return static_cast<std::size_t>(std::count(calls.begin(), calls.end(), "Request"));
   }
 
   TinyDaemon daemon_;
@@ -88,11 +140,78 @@ TEST_F(ToolTest, ExitStatusesSayWhatHappened) {
   EXPECT_EQ(runRaw({"search", "a", "--socket", "/nowhere"}), kNotReachable);
   EXPECT_EQ(runRaw({"metrics", "--json", "--socket", "/nowhere"}), kNotReachable);
   EXPECT_THAT(out_.str(), HasSubstr("\"error\""));
-  for (const auto* command :
-       {"search", "type", "bag", "defaults", "sessions", "metrics", "status"}) {
+  for (const auto* command : {"search", "type", "more", "card", "lookup", "zkw", "images", "bag",
+                              "defaults", "sessions", "metrics", "status"}) {
     EXPECT_EQ(runRaw({"help", command}), kAnswered);
     EXPECT_THAT(out_.str(), HasSubstr(std::string("usage: zelkorctl ") + command));
   }
+}
+
+TEST_F(ToolTest, TellsCacheAndNetworkApart) {
+  EXPECT_EQ(run({"search", "hello", "--json"}), kAnswered);
+  EXPECT_THAT(out_.str(), HasSubstr("\"source\":\"network\""));
+  EXPECT_THAT(out_.str(), Not(HasSubstr("httpResponse")));
+  EXPECT_EQ(run({"search", "hello", "--json", "--verbose"}), kAnswered);
+  EXPECT_THAT(out_.str(), HasSubstr("httpResponse"));
+  EXPECT_EQ(run({"search", "kept"}), kAnswered);
+  EXPECT_THAT(out_.str(), HasSubstr("answered cache"));
+}
+
+TEST_F(ToolTest, FollowsAnAnswerToFurtherResultsAndCards) {
+  const struct {
+    std::vector<std::string> words;
+    int status;
+    const char* shown;
+    std::size_t calls;  // of Request
+  } cases[] = {
+      {{"more", "snow"}, kAnswered, "\n  page 1\n", 2},
+      {{"more", "snow", "--pages", "9"}, kAnswered, "\n  last m2\n", 3},
+      {{"more", "--url", "u", "--endpoint"}, kAnswered, "\n  last u\n", 1},
+      {{"more", "plain", "--json"}, kErrorReply, "the results name no further ones", 1},
+      {{"more", "bad"}, kErrorReply, "D\\x1b 5", 1},
+      {{"card", "snow", "--result", "2"}, kAnswered, "\n  card c2\n", 2},
+      {{"card", "snow", "--result", "3", "--json"}, kErrorReply, "result 3 has no card", 1},
+      {{"card", "--url", "u"}, kAnswered, "\n  card u\n", 1},
+      {{"lookup", "bank", "--context", "the river"}, kAnswered, "\n  in the river\n", 1},
+      {{"lookup", "bank"}, kAnswered, "\n  in bank\n", 1},
+      {{"zkw"}, kAnswered, "\n  popular\n", 1},
+  };
+  for (const auto& [words, status, shown, calls] : cases) {
+    SCOPED_TRACE(shown);
+    const auto before = requests();
+    EXPECT_EQ(run(words), status) << err_.str();
+    EXPECT_THAT(out_.str(), HasSubstr(shown));
+    EXPECT_EQ(requests() - before, calls);
+  }
+}
+
+TEST_F(ToolTest, LoadsTheImagesOfAnAnswer) {
+  daemon_.on("LoadImages", [](sd_bus_message* call) {
+    const char png[] = "\x89PNG\r\n\x1a\n";
+    sd_bus_message* reply = nullptr;
+    sd_bus_message_new_method_return(call, &reply);
+    sd_bus_message_open_container(reply, 'a', "{say}");
+    for (const auto* key : {"https://a/fr.png", "other"}) {
+      sd_bus_message_open_container(reply, 'e', "say");
+      sd_bus_message_append(reply, "s", key);
+      sd_bus_message_append_array(reply, 'y', png, sizeof png - 1);
+      sd_bus_message_close_container(reply);
+    }
+    sd_bus_message_close_container(reply);
+    sd_bus_send(nullptr, reply, nullptr);
+    sd_bus_message_unref(reply);
+  });
+  const auto folder = daemon_.path() + ".d";
+  EXPECT_EQ(run({"images", "snow", "--save", folder, "--json"}), kErrorReply);
+  EXPECT_THAT(out_.str(), HasSubstr(R"("images":[{"key":"https://a/fr.png","bytes":8,)"
+                                    R"("type":"image/png","file":")" +
+                                    folder + R"(/fr.png"}],"missing":["word"])"));
+  EXPECT_EQ(std::filesystem::file_size(folder + "/fr.png"), 8u);
+  std::filesystem::remove_all(folder);
+  EXPECT_EQ(run({"images", "--url", "https://a/fr.png"}), kAnswered);
+  EXPECT_THAT(out_.str(), HasSubstr("8 bytes, image/png\n"));
+  EXPECT_EQ(run({"images", "bad"}), kErrorReply);
+  EXPECT_EQ(runRaw({"images", "--id", "a", "--socket", "/nowhere"}), kNotReachable);
 }
 
 TEST_F(ToolTest, TypesEveryPrefixInOrder) {

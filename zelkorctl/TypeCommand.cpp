@@ -78,7 +78,7 @@ class TypingSession {
       latest_.reset();
       return;
     }
-    run_.send(editor_.text());
+    run_.send({QueryKind::Search, editor_.text(), {}});
     if (!invocation_.surroundings.inputIsTerminal) {
       std::this_thread::sleep_for(invocation_.options.delayPerKey);
     }
@@ -100,7 +100,8 @@ class TypingSession {
 
   void print(const Outcome& outcome) const {
     if (invocation_.options.json) {
-      out() << json::serialize(outcomeJson(outcome)) << std::endl;
+      const auto exchange = invocation_.options.verbose ? Exchange::Told : Exchange::LeftOut;
+      out() << json::serialize(outcomeJson(outcome, exchange)) << std::endl;
     } else {
       out() << outcomeLine(outcome, invocation_.surroundings.columns) << std::endl;
     }

@@ -1,8 +1,10 @@
 #include <sys/ioctl.h>
 #include <unistd.h>
 
+#include <cstdlib>
 #include <iostream>
 
+#include "zelkorctl/InlineImage.h"
 #include "zelkorctl/Tool.h"
 
 namespace {
@@ -12,6 +14,13 @@ std::size_t columnsOfOutput() {
   winsize size{};
   if (::isatty(STDOUT_FILENO) == 0) return kOfFiles;
   return ::ioctl(STDOUT_FILENO, TIOCGWINSZ, &size) == 0 && size.ws_col >= 20 ? size.ws_col : 80;
+}
+
+bool outputShowsImages() {
+  const char* type = std::getenv("TERM");
+  const char* program = std::getenv("TERM_PROGRAM");
+  return ::isatty(STDOUT_FILENO) != 0 &&
+         zelkorctl::showsInlineImages(type ? type : "", program ? program : "");
 }
 
 }  // namespace
@@ -24,5 +33,6 @@ int main(int count, char** words) {
                              .input = STDIN_FILENO,
                              .inputIsTerminal = ::isatty(STDIN_FILENO) != 0,
                              .outputIsTerminal = ::isatty(STDOUT_FILENO) != 0,
+                             .showsImages = outputShowsImages(),
                              .columns = columnsOfOutput()});
 }
