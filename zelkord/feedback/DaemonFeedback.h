@@ -6,6 +6,13 @@ namespace zelkord {
 
 // The feedback that only the daemon makes.
 
+// A lookup's request went out.
+struct ZLKLookupStartNetworkSearchFeedback final : HVStartNetworkSearchFeedback {
+  std::string_view className() const override { return "ZLKLookupStartNetworkSearchFeedback"; }
+
+  std::uint32_t lookupSelectionType = 0;  // 0 default, 1 explicit, 2 hint
+};
+
 // The end of a network search whose answer carried the service's own fields.
 struct ZLKEndNetworkSearchFeedback final : HVEndNetworkSearchFeedback {
   std::string_view className() const override { return "ZLKEndNetworkSearchFeedback"; }

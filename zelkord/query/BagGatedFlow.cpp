@@ -15,7 +15,8 @@ bool BagGatedFlow::_passesGates() {
     return false;
   }
   if (!state_->currentBag()->isEnabled()) {
-    assembly_.log(traits_.disabledCategory).debug("no {}, bag disabled", traits_.name);
+    assembly_.log(traits_.disabledCategory.value_or(traits_.category))
+        .debug("no {}, bag disabled", traits_.name);
     _skip(SkipReason::BagDisabled);
     return false;
   }
@@ -39,7 +40,7 @@ void BagGatedFlow::_logAnswer() const {
   _log().notice("Got network response for {} query", traits_.name);
 }
 
-std::optional<QueryFlow::Refusal> BagGatedFlow::_refusalOf(const URLResult& result) const {
+std::optional<QueryFlow::Refusal> BagGatedFlow::_refusalOfAnswer(const URLResult& result) const {
   if (result.error) {
     _log().error("error with request {}", result.error->description());
     return Refusal{result.error};

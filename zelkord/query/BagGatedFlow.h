@@ -19,8 +19,7 @@ class BagGatedFlow : public QueryFlow {
   bool _passesGates() override;
   void _logDispatch() const override;
   void _logAnswer() const override;
-  std::optional<Refusal> _refusalOf(const URLResult& result) const override;
-  using QueryFlow::_refusalOf;
+  std::optional<Refusal> _refusalOfAnswer(const URLResult& result) const override;
 
   virtual void _logStart() const;
   virtual void _logNoBag() const;

@@ -33,10 +33,10 @@ using BagCallback =
 // client: its configuration and user agent, the bag as that user agent sees it, its query cache,
 // and where its feedback goes.
 //
-// Threading: every operation on any thread. Those that need the bag (`bag`, `search`) may wait for
-// it for one second. Ownership: the assembly outlives it. Flows under way keep it alive. Errors:
-// kZLKErrorDomain codes 1 (no bag, no user agent) and 500 (the service's answer), or the task's
-// error.
+// Threading: every operation on any thread. Those that need the bag (`bag`, `search`,
+// `zeroKeyword`, `lookup`) may wait for it for one second. Ownership: the assembly outlives it.
+// Flows under way keep it alive. Errors: kZLKErrorDomain codes 1 (no bag, no user agent) and 500
+// (the service's answer), or the task's error.
 class ClientState final : public std::enable_shared_from_this<ClientState> {
  public:
   ClientState(std::string identifier, Assembly& assembly);
@@ -68,7 +68,15 @@ class ClientState final : public std::enable_shared_from_this<ClientState> {
 
   // Opens a connection to the service ahead of the first query, unless one is still warm.
   void warm();
+
+  // The queries. Each is answered once, those about flights at once and with nothing.
   void search(std::shared_ptr<const ZLKSearchRequest> request, ReplyCallback reply);
+  void zeroKeyword(std::shared_ptr<const ZLKZeroKeywordRequest> request, ReplyCallback reply);
+  void moreResults(std::shared_ptr<const ZLKMoreResultsRequest> request, ReplyCallback reply);
+  void card(std::shared_ptr<const ZLKCardRequest> request, ReplyCallback reply);
+  void lookup(std::shared_ptr<const ZLKLookupRequest> request, ReplyCallback reply);
+  void flightSearch(std::shared_ptr<const ZLKFlightSearchRequest> request, ReplyCallback reply);
+  void flightLookup(std::shared_ptr<const ZLKFlightLookupRequest> request, ReplyCallback reply);
 
   // What the flows share.
 
@@ -88,6 +96,8 @@ class ClientState final : public std::enable_shared_from_this<ClientState> {
               std::optional<UUID> userGuid) const;
 
  private:
+  template <typename Flow, typename Request>
+  void _start(std::shared_ptr<const Request> request, ReplyCallback reply);
   void _observeBagChanges();
   void _bagChangeNotification(const Notification& notification);
   bool _adoptFirstBag(const std::shared_ptr<const ZLKBag>& bag);

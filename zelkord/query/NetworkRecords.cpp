@@ -41,16 +41,21 @@ std::shared_ptr<HVEndNetworkSearchFeedback> makeEnd(const json::value* rawRespon
 
 }  // namespace
 
+void fillStart(HVStartNetworkSearchFeedback& start, const URLRequest& request, std::string input,
+               std::uint32_t triggerEvent, std::int32_t endpoint) {
+  start.input = std::move(input);
+  start.url = request.url;
+  start.headers = request.headers;
+  start.triggerEvent = triggerEvent;
+  start.endpoint = endpoint;
+}
+
 std::shared_ptr<const HVStartNetworkSearchFeedback> startNetworkFeedback(const URLRequest& request,
                                                                          std::string input,
                                                                          std::uint32_t triggerEvent,
                                                                          std::int32_t endpoint) {
   auto start = std::make_shared<HVStartNetworkSearchFeedback>();
-  start->input = std::move(input);
-  start->url = request.url;
-  start->headers = request.headers;
-  start->triggerEvent = triggerEvent;
-  start->endpoint = endpoint;
+  fillStart(*start, request, std::move(input), triggerEvent, endpoint);
   return start;
 }
 

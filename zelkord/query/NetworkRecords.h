@@ -15,6 +15,8 @@ class ClientState;
 
 // The feedback about one network request of a client.
 
+void fillStart(HVStartNetworkSearchFeedback& start, const URLRequest& request, std::string input,
+               std::uint32_t triggerEvent, std::int32_t endpoint);
 std::shared_ptr<const HVStartNetworkSearchFeedback> startNetworkFeedback(const URLRequest& request,
                                                                          std::string input,
                                                                          std::uint32_t triggerEvent,

@@ -7,6 +7,7 @@
 #include "zelkord/network/ZLKRetryableNetworkRequest.h"
 #include "zelkord/query/ErrorCodes.h"
 #include "zelkord/query/NetworkRecords.h"
+#include "zelkord/query/ResponseImages.h"
 #include "zelkord/query/RoutingProxy.h"
 #include "zelkord/query/VerboseReply.h"
 
@@ -80,7 +81,7 @@ void QueryFlow::_finish(const std::shared_ptr<URLTask>& task, const URLResult& r
   if (traits_.exchangeLog != ExchangeLog::Silent && _log().isEnabled(LogLevel::Debug)) {
     _log().debug("resp: {}", _responseForLog(result));
   }
-  if (const auto refusal = _refusalOf(result)) {
+  if (const auto refusal = _refusalOfAnswer(result)) {
     _fail(*task, result, *refusal);
   } else {
     _accept(task, result);
@@ -90,14 +91,21 @@ void QueryFlow::_finish(const std::shared_ptr<URLTask>& task, const URLResult& r
 void QueryFlow::_accept(const std::shared_ptr<URLTask>& task, const URLResult& result) {
   Body body{.data = result.data.value_or(Data())};
   body.parsed = parseJson(body.data.view(), &body.problem);
-  if (const auto refusal = _refusalOf(body)) return _fail(*task, result, *refusal);
-  if (body.parsed) _didParse(*body.parsed, body.data);
+  if (const auto refusal = _refusalOfBody(body)) return _fail(*task, result, *refusal);
+  if (body.parsed) _use(*body.parsed, body.data);
   endNetworkFeedback(state_, start_, body.parsed ? &*body.parsed : nullptr, result, task,
                      request_->queryId);
   auto reply = _makeReply(body.data);
   if (request_->verboseReply) addHTTPExchange(reply, httpRequest_, *result.response);
   _willReply(*result.response);
   _reply(std::move(reply), std::nullopt);
+}
+
+void QueryFlow::_use(const json::value& rawResponse, const Data& data) {
+  if (auto* images = assembly_.responseImages()) {
+    images->processImagesFromResponse(rawResponse, state_->currentBag().get());
+  }
+  _didParse(rawResponse, data);
 }
 
 void QueryFlow::_fail(const URLTask& task, const URLResult& result, const Refusal& refusal) {

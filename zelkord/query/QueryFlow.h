@@ -24,9 +24,10 @@ enum class ExchangeLog { Silent, RequestAndResponse };
 // What differs between the kinds of query as a value; what differs in behaviour are the steps
 // below.
 struct QueryTraits {
-  std::string_view name;      // in log lines
-  Category category;          // of log lines
-  Category disabledCategory;  // of the line about a bag that is disabled
+  std::string_view name;  // in log lines
+  Category category;      // of log lines
+  // Of the line about a bag that is disabled, where that differs.
+  std::optional<Category> disabledCategory = std::nullopt;
   std::int32_t endpoint = 6;  // as recorded
   QueryTransport transport = QueryTransport::Plain;
   QueryRouting routing = QueryRouting::ThroughProxy;
@@ -83,8 +84,8 @@ class QueryFlow : public std::enable_shared_from_this<QueryFlow> {
   virtual void _didSend() {}
   virtual void _logAnswer() const {}
   // Both log the refusal.
-  virtual std::optional<Refusal> _refusalOf(const URLResult& result) const = 0;
-  virtual std::optional<Refusal> _refusalOf(const Body&) const { return std::nullopt; }
+  virtual std::optional<Refusal> _refusalOfAnswer(const URLResult& result) const = 0;
+  virtual std::optional<Refusal> _refusalOfBody(const Body&) const { return std::nullopt; }
   virtual void _didParse(const json::value&, const Data&) {}
   virtual void _willReply(const URLResponse&) {}
 
@@ -108,6 +109,7 @@ class QueryFlow : public std::enable_shared_from_this<QueryFlow> {
   std::shared_ptr<URLTask> _makeTask(const ZLKBag* bag);
   void _finish(const std::shared_ptr<URLTask>& task, const URLResult& result);
   void _accept(const std::shared_ptr<URLTask>& task, const URLResult& result);
+  void _use(const json::value& rawResponse, const Data& data);
   void _fail(const URLTask& task, const URLResult& result, const Refusal& refusal);
 
   // Fixed after construction.

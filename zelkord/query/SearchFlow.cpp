@@ -11,8 +11,7 @@
 namespace zelkord {
 namespace {
 
-constexpr QueryTraits kSearchTraits = {
-    .name = "search", .category = Category::Search, .disabledCategory = Category::Search};
+constexpr QueryTraits kSearchTraits = {.name = "search", .category = Category::Search};
 constexpr std::uint32_t kCacheHitTrigger = 4;
 
 }  // namespace

@@ -1,0 +1,51 @@
+#include "zelkord/query/LookupFlow.h"
+
+#include <algorithm>
+
+#include "zelkord/assembly/Assembly.h"
+#include "zelkord/feedback/DaemonFeedback.h"
+#include "zelkord/network/ZLKNetworkRequestFactory.h"
+#include "zelkord/query/NetworkRecords.h"
+
+namespace zelkord {
+namespace {
+
+constexpr QueryTraits kLookupTraits = {
+    .name = "lookup", .category = Category::LookUp, .transport = QueryTransport::Retryable};
+constexpr std::uint32_t kLookupTrigger = 11;
+constexpr std::uint32_t kLastSelectionType = 2;
+constexpr Duration kRenderingTime = 500ms;
+
+}  // namespace
+
+LookupFlow::LookupFlow(std::shared_ptr<ClientState> state,
+                       std::shared_ptr<const ZLKLookupRequest> request, ReplyCallback reply)
+    : BagGatedFlow(kLookupTraits, std::move(state), request, std::move(reply)),
+      lookup_(std::move(request)) {}
+
+std::optional<URLRequest> LookupFlow::_makeRequest(const ZLKBag* bag,
+                                                   const std::optional<UUID>& userGuid) {
+  return assembly_.requestFactory()->lookupRequest(*lookup_, bag, userGuid);
+}
+
+std::shared_ptr<const HVStartNetworkSearchFeedback> LookupFlow::_makeStart(
+    const URLRequest& request) const {
+  auto start = std::make_shared<ZLKLookupStartNetworkSearchFeedback>();
+  fillStart(*start, request, _input(), kLookupTrigger, traits_.endpoint);
+  const auto type = lookup_->lookupSelectionType;
+  start->lookupSelectionType = type > kLastSelectionType ? 0 : type;
+  return start;
+}
+
+std::optional<SteadyTime> LookupFlow::_deadline(const ZLKBag* bag) const {
+  return lookupDeadline(assembly_.platform().clock.now(),
+                        bag ? bag->searchRenderTimeout() : std::nullopt);
+}
+
+std::optional<SteadyTime> lookupDeadline(SteadyTime now, std::optional<Duration> renderTimeout) {
+  if (!renderTimeout) return std::nullopt;
+  const auto left = std::max(*renderTimeout, Duration::zero()) - kRenderingTime;
+  return left < Duration::zero() ? now + left : deadlineAfter(now, left);
+}
+
+}  // namespace zelkord

@@ -1,0 +1,30 @@
+#pragma once
+
+#include "zelkord/query/BagGatedFlow.h"
+
+namespace zelkord {
+
+// A lookup of a text that the user has selected. It may be repeated as long as its answer can still
+// be shown.
+class LookupFlow final : public BagGatedFlow {
+ public:
+  LookupFlow(std::shared_ptr<ClientState> state, std::shared_ptr<const ZLKLookupRequest> request,
+             ReplyCallback reply);
+
+ private:
+  std::optional<URLRequest> _makeRequest(const ZLKBag* bag,
+                                         const std::optional<UUID>& userGuid) override;
+  std::string _input() const override { return lookup_->queryString; }
+  std::shared_ptr<const HVStartNetworkSearchFeedback> _makeStart(
+      const URLRequest& request) const override;
+  std::optional<SteadyTime> _deadline(const ZLKBag* bag) const override;
+  void _didSend() override { state_->_setPerformedSearch(); }
+
+  const std::shared_ptr<const ZLKLookupRequest> lookup_;
+};
+
+// The moment after which a lookup sent `now` is not repeated: half a second before the client gives
+// up on rendering it, which for a short time-out is past already. None without a time-out.
+std::optional<SteadyTime> lookupDeadline(SteadyTime now, std::optional<Duration> renderTimeout);
+
+}  // namespace zelkord
