@@ -139,9 +139,24 @@ void ClientConnection::request(std::shared_ptr<ZLKRequest> request,
   _ensureState();
   if (!request) return;
   _fillMissing(*request);
-  if (auto searched = std::dynamic_pointer_cast<const ZLKSearchRequest>(request)) {
-    search(std::move(searched), _replyTo(reply));
-  }
+  const auto answer = _replyTo(reply);
+  _dispatch(request, answer, &ClientConnection::search) ||
+      _dispatch(request, answer, &ClientConnection::moreResults) ||
+      _dispatch(request, answer, &ClientConnection::card) ||
+      _dispatch(request, answer, &ClientConnection::zeroKeyword) ||
+      _dispatch(request, answer, &ClientConnection::lookup) ||
+      _dispatch(request, answer, &ClientConnection::flightLookup) ||
+      _dispatch(request, answer, &ClientConnection::flightSearch);
+}
+
+template <typename Request>
+bool ClientConnection::_dispatch(const std::shared_ptr<ZLKRequest>& request,
+                                 const ReplyCallback& reply,
+                                 void (ClientConnection::*operation)(std::shared_ptr<const Request>,
+                                                                     ReplyCallback)) {
+  const auto query = std::dynamic_pointer_cast<const Request>(request);
+  if (query) (this->*operation)(query, reply);
+  return query != nullptr;
 }
 
 void ClientConnection::_fillMissing(ZLKRequest& request) {
@@ -186,6 +201,57 @@ void ClientConnection::search(std::shared_ptr<const ZLKSearchRequest> request,
       reply(answered, std::move(answer), std::move(error));
     }
   });
+}
+
+template <typename Request>
+void ClientConnection::_forward(std::shared_ptr<const Request> request, ReplyCallback reply,
+                                void (ClientState::*operation)(std::shared_ptr<const Request>,
+                                                               ReplyCallback)) {
+  const auto state = state_.get();
+  if (state) ((*state).*operation)(std::move(request), std::move(reply));
+}
+
+ReplyCallback ClientConnection::_traced(TraceCode start, TraceCode end, ReplyCallback reply) const {
+  const auto& tracing = assembly_.tracing();
+  tracing.emit(start);
+  return [&tracing, end, reply = std::move(reply)](std::int64_t queryId, auto answer, auto error) {
+    tracing.emit(end);
+    reply(queryId, std::move(answer), std::move(error));
+  };
+}
+
+void ClientConnection::moreResults(std::shared_ptr<const ZLKMoreResultsRequest> request,
+                                   ReplyCallback reply) {
+  _forward(std::move(request), std::move(reply), &ClientState::moreResults);
+}
+
+void ClientConnection::card(std::shared_ptr<const ZLKCardRequest> request, ReplyCallback reply) {
+  _forward(std::move(request), _traced(TraceCode::CardStart, TraceCode::CardEnd, std::move(reply)),
+           &ClientState::card);
+}
+
+void ClientConnection::zeroKeyword(std::shared_ptr<const ZLKZeroKeywordRequest> request,
+                                   ReplyCallback reply) {
+  _forward(std::move(request),
+           _traced(TraceCode::ZeroKeywordStart, TraceCode::ZeroKeywordEnd, std::move(reply)),
+           &ClientState::zeroKeyword);
+}
+
+void ClientConnection::lookup(std::shared_ptr<const ZLKLookupRequest> request,
+                              ReplyCallback reply) {
+  _forward(std::move(request),
+           _traced(TraceCode::LookupStart, TraceCode::LookupEnd, std::move(reply)),
+           &ClientState::lookup);
+}
+
+void ClientConnection::flightLookup(std::shared_ptr<const ZLKFlightLookupRequest> request,
+                                    ReplyCallback reply) {
+  _forward(std::move(request), std::move(reply), &ClientState::flightLookup);
+}
+
+void ClientConnection::flightSearch(std::shared_ptr<const ZLKFlightSearchRequest> request,
+                                    ReplyCallback reply) {
+  _forward(std::move(request), std::move(reply), &ClientState::flightSearch);
 }
 
 // Makes `queryId` the current one when it is newer; false when it is stale, also when another

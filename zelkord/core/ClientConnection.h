@@ -9,6 +9,7 @@
 #include "corezelkor/Messages.h"
 #include "platform/api/Interprocess.h"
 #include "platform/api/ProcessTransactions.h"
+#include "zelkord/ZelkorLogging/Tracing.h"
 #include "zelkord/core/BagTeller.h"
 #include "zelkord/core/IdleTimer.h"
 #include "zelkord/core/Wire.h"
@@ -59,7 +60,14 @@ class ClientConnection final : public ipc::CallHandler,
   void configure(ZLKSessionConfiguration configuration, const ipc::Call& call);
   void bag(const std::shared_ptr<ipc::Reply>& reply);
   void request(std::shared_ptr<ZLKRequest> request, const std::shared_ptr<ipc::Reply>& reply);
+  // The queries; `request` finds the one. Only searches go stale.
   void search(std::shared_ptr<const ZLKSearchRequest> request, ReplyCallback reply);
+  void moreResults(std::shared_ptr<const ZLKMoreResultsRequest> request, ReplyCallback reply);
+  void card(std::shared_ptr<const ZLKCardRequest> request, ReplyCallback reply);
+  void zeroKeyword(std::shared_ptr<const ZLKZeroKeywordRequest> request, ReplyCallback reply);
+  void lookup(std::shared_ptr<const ZLKLookupRequest> request, ReplyCallback reply);
+  void flightLookup(std::shared_ptr<const ZLKFlightLookupRequest> request, ReplyCallback reply);
+  void flightSearch(std::shared_ptr<const ZLKFlightSearchRequest> request, ReplyCallback reply);
   void listSessions(const std::shared_ptr<ipc::Reply>& reply);
 
   void _handleConfigure(const ipc::Call& call);
@@ -69,6 +77,17 @@ class ClientConnection final : public ipc::CallHandler,
   void _ensureState();
   void _refuseConfiguration();
   void _fillMissing(ZLKRequest& request);
+  // Hands the request to that operation if it is of its kind.
+  template <typename Request>
+  bool _dispatch(const std::shared_ptr<ZLKRequest>& request, const ReplyCallback& reply,
+                 void (ClientConnection::*operation)(std::shared_ptr<const Request>,
+                                                     ReplyCallback));
+  // Hands the request to the state; nobody answers when there is none.
+  template <typename Request>
+  void _forward(std::shared_ptr<const Request> request, ReplyCallback reply,
+                void (ClientState::*operation)(std::shared_ptr<const Request>, ReplyCallback));
+  // Leaves the trace event `start` now and `end` ahead of the reply.
+  ReplyCallback _traced(TraceCode start, TraceCode end, ReplyCallback reply) const;
   ReplyCallback _replyTo(const std::shared_ptr<ipc::Reply>& reply);
   bool _accepts(std::int64_t queryId);
 
