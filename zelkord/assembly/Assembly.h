@@ -13,6 +13,7 @@ namespace zelkord {
 
 class ClientStateManager;
 class FeedbackSessions;
+class ImageFetcher;
 class ResponseImages;
 class SessionManager;
 class UserGUIDSource;
@@ -47,6 +48,7 @@ class Assembly final {
   URLSession& bagSession() { return sessions_.bagSession(); }
 
   ZLKNetworkRequestFactory* requestFactory() const { return requestFactory_.get(); }
+  ImageFetcher* imageFetcher() const { return imageFetcher_.get(); }
   ZelkorBagController* bagController() const { return bagController_.get(); }
   ResponseImages* responseImages() const { return responseImages_.get(); }
   ClientStateManager* clientStateManager() const { return clientStateManager_.get(); }
@@ -56,6 +58,9 @@ class Assembly final {
 
   void setRequestFactory(std::shared_ptr<ZLKNetworkRequestFactory> factory) {
     requestFactory_.set(std::move(factory));
+  }
+  void setImageFetcher(std::shared_ptr<ImageFetcher> fetcher) {
+    imageFetcher_.set(std::move(fetcher));
   }
   void setBagController(std::shared_ptr<ZelkorBagController> controller) {
     bagController_.set(std::move(controller));
@@ -109,6 +114,7 @@ class Assembly final {
   // In the order in which they are made; released in the reverse one.
   Slot<FeedbackSessions> feedbackSessions_;
   Slot<ZLKNetworkRequestFactory> requestFactory_;
+  Slot<ImageFetcher> imageFetcher_;
   Slot<ZelkorBagController> bagController_;
   Slot<ResponseImages> responseImages_;
   Slot<ClientStateManager> clientStateManager_;

@@ -4,7 +4,6 @@
 #include "zelkord/core/EndpointListener.h"
 #include "zelkord/core/ServiceInterfaces.h"
 #include "zelkord/query/ErrorCodes.h"
-#include "zelkord/query/ResponseImages.h"
 
 namespace zelkord {
 namespace {
@@ -131,6 +130,13 @@ std::vector<std::shared_ptr<ClientState>> ClientStateManager::states() {
 
 void ClientStateManager::processImagesFromResponse(const json::value& response, const ZLKBag* bag) {
   if (auto* images = assembly_.responseImages()) images->processImagesFromResponse(response, bag);
+}
+
+void ClientStateManager::loadImages(const std::vector<ImageDescriptor>& descriptors,
+                                    SteadyTime deadline,
+                                    const std::function<void(LoadedImages)>& completion) {
+  auto* images = assembly_.responseImages();
+  images ? images->loadImages(descriptors, deadline, completion) : completion({});
 }
 
 void ClientStateManager::request(const std::shared_ptr<ZLKRequest>& request,

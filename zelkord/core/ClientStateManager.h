@@ -9,6 +9,7 @@
 #include "platform/api/Interprocess.h"
 #include "platform/api/WorkQueues.h"
 #include "zelkord/query/ClientState.h"
+#include "zelkord/query/ResponseImages.h"
 
 namespace zelkord {
 
@@ -49,6 +50,8 @@ class ClientStateManager final : public std::enable_shared_from_this<ClientState
 
   // As ResponseImages.
   void processImagesFromResponse(const json::value& response, const ZLKBag* bag);
+  void loadImages(const std::vector<ImageDescriptor>& descriptors, SteadyTime deadline,
+                  const std::function<void(LoadedImages)>& completion);
 
  private:
   using States = std::map<std::string, std::shared_ptr<ClientState>>;

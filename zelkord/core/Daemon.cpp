@@ -9,6 +9,7 @@
 #include "zelkord/core/ServiceInterfaces.h"
 #include "zelkord/core/ZelkorService.h"
 #include "zelkord/feedback/InMemorySessions.h"
+#include "zelkord/network/ImageFetcher.h"
 #include "zelkord/network/NotificationNames.h"
 #include "zelkord/network/ZLKNetworkRequestFactory.h"
 #include "zelkord/network/ZelkorBagController.h"
@@ -52,6 +53,7 @@ void Daemon::_makeServices() {
   assembly.setRequestFactory(factory);
   factory->start();
   assembly.reporter().addValue(1, "com.quenta.zelkord.launch");
+  assembly.setImageFetcher(std::make_shared<ImageFetcher>(assembly));
   const auto bagController = std::make_shared<ZelkorBagController>(assembly, *factory);
   assembly.setBagController(bagController);
   bagController->start();

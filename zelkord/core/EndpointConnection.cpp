@@ -1,14 +1,29 @@
 #include "zelkord/core/EndpointConnection.h"
 
+#include <algorithm>
+#include <chrono>
+
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/core/ClientStateManager.h"
 #include "zelkord/core/Wire.h"
 
 namespace zelkord {
+namespace {
+
+Duration durationOfMilliseconds(std::uint64_t count) {
+  constexpr auto kLongest = std::chrono::duration_cast<std::chrono::milliseconds>(Duration::max());
+  const auto longest = static_cast<std::uint64_t>(kLongest.count());
+  return std::chrono::milliseconds(std::min(count, longest));
+}
+
+}  // namespace
 
 EndpointConnection::EndpointConnection(Assembly& assembly,
                                        std::weak_ptr<ClientStateManager> manager)
-    : assembly_(assembly), manager_(std::move(manager)) {}
+    : assembly_(assembly),
+      manager_(std::move(manager)),
+      imagesQueue_(
+          assembly.platform().queues.makeSerialQueue("com.quenta.zelkord.endpoint.images")) {}
 
 void EndpointConnection::start(const std::weak_ptr<ipc::Connection>& connection) {
   timer_ = IdleTimer::make(assembly_.platform().queues, [connection] {
@@ -16,11 +31,15 @@ void EndpointConnection::start(const std::weak_ptr<ipc::Connection>& connection)
   });
 }
 
-void EndpointConnection::invalidated() { timer_->cancel(); }
+void EndpointConnection::invalidated() {
+  ended_ = true;
+  timer_->cancel();
+}
 
 void EndpointConnection::handle(ipc::Call call) {
   timer_->rearm();
   if (call.member == "Request") _request(call);
+  if (call.member == "LoadImages") _loadImages(call);
 }
 
 void EndpointConnection::_request(const ipc::Call& call) {
@@ -41,6 +60,31 @@ void EndpointConnection::_request(const ipc::Call& call) {
                        std::int64_t queryId, const auto& answer, const auto& error) {
                      reply->send({queryId, encodeReply(answer), encodeError(error)});
                    });
+}
+
+void EndpointConnection::_loadImages(const ipc::Call& call) {
+  const auto received = assembly_.platform().clock.realNow();
+  auto descriptors =
+      decodeImageDescriptors(*call.arguments.at(0).get<std::vector<ipc::Dictionary>>());
+  if (const auto* fault = std::get_if<WireFault>(&descriptors)) {
+    assembly_.log(Category::Connection).error("endpoint {} refused: {}", call.member, fault->text);
+    return call.reply->fail(fault->errorName, fault->text);
+  }
+  const auto timeout = durationOfMilliseconds(*call.arguments.at(1).get<std::uint64_t>());
+  imagesQueue_->async([self = shared_from_this(), reply = call.reply, mark = timer_->callBegan(),
+                       images = std::get<std::vector<ImageDescriptor>>(std::move(descriptors)),
+                       deadline = deadlineAfter(received, timeout)] {
+    self->_answerImages(images, deadline, *reply);
+  });
+}
+
+void EndpointConnection::_answerImages(const std::vector<ImageDescriptor>& descriptors,
+                                       SteadyTime deadline, ipc::Reply& reply) {
+  const auto manager = ended_ ? nullptr : manager_.lock();
+  if (!manager) return;
+  manager->loadImages(descriptors, deadline, [&reply](LoadedImages images) {
+    reply.send({encodeImages(std::move(images))});
+  });
 }
 
 }  // namespace zelkord

@@ -1,9 +1,13 @@
 #pragma once
 
+#include <atomic>
 #include <memory>
+#include <vector>
 
 #include "platform/api/Interprocess.h"
+#include "platform/api/WorkQueues.h"
 #include "zelkord/core/IdleTimer.h"
+#include "zelkord/query/ImageWalk.h"
 
 namespace zelkord {
 
@@ -11,8 +15,12 @@ class Assembly;
 class ClientStateManager;
 
 // One connection to the endpoint: decodes calls for the client state manager. Ends after 180 to 240
-// seconds without a message or a call under way. Threading: on the connection's queue.
-class EndpointConnection final : public ipc::CallHandler {
+// seconds without a message or a call under way.
+//
+// Threading: on the connection's queue. Images, which may take until their deadline, are loaded on
+// a queue of their own, one call at a time; those that wait at the connection's end are dropped.
+class EndpointConnection final : public ipc::CallHandler,
+                                 public std::enable_shared_from_this<EndpointConnection> {
  public:
   EndpointConnection(Assembly& assembly, std::weak_ptr<ClientStateManager> manager);
 
@@ -22,10 +30,15 @@ class EndpointConnection final : public ipc::CallHandler {
 
  private:
   void _request(const ipc::Call& call);
+  void _loadImages(const ipc::Call& call);
+  void _answerImages(const std::vector<ImageDescriptor>& descriptors, SteadyTime deadline,
+                     ipc::Reply& reply);
 
   Assembly& assembly_;
   const std::weak_ptr<ClientStateManager> manager_;
+  const std::unique_ptr<SerialQueue> imagesQueue_;
   std::shared_ptr<IdleTimer> timer_;
+  std::atomic<bool> ended_ = false;
 };
 
 }  // namespace zelkord

@@ -27,7 +27,12 @@ ipc::Interface diagnosticsInterface() {
 }
 
 ipc::Interface endpointInterface() {
-  return {std::string(kEndpointInterface), {{"Request", "sa{sv}a{sv}", "xa{sv}a{sv}"}}, {}};
+  return {std::string(kEndpointInterface),
+          {
+              {"Request", "sa{sv}a{sv}", "xa{sv}a{sv}"},
+              {"LoadImages", "aa{sv}t", "a{say}"},
+          },
+          {}};
 }
 
 }  // namespace zelkord

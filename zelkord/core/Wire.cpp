@@ -2,6 +2,7 @@
 
 #include <fmt/core.h>
 
+#include <algorithm>
 #include <cmath>
 
 #include "base/Text.h"
@@ -11,6 +12,9 @@ namespace {
 
 constexpr std::uint32_t kLastTriggerEvent = 19;
 constexpr std::size_t kMaximumQueryItems = 256;
+constexpr std::size_t kMaximumImages = 1000;
+constexpr std::size_t kMaximumImageBytes = 64u << 20;  // the longest array that D-Bus has
+constexpr std::size_t kEntryOverhead = 20;             // lengths, terminator, padding
 
 // Reads the members of a dictionary, each once; the first fault is kept.
 class DictionaryReader {
@@ -28,9 +32,16 @@ class DictionaryReader {
     }
   }
 
+  template <typename T>
+  void readIfPresent(std::string_view key, std::optional<T>& value) {
+    if (dictionary_.contains(key)) read(key, value.emplace());
+  }
+
   void refuse(std::string_view errorName, std::string text) {
     if (!fault_) fault_ = WireFault{errorName, std::move(text)};
   }
+
+  std::optional<WireFault> fault() && { return std::move(fault_); }
 
   template <typename T>
   Decoded<T> finish(T value) && {
@@ -136,6 +147,23 @@ Decoded<MutableRequest> decodeRequest(const std::string& kind, const ipc::Dictio
   return std::move(reader).finish(std::move(request));
 }
 
+Decoded<std::vector<ImageDescriptor>> decodeImageDescriptors(
+    const std::vector<ipc::Dictionary>& dictionaries) {
+  if (dictionaries.size() > kMaximumImages) {
+    return WireFault{ipc::kLimitsExceeded, "more than 1000 descriptors"};
+  }
+  std::vector<ImageDescriptor> descriptors;
+  for (const auto& dictionary : dictionaries) {
+    DictionaryReader reader(dictionary);
+    auto& descriptor = descriptors.emplace_back();
+    reader.readIfPresent("url", descriptor.url);
+    reader.readIfPresent("id", descriptor.id);
+    reader.read("data", descriptor.data);
+    if (auto fault = std::move(reader).fault()) return *std::move(fault);
+  }
+  return descriptors;
+}
+
 ipc::Dictionary encodeBag(const ZLKBag* bag) {
   ipc::Dictionary dictionary;
   if (!bag) return dictionary;
@@ -176,6 +204,16 @@ ipc::Dictionary encodeReply(const std::optional<ZLKReply>& reply) {
                         {"headers", headerMap(reply->httpResponse->headers)}};
   }
   return dictionary;
+}
+
+ipc::DataMap encodeImages(LoadedImages images) {
+  std::size_t size = 0;
+  const auto first = std::ranges::find_if(images, [&size](const auto& image) {
+    size += image.first.size() + image.second.size() + kEntryOverhead;
+    return size > kMaximumImageBytes;
+  });
+  images.erase(first, images.end());
+  return images;
 }
 
 }  // namespace zelkord

@@ -4,11 +4,13 @@
 #include <optional>
 #include <string>
 #include <variant>
+#include <vector>
 
 #include "base/Error.h"
 #include "corezelkor/Messages.h"
 #include "corezelkor/ZLKBag.h"
 #include "platform/api/Interprocess.h"
+#include "zelkord/query/ResponseImages.h"
 
 namespace zelkord {
 
@@ -31,9 +33,16 @@ Decoded<ZLKSessionConfiguration> decodeConfiguration(const ipc::Dictionary& dict
 using MutableRequest = std::shared_ptr<ZLKRequest>;
 Decoded<MutableRequest> decodeRequest(const std::string& kind, const ipc::Dictionary& dictionary);
 
+// At most 1,000 of them.
+Decoded<std::vector<ImageDescriptor>> decodeImageDescriptors(
+    const std::vector<ipc::Dictionary>& dictionaries);
+
 // "Nothing" is an empty dictionary in each of these.
 ipc::Dictionary encodeBag(const ZLKBag* bag);
 ipc::Dictionary encodeError(const std::optional<Error>& error);
 ipc::Dictionary encodeReply(const std::optional<ZLKReply>& reply);
+
+// As many images, from the first on, as one array holds: with their names 64 MiB.
+ipc::DataMap encodeImages(LoadedImages images);
 
 }  // namespace zelkord

@@ -3,11 +3,41 @@
 #include <algorithm>
 
 #include "zelkord/assembly/Assembly.h"
+#include "zelkord/network/URLHost.h"
+#include "zelkord/network/ZelkorBagController.h"
 
 namespace zelkord {
+namespace {
+
+// The hosts that the bag itself names: of its resources the first one's, and the search service's.
+ImageHosts hostsNamedBy(const ZLKBag& bag) {
+  ImageHosts hosts;
+  const auto add = [&hosts](std::string_view url) {
+    auto place = URLHost::parse(url);
+    if (place) hosts.insert(std::move(place->host));
+    return place.has_value();
+  };
+  if (const auto* resources = bag.resources()) {
+    for (const auto& entry : *resources) {
+      const auto* url = entry.value().if_string();
+      if (url && add(*url)) break;
+    }
+  }
+  add(bag.searchURL().value_or(""));
+  return hosts;
+}
+
+// The bytes when they have come.
+const Data* bytesIn(const ZLKFuture<ImageFetcher::Image>& future) {
+  const auto* image = future.find();
+  return image && *image && !(*image)->empty() ? &**image : nullptr;
+}
+
+}  // namespace
 
 ResponseImages::ResponseImages(Assembly& assembly)
-    : imageHostsQueue_(
+    : assembly_(assembly),
+      imageHostsQueue_(
           assembly.platform().queues.makeConcurrentQueue("com.quenta.zelkord.imageHostsQueue")),
       validImageHosts_(std::make_shared<const ImageHosts>()) {}
 
@@ -34,6 +64,95 @@ void ResponseImages::_add(const ImageHosts& hosts) {
   auto all = std::make_shared<ImageHosts>(*validImageHosts_);
   all->insert(hosts.begin(), hosts.end());
   validImageHosts_ = std::move(all);
+}
+
+void ResponseImages::loadImages(const std::vector<ImageDescriptor>& descriptors,
+                                SteadyTime deadline,
+                                const std::function<void(LoadedImages)>& completion) {
+  const auto bag = assembly_.bagController()->currentBag();
+  if (!bag) return completion({});
+  OrderedImages images;
+  for (const auto& descriptor : descriptors) {
+    collectOrderedImages(descriptor, *bag, nullptr, images);
+  }
+  const std::shared_ptr<Group> group = assembly_.platform().queues.makeGroup();
+  const auto fetches = _fetch(images, *bag, group);
+  const auto now = assembly_.platform().clock.realNow();
+  group->wait(deadline > now ? deadline - now : Duration::zero());
+  completion(_loaded(descriptors, *bag, fetches));
+}
+
+ResponseImages::Hosts ResponseImages::_validHosts(const ZLKBag& bag) {
+  Hosts hosts;
+  imageHostsQueue_->sync([&] {
+    imageHostsQueue_->assertReading();
+    hosts = validImageHosts_;
+  });
+  if (!hosts->empty()) return hosts;
+  auto seed = hostsNamedBy(bag);
+  _allow(seed);
+  return std::make_shared<const ImageHosts>(std::move(seed));
+}
+
+bool ResponseImages::_mayFetch(const std::string& url, const ImageHosts& hosts) const {
+  const auto place = URLHost::parse(url);
+  if (!place || !place->isHTTP()) {
+    assembly_.log(Category::Images).error("loadImage with invalid scheme: {}", _shown(url));
+    return false;
+  }
+  if (!hosts.contains(place->host)) {
+    assembly_.log(Category::Images).error("loadImage with invalid host: {}", _shown(url));
+    return false;
+  }
+  return true;
+}
+
+ResponseImages::Fetches ResponseImages::_fetch(const OrderedImages& images, const ZLKBag& bag,
+                                               const std::shared_ptr<Group>& group) {
+  Fetches fetches;
+  if (images.seen.empty()) return fetches;
+  const auto hosts = _validHosts(bag);
+  const auto acceptsRedirect = [hosts](const std::string& url) {
+    const auto place = URLHost::parse(url);
+    return place && place->isHTTP() && hosts->contains(place->host);
+  };
+  auto& queue = assembly_.platform().queues.global(QualityOfService::High);
+  for (const auto* list : {&images.primary, &images.secondary}) {
+    for (const auto& url : *list) {
+      if (!_mayFetch(url, *hosts)) continue;
+      const auto future = assembly_.imageFetcher()->fetchImageData(
+          url, bag.timeoutIntervalForRequest(), acceptsRedirect);
+      group->enter();
+      future.then([group, &queue](const auto&) { queue.async([group] { group->leave(); }); });
+      fetches.emplace(url, future);
+    }
+  }
+  return fetches;
+}
+
+LoadedImages ResponseImages::_loaded(const std::vector<ImageDescriptor>& descriptors,
+                                     const ZLKBag& bag, const Fetches& fetches) const {
+  const auto& log = assembly_.log(Category::Images);
+  LoadedImages images;
+  std::unordered_set<std::string_view> filed;
+  const auto bytesAt = [&fetches](const std::optional<std::string>& url) -> const Data* {
+    const auto fetch = url ? fetches.find(*url) : fetches.end();
+    return fetch == fetches.end() ? nullptr : bytesIn(fetch->second);
+  };
+  for (const auto& [url, id, data] : descriptors) {
+    if (const auto* bytes = bytesAt(url)) {
+      log.debug("mapping image url {} to {} bytes of data", _shown(*url), bytes->size());
+      if (filed.insert(*url).second) images.emplace_back(*url, *bytes);
+    } else if (const auto* named = id ? bytesAt(bag.urlForIdentifier(*id)) : nullptr) {
+      log.debug("mapping image id {} to {} bytes of data", *id, named->size());
+      if (filed.insert(*id).second) images.emplace_back(*id, *named);
+    }
+  }
+  return images;
+}
+
+std::string ResponseImages::_shown(const std::string& url) const {
+  return urlForLog(url, assembly_.platform().log.showsPrivateData());
 }
 
 }  // namespace zelkord
