@@ -59,7 +59,9 @@ std::string readBusProperty(sd_bus* bus, const char* service, const char* path,
 
 BusThread::BusThread(BusConnection bus) : bus_(std::move(bus)), stop_(::eventfd(0, EFD_CLOEXEC)) {}
 
-BusThread::~BusThread() {
+BusThread::~BusThread() { stop(); }
+
+void BusThread::stop() {
   const std::uint64_t one = 1;
   if (thread_.joinable() && ::write(stop_.get(), &one, sizeof one) > 0) thread_.join();
 }

@@ -29,8 +29,8 @@ std::string readBusProperty(sd_bus* bus, const char* service, const char* path,
 // A thread that dispatches one bus connection until it is destroyed or the bus is gone.
 //
 // Threading: the connection belongs to the thread once `start` was called; every call-back
-// registered on it runs there and must not wait. Destroying this waits for the call-back that runs;
-// not on the thread itself.
+// registered on it runs there and must not wait. Destroying or stopping this waits for the
+// call-back that runs; not on the thread itself.
 class BusThread final {
  public:
   explicit BusThread(BusConnection bus);
@@ -42,6 +42,8 @@ class BusThread final {
   // Call once, when everything is registered. `lost` runs on the thread when the bus goes away by
   // itself.
   void start(std::function<void()> lost);
+  // No call-back runs after this: for owners whose call-backs look at this object.
+  void stop();
 
  private:
   void run(const std::function<void()>& lost);

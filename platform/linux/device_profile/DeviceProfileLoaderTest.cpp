@@ -98,7 +98,7 @@ class WatchedProfileTest : public testing::Test {
   }
   bool becomes(const std::string& country) {
     std::unique_lock lock(mutex_);
-    return changed_.wait_for(lock, 5s, [&] { return country_ == country; });
+    return changed_.wait_for(lock, 20s, [&] { return country_ == country; });
   }
 
   const TemporaryDirectory root_;

@@ -10,6 +10,7 @@
 #include <systemd/sd-bus.h>
 
 #include <atomic>
+#include <chrono>
 #include <condition_variable>
 #include <cstdlib>
 #include <filesystem>
@@ -37,6 +38,18 @@ inline constexpr const char* kTestService = "com.quenta.zelkord";
 inline constexpr const char* kTestPath = "/com/quenta/zelkord";
 inline constexpr const char* kTestInterface = "com.quenta.zelkord.Daemon1";
 inline constexpr const char* kTestSharedInterface = "com.quenta.zelkord.Diagnostics1";
+// What only a fault exceeds, however busy the machine is.
+inline constexpr std::chrono::seconds kTestPatience{20};
+
+// Waits for a condition that other threads bring about.
+inline bool eventually(const std::function<bool()>& condition) {
+  const auto limit = std::chrono::steady_clock::now() + kTestPatience;
+  while (!condition()) {
+    if (std::chrono::steady_clock::now() > limit) return false;
+    std::this_thread::sleep_for(std::chrono::milliseconds(1));
+  }
+  return true;
+}
 
 // A directory for the length of a test.
 class IpcTestDirectory {
@@ -70,9 +83,7 @@ class IpcTestBus {
       ADD_FAILURE() << "dbus-daemon does not start";
     }
     address_ = "unix:path=" + socket;
-    for (int i = 0; i < 500 && !std::filesystem::exists(socket); ++i) {
-      std::this_thread::sleep_for(std::chrono::milliseconds(10));
-    }
+    if (!eventually([&] { return _accepts(socket); })) ADD_FAILURE() << "dbus-daemon is silent";
   }
   ~IpcTestBus() { stop(); }
   void stop() {
@@ -83,18 +94,17 @@ class IpcTestBus {
   const std::string& address() const { return address_; }
 
  private:
+  // The socket's file is there a moment before anybody listens.
+  static bool _accepts(const std::string& path) {
+    const OwnedFd socket(::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0));
+    sockaddr_un address{.sun_family = AF_UNIX, .sun_path = {}};
+    path.copy(address.sun_path, sizeof(address.sun_path) - 1);
+    return ::connect(socket.get(), reinterpret_cast<sockaddr*>(&address), sizeof(address)) == 0;
+  }
+
   pid_t pid_ = 0;
   std::string address_;
 };
-
-// Waits for a condition that other threads bring about.
-inline bool eventually(const std::function<bool()>& condition, int milliseconds = 5000) {
-  for (int i = 0; i < milliseconds; ++i) {
-    if (condition()) return true;
-    std::this_thread::sleep_for(std::chrono::milliseconds(1));
-  }
-  return condition();
-}
 
 // A handler made of a function.
 class IpcTestHandler final : public CallHandler {
@@ -158,7 +168,7 @@ class IpcTestClient {
     bus_.reset(bus);
     sd_bus_set_address(bus, address.c_str());
     sd_bus_set_bus_client(bus, isBusClient);
-    sd_bus_set_method_call_timeout(bus, 10'000'000);
+    sd_bus_set_method_call_timeout(bus, 20'000'000);
     started_ = sd_bus_start(bus);
   }
   explicit IpcTestClient(OwnedFd socket) {
@@ -167,7 +177,7 @@ class IpcTestClient {
     bus_.reset(bus);
     sd_bus_set_fd(bus, socket.get(), socket.get());
     socket.release();
-    sd_bus_set_method_call_timeout(bus, 10'000'000);
+    sd_bus_set_method_call_timeout(bus, 20'000'000);
     started_ = sd_bus_start(bus);
   }
 
@@ -209,7 +219,8 @@ class IpcTestClient {
   }
   // Handles what comes until the condition holds.
   bool processUntil(const std::function<bool()>& condition) {
-    for (int i = 0; i < 500; ++i) {
+    const auto limit = std::chrono::steady_clock::now() + kTestPatience;
+    while (std::chrono::steady_clock::now() < limit) {
       while (sd_bus_process(bus_.get(), nullptr) > 0) {
       }
       if (condition()) return true;
@@ -250,7 +261,8 @@ class IpcRawClient {
     return true;
   }
   // Everything until the other side closes; none when it does not.
-  std::optional<std::string> readToEnd(int milliseconds = 5000) {
+  std::optional<std::string> readToEnd() {
+    const int milliseconds = std::chrono::milliseconds(kTestPatience).count();
     std::string all;
     char bytes[4096];
     for (;;) {

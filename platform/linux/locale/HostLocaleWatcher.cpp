@@ -68,7 +68,7 @@ HostLocaleWatcher::HostLocaleWatcher(HostLocaleSources sources,
 
 HostLocaleWatcher::~HostLocaleWatcher() {
   watches_.clear();
-  bus_.reset();
+  if (bus_) bus_->stop();
   queue_->sync([this] {
     queue_->assertCurrent();
     timer_.reset();

@@ -56,11 +56,6 @@ class HostServicesDouble final {
   void start() {
     thread_.start([] {});
   }
-  // Before `start`.
-  void announceLocale() {
-    ::sd_bus_emit_properties_changed(thread_.bus(), "/org/freedesktop/locale1",
-                                     "org.freedesktop.locale1", "Locale", nullptr);
-  }
 
  private:
   static int getClient(sd_bus_message* call, void*, sd_bus_error*) {
@@ -128,8 +123,12 @@ class HeardEvents final {
   }
   std::string wait() {
     std::unique_lock lock(mutex_);
-    arrived_.wait_for(lock, 5s, [this] { return !text_.empty(); });
+    arrived_.wait_for(lock, ipc::kTestPatience, [this] { return !text_.empty(); });
     return text_;
+  }
+  bool hasHeard() {
+    const std::lock_guard lock(mutex_);
+    return !text_.empty();
   }
 
  private:
@@ -190,8 +189,16 @@ TEST(HostLocaleWatcherTest, HearsOfTheSystemsLocale) {
   HostLocaleWatcher watcher(
       sources, [&](HostLocale host) { heard.note(host.locale); }, queues, files, log);
   HostServicesDouble services("org.freedesktop.locale1");
-  services.announceLocale();
   services.start();
+  // The watcher listens from a moment on that only the bus knows.
+  const auto announcer = openSystemBus(nullptr);
+  EXPECT_TRUE(ipc::eventually([&] {
+    ::sd_bus_emit_signal(announcer.get(), "/org/freedesktop/locale1",
+                         "org.freedesktop.DBus.Properties", "PropertiesChanged", "sa{sv}as",
+                         "org.freedesktop.locale1", 0, 1, "Locale");
+    ::sd_bus_process(announcer.get(), nullptr);
+    return heard.hasHeard();
+  }));
   EXPECT_EQ(heard.wait(), "fr_FR");
 }
 

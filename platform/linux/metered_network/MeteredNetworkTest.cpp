@@ -32,7 +32,7 @@ class NetworkManagerDouble final {
   BusThread thread_;
 };
 
-bool becomesMetered(const MeteredNetwork& network, std::chrono::milliseconds limit) {
+bool becomesMetered(const MeteredNetwork& network, Duration limit) {
   const auto end = std::chrono::steady_clock::now() + limit;
   while (!network.isMetered() && std::chrono::steady_clock::now() < end) {
     std::this_thread::sleep_for(std::chrono::milliseconds(5));
@@ -48,7 +48,7 @@ TEST(MeteredNetworkTest, BelievesNetworkManager) {
     SCOPED_TRACE(value);
     const NetworkManagerDouble manager(value);
     const MeteredNetwork network;
-    EXPECT_EQ(becomesMetered(network, std::chrono::milliseconds(expected ? 5'000 : 200)), expected);
+    EXPECT_EQ(becomesMetered(network, expected ? Duration(ipc::kTestPatience) : 200ms), expected);
   }
   ::setenv("DBUS_SYSTEM_BUS_ADDRESS", "unix:path=/nonexistent/bus", 1);
   EXPECT_FALSE(MeteredNetwork().isMetered());

@@ -195,7 +195,7 @@ TEST_P(WorkQueuesContract, ADestroyedQueueDropsWhatHasNotBegun) {
   std::atomic<bool> began = false, due = false, ended = false;
   queue->async([&] {
     began = true;
-    gate->wait(100ms);
+    gate->wait(20s);
     ended = true;
   });
   queue->async([captured] { ADD_FAILURE() << "ran on a destroyed queue"; });
@@ -205,6 +205,7 @@ TEST_P(WorkQueuesContract, ADestroyedQueueDropsWhatHasNotBegun) {
   if (GetParam() == HostKind::Linux) {
     EXPECT_TRUE(eventually([&] { return began && due; }));
   }
+  const auto release = other->after(200ms, [&] { gate->signal(); });
   queue.reset();
   EXPECT_EQ(began, ended);  // what had begun was waited for
   EXPECT_TRUE(eventually([&] { return captured.use_count() == 1; }));
@@ -247,18 +248,24 @@ TEST_P(WorkQueuesContract, ATimerFiresOnceForItsLastArming) {
   const auto queue = queues().makeSerialQueue("serial");
   std::atomic<int> fired = 0;
   const auto timer = queues().makeTimer(*queue, [&] { ++fired; });
+  // While the queue is busy, however long that takes, a timer can be due but not have fired.
+  const auto gate = queues().makeSemaphore(0);
+  block(*queue, *gate);
   timer->arm(1h, 0s);
   timer->arm(5ms, 1ms);   // earlier than before
   timer->arm(20ms, 5ms);  // later than before
+  gate->signal();
   EXPECT_TRUE(eventually([&] { return fired == 1; }));
 
   std::atomic<bool> passed = false;
+  block(*queue, *gate);
   timer->arm(5ms, 0s);
   timer->cancel();
   auto doomed = queues().makeTimer(*queue, [] { ADD_FAILURE() << "fired though destroyed"; });
   doomed->arm(5ms, 0s);
   doomed.reset();
   const auto later = queue->after(30ms, [&] { passed = true; });
+  gate->signal();
   EXPECT_TRUE(eventually([&] { return passed.load(); }));
   EXPECT_EQ(fired, 1);
 }

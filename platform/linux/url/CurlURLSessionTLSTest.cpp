@@ -46,7 +46,7 @@ TEST(CurlURLSessionTLSTest, SendsQueriesAsLongAsClientsMayAsk) {
   server.reply("/", TestHTTPReply::make(200, "long"));
   URLSessionTestBed bed({.rootsFile = roots.path()});
   const auto session = bed.make({.name = "test"});
-  const auto outcome = loadURL(*session, {.url = server.url(path), .timeout = 5s});
+  const auto outcome = loadURL(*session, {.url = server.url(path), .timeout = 20s});
   EXPECT_EQ(outcome.text(), "long");
 }
 

@@ -230,7 +230,7 @@ TEST_F(CurlURLSessionTest, TimesOutWithoutProgressOnly) {
   server_.reply("/silent", TestHTTPReply::hanging());
   server_.reply("/stuck",
                 TestHTTPReply::hanging("HTTP/1.1 200 OK\r\nContent-Length: 9\r\n\r\nabc"));
-  server_.reply("/moving", slow.dripping(slow.bytes.size() / 5, 250ms));
+  server_.reply("/moving", slow.dripping(slow.bytes.size() / 5, 500ms));
   server_.reply("/endless", TestHTTPReply::make(200, std::string(1000, 'x')).dripping(1, 20ms));
   const struct {
     const char* path;
@@ -239,7 +239,7 @@ TEST_F(CurlURLSessionTest, TimesOutWithoutProgressOnly) {
   } cases[] = {
       {"/silent", 100ms, -1001},
       {"/stuck", 100ms, -1001},
-      {"/moving", 1s, 0},
+      {"/moving", 2s, 0},
       {"/endless", 60ms, -1001},
   };
   for (const auto& [path, timeout, code] : cases) {
