@@ -6,6 +6,7 @@
 #include <array>
 #include <utility>
 
+#include "base/Text.h"
 #include "zelkorctl/Printable.h"
 
 namespace zelkorctl {
@@ -65,14 +66,27 @@ std::string notAList(std::string_view data, std::string_view ofWhat) {
 }
 
 // The objects of a list, whatever else it holds.
-std::vector<const json::object*> objectsIn(const json::object& object, std::string_view key) {
+std::vector<const json::object*> objectsOf(const json::array& list) {
   std::vector<const json::object*> objects;
-  const auto* list = arrayIn(object, key);
-  if (!list) return objects;
-  for (const auto& element : *list) {
-    if (const auto* member = element.if_object()) objects.push_back(member);
+  for (const auto& element : list) {
+    if (const auto* object = element.if_object()) objects.push_back(object);
   }
   return objects;
+}
+
+std::vector<const json::object*> objectsIn(const json::object& object, std::string_view key) {
+  const auto* list = arrayIn(object, key);
+  return list ? objectsOf(*list) : std::vector<const json::object*>();
+}
+
+std::vector<const json::object*> fittingSets(const json::array& sets, std::string_view typed) {
+  const auto all = objectsOf(sets);
+  const auto text = lowercased(typed);
+  auto fitting = all;
+  std::erase_if(fitting, [&](const json::object* set) {
+    return !lowercased(stringIn(*set, "query").value_or("")).starts_with(text);
+  });
+  return fitting.empty() ? all : fitting;
 }
 
 void appendFacts(const json::object& section, std::vector<std::string>& lines) {
@@ -133,15 +147,13 @@ void appendHeaders(const HeaderFields& headers, std::vector<std::string>& lines)
 
 }  // namespace
 
-std::vector<std::string> resultLines(std::string_view data, std::size_t limit, std::size_t width) {
+std::vector<std::string> resultLines(std::string_view data, const Shown& shown) {
   const auto parsed = parseJson(data);
   const auto* sets = parsed ? parsed->if_array() : nullptr;
   if (!sets) return {notAList(data, "result sets")};
   std::vector<Row> rows;
-  for (const auto& set : *sets) {
-    if (const auto* object = set.if_object()) appendRows(*object, limit, rows);
-  }
-  return rowLines(rows, width);
+  for (const auto* set : fittingSets(*sets, shown.typed)) appendRows(*set, shown.limit, rows);
+  return rowLines(rows, shown.width);
 }
 
 std::vector<std::string> cardLines(std::string_view data, std::size_t width) {

@@ -10,10 +10,19 @@
 
 namespace zelkorctl {
 
-// The best results of a service response, one line each, at most `limit` in all and `width` columns
-// wide: title, type and description under each other. What is not a list of result sets is said in
-// one line. Nothing in the lines can steer a terminal.
-std::vector<std::string> resultLines(std::string_view data, std::size_t limit, std::size_t width);
+// What is shown of a service response.
+struct Shown {
+  std::size_t limit = 0;  // lines in all
+  std::size_t width = 0;  // columns of each
+  // A cached response was fetched for an earlier text: only its sets whose completed query begins
+  // with this one are shown, unless none does.
+  std::string_view typed = {};
+};
+
+// The best results of a service response, one line each: title, type and description under each
+// other. What is not a list of result sets is said in one line. Nothing in the lines can steer a
+// terminal.
+std::vector<std::string> resultLines(std::string_view data, const Shown& shown);
 
 // The cards of a service response: titles, and the facts as labels and values; each at most `width`
 // columns wide. What is not a list of cards is said in one line, as above.

@@ -45,6 +45,9 @@ TEST(ResultLinesTest, AlignsTheBestResultsAndSurvivesAnything) {
       {R"([{"results":[{"title":"x\u001b[2J","description":"\n"}]}])", {"  x\\x1b[2J    \\n"}},
       {R"([{"results":[7,{"title":{"text":"no"}},{"title":"yes"}]},8,{"results":9}])",
        {"", "  yes"}},
+      {R"([{"query":"friend","results":[{"title":"friend"}]},
+          {"query":"France","results":[{"title":"France"}]}])",
+       {"  France"}},
       {"[]", {}},
       {R"({"results":[]})", {"  (14 bytes that are no list of result sets)"}},
       {"<html>", {"  (6 bytes that are no list of result sets)"}},
@@ -53,10 +56,10 @@ TEST(ResultLinesTest, AlignsTheBestResultsAndSurvivesAnything) {
   };
   for (const auto& [data, lines] : cases) {
     SCOPED_TRACE(data);
-    EXPECT_EQ(resultLines(data, 3, 80), lines);
+    EXPECT_EQ(resultLines(data, {3, 80, "Fra"}), lines);
   }
   const std::string wide = R"([{"results":[{"title":")" + std::string(300, 'w') + R"("}]}])";
-  EXPECT_EQ(displayWidth(resultLines(wide, 3, 80).front()), 42u);
+  EXPECT_EQ(displayWidth(resultLines(wide, {3, 80}).front()), 42u);
 }
 
 TEST(CardLinesTest, AlignsTheFactsAndSurvivesAnything) {

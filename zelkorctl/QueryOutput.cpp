@@ -23,8 +23,8 @@ void showOutcome(const Invocation& invocation, const Outcome& outcome) {
 void showResults(const Invocation& invocation, const Outcome& outcome) {
   const auto& [options, surroundings] = invocation;
   if (options.json || !outcome.answer.reply) return;
-  const auto lines = resultLines(outcome.answer.reply->data.view(),
-                                 static_cast<std::size_t>(options.limit), surroundings.columns);
+  const Shown shown{static_cast<std::size_t>(options.limit), surroundings.columns, outcome.text};
+  const auto lines = resultLines(outcome.answer.reply->data.view(), shown);
   for (const auto& line : lines) surroundings.out << line << '\n';
 }
 

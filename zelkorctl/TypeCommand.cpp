@@ -123,8 +123,8 @@ class TypingSession {
     if (!latest_) return {};
     auto lines = std::vector<std::string>{outcomeLine(*latest_, columns)};
     if (!latest_->answer.reply) return lines;
-    const auto results = resultLines(latest_->answer.reply->data.view(),
-                                     static_cast<std::size_t>(invocation_.options.limit), columns);
+    const Shown shown{static_cast<std::size_t>(invocation_.options.limit), columns, latest_->text};
+    const auto results = resultLines(latest_->answer.reply->data.view(), shown);
     lines.insert(lines.end(), results.begin(), results.end());
     return lines;
   }
