@@ -62,6 +62,7 @@ std::shared_ptr<ClientState> ClientStateManager::configuredState(const std::stri
     const auto found = stateCache_.find(identifier);
     if (found != stateCache_.end() && found->second->configuration()) state = found->second;
   });
+  if (state) assembly_.log(Category::Session).info("using client state: {}", identifier);
   return state;
 }
 
@@ -142,9 +143,16 @@ void ClientStateManager::loadImages(const std::vector<ImageDescriptor>& descript
 void ClientStateManager::request(const std::shared_ptr<ZLKRequest>& request,
                                  const ZLKSessionConfiguration& configuration,
                                  const ReplyCallback& reply) {
-  if (!request || configuredState(configuration.identifier)) return;
-  reply(request->queryId, std::nullopt,
-        zelkorError(kConnectionFault, "invalid configuration " + configuration.description()));
+  if (!request) return;
+  const auto state = configuredState(configuration.identifier);
+  if (!state) {
+    reply(request->queryId, std::nullopt,
+          zelkorError(kConnectionFault, "invalid configuration " + configuration.description()));
+  } else if (auto more = std::dynamic_pointer_cast<const ZLKMoreResultsRequest>(request)) {
+    state->moreResults(std::move(more), reply);
+  } else if (auto card = std::dynamic_pointer_cast<const ZLKCardRequest>(request)) {
+    state->card(std::move(card), reply);
+  }
 }
 
 }  // namespace zelkord

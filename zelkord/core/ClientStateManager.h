@@ -44,7 +44,10 @@ class ClientStateManager final : public std::enable_shared_from_this<ClientState
   const std::string& endpoint() const;
   std::vector<std::shared_ptr<ClientState>> states();
 
-  // A query that came through the endpoint; `request` is null for a kind that does not exist.
+  // A query that came through the endpoint: more results and cards are answered as the state of the
+  // configuration's identifier, whose own configuration and user agent stay. Other kinds, and a
+  // null `request` (a kind that does not exist), get no answer; an identifier that no client has
+  // configured gets an error.
   void request(const std::shared_ptr<ZLKRequest>& request,
                const ZLKSessionConfiguration& configuration, const ReplyCallback& reply);
 
