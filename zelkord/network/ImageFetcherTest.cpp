@@ -1,0 +1,212 @@
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <cerrno>
+
+#include "platform/testing/FakePlatform.h"
+#include "zelkord/assembly/Assembly.h"
+#include "zelkord/feedback/InMemorySessions.h"
+#include "zelkord/network/ImageFetcher.h"
+#include "zelkord/network/UserAgent.h"
+#include "zelkord/network/ZelkorUserGUIDController.h"
+
+namespace zelkord {
+namespace {
+
+constexpr const char* kImageURL = "https://img.example/a.png?key=secret";
+
+class ImageFetcherTest : public testing::Test {
+ protected:
+  using Image = ImageFetcher::Image;
+
+  ImageFetcherTest() {
+    assembly_.setGuidController(std::make_shared<ZelkorUserGUIDController>(assembly_));
+    assembly_.setClientSessionManager(sessions_);
+    assembly_.setImageFetcher(std::make_shared<ImageFetcher>(assembly_));
+    assembly_.urlSession();
+  }
+
+  ZLKFuture<Image> fetch(const std::string& url = kImageURL) {
+    return assembly_.imageFetcher()->fetchImageData(url, 7s);
+  }
+  FakeURLSession& session() { return *fakes_.urlSessions.find("urlSession"); }
+  // Answers the one task that waits.
+  void answer(const std::function<void(FakeURLTask&)>& reply) {
+    ASSERT_EQ(session().pending().size(), 1u);
+    reply(*session().pending().front());
+    fakes_.timeline.runUntilIdle();
+  }
+  void answer(int status, const std::string& body) {
+    answer([&](FakeURLTask& task) { task.succeed(status, body); });
+  }
+  template <typename Feedback>
+  std::vector<std::shared_ptr<const Feedback>> recorded() const {
+    std::vector<std::shared_ptr<const Feedback>> found;
+    for (const auto& record : sessions_->records().all()) {
+      auto feedback = std::dynamic_pointer_cast<const Feedback>(record.feedback);
+      if (feedback) found.push_back(std::move(feedback));
+    }
+    return found;
+  }
+
+  FakePlatform fakes_;
+  Assembly assembly_{fakes_.platform()};
+  const std::shared_ptr<InMemorySessionManager> sessions_ =
+      std::make_shared<InMemorySessionManager>("zelkor", true);
+};
+
+TEST_F(ImageFetcherTest, DownloadsOnceForAllWhoAskMeanwhile) {
+  const auto first = fetch();
+  const auto second = fetch();
+  EXPECT_TRUE(fakes_.log.contains("pending https://img.example/a.png?<private>"));
+  EXPECT_THAT(fakes_.transactions.openNames(), testing::ElementsAre("imageFetch"));
+  EXPECT_TRUE(session().pending().at(0)->isDownload());
+  answer(200, "bytes");
+  EXPECT_EQ(first.get(), Data("bytes"));
+  EXPECT_EQ(second.get(), Data("bytes"));
+  EXPECT_TRUE(fakes_.transactions.openNames().empty());
+  EXPECT_TRUE(fakes_.log.contains("caching 5 bytes for https://img.example/a.png?<private>"));
+
+  const auto third = fetch();
+  ASSERT_TRUE(third.isFulfilled());
+  EXPECT_EQ(third.get(), Data("bytes"));
+  EXPECT_EQ(session().tasks().size(), 1u);
+  EXPECT_TRUE(fakes_.transactions.openNames().empty());
+}
+
+TEST_F(ImageFetcherTest, GivesTheOldFutureBetweenFulfilmentAndRemoval) {
+  std::optional<ZLKFuture<Image>> between;
+  fetch().then([&](const Image&) { between = fetch(); });
+  answer(404, "");
+  ASSERT_TRUE(between);
+  EXPECT_TRUE(between->isFulfilled());
+  EXPECT_EQ(session().tasks().size(), 1u);
+
+  const auto later = fetch();
+  EXPECT_FALSE(later.isFulfilled());
+  answer(200, "better");
+  EXPECT_EQ(later.get(), Data("better"));
+}
+
+TEST_F(ImageFetcherTest, AsksTheNetworkForHTTPAlone) {
+  for (const auto* url :
+       {"", "http", "data:image/png;base64,AA", "file:///http", "ht:tp", "://a"}) {
+    SCOPED_TRACE(url);
+    const auto image = fetch(url);
+    ASSERT_TRUE(image.isFulfilled());
+    EXPECT_EQ(image.get(), std::nullopt);
+  }
+  EXPECT_TRUE(session().tasks().empty());
+  EXPECT_TRUE(sessions_->records().all().empty());
+  EXPECT_FALSE(fetch("HTTPS://img.example/").isFulfilled());
+  EXPECT_EQ(session().tasks().size(), 1u);
+}
+
+TEST_F(ImageFetcherTest, RecordsTheFetch) {
+  fetch();
+  answer([](FakeURLTask& task) {
+    task.setTimingData({.domainLookup = 3});
+    task.succeed(200, "bytes");
+  });
+  const auto start = recorded<HVStartNetworkSearchFeedback>().at(0);
+  const auto agent = zelkordUserAgent(fakes_.device);
+  EXPECT_EQ(start->url, kImageURL);
+  EXPECT_EQ(start->headers, (HTTPHeaders{{"User-Agent", *agent}}));
+  EXPECT_EQ(start->headers, session().tasks().at(0)->request().headers);
+  EXPECT_EQ(session().tasks().at(0)->request().timeout, 7s);
+  EXPECT_EQ(start->triggerEvent, 15u);
+  EXPECT_EQ(start->endpoint, 7);
+  const auto end = recorded<HVEndNetworkSearchFeedback>().at(0);
+  EXPECT_EQ(end->startSearch, start);
+  EXPECT_EQ(end->responseSize, 5);
+  EXPECT_EQ(end->statusCode, 200);
+  EXPECT_EQ(end->networkTimingData->at("domain_lookup"), 3.0);
+  for (const auto& record : sessions_->records().all()) EXPECT_EQ(record.userAgent, agent);
+}
+
+TEST_F(ImageFetcherTest, AnyFailureGivesNoneIsRecordedAndNotKept) {
+  using Operation = FakeFileManager::Operation;
+  const auto reply = [](int status, std::string body) {
+    return [status, body](FakeURLTask& task) { task.succeed(status, body); };
+  };
+  struct Case {
+    std::string log;
+    std::function<void(FakeURLTask&)> reply;
+    std::optional<Error> error;
+    std::optional<Operation> failing;
+  };
+  const auto lost = urlError(URLErrorCode::ConnectionLost, "lost");
+  const std::string shown = "https://img.example/a.png?<private>";
+  const Case cases[] = {
+      {"Error fetching image " + shown + ": " + lost.description(),
+       [&](FakeURLTask& task) { task.fail(lost); },
+       zelkorError(500, std::string("image fetch error ") + kImageURL)},
+      {"Bad status code 404 for image " + shown, reply(404, "page"), std::nullopt},
+      {"Bad status code 0 for image " + shown, [](FakeURLTask& task) { task.nonHTTP("x"); }, {}},
+      {"opening file failed " + posixError(EMFILE).description(), reply(200, "x"),
+       zelkorError(500, "file open failed"), Operation::Open},
+      {"mmap failed " + posixError(ENOMEM).description(), reply(200, "x"), posixError(ENOMEM),
+       Operation::Map},
+      {"mmap failed " + posixError(EINVAL).description(), reply(200, ""), posixError(EINVAL)},
+  };
+  for (const auto& row : cases) {
+    SCOPED_TRACE(row.log);
+    fakes_.log.clear();
+    if (row.failing)
+      fakes_.files.fail(*row.failing, *row.failing == Operation::Open ? EMFILE : ENOMEM);
+    const auto image = fetch();
+    const auto errorsBefore = recorded<HVErrorFeedback>().size();
+    answer(row.reply);
+    if (row.failing) fakes_.files.fail(*row.failing, 0);
+    ASSERT_TRUE(image.isFulfilled());
+    EXPECT_EQ(image.get(), std::nullopt);
+    EXPECT_EQ(fakes_.log.count(row.log), 1);
+    const auto errors = recorded<HVErrorFeedback>();
+    EXPECT_EQ(errors.size() - errorsBefore, row.error ? 1u : 0u);
+    if (row.error) EXPECT_EQ(errors.back()->error, *row.error);
+    EXPECT_EQ(recorded<HVEndNetworkSearchFeedback>().size(),
+              recorded<HVStartNetworkSearchFeedback>().size());
+    EXPECT_TRUE(fakes_.transactions.openNames().empty());
+  }
+  EXPECT_EQ(session().cache()->count(), 0u);
+}
+
+TEST_F(ImageFetcherTest, TakesOnlyAKeptImageFromTheCache) {
+  session().cache()->store({.url = kImageURL}, {{kImageURL, 404, {}}, Data("not found")});
+  EXPECT_FALSE(fetch().isFulfilled());
+}
+
+TEST_F(ImageFetcherTest, GoesThroughTheProxyWhenThatIsInUse) {
+  struct Case {
+    bool setting, enabled, fails;
+    bool routed, proxied;
+  };
+  for (const auto& row : {Case{true, true, false, true, true},
+                          {true, true, true, true, false},
+                          {true, false, false, false, false},
+                          {false, true, false, false, false}}) {
+    SCOPED_TRACE(testing::Message() << row.setting << row.enabled << row.fails);
+    fakes_.settings.set("ZLKUseMorvane", row.setting);
+    fakes_.networkProxy.enabled = row.enabled;
+    session().setProxyError(row.fails ? std::optional(zelkorError(1, "no proxy")) : std::nullopt);
+    fakes_.log.clear();
+    fetch();
+    const auto task = session().pending().at(0);
+    EXPECT_EQ(task->request().routed, row.routed);
+    EXPECT_EQ(task->isProxyEnabled(), row.proxied);
+    EXPECT_EQ(fakes_.log.contains("Enabling Morvane for #image request failed."), row.fails);
+    answer(404, "");
+  }
+}
+
+TEST_F(ImageFetcherTest, LeavesNobodyWaitingWhenItIsGone) {
+  const auto image = fetch();
+  assembly_.setImageFetcher(nullptr);
+  answer(200, "bytes");
+  ASSERT_TRUE(image.isFulfilled());
+  EXPECT_EQ(image.get(), std::nullopt);
+  EXPECT_TRUE(fakes_.transactions.openNames().empty());
+}
+
+}  // namespace
+}  // namespace zelkord
