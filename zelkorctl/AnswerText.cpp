@@ -6,8 +6,8 @@
 #include <array>
 #include <utility>
 
-#include "base/Text.h"
 #include "zelkorctl/Printable.h"
+#include "zelkorctl/ResponseSets.h"
 
 namespace zelkorctl {
 namespace {
@@ -26,14 +26,10 @@ std::string memberText(const json::object& object, std::string_view key) {
 }
 
 void appendRows(const json::object& set, std::size_t limit, std::vector<Row>& rows) {
-  const auto* results = arrayIn(set, "results");
-  if (!results) return;
-  for (const auto& result : *results) {
+  for (const auto* result : objectsIn(set, "results")) {
     if (rows.size() >= limit) return;
-    const auto* object = result.if_object();
-    if (!object) continue;
-    rows.push_back({memberText(*object, "title"), memberText(*object, "type"),
-                    memberText(*object, "description")});
+    rows.push_back({memberText(*result, "title"), memberText(*result, "type"),
+                    memberText(*result, "description")});
   }
 }
 
@@ -63,30 +59,6 @@ std::vector<std::string> rowLines(const std::vector<Row>& rows, std::size_t widt
 
 std::string notAList(std::string_view data, std::string_view ofWhat) {
   return fmt::format("  ({} bytes that are no list of {})", data.size(), ofWhat);
-}
-
-// The objects of a list, whatever else it holds.
-std::vector<const json::object*> objectsOf(const json::array& list) {
-  std::vector<const json::object*> objects;
-  for (const auto& element : list) {
-    if (const auto* object = element.if_object()) objects.push_back(object);
-  }
-  return objects;
-}
-
-std::vector<const json::object*> objectsIn(const json::object& object, std::string_view key) {
-  const auto* list = arrayIn(object, key);
-  return list ? objectsOf(*list) : std::vector<const json::object*>();
-}
-
-std::vector<const json::object*> fittingSets(const json::array& sets, std::string_view typed) {
-  const auto all = objectsOf(sets);
-  const auto text = lowercased(typed);
-  auto fitting = all;
-  std::erase_if(fitting, [&](const json::object* set) {
-    return !lowercased(stringIn(*set, "query").value_or("")).starts_with(text);
-  });
-  return fitting.empty() ? all : fitting;
 }
 
 void appendFacts(const json::object& section, std::vector<std::string>& lines) {
@@ -161,9 +133,7 @@ std::vector<std::string> cardLines(std::string_view data, std::size_t width) {
   const auto* cards = parsed ? parsed->if_array() : nullptr;
   if (!cards) return {notAList(data, "cards")};
   std::vector<std::string> lines;
-  for (const auto& card : *cards) {
-    if (const auto* object = card.if_object()) appendCard(*object, lines);
-  }
+  for (const auto* card : objectsOf(*cards)) appendCard(*card, lines);
   for (auto& line : lines) line = fitted(trimmed(line), width);
   return lines;
 }

@@ -12,11 +12,9 @@ namespace zelkorctl {
 
 // What is shown of a service response.
 struct Shown {
-  std::size_t limit = 0;  // lines in all
-  std::size_t width = 0;  // columns of each
-  // A cached response was fetched for an earlier text: only its sets whose completed query begins
-  // with this one are shown, unless none does.
-  std::string_view typed = {};
+  std::size_t limit = 0;        // lines in all
+  std::size_t width = 0;        // columns of each
+  std::string_view typed = {};  // of the sets, those that fit this are shown
 };
 
 // The best results of a service response, one line each: title, type and description under each

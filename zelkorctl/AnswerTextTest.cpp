@@ -88,6 +88,9 @@ TEST(FollowUpsTest, FindWhereAResponseLeads) {
   } cases[] = {
       {R"([{"results":[{"card_url":"a"}]},{"more_results_url":"m","results":[{"card_url":"b"}]}])",
        "m", "b"},
+      {R"([{"query":"friend","more_results_url":"n","results":[{},{"card_url":"x"}]},
+          {"query":"france","more_results_url":"m","results":[{},{"card_url":"b"}]}])",
+       "m", "b"},
       {R"([7,{"more_results_url":8,"results":[{},9,{"card_url":"b"}]}])", {}, "b"},
       {R"([{"results":[{"card_url":"a"},{"title":"b"}]}])", {}, {}},
       {"{}", {}, {}},
@@ -95,8 +98,8 @@ TEST(FollowUpsTest, FindWhereAResponseLeads) {
   };
   for (const auto& [data, more, second] : cases) {
     SCOPED_TRACE(data);
-    EXPECT_EQ(moreResultsURL(data), more);
-    EXPECT_EQ(cardURL(data, 2), second);
+    EXPECT_EQ(moreResultsURL(data, "Fra"), more);
+    EXPECT_EQ(cardURL(data, "Fra", 2), second);
   }
 }
 

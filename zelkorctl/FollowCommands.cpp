@@ -46,7 +46,7 @@ class Following {
 
 std::optional<std::string> nextPage(const Outcome& outcome) {
   if (!outcome.answer.reply) return std::nullopt;
-  return moreResultsURL(outcome.answer.reply->data.view());
+  return moreResultsURL(outcome.answer.reply->data.view(), outcome.text);
 }
 
 }  // namespace
@@ -75,8 +75,8 @@ int runCard(const Invocation& invocation) {
   if (url->empty()) {
     const auto searched = following.search();
     const auto number = static_cast<std::size_t>(invocation.options.result);
-    url =
-        searched.answer.reply ? cardURL(searched.answer.reply->data.view(), number) : std::nullopt;
+    url = searched.answer.reply ? cardURL(searched.answer.reply->data.view(), searched.text, number)
+                                : std::nullopt;
     if (!url) {
       return following.endOfTheWay(searched, fmt::format("result {} has no card", number));
     }
