@@ -1,0 +1,141 @@
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <limits>
+
+#include "corezelkor/Constants.h"
+#include "zelkord/core/ClientStateManager.h"
+#include "zelkord/core/DaemonTestSupport.h"
+#include "zelkord/core/Wire.h"
+
+namespace zelkord {
+namespace {
+
+class EndpointImagesTest : public testing::Test {
+ protected:
+  EndpointImagesTest() { bed_.installBag(kServedBag); }
+
+  DaemonBed::Client connect() {
+    auto client =
+        bed_.fakes.interprocess.connect(bed_.daemon.assembly().clientStateManager()->endpoint());
+    bed_.run();
+    return client;
+  }
+  // The call is on its way when this returns.
+  static DaemonBed::Answer ask(const DaemonBed::Client& client,
+                               std::vector<ipc::Dictionary> descriptors,
+                               std::uint64_t milliseconds) {
+    return client->call(std::string(kEndpointInterface), "LoadImages",
+                        {std::move(descriptors), milliseconds});
+  }
+  static ipc::Dictionary image(const std::string& name) {
+    return {{"url", "https://s.example/" + name}};
+  }
+  static std::vector<std::string> keysIn(const ipc::FakeAnswer& answer) {
+    std::vector<std::string> keys;
+    for (const auto& [key, bytes] : *answer.values.at(0).get<ipc::DataMap>()) keys.push_back(key);
+    return keys;
+  }
+  std::size_t downloads() {
+    return static_cast<std::size_t>(std::ranges::count_if(
+        bed_.urlSession().tasks(), [](const auto& task) { return task->isDownload(); }));
+  }
+
+  DaemonBed bed_;
+};
+
+TEST_F(EndpointImagesTest, RefusesWhatBreaksItsRules) {
+  const struct {
+    std::vector<ipc::Dictionary> descriptors;
+    std::string errorName;
+  } cases[] = {
+      {{}, ""},
+      {{{{"url", ""}, {"id", "no such"}, {"data", Data("x")}, {"more", true}}}, ""},
+      {{{{"url", std::int64_t{7}}}}, std::string(ipc::kInvalidArgs)},
+      {{{{"id", Data("x")}}}, std::string(ipc::kInvalidArgs)},
+      {{image("a"), {{"data", "text"}}}, std::string(ipc::kInvalidArgs)},
+      {std::vector<ipc::Dictionary>(1000), ""},
+      {std::vector<ipc::Dictionary>(1001), std::string(ipc::kLimitsExceeded)},
+  };
+  const auto client = connect();
+  for (const auto& [descriptors, errorName] : cases) {
+    const auto answer = ask(client, descriptors, 1000);
+    bed_.run();
+    EXPECT_TRUE(answer->answered);
+    EXPECT_EQ(answer->errorName, errorName);
+    if (errorName.empty()) EXPECT_THAT(keysIn(*answer), testing::IsEmpty());
+  }
+  EXPECT_EQ(downloads(), 0u);
+  EXPECT_TRUE(bed_.fakes.log.contains("endpoint LoadImages refused: more than 1000 descriptors"));
+}
+
+TEST_F(EndpointImagesTest, CountsTheTimeFromReceiptAndHoldsUpNobody) {
+  const auto client = connect();
+  const auto other = connect();
+  auto& timeline = bed_.fakes.timeline;
+  const auto begin = timeline.now();
+  const auto first = ask(client, {image("slow")}, 300);
+  const auto second = ask(client, {image("slower")}, 400);
+  const auto elsewhere = ask(other, {}, 300);
+  const auto query = client->call(std::string(kEndpointInterface), "Request",
+                                  {"card", ipc::Dictionary{}, ipc::Dictionary{}});
+  std::vector<bool> early;
+  const auto look = timeline.global(QualityOfService::Default).after(299ms, [&] {
+    for (const auto& answer : {elsewhere, query, first}) early.push_back(answer->answered);
+  });
+  ASSERT_TRUE(timeline.runUntil([&] { return second->answered; }));
+  EXPECT_EQ(timeline.now() - begin, 400ms);
+  EXPECT_THAT(early, testing::ElementsAre(true, true, false));
+  EXPECT_TRUE(first->succeeded());
+}
+
+TEST_F(EndpointImagesTest, EndsWithTheLastImageHoweverLongItMayWait) {
+  const auto client = connect();
+  auto& timeline = bed_.fakes.timeline;
+  constexpr auto kMaximum = std::numeric_limits<std::uint64_t>::max();
+  for (const auto limit : {std::uint64_t{400'000}, kMaximum / 2 + 1, kMaximum}) {
+    SCOPED_TRACE(limit);
+    const auto answer = ask(client, {image(std::to_string(limit))}, limit);
+    const auto arrival = timeline.global(QualityOfService::Default).after(300s, [&] {
+      bed_.urlSession().pending().at(0)->succeed(200, "bytes");
+    });
+    const auto begin = timeline.now();
+    ASSERT_TRUE(timeline.runUntil([&] { return answer->answered; }));
+    EXPECT_EQ(timeline.now() - begin, 300s);
+    EXPECT_THAT(keysIn(*answer),
+                testing::ElementsAre("https://s.example/" + std::to_string(limit)));
+    EXPECT_EQ(client->state(), ipc::FakeClient::State::Open);
+  }
+}
+
+TEST_F(EndpointImagesTest, DropsWhatWaitsWhenTheClientGoes) {
+  const auto client = connect();
+  ask(client, {image("a")}, 1000);
+  ask(client, {image("b")}, 1000);
+  const auto departure = bed_.fakes.timeline.global(QualityOfService::Default).after(100ms, [&] {
+    client->disconnect();
+  });
+  bed_.fakes.timeline.advance(10s);
+  EXPECT_EQ(downloads(), 1u);
+}
+
+TEST(EncodedImagesTest, AreAsManyAsFitIntoOneArray) {
+  const auto total = [](const ipc::DataMap& images) {
+    std::size_t size = 0;
+    for (const auto& [key, bytes] : images) size += 4 + key.size() + 1 + 3 + 4 + bytes.size() + 7;
+    return size;
+  };
+  const Data large(std::string(8u << 20, 'x'));
+  LoadedImages images;
+  for (int i = 0; i < 8; ++i) images.emplace_back(std::to_string(i), large);
+  images.emplace_back("small", Data("x"));
+  const auto encoded = encodeImages(images);
+  ASSERT_EQ(encoded.size(), 7u);
+  EXPECT_EQ(encoded.back().first, "6");
+  EXPECT_LE(total(encoded), 64u << 20);
+  images.erase(images.begin());
+  EXPECT_EQ(encodeImages(images).size(), 8u);
+}
+
+}  // namespace
+}  // namespace zelkord
