@@ -1,0 +1,88 @@
+#include "platform/linux/url_cache/BodyFiles.h"
+
+#include <dirent.h>
+#include <fcntl.h>
+#include <fmt/format.h>
+#include <sys/mman.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <charconv>
+#include <memory>
+#include <string_view>
+#include <vector>
+
+namespace zelkord {
+namespace {
+
+constexpr std::string_view kBodySuffix = ".body";
+
+std::string bodyFileName(std::int64_t id) { return fmt::format("{:016x}{}", id, kBodySuffix); }
+
+std::optional<std::int64_t> idOfBodyFile(std::string_view name) {
+  if (!name.ends_with(kBodySuffix)) return std::nullopt;
+  name.remove_suffix(kBodySuffix.size());
+  std::int64_t id = 0;
+  const auto [end, error] = std::from_chars(name.data(), name.data() + name.size(), id, 16);
+  if (error != std::errc() || bodyFileName(id) != std::string(name) + std::string(kBodySuffix)) {
+    return 0;  // looks like one of ours, but is not
+  }
+  return id;
+}
+
+}  // namespace
+
+Descriptor BodyFiles::_openFolder() const {
+  return Descriptor(::open(folder_.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+}
+
+std::optional<Error> BodyFiles::makeFolder() {
+  if (::mkdir(folder_.c_str(), 0700) != 0 && errno != EEXIST) return posixError(errno);
+  open_ = _openFolder();
+  if (!open_ || ::fchmod(open_.get(), 0700) != 0) return posixError(errno);
+  return std::nullopt;
+}
+
+std::optional<Error> BodyFiles::write(std::int64_t id, std::string_view bytes) {
+  const auto name = bodyFileName(id);
+  constexpr int kFlags = O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC;
+  Descriptor file(::openat(open_.get(), name.c_str(), kFlags, 0600));
+  if (!file && errno == EEXIST && ::unlinkat(open_.get(), name.c_str(), 0) == 0) {
+    file = Descriptor(::openat(open_.get(), name.c_str(), kFlags, 0600));
+  }
+  if (!file) return posixError(errno);
+  if (writeFully(file.get(), bytes) && file.close()) return std::nullopt;
+  const auto error = posixError(errno);
+  remove(id);
+  return error;
+}
+
+std::optional<Data> BodyFiles::map(std::int64_t id, std::uint64_t size) {
+  if (!open_) open_ = _openFolder();
+  // O_NONBLOCK: a pipe that somebody put there must not wait for a writer.
+  constexpr int kFlags = O_RDONLY | O_NOFOLLOW | O_CLOEXEC | O_NONBLOCK;
+  const Descriptor file(::openat(open_.get(), bodyFileName(id).c_str(), kFlags));
+  struct stat status {};
+  if (!file || ::fstat(file.get(), &status) != 0 || !S_ISREG(status.st_mode)) return std::nullopt;
+  if (status.st_size <= 0 || static_cast<std::uint64_t>(status.st_size) != size) return {};
+  void* const start = ::mmap(nullptr, size, PROT_READ, MAP_PRIVATE, file.get(), 0);
+  if (start == MAP_FAILED) return std::nullopt;
+  std::shared_ptr<const void> mapping(start, [size](void* address) { ::munmap(address, size); });
+  return Data(std::move(mapping), {static_cast<const char*>(start), size});
+}
+
+void BodyFiles::remove(std::int64_t id) { ::unlinkat(open_.get(), bodyFileName(id).c_str(), 0); }
+
+void BodyFiles::removeUnless(FunctionRef<bool(std::int64_t id)> isKnown) {
+  const std::unique_ptr<DIR, int (*)(DIR*)> listing(::opendir(folder_.c_str()), ::closedir);
+  if (!listing) return;
+  std::vector<std::string> orphans;
+  while (const auto* file = ::readdir(listing.get())) {
+    const auto id = idOfBodyFile(file->d_name);
+    if (id && !isKnown(*id)) orphans.emplace_back(file->d_name);
+  }
+  for (const auto& name : orphans) ::unlinkat(::dirfd(listing.get()), name.c_str(), 0);
+}
+
+}  // namespace zelkord
