@@ -46,16 +46,16 @@ std::shared_ptr<QueryBed::Answer> QueryBed::search(ClientState& state, const std
 }
 
 std::shared_ptr<QueryBed::Answer> QueryBed::search(ClientState& state, ZLKSearchRequest request) {
-  auto answer = std::make_shared<Answer>();
-  state.search(std::make_shared<const ZLKSearchRequest>(std::move(request)),
-               [answer](std::int64_t queryId, auto reply, auto error) {
-                 ++answer->count;
-                 answer->queryId = queryId;
-                 answer->reply = std::move(reply);
-                 answer->error = std::move(error);
-               });
-  fakes.timeline.runUntilIdle();
-  return answer;
+  return ask(state, &ClientState::search, std::move(request));
+}
+
+ReplyCallback QueryBed::_into(std::shared_ptr<Answer> answer) {
+  return [answer = std::move(answer)](std::int64_t queryId, auto reply, auto error) {
+    ++answer->count;
+    answer->queryId = queryId;
+    answer->reply = std::move(reply);
+    answer->error = std::move(error);
+  };
 }
 
 std::vector<ZelkorFeedback> QueryBed::records() const { return sessions->records().all(); }

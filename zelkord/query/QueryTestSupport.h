@@ -35,6 +35,17 @@ class QueryBed {
   std::shared_ptr<Answer> search(ClientState& state, const std::string& text,
                                  std::int64_t queryId = 1);
   std::shared_ptr<Answer> search(ClientState& state, ZLKSearchRequest request);
+  // The same for any kind of query.
+  template <typename Request>
+  std::shared_ptr<Answer> ask(ClientState& state,
+                              void (ClientState::*operation)(std::shared_ptr<const Request>,
+                                                             ReplyCallback),
+                              Request request) {
+    auto answer = std::make_shared<Answer>();
+    (state.*operation)(std::make_shared<const Request>(std::move(request)), _into(answer));
+    fakes.timeline.runUntilIdle();
+    return answer;
+  }
 
   FakeURLSession& urlSession() { return *fakes.urlSessions.find("urlSession"); }
   // Class names of what was recorded for all clients, oldest first.
@@ -45,6 +56,9 @@ class QueryBed {
   FakePlatform fakes;
   Assembly assembly;
   std::shared_ptr<InMemorySessionManager> sessions;
+
+ private:
+  static ReplyCallback _into(std::shared_ptr<Answer> answer);
 };
 
 // A bag under which searches go out.
