@@ -94,8 +94,56 @@ TEST_F(ClientConnectionTest, AnUnboundConnectionGetsNoAnswersButForStaleSearches
   EXPECT_FALSE(bed_.search(client, 1)->answered);
   EXPECT_TRUE(bed_.search(client, 0)->answered);
   EXPECT_TRUE(bed_.search(client, 1)->answered);
+  for (const auto* kind :
+       {"moreResults", "card", "zeroKeyword", "lookup", "flightLookup", "flightSearch"}) {
+    EXPECT_FALSE(bed_.call(client, "Request", {kind, ipc::Dictionary{}})->answered) << kind;
+  }
+  EXPECT_TRUE(bed_.urlSession().tasks().empty());
   EXPECT_TRUE(bed_.call(client, "ListSessions")->answered);
   EXPECT_TRUE(bed_.fakes.log.contains("configuration must not be nil"));
+}
+
+// Searches go stale, see above; nothing else does.
+TEST_F(ClientConnectionTest, ServesEveryKindWhateverItsNumber) {
+  struct Case {
+    const char* kind;
+    bool isSent;
+    std::vector<std::uint32_t> trace;
+  };
+  const std::vector<Case> cases = {
+      {"moreResults", true, {}},
+      {"card", true, {0x2B00000C, 0x2B000010}},
+      {"zeroKeyword", true, {0x2B00001C, 0x2B000020}},
+      {"lookup", true, {0x2B00002C, 0x2B000030}},
+      {"flightLookup", false, {}},
+      {"flightSearch", false, {}},
+  };
+  DaemonBed bed({{"TraceEnabled", true}});
+  bed.installBag(kServedBag);
+  bed.fakes.textInput.scale = 3;
+  const auto client = bed.connectAndConfigure();
+  bed.search(client, 50);
+  bed.fakes.trace.take();
+  for (const auto& [kind, isSent, trace] : cases) {
+    for (const auto queryId : {std::int64_t{-3}, std::int64_t{3}, std::int64_t{90}}) {
+      SCOPED_TRACE(std::string(kind) + std::to_string(queryId));
+      const auto answer = bed.call(client, "Request",
+                                   {kind, ipc::Dictionary{{"queryId", queryId},
+                                                          {"moreResultsURL", "https://m.example"},
+                                                          {"cardURL", "https://c.example"}}});
+      EXPECT_EQ(answer->answered, !isSent);
+      if (isSent) bed.urlSession().pending().back()->succeed(200, "[]");
+      bed.run();
+      ASSERT_TRUE(answer->answered);
+      EXPECT_EQ(*answer->values[0].get<std::int64_t>(), queryId);
+      EXPECT_TRUE(isNothing(*answer, 2));
+      const auto& reply = *answer->values[1].get<ipc::Dictionary>();
+      ASSERT_EQ(reply.empty(), !isSent);
+      if (isSent) EXPECT_EQ(*reply.at("scale").get<double>(), 3);
+      EXPECT_EQ(bed.fakes.trace.take(), trace);
+    }
+  }
+  EXPECT_FALSE(bed.search(client, 51)->answered);  // the others' numbers have not made it stale
 }
 
 TEST_F(ClientConnectionTest, RefusesWhatItCannotMean) {

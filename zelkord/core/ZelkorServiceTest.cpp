@@ -140,6 +140,45 @@ TEST(EndpointTest, KnowsOnlyClientsThatConfiguredThemselves) {
   EXPECT_EQ(manager.states().size(), 1u);
 }
 
+TEST(EndpointTest, AnswersMoreResultsAndCardsAsTheClientThatIsNamed) {
+  DaemonBed bed;
+  bed.installBag(kServedBag);
+  bed.connectAndConfigure("lanthe");
+  auto& manager = *bed.daemon.assembly().clientStateManager();
+  const auto client = bed.fakes.interprocess.connect(manager.endpoint());
+  for (const auto& [kind, isServed] :
+       std::vector<std::pair<std::string, bool>>{{"moreResults", true},
+                                                 {"card", true},
+                                                 {"search", false},
+                                                 {"zeroKeyword", false},
+                                                 {"lookup", false},
+                                                 {"flightLookup", false},
+                                                 {"flightSearch", false}}) {
+    SCOPED_TRACE(kind);
+    bed.fakes.log.clear();
+    const auto answer =
+        client->call(std::string(kEndpointInterface), "Request",
+                     {kind,
+                      ipc::Dictionary{{"queryId", std::int64_t{-9}},
+                                      {"moreResultsURL", "https://m.example/?q=a"},
+                                      {"cardURL", "https://c.example/"}},
+                      ipc::Dictionary{{"identifier", "lanthe"}, {"userAgent", "Other/1"}}});
+    bed.run();
+    EXPECT_TRUE(bed.fakes.log.contains("using client state: lanthe"));
+    EXPECT_FALSE(answer->answered);
+    ASSERT_EQ(bed.urlSession().pending().size(), isServed ? 1u : 0u);
+    if (!isServed) continue;
+    const auto task = bed.urlSession().pending().back();
+    EXPECT_THAT(task->request().header("User-Agent").value_or(""), testing::EndsWith("Lanthe/9"));
+    task->succeed(200, "[7]");
+    bed.run();
+    ASSERT_TRUE(answer->answered);
+    EXPECT_EQ(*answer->values[0].get<std::int64_t>(), -9);
+    EXPECT_EQ(answer->values[1].get<ipc::Dictionary>()->at("data").get<Data>()->view(), "[7]");
+  }
+  EXPECT_EQ(manager.sessions().at(0).at("agent").find("Other/1"), std::string::npos);
+}
+
 TEST(DaemonTest, BuildsTheGraphAnnouncesItselfAndLeavesOnSignals) {
   for (const auto& [number, text] : {std::pair{SIGTERM, "SIGTERM"}, {SIGINT, "SIGINT"}}) {
     SCOPED_TRACE(text);
