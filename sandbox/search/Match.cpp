@@ -37,6 +37,14 @@ std::vector<Match> pickMixed(std::vector<Match> matches, std::size_t limit) {
   return picked;
 }
 
+std::vector<Match> pickAfter(std::vector<Match> matches, std::size_t limit) {
+  std::unordered_set<std::int64_t> seen;
+  for (const Match& match : pickMixed(matches, limit)) seen.insert(match.entry);
+  std::sort(matches.begin(), matches.end(), ranksHigher);
+  std::erase_if(matches, [&](const Match& match) { return !seen.insert(match.entry).second; });
+  return matches;
+}
+
 std::vector<Match> pickCompletions(const std::vector<Match>& ordered, std::size_t limit) {
   std::unordered_set<std::string> seen;
   std::vector<Match> picked;

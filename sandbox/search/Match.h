@@ -21,6 +21,9 @@ struct Match {
 // others are there.
 std::vector<Match> pickMixed(std::vector<Match> matches, std::size_t limit);
 
+// The entries that pickMixed leaves out at that limit, each by its best match, in order of weight.
+std::vector<Match> pickAfter(std::vector<Match> matches, std::size_t limit);
+
 // Up to `limit` different texts of the matches, best first, for completing what was typed.
 std::vector<Match> pickCompletions(const std::vector<Match>& ordered, std::size_t limit);
 

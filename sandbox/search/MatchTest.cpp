@@ -21,6 +21,11 @@ TEST(MatchTest, LeavesRoomForOtherKindsWhenThereAreAny) {
   matches.push_back({"country", 100, -10, Kind::Country});
   matches.push_back({"character", 101, -20, Kind::Character});
   EXPECT_EQ(idsOf(pickMixed(matches, 8)), (std::vector<std::int64_t>{0, 1, 2, 3, 4, 5, 100, 101}));
+  EXPECT_EQ(idsOf(pickAfter(matches, 8)),
+            (std::vector<std::int64_t>{6, 7, 8, 9, 10, 11, 12, 13, 14, 15, 16, 17, 18, 19}));
+  EXPECT_EQ(pickAfter(matches, 0).size(), matches.size());
+  matches.push_back({"the country", 100, -30, Kind::Country});
+  EXPECT_EQ(pickAfter(matches, 8).size(), 14U);
   matches.resize(20);
   EXPECT_EQ(idsOf(pickMixed(matches, 8)), (std::vector<std::int64_t>{0, 1, 2, 3, 4, 5, 6, 7}));
 }

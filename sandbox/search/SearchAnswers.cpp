@@ -59,16 +59,18 @@ json::array SearchAnswers::mentions(SuggestionIndex& index, std::string_view typ
   return sets;
 }
 
+// The first page, of a search, is a mixture; its size is what `offset` is above whole pages.
 json::array SearchAnswers::more(std::string_view query, std::size_t offset) const {
   const auto start = std::chrono::steady_clock::now();
   auto index = pool_.borrow();
-  auto matches = pickMixed(index->startingWith(foldQuery(query)), offset + kPageSize + 1);
-  const bool furtherPage = matches.size() > offset + kPageSize;
-  matches.resize(std::min(matches.size(), offset + kPageSize));
-  matches.erase(matches.begin(),
-                matches.begin() + static_cast<std::ptrdiff_t>(std::min(matches.size(), offset)));
-  auto set = resultSet({lowerCased(query), 1, kSearchMaxAge}, resultsOf(*index, writer_, matches));
-  if (furtherPage) set["more_results_url"] = writer_.moreUrl(query, offset + kPageSize);
+  const std::size_t first = offset % kPageSize;
+  const auto rest = pickAfter(index->startingWith(foldQuery(query)), first);
+  const std::size_t begin = std::min(rest.size(), offset - first);
+  const std::size_t end = std::min(rest.size(), begin + kPageSize);
+  const std::vector<Match> page(rest.begin() + static_cast<std::ptrdiff_t>(begin),
+                                rest.begin() + static_cast<std::ptrdiff_t>(end));
+  auto set = resultSet({lowerCased(query), 1, kSearchMaxAge}, resultsOf(*index, writer_, page));
+  if (end < rest.size()) set["more_results_url"] = writer_.moreUrl(query, offset + kPageSize);
   json::array sets;
   sets.push_back(std::move(set));
   stampDuration(sets, start);

@@ -23,7 +23,8 @@ class SearchAnswers final {
   // `typed`, lower-cased.
   boost::json::array search(std::string_view typed) const;
 
-  // One set with the results for `query` from `offset` on.
+  // One set with the results for `query` from `offset` on. Pages from the offset that a search
+  // names neither repeat its results nor each other's.
   boost::json::array more(std::string_view query, std::size_t offset) const;
 
   // [card], or nothing for an unknown number.
