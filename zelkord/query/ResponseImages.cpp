@@ -9,6 +9,9 @@
 namespace zelkord {
 namespace {
 
+// More than any service has; keeps one that invents hosts from filling the memory.
+constexpr std::size_t kMaximumImageHosts = 100'000;
+
 // The hosts that the bag itself names: of its resources the first one's, and the search service's.
 ImageHosts hostsNamedBy(const ZLKBag& bag) {
   ImageHosts hosts;
@@ -62,7 +65,9 @@ void ResponseImages::_add(const ImageHosts& hosts) {
   imageHostsQueue_->assertBarrier();
   if (std::ranges::includes(*validImageHosts_, hosts)) return;
   auto all = std::make_shared<ImageHosts>(*validImageHosts_);
-  all->insert(hosts.begin(), hosts.end());
+  for (const auto& host : hosts) {
+    if (all->size() < kMaximumImageHosts) all->insert(host);
+  }
   validImageHosts_ = std::move(all);
 }
 

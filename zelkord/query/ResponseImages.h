@@ -29,7 +29,8 @@ class ResponseImages final : public std::enable_shared_from_this<ResponseImages>
  public:
   explicit ResponseImages(Assembly& assembly);
 
-  // Takes the hosts of a response's images as good from now on. Nothing without a bag.
+  // Takes the hosts of a response's images as good from now on; at most 100,000 in all. Nothing
+  // without a bag.
   void processImagesFromResponse(const json::value& response, const ZLKBag* bag);
 
   // Calls back, on the caller's thread, with what is there at `deadline` (on the clock's real
