@@ -1,5 +1,6 @@
 #include <fmt/format.h>
 
+#include <algorithm>
 #include <chrono>
 #include <map>
 #include <optional>
@@ -96,7 +97,9 @@ class ImagesRun {
       return;
     }
     for (const auto& image : images) showOne(image);
-    invocation_.surroundings.out << fmt::format("{} images in {:.1f} ms\n", images.size(),
+    const auto came = std::count_if(images.begin(), images.end(),
+                                    [](const auto& image) { return image.bytes.has_value(); });
+    invocation_.surroundings.out << fmt::format("{} of {} in {:.1f} ms\n", came, images.size(),
                                                 milliseconds_);
   }
 
