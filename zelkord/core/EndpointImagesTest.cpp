@@ -1,6 +1,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <limits>
 
 #include "corezelkor/Constants.h"
@@ -63,7 +64,9 @@ TEST_F(EndpointImagesTest, RefusesWhatBreaksItsRules) {
     bed_.run();
     EXPECT_TRUE(answer->answered);
     EXPECT_EQ(answer->errorName, errorName);
-    if (errorName.empty()) EXPECT_THAT(keysIn(*answer), testing::IsEmpty());
+    if (errorName.empty()) {
+      EXPECT_THAT(keysIn(*answer), testing::IsEmpty());
+    }
   }
   EXPECT_EQ(downloads(), 0u);
   EXPECT_TRUE(bed_.fakes.log.contains("endpoint LoadImages refused: more than 1000 descriptors"));

@@ -163,7 +163,9 @@ TEST_F(ImageFetcherTest, AnyFailureGivesNoneIsRecordedAndNotKept) {
     EXPECT_EQ(fakes_.log.count(row.log), 1);
     const auto errors = recorded<HVErrorFeedback>();
     EXPECT_EQ(errors.size() - errorsBefore, row.error ? 1u : 0u);
-    if (row.error) EXPECT_EQ(errors.back()->error, *row.error);
+    if (row.error) {
+      EXPECT_EQ(errors.back()->error, *row.error);
+    }
     EXPECT_EQ(recorded<HVEndNetworkSearchFeedback>().size(),
               recorded<HVStartNetworkSearchFeedback>().size());
     EXPECT_TRUE(fakes_.transactions.openNames().empty());
