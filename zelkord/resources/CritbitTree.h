@@ -4,7 +4,6 @@
 #include <cstdint>
 #include <string_view>
 
-#include "base/FunctionRef.h"
 #include "zelkord/resources/critbit.h"
 
 namespace zelkord {
@@ -34,21 +33,28 @@ class CritbitTree final {
     return false;
   }
 
-  // Null when the key is absent.
-  Pointer objectForKey(std::string_view key) const {
+  // Null when the key is absent. Valid until the tree drops it.
+  Object* objectForKey(std::string_view key) const {
     void* value = nullptr;
-    return critbit_contains(tree_, key, &value) ? Pointer(static_cast<Object*>(value)) : Pointer();
+    return critbit_contains(tree_, key, &value) ? static_cast<Object*>(value) : nullptr;
   }
 
   void removeObjectForKey(std::string_view key) { critbit_delete(tree_, key); }
   void removeAllObjects() { critbit_clear(tree_); }
   std::uint64_t count() const { return tree_.count; }
 
-  // Every key that begins with the prefix, with its object, in ascending byte order; setting the
-  // flag ends the walk. The call-back must not change the tree.
-  using Visitor = FunctionRef<void(std::string_view key, Object& object, bool& stop)>;
-  void keysMatchingPrefix(std::string_view prefix, Visitor visit) const {
-    critbit_allprefixed(tree_, prefix, prefixCallback, &visit);
+  // Calls `visit(std::string_view key, Object& object, bool& stop)` for every key that begins with
+  // the prefix, with its object, in ascending byte order; setting the flag ends the walk. The call
+  // must not change the tree.
+  template <typename Visit>
+  void keysMatchingPrefix(std::string_view prefix, const Visit& visit) const {
+    auto* top = tree_.root && prefix.data() ? critbit_prefixed(tree_.root, prefix) : nullptr;
+    if (!top) return;
+    critbit_visit(top, [&visit](const CritbitLeaf& leaf) {
+      bool stop = false;
+      visit(std::string_view(leaf.key()), *static_cast<Object*>(leaf.value), stop);
+      return stop ? 0 : 1;
+    });
   }
 
  private:
@@ -56,11 +62,6 @@ class CritbitTree final {
     return const_cast<void*>(static_cast<const void*>(object));
   }
   static void valueRelease(void* value) { intrusive_ptr_release(static_cast<Object*>(value)); }
-  static int prefixCallback(std::string_view key, void* value, void* visitor) {
-    bool stop = false;
-    (*static_cast<Visitor*>(visitor))(key, *static_cast<Object*>(value), stop);
-    return stop ? 0 : 1;
-  }
 
   CritbitRecord tree_;
 };

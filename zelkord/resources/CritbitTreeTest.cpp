@@ -1,12 +1,25 @@
 #include <gtest/gtest.h>
 
 #include <boost/smart_ptr/intrusive_ref_counter.hpp>
+#include <cstdlib>
 #include <map>
+#include <new>
 #include <random>
 #include <string>
 #include <vector>
 
 #include "zelkord/resources/CritbitTree.h"
+
+namespace {
+// How many allocations still succeed; negative: all.
+int allocationsLeft = -1;
+}  // namespace
+
+void* operator new(std::size_t size, const std::nothrow_t&) noexcept {
+  if (allocationsLeft == 0) return nullptr;
+  if (allocationsLeft > 0) --allocationsLeft;
+  return ::operator new(size);
+}
 
 namespace zelkord {
 namespace {
@@ -77,6 +90,80 @@ TEST(CritbitTreeTest, HoldsOneReferenceToEachValue) {
   EXPECT_EQ(second->use_count(), 1u);
 }
 
+TEST(CritbitTreeTest, StaysAsItIsWhenMemoryIsOut) {
+  const auto object = counted(1);
+  for (const auto* present : {"", "key"}) {  // a root leaf; an inner node and its leaf
+    for (int left = 0; left < (*present ? 2 : 1); ++left) {
+      SCOPED_TRACE(testing::Message() << present << " and " << left << " allocations");
+      CountedTree tree;
+      if (*present) tree.setObject(counted(2), present);
+      allocationsLeft = left;
+      const bool stored = tree.setObject(object, "kez");
+      allocationsLeft = -1;
+      EXPECT_FALSE(stored);
+      EXPECT_EQ(object->use_count(), 1u);
+      EXPECT_EQ(tree.count(), *present ? 1u : 0u);
+      EXPECT_EQ(tree.objectForKey("kez"), nullptr);
+    }
+  }
+}
+
+// The plain functions, without the wrapper: values are any pointers.
+TEST(CritbitRecordTest, TellsWhatAnInsertionDid) {
+  static std::vector<void*> released;
+  released.clear();
+  int values[2] = {};
+  CritbitRecord tree{.releaseValue = [](void* value) { released.push_back(value); }};
+  const auto stored = [&tree] {
+    void* value = nullptr;
+    critbit_contains(tree, "key", &value);
+    return value;
+  };
+  EXPECT_EQ(critbit_insert(tree, "key", &values[0], false), CritbitInsertion::Inserted);
+  EXPECT_EQ(critbit_insert(tree, "key", &values[0], true), CritbitInsertion::NothingDone);
+  EXPECT_EQ(critbit_insert(tree, "key", &values[1], false), CritbitInsertion::KeyPresent);
+  EXPECT_EQ(stored(), &values[0]);
+  EXPECT_EQ(critbit_insert(tree, "key", &values[1], true), CritbitInsertion::KeyPresent);
+  EXPECT_EQ(stored(), &values[1]);
+  EXPECT_FALSE(critbit_delete(tree, "ke"));
+  EXPECT_TRUE(critbit_delete(tree, "key"));
+  EXPECT_EQ(tree.root, nullptr);
+  EXPECT_EQ(released, (std::vector<void*>{&values[0], &values[1]}));
+}
+
+TEST(CritbitRecordTest, TheHandlerDecidesHowAWalkEnds) {
+  CritbitRecord tree;
+  int value = 0;
+  for (const auto* key : {"a", "ab", "b"}) critbit_insert(tree, key, &value, true);
+  struct Walk {
+    int answer;  // from the second key on
+    std::string keys;
+  };
+  const CritbitHandler handler = [](const char* key, void* argument) {
+    auto& walk = *static_cast<Walk*>(argument);
+    walk.keys += walk.keys.empty() ? key : std::string(" ") + key;
+    return walk.keys == key ? 1 : walk.answer;
+  };
+  struct Case {
+    std::string_view prefix;
+    int answer;
+    CritbitWalk expected;
+    std::string keys;
+  };
+  const std::vector<Case> cases = {{"", 1, CritbitWalk::RanToTheEnd, "a ab b"},
+                                   {"", 0, CritbitWalk::Stopped, "a ab"},
+                                   {"a", 7, CritbitWalk::Failed, "a ab"},
+                                   {"c", 0, CritbitWalk::RanToTheEnd, ""},
+                                   {std::string_view(), 1, CritbitWalk::RanToTheEnd, ""}};
+  for (const auto& wanted : cases) {
+    SCOPED_TRACE(testing::Message() << "'" << wanted.prefix << "' " << wanted.answer);
+    Walk walk{wanted.answer, ""};
+    EXPECT_EQ(critbit_allprefixed(tree, wanted.prefix, handler, &walk), wanted.expected);
+    EXPECT_EQ(walk.keys, wanted.keys);
+  }
+  critbit_clear(tree);
+}
+
 TEST(CritbitTreeTest, RefusesKeysWithZeroBytes) {
   CountedTree tree;
   EXPECT_FALSE(tree.setObject(counted(1), std::string_view("a\0b", 3)));
@@ -119,7 +206,7 @@ TEST(CritbitTreeTest, AgreesWithAnOrderedMap) {
     }
     ASSERT_EQ(tree.count(), model.size());
     const auto found = model.find(key);
-    ASSERT_EQ(tree.objectForKey(key), found == model.end() ? nullptr : found->second);
+    ASSERT_EQ(tree.objectForKey(key), found == model.end() ? nullptr : found->second.get());
     if (step % 97 != 0) continue;
     const auto prefix = randomKey().substr(0, 2);
     std::vector<std::string> expected;

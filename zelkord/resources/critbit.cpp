@@ -1,81 +1,29 @@
 #include "zelkord/resources/critbit.h"
 
-#include <cstring>
+#include <algorithm>
 #include <new>
 #include <utility>
-#include <vector>
 
 namespace zelkord {
 namespace {
 
-constexpr std::align_val_t kNodeAlignment{8};
-constexpr std::uintptr_t kInnerTag = 1;
+static_assert(__STDCPP_DEFAULT_NEW_ALIGNMENT__ >= 8, "the low bit of node addresses is a tag");
 
-struct InnerNode {
-  CritbitNode* child[2];
-  std::uint32_t byte;      // index of the critical byte
-  std::uint8_t otherbits;  // every bit but the critical one
-};
-static_assert(sizeof(InnerNode) == 24);
-
-// The key follows, then a zero byte.
-struct Leaf {
-  void* value;
-
-  char* key() { return reinterpret_cast<char*>(this + 1); }
-  const char* key() const { return reinterpret_cast<const char*>(this + 1); }
-};
+CritbitNode* tagged(CritbitInner* inner) {
+  return reinterpret_cast<CritbitNode*>(reinterpret_cast<std::uintptr_t>(inner) + kCritbitInnerTag);
+}
+CritbitNode* tagged(CritbitLeaf* leaf) { return reinterpret_cast<CritbitNode*>(leaf); }
 
 // Such a key cannot be stored, so no tree has it.
 bool hasZeroByte(std::string_view key) { return key.find('\0') != std::string_view::npos; }
 
-std::uintptr_t bits(const CritbitNode* node) { return reinterpret_cast<std::uintptr_t>(node); }
-bool isInner(const CritbitNode* node) { return (bits(node) & kInnerTag) != 0; }
-InnerNode* asInner(CritbitNode* node) {
-  return reinterpret_cast<InnerNode*>(bits(node) - kInnerTag);
-}
-Leaf* asLeaf(CritbitNode* node) { return reinterpret_cast<Leaf*>(node); }
-CritbitNode* tagged(InnerNode* inner) {
-  return reinterpret_cast<CritbitNode*>(reinterpret_cast<std::uintptr_t>(inner) + kInnerTag);
-}
-CritbitNode* tagged(Leaf* leaf) { return reinterpret_cast<CritbitNode*>(leaf); }
-
-std::uint8_t byteAt(std::string_view key, std::size_t index) {
-  return index < key.size() ? static_cast<std::uint8_t>(key[index]) : 0;
+bool hasKey(const CritbitLeaf& leaf, std::string_view key) {
+  return startsWith(leaf, key) && leaf.key()[key.size()] == '\0';
 }
 
-int directionOf(const InnerNode& inner, std::uint8_t c) { return (1 + (inner.otherbits | c)) >> 8; }
-int directionOf(const InnerNode& inner, std::string_view key) {
-  return directionOf(inner, byteAt(key, inner.byte));
-}
-
-// The leaf that the key's bits lead to: the best match, not necessarily equal.
-Leaf* find_next_external_node(CritbitNode* node, std::string_view key) {
-  while (isInner(node)) {
-    const auto* inner = asInner(node);
-    node = inner->child[directionOf(*inner, key)];
-  }
-  return asLeaf(node);
-}
-
-Leaf* new_external_node(std::string_view key, void* value) {
-  void* memory = ::operator new(sizeof(Leaf) + key.size() + 1, kNodeAlignment, std::nothrow);
-  if (!memory) return nullptr;
-  auto* leaf = new (memory) Leaf{value};
-  std::memcpy(leaf->key(), key.data(), key.size());
-  leaf->key()[key.size()] = '\0';
-  return leaf;
-}
-
-void freeNode(void* node) { ::operator delete(node, kNodeAlignment); }
-
-bool hasKey(const Leaf& leaf, std::string_view key) {
-  return std::strncmp(leaf.key(), key.data(), key.size()) == 0 && leaf.key()[key.size()] == '\0';
-}
-
-void dropLeaf(const CritbitRecord& tree, Leaf* leaf) {
+void dropLeaf(const CritbitRecord& tree, CritbitLeaf* leaf) {
   if (tree.releaseValue) tree.releaseValue(leaf->value);
-  freeNode(leaf);
+  ::operator delete(leaf);
 }
 
 // Where a new key parts from the leaf that it leads to.
@@ -84,7 +32,7 @@ struct Difference {
   std::uint8_t bits = 0;  // none: the key is the leaf's
 };
 
-Difference differenceFrom(const Leaf& leaf, std::string_view key) {
+Difference differenceFrom(const CritbitLeaf& leaf, std::string_view key) {
   for (std::size_t i = 0; i < key.size(); ++i) {
     const auto difference = static_cast<std::uint8_t>(key[i] ^ leaf.key()[i]);
     if (difference) return {i, difference};
@@ -100,7 +48,8 @@ std::uint8_t allButHighest(std::uint8_t difference) {
   return static_cast<std::uint8_t>((spread & ~(spread >> 1)) ^ 255u);
 }
 
-CritbitInsertion replaceValue(const CritbitRecord& tree, Leaf& leaf, void* value, bool replace) {
+CritbitInsertion replaceValue(const CritbitRecord& tree, CritbitLeaf& leaf, void* value,
+                              bool replace) {
   if (leaf.value == value) return CritbitInsertion::NothingDone;
   if (!replace) return CritbitInsertion::KeyPresent;
   void* old = std::exchange(leaf.value, value);
@@ -109,30 +58,34 @@ CritbitInsertion replaceValue(const CritbitRecord& tree, Leaf& leaf, void* value
 }
 
 // The slot into which a node that parts at (byte, otherbits) goes: positions grow along every path.
-CritbitNode** slotFor(CritbitRecord& tree, std::string_view key, const InnerNode& added) {
+CritbitNode** slotFor(CritbitRecord& tree, std::string_view key, const CritbitInner& added) {
   auto** slot = &tree.root;
-  while (isInner(*slot)) {
-    auto* inner = asInner(*slot);
-    if (inner->byte > added.byte) break;
-    if (inner->byte == added.byte && inner->otherbits > added.otherbits) break;
-    slot = &inner->child[directionOf(*inner, key)];
+  auto* node = tree.root;
+  while (isInner(node)) {
+    auto& inner = *asInner(node);
+    if (inner.byte > added.byte) break;
+    if (inner.byte == added.byte && inner.otherbits > added.otherbits) break;
+    const auto c = byteAt(inner, key);
+    slot = &inner.child[directionOf(inner, c)];
+    node = childOf(inner, c);
   }
   return slot;
 }
 
-CritbitInsertion insertBeside(CritbitRecord& tree, const Leaf& best, std::string_view key,
+CritbitInsertion insertBeside(CritbitRecord& tree, const CritbitLeaf& best, std::string_view key,
                               Difference difference, void* value) {
-  void* memory = ::operator new(sizeof(InnerNode), kNodeAlignment, std::nothrow);
+  void* memory = ::operator new(sizeof(CritbitInner), std::nothrow);
   if (!memory) return CritbitInsertion::NothingDone;
-  auto* inner = new (memory) InnerNode{{nullptr, nullptr},
-                                       static_cast<std::uint32_t>(difference.byte),
-                                       allButHighest(difference.bits)};
+  auto* inner = new (memory) CritbitInner{{nullptr, nullptr},
+                                          static_cast<std::uint32_t>(difference.byte),
+                                          allButHighest(difference.bits)};
   auto* leaf = new_external_node(key, value);
   if (!leaf) {
-    freeNode(inner);
+    ::operator delete(inner);
     return CritbitInsertion::NothingDone;
   }
-  const int direction = directionOf(*inner, static_cast<std::uint8_t>(best.key()[difference.byte]));
+  const auto direction =
+      directionOf(*inner, static_cast<std::uint8_t>(best.key()[difference.byte]));
   auto** slot = slotFor(tree, key, *inner);
   inner->child[1 - direction] = tagged(leaf);
   inner->child[direction] = *slot;
@@ -141,25 +94,17 @@ CritbitInsertion insertBeside(CritbitRecord& tree, const Leaf& best, std::string
   return CritbitInsertion::Inserted;
 }
 
-// Calls the handler on every leaf below the node, child 0 before child 1. A stack of its own: depth
-// is as much as the keys are long.
-CritbitWalk allprefixed_traverse(CritbitNode* top, CritbitHandler handler, void* argument) {
-  std::vector<CritbitNode*> waiting{top};
-  while (!waiting.empty()) {
-    auto* node = waiting.back();
-    waiting.pop_back();
-    while (isInner(node)) {
-      waiting.push_back(asInner(node)->child[1]);
-      node = asInner(node)->child[0];
-    }
-    const int answer = handler(asLeaf(node)->key(), asLeaf(node)->value, argument);
-    if (answer != 1) return answer == 0 ? CritbitWalk::Stopped : CritbitWalk::Failed;
-  }
-  return CritbitWalk::RanToTheEnd;
+}  // namespace
+
+CritbitLeaf* new_external_node(std::string_view key, void* value) {
+  void* memory = ::operator new(sizeof(CritbitLeaf) + key.size() + 1, std::nothrow);
+  if (!memory) return nullptr;
+  auto* leaf = new (memory) CritbitLeaf{value};
+  *std::copy(key.begin(), key.end(), leaf->key()) = '\0';
+  return leaf;
 }
 
-// Frees the subtree, children before their node, without a stack: an inner node's first child, once
-// freed, holds the way back.
+// Without a stack: an inner node's first child, once freed, holds the way back.
 void traverse(const CritbitRecord& tree, CritbitNode* node) {
   CritbitNode* parent = nullptr;
   for (;;) {
@@ -173,17 +118,22 @@ void traverse(const CritbitRecord& tree, CritbitNode* node) {
     while (parent && !asInner(parent)->child[1]) {
       auto* done = asInner(parent);
       parent = done->child[0];
-      freeNode(done);
+      ::operator delete(done);
     }
     if (!parent) return;
     node = std::exchange(asInner(parent)->child[1], nullptr);
   }
 }
 
-}  // namespace
+CritbitWalk allprefixed_traverse(CritbitNode* node, CritbitHandler handler, void* argument) {
+  const int answer =
+      critbit_visit(node, [=](const CritbitLeaf& leaf) { return handler(leaf.key(), argument); });
+  if (answer == 1) return CritbitWalk::RanToTheEnd;
+  return answer == 0 ? CritbitWalk::Stopped : CritbitWalk::Failed;
+}
 
 bool critbit_contains(const CritbitRecord& tree, std::string_view key, void** value) {
-  if (!tree.root || hasZeroByte(key)) return false;
+  if (!tree.root) return false;
   const auto* leaf = find_next_external_node(tree.root, key);
   if (!hasKey(*leaf, key)) return false;
   if (value) *value = leaf->value;
@@ -207,27 +157,29 @@ CritbitInsertion critbit_insert(CritbitRecord& tree, std::string_view key, void*
 }
 
 bool critbit_delete(CritbitRecord& tree, std::string_view key) {
-  if (!tree.root || hasZeroByte(key)) return false;
+  if (!tree.root) return false;
   auto** slot = &tree.root;
+  auto* node = tree.root;
   CritbitNode** innerSlot = nullptr;
-  int direction = 0;
-  while (isInner(*slot)) {
+  CritbitInner* inner = nullptr;
+  unsigned direction = 0;
+  while (isInner(node)) {
     innerSlot = slot;
-    auto* inner = asInner(*slot);
-    direction = directionOf(*inner, key);
+    inner = asInner(node);
+    const auto c = byteAt(*inner, key);
+    direction = directionOf(*inner, c);
     slot = &inner->child[direction];
+    node = childOf(*inner, c);
   }
-  auto* leaf = asLeaf(*slot);
-  if (!hasKey(*leaf, key)) return false;
-  dropLeaf(tree, leaf);
+  if (!hasKey(*asLeaf(node), key)) return false;
+  dropLeaf(tree, asLeaf(node));
   --tree.count;
-  if (!innerSlot) {
+  if (!inner) {
     tree.root = nullptr;
     return true;
   }
-  auto* inner = asInner(*innerSlot);
   *innerSlot = inner->child[1 - direction];
-  freeNode(inner);
+  ::operator delete(inner);
   return true;
 }
 
@@ -239,18 +191,8 @@ void critbit_clear(CritbitRecord& tree) {
 
 CritbitWalk critbit_allprefixed(const CritbitRecord& tree, std::string_view prefix,
                                 CritbitHandler handler, void* argument) {
-  if (!tree.root || hasZeroByte(prefix)) return CritbitWalk::RanToTheEnd;
-  auto* node = tree.root;
-  auto* top = node;
-  while (isInner(node)) {
-    const auto* inner = asInner(node);
-    node = inner->child[directionOf(*inner, prefix)];
-    if (inner->byte < prefix.size()) top = node;
-  }
-  if (std::strncmp(asLeaf(node)->key(), prefix.data(), prefix.size()) != 0) {
-    return CritbitWalk::RanToTheEnd;
-  }
-  return allprefixed_traverse(top, handler, argument);
+  auto* top = tree.root && prefix.data() ? critbit_prefixed(tree.root, prefix) : nullptr;
+  return top ? allprefixed_traverse(top, handler, argument) : CritbitWalk::RanToTheEnd;
 }
 
 }  // namespace zelkord

@@ -4,24 +4,20 @@
 #include <cstdint>
 #include <string_view>
 
+#include "zelkord/resources/CritbitNodes.h"
+
 namespace zelkord {
 
 // A crit-bit tree: an ordered map from byte strings without zero bytes to pointers. Finding a key,
 // or all keys with a prefix, costs one pass over the key plus one node for each bit in which stored
 // keys differ on the way.
 //
-// A node pointer's low bit tells its kind (nodes are 8-byte aligned):
-//   0  leaf: the value pointer, the key's bytes, a zero byte
-//   1  inner node at the address minus one: two children, the index of the byte in which the
-//   subtrees first differ, and
-//      a mask with every bit set but the highest one in which they differ
 // A key that ends before a node's byte counts as having a zero there, so walks go in ascending byte
-// order, a key before those that extend it.
+// order, a key before those that extend it. A key that holds a zero byte is never found and not
+// stored.
 //
 // Threading: none inside; one queue owns a tree. Ownership: the tree owns its nodes and its copies
 // of the keys; values belong to whoever inserts, until the tree drops them through `releaseValue`.
-struct CritbitNode;  // tagged, never dereferenced as such
-
 struct CritbitRecord {
   CritbitNode* root = nullptr;
   std::uint64_t count = 0;
@@ -40,17 +36,26 @@ enum class CritbitWalk {
   RanToTheEnd = 1,
 };
 
-// Gets a leaf's zero-terminated key and the value, answers 1 to go on and 0 to stop. Must not
-// change the tree.
-using CritbitHandler = int (*)(std::string_view key, void* value, void* argument);
+// Gets a leaf's zero-terminated key, answers 1 to go on and 0 to stop. Must not change the tree.
+using CritbitHandler = int (*)(const char* key, void* argument);
 
+// `value` may be null.
 bool critbit_contains(const CritbitRecord& tree, std::string_view key, void** value);
 CritbitInsertion critbit_insert(CritbitRecord& tree, std::string_view key, void* value,
                                 bool replace);
 bool critbit_delete(CritbitRecord& tree, std::string_view key);
 void critbit_clear(CritbitRecord& tree);
-// Every key that begins with the prefix, ascending.
+// Every key that begins with the prefix, ascending; none for a prefix without data.
 CritbitWalk critbit_allprefixed(const CritbitRecord& tree, std::string_view prefix,
                                 CritbitHandler handler, void* argument);
+
+// The steps of the above.
+
+// Null when memory is out. Until it is in a tree it belongs to the caller.
+CritbitLeaf* new_external_node(std::string_view key, void* value);
+// Frees the subtree, releasing the leaves' values.
+void traverse(const CritbitRecord& tree, CritbitNode* node);
+// Calls the handler on every leaf below the node, child 0 before child 1.
+CritbitWalk allprefixed_traverse(CritbitNode* node, CritbitHandler handler, void* argument);
 
 }  // namespace zelkord
