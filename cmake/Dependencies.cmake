@@ -29,6 +29,7 @@ zk_find(OpenSSL libssl-dev)
 zk_find(ZLIB zlib1g-dev)
 zk_find(GTest libgmock-dev CONFIG)
 zk_find(benchmark libbenchmark-dev CONFIG)
+zk_find(absl libabsl-dev CONFIG)
 zk_find_module(systemd libsystemd libsystemd-dev)
 zk_find_module(plist libplist-2.0 libplist-dev)
 
