@@ -15,11 +15,8 @@ double scaleOf(const URLRequest& request) {
   return scale;
 }
 
-std::optional<SteadyTime> expiryOf(const json::object& resultSet, SteadyTime now) {
-  const auto maxAge = numberIn(resultSet, "max_age");
-  if (!maxAge || *maxAge == 0) return std::nullopt;
-  constexpr double kLongest = 1e9;  // seconds; keeps the sum in range
-  return now + durationOfSeconds(std::clamp(*maxAge, -kLongest, kLongest));
+std::uint32_t lengthOf(const std::string& text) {
+  return static_cast<std::uint32_t>(utf16Length(text));
 }
 
 }  // namespace
@@ -28,13 +25,21 @@ CachedResultSet::CachedResultSet(std::string_view input, const URLRequest& reque
                                  const json::object& resultSet, std::string uuid, Data data,
                                  SteadyTime now)
     : completionScore_(static_cast<float>(numberIn(resultSet, "completion_score").value_or(0))),
-      input_(lowercased(input)),
-      inputLength_(utf16Length(input_)),
-      query_(lowercased(stringIn(resultSet, "query").value_or(""))),
-      queryLength_(utf16Length(query_)),
-      expireTime_(expiryOf(resultSet, now)),
-      uuid_(std::move(uuid)),
+      expireTime_(_expiryOf(resultSet, now)),
       uiScale_(scaleOf(request)),
-      data_(std::move(data)) {}
+      input_(lowercased(input)),
+      query_(lowercased(stringIn(resultSet, "query").value_or(""))),
+      uuid_(std::move(uuid)),
+      data_(std::move(data)) {
+  inputLength_ = lengthOf(input_);
+  queryLength_ = lengthOf(query_);
+}
+
+SteadyTime CachedResultSet::_expiryOf(const json::object& resultSet, SteadyTime now) {
+  const auto maxAge = numberIn(resultSet, "max_age");
+  if (!maxAge || *maxAge == 0) return kNever;
+  constexpr double kLongest = 1e9;  // seconds; keeps the sum in range
+  return now + durationOfSeconds(std::clamp(*maxAge, -kLongest, kLongest));
+}
 
 }  // namespace zelkord

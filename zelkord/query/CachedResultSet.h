@@ -3,7 +3,6 @@
 #include <boost/smart_ptr/intrusive_ptr.hpp>
 #include <boost/smart_ptr/intrusive_ref_counter.hpp>
 #include <cstdint>
-#include <optional>
 #include <string>
 
 #include "base/Data.h"
@@ -28,25 +27,30 @@ class CachedResultSet final : public boost::intrusive_ref_counter<CachedResultSe
   float completionScore() const { return completionScore_; }  // 0 when the service gave none
   const std::string& input() const { return input_; }         // lower-cased
   std::size_t inputLength() const { return inputLength_; }    // UTF-16 units
-  const std::string& query() const {
-    return query_;
-  }  // completed query, lower-cased; the cache's key
-  std::size_t queryLength() const { return queryLength_; }              // UTF-16 units
-  std::optional<SteadyTime> expireTime() const { return expireTime_; }  // none: never
+  // The completed query, lower-cased; the cache's key.
+  const std::string& query() const { return query_; }
+  std::size_t queryLength() const { return queryLength_; }  // UTF-16 units
+  bool hasExpired(SteadyTime now) const { return expireTime_ <= now; }
   const std::string& uuid() const { return uuid_; }
   double uiScale() const { return uiScale_; }  // of the request; 0 when it named none
   const Data& data() const { return data_; }
   std::uint64_t cost() const { return data_.size(); }  // bytes
 
  private:
+  static constexpr SteadyTime kNever = SteadyTime::max();
+
+  static SteadyTime _expiryOf(const json::object& resultSet, SteadyTime now);
+
+  // What a look-up reads of every entry that begins with its text, side by side.
   float completionScore_;
+  std::uint32_t inputLength_;
+  std::uint32_t queryLength_;
+  SteadyTime expireTime_;
+  double uiScale_;
+
   std::string input_;
-  std::size_t inputLength_;
   std::string query_;
-  std::size_t queryLength_;
-  std::optional<SteadyTime> expireTime_;
   std::string uuid_;
-  double uiScale_ = 0;
   Data data_;
 };
 

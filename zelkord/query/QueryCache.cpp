@@ -1,5 +1,7 @@
 #include "zelkord/query/QueryCache.h"
 
+#include <limits>
+
 #include "base/Text.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/network/NotificationNames.h"
@@ -21,22 +23,15 @@ constexpr std::string_view kClearingNotifications[] = {kZLKUserGUIDChangeNotific
 // The shortest completions among the entries of one walk, in its order.
 class ShortestCompletions {
  public:
-  ShortestCompletions(std::size_t textLength, double scale, SteadyTime now)
-      : textLength_(textLength), scale_(scale), now_(now) {}
-
-  // Whether the entry has expired.
-  bool isExpired(const CachedResultSet& entry) const {
-    return entry.expireTime() && *entry.expireTime() <= now_;
-  }
+  ShortestCompletions(std::size_t textLength, double scale)
+      : textLength_(textLength), scale_(scale) {}
 
   void consider(const CachedResultSet& entry) {
+    if (entry.queryLength() > shortest_) return;
     if (scale_ > 0 && scale_ != entry.uiScale()) return;
     if (textLength_ < entry.inputLength()) return;
-    if (!entries_.empty()) {
-      const auto shortest = entries_.front()->queryLength();
-      if (entry.queryLength() > shortest) return;
-      if (entry.queryLength() < shortest) entries_.clear();
-    }
+    if (entry.queryLength() < shortest_) entries_.clear();
+    shortest_ = entry.queryLength();
     entries_.push_back(&entry);
   }
 
@@ -45,7 +40,7 @@ class ShortestCompletions {
  private:
   const std::size_t textLength_;
   const double scale_;
-  const SteadyTime now_;
+  std::size_t shortest_ = std::numeric_limits<std::size_t>::max();
   std::vector<const CachedResultSet*> entries_;
 };
 
@@ -65,7 +60,7 @@ void QueryCache::start() {
   for (const auto name : kClearingNotifications) {
     observations_.push_back(assembly_.notificationCenter().observe(
         std::string(name), [weak = weak_from_this()](const Notification&) {
-          if (const auto self = weak.lock()) self->removeAllObjects();
+          if (const auto self = weak.lock()) self->_cacheClearNotification();
         }));
   }
 }
@@ -129,10 +124,11 @@ CachedResultSet::Pointer QueryCache::getRequest(const ZLKRequest& request) {
 
 CachedResultSet::Pointer QueryCache::_find(const std::string& text, double scale) {
   queue_->assertCurrent();
-  ShortestCompletions shortest(utf16Length(text), scale, assembly_.platform().clock.now());
+  const auto now = assembly_.platform().clock.now();
+  ShortestCompletions shortest(utf16Length(text), scale);
   std::vector<CachedResultSet::Pointer> expired;
   tree_.keysMatchingPrefix(text, [&](std::string_view, const CachedResultSet& entry, bool&) {
-    if (shortest.isExpired(entry)) {
+    if (entry.hasExpired(now)) {
       expired.emplace_back(&entry);
     } else {
       shortest.consider(entry);
@@ -148,6 +144,8 @@ CachedResultSet::Pointer QueryCache::_find(const std::string& text, double scale
   }
   return CachedResultSet::Pointer(best);
 }
+
+void QueryCache::_cacheClearNotification() { removeAllObjects(); }
 
 void QueryCache::removeAllObjects() {
   queue_->async([weak = weak_from_this()] {

@@ -48,6 +48,7 @@ class QueryCache final : public std::enable_shared_from_this<QueryCache> {
   std::size_t count();
 
  private:
+  void _cacheClearNotification();
   bool _accepts(const CachedResultSet::Pointer& resultSet) const;
   void _store(const CachedResultSet::Pointer& resultSet);
   CachedResultSet::Pointer _find(const std::string& text, double scale);
