@@ -43,11 +43,19 @@ LoadedImage imageOf(const ImageDescriptor& wanted, const Images& images) {
   return {wanted.url.empty() ? wanted.id : wanted.url, std::nullopt, {}};
 }
 
+// A call may take as long as the images.
+ClientOptions patientOptions(const Options& options) {
+  constexpr Duration kForTheAnswer = 10s;
+  auto result = clientOptions(options);
+  result.timeout = std::max(result.timeout, options.deadline + kForTheAnswer);
+  return result;
+}
+
 // Loads, saves and shows.
 class ImagesRun {
  public:
   explicit ImagesRun(const Invocation& invocation)
-      : invocation_(invocation), client_(clientOptions(invocation.options)) {}
+      : invocation_(invocation), client_(patientOptions(invocation.options)) {}
 
   int run() {
     auto wanted = namedImages(invocation_.options);

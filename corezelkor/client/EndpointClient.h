@@ -27,7 +27,8 @@ class EndpointClient {
     return request(std::make_shared<const Request>(std::move(query)));
   }
 
-  // Bytes by URL or identifier, of the images that were there within `timeout`; at most 1,000.
+  // Bytes by URL or identifier, of the images that were there within `timeout`; at most 1,000. The
+  // call as a whole still ends with ClientOptions::timeout.
   ZLKFuture<ClientResult<std::map<std::string, Data>>> loadImages(
       std::vector<ImageDescriptor> images, Duration timeout) const;
 
