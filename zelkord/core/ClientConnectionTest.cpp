@@ -139,7 +139,9 @@ TEST_F(ClientConnectionTest, ServesEveryKindWhateverItsNumber) {
       EXPECT_TRUE(isNothing(*answer, 2));
       const auto& reply = *answer->values[1].get<ipc::Dictionary>();
       ASSERT_EQ(reply.empty(), !isSent);
-      if (isSent) EXPECT_EQ(*reply.at("scale").get<double>(), 3);
+      if (isSent) {
+        EXPECT_EQ(*reply.at("scale").get<double>(), 3);
+      }
       EXPECT_EQ(bed.fakes.trace.take(), trace);
     }
   }
