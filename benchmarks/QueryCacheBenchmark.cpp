@@ -1,7 +1,7 @@
 // What looking up the answer to a keystroke costs when it is there: from the request to the chosen
 // entry, in a cache that is as full of small entries as it gets.
 //
-// Floor: an idle `sync`, with which every look-up begins.
+// An idle `sync`, with which every look-up begins, is BM_IdleSync.
 
 #include <benchmark/benchmark.h>
 

@@ -22,6 +22,13 @@ FLOORS = {
     "BM_SearchRequest": "BM_CopyRequestFloor",
 }
 
+# What a figure is to be at most, in microseconds.
+LIMITS = {
+    "BM_CacheHitOfOneLetter": 5,
+    "BM_CacheHitOfTheCommonestLetter": 5,
+    "BM_CacheHitAmongAllEntries": 5,
+}
+
 
 def microseconds(row):
     scale = {"ns": 1e-3, "us": 1.0, "ms": 1e3, "s": 1e6}[row["time_unit"]]
@@ -39,7 +46,9 @@ def main():
             continue
         ours, floor = microseconds(row), by_base.get(FLOORS.get(base))
         bare, ratio = (f"{floor:.4g} us", f"{ours / floor:.2f}") if floor else ("-", "-")
-        print(row["name"], f"{ours:.4g} us", bare, ratio, "-", "-", sep="\t")
+        limit = LIMITS.get(base)
+        target, verdict = (f"<= {limit} us", "ok" if ours <= limit else "over") if limit else ("-", "-")
+        print(row["name"], f"{ours:.4g} us", bare, ratio, target, verdict, sep="\t")
 
 
 main()

@@ -7,15 +7,20 @@
 
 namespace zelkord::bench {
 
-BusClient BusClient::ofPeer(const std::string& address) { return {connectToPeer(address), ""}; }
-
-BusClient BusClient::onBus(const std::string& address, const std::string& service) {
-  return {connectToBus(address), service};
+BusClient BusClient::ofPeer(const std::string& address, const std::string& identifier) {
+  return {connectToPeer(address), "", identifier};
 }
 
-BusClient::BusClient(zelkor::BusPointer bus, std::string service)
+BusClient BusClient::onBus(const std::string& address, const std::string& service) {
+  return {connectToBus(address), service, "com.quenta.benchmark"};
+}
+
+BusClient::BusClient(zelkor::BusPointer bus, std::string service, const std::string& identifier)
     : bus_(std::move(bus)), service_(std::move(service)) {
-  _call(configureCall(bus_.get(), service_, "com.quenta.benchmark").get());
+  const auto reply = _call(configureCall(bus_.get(), service_, identifier).get());
+  const char* endpoint = "";
+  check(sd_bus_message_read(reply.get(), "s", &endpoint), "reading the endpoint's address");
+  endpoint_ = endpoint;
 }
 
 SearchAnswer BusClient::search(Search query) {

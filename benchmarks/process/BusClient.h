@@ -12,8 +12,12 @@ namespace zelkord::bench {
 class BusClient {
  public:
   // Connects and configures itself.
-  static BusClient ofPeer(const std::string& address);
+  static BusClient ofPeer(const std::string& address,
+                          const std::string& identifier = "com.quenta.benchmark");
   static BusClient onBus(const std::string& address, const std::string& service);
+
+  // Of the second connection, as the configuration told it.
+  const std::string& endpointAddress() const { return endpoint_; }
 
   // The query gets the next number.
   SearchAnswer search(Search query);
@@ -22,12 +26,13 @@ class BusClient {
   SearchAnswer firstSearch(const Search& query);
 
  private:
-  BusClient(zelkor::BusPointer bus, std::string service);
+  BusClient(zelkor::BusPointer bus, std::string service, const std::string& identifier);
 
   zelkor::MessagePointer _call(sd_bus_message* call);
 
   zelkor::BusPointer bus_;
   const std::string service_;
+  std::string endpoint_;
   std::int64_t queryId_ = 0;
 };
 

@@ -14,6 +14,12 @@ namespace zelkord::bench {
 
 // A search that is too short to be sent, through both doors.
 void measureRoundTrips(const Plan& plan, const SandboxProcess& sandbox, Report& report);
+// A search that the daemon's query cache answers.
+void measureCacheHits(const Plan& plan, const SandboxProcess& sandbox, Report& report);
+// The same with more and more clients whose caches are full, and the memory that takes.
+void measureFullCaches(const Plan& plan, const SandboxProcess& sandbox, Report& report);
+// Images from the service, and again from the daemon's cache.
+void measureImages(const Plan& plan, const SandboxProcess& sandbox, Report& report);
 // A search that goes to the service, by the size of the answer.
 void measureNetworkSearches(const Plan& plan, const SandboxProcess& sandbox, Report& report);
 // From the start of the process to its name on the bus.

@@ -30,7 +30,7 @@ Plan parsePlan(const std::vector<std::string>& arguments) {
     } else {
       throw std::runtime_error(
           "usage: zelkord_process_bench [--quick] [--idle SECONDS]\n"
-          "         [--only roundtrip|network|start|idle|burst|typing]");
+          "         [--only roundtrip|hit|states|images|network|start|idle|burst|typing]");
     }
   }
   return plan;

@@ -83,11 +83,12 @@ std::unique_ptr<ChildProcess> ProcessBed::_startDaemon() const {
       environment_, folder_.path() / "output");
 }
 
-std::unique_ptr<ChildProcess> ProcessBed::_startFloor() const {
+std::unique_ptr<ChildProcess> ProcessBed::_startFloor(std::size_t bodySize) const {
   std::filesystem::remove(_floorSocket());
   return std::make_unique<ChildProcess>(
-      std::vector<std::string>{ZK_FLOOR_BINARY, _floorSocket(), kFloorName}, environment_,
-      folder_.path() / "floor.output");
+      std::vector<std::string>{ZK_FLOOR_BINARY, _floorSocket(), kFloorName,
+                               std::to_string(bodySize)},
+      environment_, folder_.path() / "floor.output");
 }
 
 ChildProcess& ProcessBed::daemon() {
@@ -102,9 +103,9 @@ ChildProcess& ProcessBed::daemon() {
   return *daemon_;
 }
 
-ChildProcess& ProcessBed::floor() {
+ChildProcess& ProcessBed::floor(std::size_t bodySize) {
   if (floor_) return *floor_;
-  floor_ = _startFloor();
+  floor_ = _startFloor(bodySize);
   waitFor("the floor", kPatience, [this] { return accepts(floorAddress()); });
   return *floor_;
 }
@@ -120,7 +121,7 @@ double ProcessBed::timeDaemonStart() {
 double ProcessBed::timeFloorStart() {
   NameWatch watch(busAddress(), kFloorName);
   const auto start = Clock::now();
-  const auto process = _startFloor();
+  const auto process = _startFloor(0);
   watch.waitForOwner();
   return microsecondsSince(start);
 }

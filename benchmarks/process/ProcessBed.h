@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstddef>
 #include <filesystem>
 #include <memory>
 #include <string>
@@ -27,7 +28,8 @@ class ProcessBed {
 
   // Both start if need be and return when the socket and the name on the bus are there.
   ChildProcess& daemon();
-  ChildProcess& floor();
+  // The floor's answers have a body of that size, the one it was started with.
+  ChildProcess& floor(std::size_t bodySize = 0);
   // Microseconds from the start of a new process to the name, which then is stopped.
   double timeDaemonStart();
   double timeFloorStart();
@@ -42,7 +44,7 @@ class ProcessBed {
   void _writeSettings(const SandboxProcess& sandbox) const;
   void _startBus();
   std::unique_ptr<ChildProcess> _startDaemon() const;
-  std::unique_ptr<ChildProcess> _startFloor() const;
+  std::unique_ptr<ChildProcess> _startFloor(std::size_t bodySize) const;
   void _showLog() const;
 
   const ScratchFolder folder_;

@@ -20,6 +20,9 @@ void measureAll(const Plan& plan) {
   if (plan.includes("idle")) idleness = measureIdleness(plan, sandbox);
   if (plan.includes("start")) measureStart(plan, sandbox, report);
   if (plan.includes("roundtrip")) measureRoundTrips(plan, sandbox, report);
+  if (plan.includes("hit")) measureCacheHits(plan, sandbox, report);
+  if (plan.includes("states")) measureFullCaches(plan, sandbox, report);
+  if (plan.includes("images")) measureImages(plan, sandbox, report);
   if (plan.includes("network")) measureNetworkSearches(plan, sandbox, report);
   if (plan.includes("burst")) measureBurst(plan, sandbox, report);
   if (plan.includes("typing")) measureTyping(plan, sandbox, report);

@@ -9,8 +9,8 @@
 
 namespace zelkord::bench {
 
-FloorService::FloorService(const std::string& socketPath, sd_bus* bus)
-    : epoll_(::epoll_create1(EPOLL_CLOEXEC)) {
+FloorService::FloorService(const std::string& socketPath, sd_bus* bus, std::size_t bodySize)
+    : epoll_(::epoll_create1(EPOLL_CLOEXEC)), body_(bodySize, 'p') {
   _listen(socketPath);
   _watch(listener_);
   _watch(worker_.wakeUp());
@@ -93,7 +93,7 @@ void FloorService::_sendReplies() {
     if (std::string_view(sd_bus_message_get_member(call)) == "Configure") {
       sd_bus_message_append(reply, "s", "unix:path=/nowhere");
     } else {
-      sd_bus_message_append(reply, "xa{sv}a{sv}", std::int64_t{1}, 0, 0);
+      _appendAnswer(reply);
     }
     auto* bus = sd_bus_message_get_bus(call);
     sd_bus_send(bus, reply, nullptr);
@@ -101,6 +101,22 @@ void FloorService::_sendReplies() {
     _process(bus);
     sd_bus_message_unref(call);
   }
+}
+
+void FloorService::_appendAnswer(sd_bus_message* reply) const {
+  if (body_.empty()) {
+    sd_bus_message_append(reply, "xa{sv}a{sv}", std::int64_t{1}, 0, 0);
+    return;
+  }
+  sd_bus_message_append(reply, "x", std::int64_t{1});
+  sd_bus_message_open_container(reply, 'a', "{sv}");
+  sd_bus_message_append(reply, "{sv}", "scale", "d", 1.0);
+  sd_bus_message_open_container(reply, 'e', "sv");
+  sd_bus_message_append(reply, "s", "data");
+  sd_bus_message_open_container(reply, 'v', "ay");
+  sd_bus_message_append_array(reply, 'y', body_.data(), body_.size());
+  for (int i = 0; i < 3; ++i) sd_bus_message_close_container(reply);
+  sd_bus_message_append(reply, "a{sv}", 0);
 }
 
 void FloorService::_process(sd_bus* bus) {

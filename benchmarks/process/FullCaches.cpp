@@ -1,0 +1,91 @@
+#include <fmt/format.h>
+
+#include <array>
+#include <stdexcept>
+#include <vector>
+
+#include "benchmarks/process/BusClient.h"
+#include "benchmarks/process/Measurements.h"
+#include "benchmarks/process/ProcessBed.h"
+#include "benchmarks/process/ProcessFacts.h"
+#include "benchmarks/process/Samples.h"
+#include "benchmarks/process/Waiting.h"
+
+namespace zelkord::bench {
+namespace {
+
+constexpr std::array<std::size_t, 3> kStates = {1, 10, 50};
+constexpr int kHits = 3'000;
+
+// An answer's size, and how many such fit: a cache takes less than 2 MiB, 1,024 bytes more for
+// each.
+constexpr std::size_t kBody = 20'480;
+constexpr std::size_t kFits = 2'097'151 / (kBody + 1'024);
+
+std::string textOf(std::size_t number) {
+  return {static_cast<char>('a' + number % 26), static_cast<char>('a' + number / 26)};
+}
+
+// One completion of the text in an answer of that size.
+std::string answerTo(const std::string& text) {
+  const auto head = R"([{"status": "OK", "query": ")" + text + R"(ward", "pad": ")";
+  const std::string tail = "\"}]";
+  return head + std::string(kBody - head.size() - tail.size(), 'p') + tail;
+}
+
+std::string quoted(const std::string& text) {
+  std::string quoted;
+  for (const char c : text) {
+    if (c == '"') quoted += '\\';
+    quoted += c;
+  }
+  return '"' + quoted + '"';
+}
+
+void fill(std::vector<BusClient>& clients, const SandboxProcess& sandbox) {
+  for (std::size_t i = 0; i < kFits; ++i) {
+    const auto text = textOf(i);
+    sandbox.control("misbehave",
+                    R"({"path": "/search", "count": 0, "body": )" + quoted(answerTo(text)) + "}");
+    for (auto& client : clients) client.firstSearch({.queryString = text});
+    sandbox.control("behave");
+  }
+}
+
+// From call to answer, in microseconds, of searches that all clients ask in turn.
+Samples hits(std::vector<BusClient>& clients) {
+  Samples samples;
+  for (std::size_t i = 0; i < kHits; ++i) {
+    auto& client = clients[i % clients.size()];
+    const Search search{.queryString = textOf(i / clients.size() % kFits)};
+    const auto start = Clock::now();
+    const auto answer = client.search(search);
+    samples.add(microsecondsSince(start));
+    if (answer.dataSize != kBody) throw std::runtime_error("an answer that is not the cache's");
+  }
+  return samples;
+}
+
+void measure(std::size_t states, const SandboxProcess& sandbox, Report& report) {
+  ProcessBed bed(sandbox);
+  const auto process = bed.daemon().pid();
+  std::vector<BusClient> clients;
+  for (std::size_t i = 0; i < states; ++i) {
+    clients.push_back(
+        BusClient::ofPeer(bed.daemonAddress(), "com.quenta.benchmark" + std::to_string(i)));
+  }
+  fill(clients, sandbox);
+  const auto samples = hits(clients);
+  const auto name = fmt::format("{} client states with full caches", states);
+  report.plain(name + ", hit p50", samples.median(), "us");
+  report.plain(name + ", hit p99", samples.percentile(0.99), "us");
+  report.plain(name + ", resident memory", residentMiBOf(process), "MiB");
+}
+
+}  // namespace
+
+void measureFullCaches(const Plan&, const SandboxProcess& sandbox, Report& report) {
+  for (const auto states : kStates) measure(states, sandbox, report);
+}
+
+}  // namespace zelkord::bench
