@@ -91,6 +91,16 @@ TEST_F(QueryCacheTest, DropsAnEntryOnceItIsTooOld) {
   EXPECT_EQ(cache_->count(), 0u);
 }
 
+TEST_F(QueryCacheTest, StaysNonEmptyWhenTheLastEntryExpires) {
+  store({"a", "abc", 0, 10});
+  bed_.fakes.timeline.advance(10s);
+  EXPECT_EQ(found("a"), "none");
+  EXPECT_EQ(bed_.fakes.transactions.openNames().size(), 1u);
+  store({"a", "abc"});
+  EXPECT_EQ(bed_.fakes.transactions.openNames().size(), 1u);
+  EXPECT_EQ(bed_.fakes.memoryPressure.sourceCount(), 1u);
+}
+
 TEST_F(QueryCacheTest, KeepsWithinItsBudget) {
   constexpr std::size_t kLargest = 2'097'152 - 1'024 - 1;
   store({"a", "abc"}, std::string(kLargest + 1, 'x'));
