@@ -64,7 +64,8 @@ ipc::SdBusOptions busOptions(const LinuxPlatformOptions& options, const LinuxFil
 
 CurlURLSessions::Services urlServices(const std::shared_ptr<LinuxSettings>& settings,
                                       std::shared_ptr<const ProxyConfigurationSource> proxies,
-                                      const MeteredNetwork& network) {
+                                      const MeteredNetwork& network,
+                                      CurlURLSessions::Services::CacheHost cache) {
   CurlURLSessions::Services services;
   services.isMetered = [&network] { return network.isMetered(); };
   services.maximumResponseSize = [settings] {
@@ -72,6 +73,7 @@ CurlURLSessions::Services urlServices(const std::shared_ptr<LinuxSettings>& sett
   };
   services.proxies = std::move(proxies);
   services.rootsFile = CurlURLSessions::rootsFileOfEnvironment();
+  services.cache.emplace(std::move(cache));
   return services;
 }
 
@@ -138,7 +140,8 @@ struct LinuxPlatform::Services {
         settings(std::make_shared<LinuxSettings>(settingsOptions(files, configuration), files,
                                                  queues, log)),
         interprocess(queues, log, busOptions(options, files)),
-        urlSessions(queues, urlServices(settings, networkProxy, meteredNetwork)) {
+        urlSessions(queues, urlServices(settings, networkProxy, meteredNetwork,
+                                        {clock, log, files.directories().state + "/urlcache"})) {
     log.showPrivateDataWhen([weak = std::weak_ptr(settings)] {
       const auto alive = weak.lock();
       return alive && boolSetting(*alive, "ZLKLogPrivateData");

@@ -10,9 +10,9 @@
 namespace zelkord {
 
 CurlURLSession::CurlURLSession(Services services, CurlSettings settings,
-                               std::unique_ptr<SerialQueue> queue)
+                               std::shared_ptr<DelegateQueue> delegateQueue)
     : services_(std::move(services)),
-      delegateQueue_(std::make_shared<DelegateQueue>(std::move(queue))),
+      delegateQueue_(std::move(delegateQueue)),
       connections_(std::make_shared<CurlConnections>(*services_.loop, std::move(settings))) {}
 
 CurlURLSession::~CurlURLSession() {

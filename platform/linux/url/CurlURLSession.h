@@ -17,7 +17,7 @@ namespace zelkord {
 // cache is another URLSession in front of this one.
 //
 // Threading: any thread. Ownership: shares the loop with the other sessions; its end drops the
-// tasks under way, whose completions then never run.
+// tasks under way, whose completions then never run, and closes the delegate queue.
 class CurlURLSession final : public URLSession,
                              public std::enable_shared_from_this<CurlURLSession> {
  public:
@@ -27,7 +27,8 @@ class CurlURLSession final : public URLSession,
     std::shared_ptr<const ProxyConfigurationSource> proxies;  // may be null
   };
 
-  CurlURLSession(Services services, CurlSettings settings, std::unique_ptr<SerialQueue> queue);
+  CurlURLSession(Services services, CurlSettings settings,
+                 std::shared_ptr<DelegateQueue> delegateQueue);
   ~CurlURLSession() override;
 
   // URLSession

@@ -8,6 +8,7 @@
 
 #include "base/Check.h"
 #include "platform/linux/url/CurlURLSession.h"
+#include "platform/linux/url_cache/CachingURLSession.h"
 
 namespace zelkord {
 namespace {
@@ -35,9 +36,26 @@ std::shared_ptr<URLSession> CurlURLSessions::make(const URLSessionConfiguration&
                         .tlsSessionTickets = configuration.tlsSessionTickets,
                         .meteredIdleTime = configuration.cellularPurgeTimeout,
                         .isMetered = services_.isMetered};
-  return std::make_shared<CurlURLSession>(
+  auto delegateQueue =
+      std::make_shared<DelegateQueue>(queues_.makeSerialQueue("url." + configuration.name));
+  auto session = std::make_shared<CurlURLSession>(
       CurlURLSession::Services{loop_, services_.maximumResponseSize, services_.proxies},
-      std::move(settings), queues_.makeSerialQueue("url." + configuration.name));
+      std::move(settings), delegateQueue);
+  if (!configuration.cache || !services_.cache) return session;
+  return std::make_shared<CachingURLSession>(std::move(session), std::move(delegateQueue),
+                                             _cache(*configuration.cache));
+}
+
+std::shared_ptr<LinuxURLCache> CurlURLSessions::_cache(
+    const URLSessionConfiguration::Cache& limits) {
+  const MutexLock lock(mutex_);
+  auto cache = cache_.lock();
+  if (cache) return cache;
+  const auto& host = *services_.cache;
+  cache = std::make_shared<LinuxURLCache>(
+      LinuxURLCache::Host{queues_, host.clock, host.log, host.folder}, limits);
+  cache_ = cache;
+  return cache;
 }
 
 std::string CurlURLSessions::rootsFileOfEnvironment() {

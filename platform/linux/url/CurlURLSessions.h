@@ -3,8 +3,12 @@
 #include <cstdint>
 #include <functional>
 #include <memory>
+#include <optional>
 #include <string>
 
+#include "base/Mutex.h"
+#include "platform/api/Clock.h"
+#include "platform/api/Log.h"
 #include "platform/api/URLSession.h"
 #include "platform/api/WorkQueues.h"
 #include "platform/linux/url/IOLoop.h"
@@ -12,11 +16,14 @@
 
 namespace zelkord {
 
+class LinuxURLCache;
+
 // URL loading with libcurl: HTTP/1.1 and HTTP/2, all sessions on one I/O thread that starts with
 // the first task. A session's connections are its own and stay open for the next request.
 //
 // Each request is sent with what it says and nothing more than Host, Accept, Accept-Encoding: gzip
-// and the length of its body. Neither cookies nor the environment's proxies are used.
+// and the length of its body, save what the URL cache asks. Neither cookies nor the environment's
+// proxies are used.
 //
 // Threading: any thread.
 // Ownership: `queues` outlives it and its sessions. Its end ends the tasks under way with -999, and
@@ -32,6 +39,14 @@ class CurlURLSessions final : public URLSessions {
     std::shared_ptr<const ProxyConfigurationSource> proxies;  // null: there is no such service
     // PEM file with the trusted roots; empty: the system's.
     std::string rootsFile;
+    // What sessions with a URL cache need for it; none: they have none. The clock and the log
+    // outlive the sessions, the folder is the cache's own.
+    struct CacheHost {
+      const Clock& clock;
+      LogSink& log;
+      std::string folder;
+    };
+    std::optional<CacheHost> cache;
   };
 
   CurlURLSessions(WorkQueues& queues, Services services);
@@ -46,11 +61,17 @@ class CurlURLSessions final : public URLSessions {
   static std::string rootsFileOfEnvironment();
 
  private:
+  // The same for all sessions: two caches in one folder would be in each other's way.
+  std::shared_ptr<LinuxURLCache> _cache(const URLSessionConfiguration::Cache& limits);
+
   // Fixed after construction.
   WorkQueues& queues_;
   const Services services_;
   const bool kernelHasFastOpen_;
   const std::shared_ptr<IOLoop> loop_ = std::make_shared<IOLoop>();
+
+  Mutex mutex_;
+  std::weak_ptr<LinuxURLCache> cache_ ZK_GUARDED_BY(mutex_);
 };
 
 }  // namespace zelkord
