@@ -17,7 +17,7 @@ class BusDoor;
 //
 // States: Checking (the bus driver is asked who it is; calls wait), Known, Refused (another user:
 // every call is denied). Within Known there is at most one client connection, begun by a call of
-// the connection interface. Threading: the loop's thread. Ownership: the bus door.
+// the connection interface. Threading: the loop. Ownership: the bus door.
 class BusCaller final : public Caller {
  public:
   BusCaller(BusDoor& door, IpcContext& context, sd_bus* bus, std::string name);

@@ -28,7 +28,7 @@ BusName acquireBusName(const std::string& address, const std::string& name);
 // The door on the session bus.
 //
 // States: serving; closed, by us or because the bus went away: its connections have then ended.
-// Threading: the loop's thread, except `port`. Ownership: the transport; `close` first, then
+// Threading: the loop, except `port`. Ownership: the transport; `close` first, then
 // destroy.
 class BusDoor final {
  public:

@@ -11,7 +11,7 @@ namespace zelkord::ipc {
 // What leaves for one bus client. A connection that has ended leaves its outlet behind: late
 // answers stop there, also when the same client has begun another connection.
 //
-// Threading: the loop's thread. Ownership: its bus caller.
+// Threading: the loop. Ownership: its bus caller.
 class BusOutlet final : public Outlet {
  public:
   using Send = std::function<void(MessagePtr message, std::size_t bytes)>;

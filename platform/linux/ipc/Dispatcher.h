@@ -14,7 +14,7 @@
 namespace zelkord::ipc {
 
 // Who made a call, as its door knows it.
-// Threading: the loop's thread.
+// Threading: the loop.
 class Caller {
  public:
   virtual ~Caller() = default;
@@ -31,7 +31,7 @@ class Caller {
 // Takes a method call apart: answers what every D-Bus peer is asked, checks and decodes the rest,
 // hands it on.
 //
-// Threading: the loop's thread; never blocks.
+// Threading: the loop; never blocks.
 // Errors: everything wrong with a call is answered; a message that is none ends its caller's
 // connection.
 class Dispatcher {

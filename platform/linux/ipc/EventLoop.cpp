@@ -2,7 +2,6 @@
 
 #include <pthread.h>
 #include <signal.h>
-#include <sys/epoll.h>
 
 #include <algorithm>
 #include <array>
@@ -14,8 +13,6 @@
 
 namespace zelkord::ipc {
 namespace {
-
-constexpr int kEventsAtOnce = 64;
 
 // A thread that no signal is delivered to.
 template <typename Function>
@@ -31,18 +28,16 @@ std::thread makeQuietThread(Function function) {
 
 }  // namespace
 
-EventLoop::EventLoop() : epoll_(::epoll_create1(EPOLL_CLOEXEC)) {
+EventLoop::EventLoop()
+    : epoll_(::epoll_create1(EPOLL_CLOEXEC)),
+      inbox_(std::make_shared<LoopInbox>(static_cast<LoopHost&>(*this))) {
   ZK_CHECK(epoll_, "no epoll for the IPC thread");
-  epoll_event event{.events = EPOLLIN, .data = {.u64 = 0}};
+  epoll_event event{.events = EPOLLIN | EPOLLET, .data = {.u64 = 0}};
   ::epoll_ctl(epoll_.get(), EPOLL_CTL_ADD, inbox_->descriptor(), &event);
-  // The thread waits for `thread_` to be assigned before it looks at itself.
-  std::promise<void> assigned;
-  thread_ = makeQuietThread([this, ready = assigned.get_future().share()] {
-    ready.wait();
+  thread_ = makeQuietThread([this] {
     pthread_setname_np(pthread_self(), "zelkord-ipc");
     _run();
   });
-  assigned.set_value();
 }
 
 EventLoop::~EventLoop() { stop(); }
@@ -104,29 +99,53 @@ Subscription EventLoop::after(Duration delay, Task task) {
 void EventLoop::soon(Task task) { soon_.push_back(std::move(task)); }
 
 void EventLoop::_run() {
+  inbox_->begin();
   std::array<epoll_event, kEventsAtOnce> events;
   while (!stopping_) {
-    const int count =
-        ::epoll_wait(epoll_.get(), events.data(), kEventsAtOnce, _millisecondsToWait());
-    for (int i = 0; i < count; ++i) {
-      const auto id = events[i].data.u64;
-      if (id == 0) {
-        _runAll(inbox_->take());
-      } else if (const auto found = watched_.find(id); found != watched_.end()) {
-        const auto watched = found->second;  // may be unwatched by its own call
-        watched->ready(events[i].events);
-      }
-    }
+    const int count = _sleep(events);
+    for (int i = 0; i < count; ++i) _dispatch(events[static_cast<std::size_t>(i)]);
+    _runAll(inbox_->take());
     _runDueTimers();
-    _runAll(std::exchange(soon_, {}));
+    _runSoon();
   }
   inbox_->close();
   timers_.clear();
   watched_.clear();
   soon_.clear();
+  inbox_->end();
 }
 
-int EventLoop::_millisecondsToWait() const {
+// Waits for events, or only looks for them when there is something else to do.
+int EventLoop::_sleep(std::array<epoll_event, kEventsAtOnce>& events) {
+  const int milliseconds = _millisecondsToWait();
+  const bool sleeps = milliseconds != 0 && inbox_->beginSleep();
+  const int count =
+      ::epoll_wait(epoll_.get(), events.data(), kEventsAtOnce, sleeps ? milliseconds : 0);
+  if (sleeps) inbox_->endSleep();
+  return count;
+}
+
+void EventLoop::_dispatch(const epoll_event& event) {
+  const auto found = watched_.find(event.data.u64);
+  if (found == watched_.end()) return;
+  const auto watched = found->second;  // may be unwatched by its own call
+  watched->ready(event.events);
+}
+
+void EventLoop::runPosted(std::vector<Task> tasks) {
+  _runAll(std::move(tasks));
+  _runSoon();
+}
+
+bool EventLoop::needsOwnThread() {
+  const bool isDueEarlier = !timers_.empty() && timers_.begin()->first.first < sleepsUntil_;
+  return stopping_ || !soon_.empty() || isDueEarlier;
+}
+
+void EventLoop::_runSoon() { _runAll(std::exchange(soon_, {})); }
+
+int EventLoop::_millisecondsToWait() {
+  sleepsUntil_ = timers_.empty() ? Instant::max() : timers_.begin()->first.first;
   if (!soon_.empty()) return 0;
   if (timers_.empty()) return -1;
   const auto left = timers_.begin()->first.first - std::chrono::steady_clock::now();

@@ -1,5 +1,8 @@
 #pragma once
 
+#include <sys/epoll.h>
+
+#include <array>
 #include <chrono>
 #include <cstdint>
 #include <functional>
@@ -13,23 +16,24 @@
 #include "base/Subscription.h"
 #include "base/Time.h"
 #include "platform/api/WorkQueue.h"
-#include "platform/linux/ipc/LoopInbox.h"
 #include "platform/linux/ipc/OwnedFd.h"
+#include "platform/linux/queues/LoopInbox.h"
 
 namespace zelkord::ipc {
 
 // One thread around epoll: descriptors, timers (real time) and posted tasks. It sleeps while
-// nothing happens.
+// nothing happens; what is posted then runs on the posting thread, when that is a service thread.
 //
-// Threading: `inbox`, `sync` and `isCurrent` on any thread; everything else on the loop's own.
+// Threading: `inbox`, `sync` and `isCurrent` on any thread; everything else on the one that the
+// loop belongs to: its own, or one that runs posted tasks.
 // Ownership: destroying it (not on its own thread) ends the thread; what was posted and has not
 // begun is dropped.
-class ZK_CAPABILITY("loop") EventLoop {
+class ZK_CAPABILITY("loop") EventLoop final : private LoopHost {
  public:
   using Ready = std::function<void(std::uint32_t events)>;
 
   EventLoop();
-  ~EventLoop();
+  ~EventLoop() override;
   EventLoop(const EventLoop&) = delete;
   EventLoop& operator=(const EventLoop&) = delete;
 
@@ -37,9 +41,9 @@ class ZK_CAPABILITY("loop") EventLoop {
   void stop();
 
   const std::shared_ptr<LoopInbox>& inbox() const { return inbox_; }
-  // Runs the task on the loop's thread and waits for it. False when the loop has ended.
+  // Runs the task where the loop's tasks run and waits for it. False when the loop has ended.
   bool sync(FunctionRef<void()> task);
-  bool isCurrent() const { return std::this_thread::get_id() == thread_.get_id(); }
+  bool isCurrent() const { return inbox_->isCurrent(); }
   void assertCurrent() const ZK_ASSERTS(this);
 
   // Calls `ready` with epoll's events. The descriptor stays open until the subscription is gone.
@@ -51,19 +55,27 @@ class ZK_CAPABILITY("loop") EventLoop {
   void soon(Task task);
 
  private:
+  static constexpr int kEventsAtOnce = 64;
   using Instant = std::chrono::steady_clock::time_point;
   struct Watched {
     int fd;
     Ready ready;
   };
 
+  // LoopHost
+  void runPosted(std::vector<Task> tasks) override;
+  bool needsOwnThread() override;
+
   void _run();
-  int _millisecondsToWait() const;
+  int _sleep(std::array<epoll_event, kEventsAtOnce>& events);
+  int _millisecondsToWait();
+  void _dispatch(const epoll_event& event);
   void _runDueTimers();
+  void _runSoon();
   static void _runAll(std::vector<Task> tasks);
 
   const OwnedFd epoll_;
-  const std::shared_ptr<LoopInbox> inbox_ = std::make_shared<LoopInbox>();
+  const std::shared_ptr<LoopInbox> inbox_;
 
   // Loop state.
   bool stopping_ = false;
@@ -72,6 +84,7 @@ class ZK_CAPABILITY("loop") EventLoop {
   std::unordered_map<int, std::uint64_t> idOfDescriptor_;
   std::multimap<std::pair<Instant, std::uint64_t>, Task> timers_;
   std::vector<Task> soon_;
+  Instant sleepsUntil_ = Instant::max();
 
   std::thread thread_;
 };

@@ -12,7 +12,7 @@ namespace zelkord::ipc {
 
 // One admitted socket while it authenticates. Reads nothing beyond the end of the authentication.
 //
-// Threading: the loop's thread. Ownership: its listener, which lets go of it once it has finished.
+// Threading: the loop. Ownership: its listener, which lets go of it once it has finished.
 // Errors: garbage, a time-out and a peer that went away finish it without success; the socket is
 // then closed.
 class Handshake {

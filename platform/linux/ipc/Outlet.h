@@ -10,7 +10,7 @@
 namespace zelkord::ipc {
 
 // Where the messages for one client leave.
-// Threading: the loop's thread.
+// Threading: the loop.
 class Outlet {
  public:
   virtual ~Outlet() = default;

@@ -6,8 +6,8 @@
 #include "platform/api/Interprocess.h"
 #include "platform/api/Log.h"
 #include "platform/linux/ipc/CallFlow.h"
-#include "platform/linux/ipc/LoopInbox.h"
 #include "platform/linux/ipc/Outlet.h"
+#include "platform/linux/queues/LoopInbox.h"
 
 namespace zelkord::ipc {
 

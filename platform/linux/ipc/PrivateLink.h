@@ -19,7 +19,7 @@ class PrivateListener;
 //
 // States: open; ended by the peer, by a fault, by a client that does not read, or by us. Then
 // nothing more is read or written, and the socket closes in the same turn of the loop. Threading:
-// the loop's thread. Ownership: its listener, until the end.
+// the loop. Ownership: its listener, until the end.
 class PrivateLink final : public Outlet,
                           public Caller,
                           public std::enable_shared_from_this<PrivateLink> {

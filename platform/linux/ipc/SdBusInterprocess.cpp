@@ -80,7 +80,7 @@ class DeafListener final : public AnonymousListener {
 
 }  // namespace
 
-// What the loop's thread works with; late tasks hold it weakly.
+// What the loop works with; late tasks hold it weakly.
 struct SdBusInterprocess::Doors {
   std::string name;
   std::unique_ptr<BusDoor> bus;

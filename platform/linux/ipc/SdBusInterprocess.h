@@ -17,9 +17,9 @@ namespace zelkord::ipc {
 // Interprocess connections as D-Bus: a name on the session bus, and private sockets that speak it
 // without a bus. Both behave alike; the docs say what clients see.
 //
-// One thread owns every sd-bus object and only frames, checks and dispatches; calls are handled on
-// a queue of their connection, and answers come back to that thread through its inbox, many a
-// wake-up. It sleeps while nobody calls.
+// One loop has every sd-bus object and only frames, checks and dispatches; calls are handled on a
+// queue of their connection, and answers come back through the loop's inbox: to its thread, many a
+// wake-up, or, while that sleeps, sent by the worker itself. It sleeps while nobody calls.
 //
 // Threading: any thread, except the constructor, `listen` (once) and the destructor: one thread.
 // Ownership: log and queues outlive it; anonymous listeners may outlive it, closed.

@@ -7,7 +7,14 @@
 
 namespace zelkord {
 
+namespace {
+constinit thread_local bool tlsIsServiceThread = false;
+}  // namespace
+
+bool isServiceThread() { return tlsIsServiceThread; }
+
 void beginServiceThread(const char* name) {
+  tlsIsServiceThread = true;
   ::pthread_setname_np(::pthread_self(), name);
   sigset_t blocked;
   ::sigfillset(&blocked);

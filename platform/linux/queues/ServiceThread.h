@@ -6,5 +6,7 @@ namespace zelkord {
 // and no signals but those that a fault of its own raises, so that its system calls are not
 // interrupted.
 void beginServiceThread(const char* name);
+// Whether the calling thread was prepared so.
+bool isServiceThread();
 
 }  // namespace zelkord

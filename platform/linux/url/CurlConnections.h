@@ -20,7 +20,7 @@ namespace zelkord {
 // States: unused; open (from the first task; on a metered network the multi handle, and with it the
 // connections, goes when it has been idle for a while, and comes back with the next task); closed.
 //
-// Threading: the I/O thread; made and, once closed, destroyed on any.
+// Threading: the I/O loop; made and, once closed, destroyed on any.
 // Ownership: holds the tasks under way.
 class CurlConnections final : public IOLoopClient {
  public:
@@ -59,7 +59,7 @@ class CurlConnections final : public IOLoopClient {
   IOLoop& loop_;
   const CurlSettings settings_;
 
-  // The I/O thread.
+  // The I/O loop.
   bool open_ = false;
   bool closed_ = false;
   CURLSH* share_ = nullptr;

@@ -2,7 +2,7 @@
 
 #include <pthread.h>
 #include <sys/epoll.h>
-#include <sys/eventfd.h>
+#include <sys/timerfd.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -16,17 +16,21 @@
 namespace zelkord {
 
 IOLoop::IOLoop()
-    : epoll_(epoll_create1(EPOLL_CLOEXEC)), wakeUp_(eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK)) {
-  ZK_CHECK(epoll_ >= 0 && wakeUp_ >= 0, "an I/O loop has its descriptors");
-  epoll_event event{};
-  event.events = EPOLLIN | EPOLLET;  // every write is an edge, so nobody needs to read
-  event.data.fd = wakeUp_;
-  epoll_ctl(epoll_, EPOLL_CTL_ADD, wakeUp_, &event);
+    : inbox_(static_cast<LoopHost&>(*this)),
+      epoll_(epoll_create1(EPOLL_CLOEXEC)),
+      alarm_(timerfd_create(CLOCK_BOOTTIME, TFD_CLOEXEC | TFD_NONBLOCK)) {
+  ZK_CHECK(epoll_ >= 0 && alarm_ >= 0, "an I/O loop has its descriptors");
+  for (const int descriptor : {inbox_.descriptor(), alarm_}) {
+    epoll_event event{};
+    event.events = EPOLLIN | EPOLLET;  // every change is an edge, so nobody needs to read
+    event.data.fd = descriptor;
+    epoll_ctl(epoll_, EPOLL_CTL_ADD, descriptor, &event);
+  }
 }
 
 IOLoop::~IOLoop() {
   stop();
-  close(wakeUp_);
+  close(alarm_);
   close(epoll_);
 }
 
@@ -37,23 +41,19 @@ SteadyTime IOLoop::now() {
 }
 
 void IOLoop::assertCurrent() const {
-  ZK_CHECK(_isOwnThread() || owner_.load() == std::thread::id(), "on the I/O loop's thread");
+  ZK_CHECK(inbox_.isCurrent() || !_isRunning(), "the I/O loop is the thread's");
 }
 
-bool IOLoop::post(Task task) {
-  bool wakes = false;
-  {
-    const MutexLock lock(mutex_);
-    if (state_ == State::Stopping || state_ == State::Stopped) return false;
-    posted_.push_back(std::move(task));
-    if (state_ == State::NotStarted) {
-      state_ = State::Running;
-      thread_ = std::thread([this] { _run(); });
-    }
-    wakes = std::exchange(asleep_, false);
+bool IOLoop::post(Task task) { return _start() && inbox_.post(std::move(task)); }
+
+// False once the loop is stopped.
+bool IOLoop::_start() {
+  const MutexLock lock(mutex_);
+  if (state_ == State::NotStarted) {
+    state_ = State::Running;
+    thread_ = std::thread([this] { _run(); });
   }
-  if (wakes) eventfd_write(wakeUp_, 1);
-  return true;
+  return state_ == State::Running;
 }
 
 bool IOLoop::_isStarted() const {
@@ -61,14 +61,19 @@ bool IOLoop::_isStarted() const {
   return state_ != State::NotStarted;
 }
 
+bool IOLoop::_isRunning() const {
+  const MutexLock lock(mutex_);
+  return state_ == State::Running || state_ == State::Stopping;
+}
+
 void IOLoop::sync(FunctionRef<void()> task) {
-  if (_isOwnThread() || !_isStarted()) return task();
+  if (inbox_.isCurrent() || !_isStarted()) return task();
   bool done = false;
   const bool posted = post([&] {
     task();
     const MutexLock lock(mutex_);
     done = true;
-    changed_.notify_all();
+    changed_.notifyAll();
   });
   {
     const MutexLock lock(mutex_);
@@ -78,7 +83,7 @@ void IOLoop::sync(FunctionRef<void()> task) {
 }
 
 void IOLoop::stop() {
-  ZK_CHECK(!_isOwnThread(), "an I/O loop is stopped from outside");
+  ZK_CHECK(!inbox_.isCurrent(), "an I/O loop is stopped from outside");
   std::thread thread;
   {
     const MutexLock lock(mutex_);
@@ -87,7 +92,7 @@ void IOLoop::stop() {
     thread = std::move(thread_);
   }
   if (!thread.joinable()) return;
-  eventfd_write(wakeUp_, 1);
+  inbox_.post([] {});  // the thread looks up
   thread.join();
 }
 
@@ -128,26 +133,26 @@ void IOLoop::_run() {
   sigfillset(&all);
   pthread_sigmask(SIG_BLOCK, &all, nullptr);
   pthread_setname_np(pthread_self(), "zelkord-url");
-  owner_ = std::this_thread::get_id();
+  inbox_.begin();
   assertCurrent();
-  while (_runPosted()) {
-    _runDue();
+  while (true) {
+    runPosted(inbox_.take());
+    if (needsOwnThread()) break;
     _waitAndDispatch();
   }
   _end();
 }
 
-// False when the loop is stopping and nothing more is posted.
-bool IOLoop::_runPosted() {
-  while (true) {
-    {
-      const MutexLock lock(mutex_);
-      if (posted_.empty()) return state_ == State::Running;
-      running_.swap(posted_);
-    }
-    for (Task& task : running_) std::exchange(task, nullptr)();
-    running_.clear();
-  }
+void IOLoop::runPosted(std::vector<Task> tasks) {
+  assertCurrent();
+  for (Task& task : tasks) std::exchange(task, nullptr)();
+  _runDue();
+  _setAlarm();
+}
+
+bool IOLoop::needsOwnThread() {
+  const MutexLock lock(mutex_);
+  return state_ != State::Running;
 }
 
 void IOLoop::_runDue() {
@@ -157,29 +162,30 @@ void IOLoop::_runDue() {
   }
 }
 
-int IOLoop::_waitMilliseconds() const {
+void IOLoop::_setAlarm() {
   SteadyTime due = IOLoopClient::kNever;
   for (const IOLoopClient* client : clients_) due = std::min(due, client->nextDue());
-  if (due == IOLoopClient::kNever) return -1;
-  const auto wait = std::chrono::ceil<std::chrono::milliseconds>(due - now());
-  return static_cast<int>(std::clamp<std::int64_t>(wait.count(), 0, 3'600'000));
+  if (due == alarmTime_ || (due > alarmTime_ && due != IOLoopClient::kNever)) return;
+  alarmTime_ = due;
+  itimerspec setting{};  // zero: off
+  if (due != IOLoopClient::kNever) {
+    const Duration sinceBoot = std::max(Duration(1), due.time_since_epoch());
+    const auto seconds = std::chrono::floor<std::chrono::seconds>(sinceBoot);
+    setting.it_value.tv_sec = seconds.count();
+    setting.it_value.tv_nsec = (sinceBoot - seconds).count();
+  }
+  timerfd_settime(alarm_, TFD_TIMER_ABSTIME, &setting, nullptr);
 }
 
 void IOLoop::_waitAndDispatch() {
-  int wait = _waitMilliseconds();
-  {
-    const MutexLock lock(mutex_);
-    asleep_ = posted_.empty() && state_ == State::Running;
-    if (!asleep_) wait = 0;
-  }
+  const bool sleeps = inbox_.beginSleep();
   std::array<epoll_event, 64> events;
-  const int count = epoll_wait(epoll_, events.data(), static_cast<int>(events.size()), wait);
-  {
-    const MutexLock lock(mutex_);
-    asleep_ = false;
-  }
+  const int count =
+      epoll_wait(epoll_, events.data(), static_cast<int>(events.size()), sleeps ? -1 : 0);
+  if (sleeps) inbox_.endSleep();
   for (int i = 0; i < count; ++i) {
     const epoll_event& event = events[static_cast<std::size_t>(i)];
+    if (event.data.fd == alarm_) alarmTime_ = IOLoopClient::kNever;
     const auto place = static_cast<std::size_t>(event.data.fd);
     IOLoopClient* client = place < watchers_.size() ? watchers_[place] : nullptr;
     if (client) client->ready(event.data.fd, event.events);
@@ -187,15 +193,16 @@ void IOLoop::_waitAndDispatch() {
 }
 
 void IOLoop::_end() {
+  runPosted(inbox_.close());
   while (!clients_.empty()) {
     IOLoopClient& client = *clients_.back();
     remove(client);
     client.loopEnded();
   }
+  inbox_.end();
   const MutexLock lock(mutex_);
-  owner_ = std::thread::id();
   state_ = State::Stopped;
-  changed_.notify_all();
+  changed_.notifyAll();
 }
 
 }  // namespace zelkord

@@ -1,0 +1,79 @@
+#pragma once
+
+#include <atomic>
+#include <thread>
+#include <vector>
+
+#include "base/CondVar.h"
+#include "base/Mutex.h"
+#include "platform/api/WorkQueue.h"
+
+namespace zelkord {
+
+// What belongs to one loop at a time is touched by one thread at a time: the loop's own while it is
+// awake, and while it sleeps whoever posts something. That saves waking it and switching to it.
+class LoopHost {
+ public:
+  virtual ~LoopHost() = default;
+  // Runs the tasks, and what they leave to be done at once.
+  virtual void runPosted(std::vector<Task> tasks) = 0;
+  // Whether the loop's own thread must wake up: for what only it can do, or to sleep less long.
+  virtual bool needsOwnThread() = 0;
+};
+
+// Tasks on their way to a loop, and the loop itself while its thread sleeps.
+//
+// States: the loop's thread is awake and will look here before it sleeps; it sleeps; it sleeps and
+// the loop is lent to a thread that has posted; closed, when tasks are dropped. Tasks run in the
+// order in which they were posted, never from within another one. Only service threads are lent
+// the loop, for a bounded number of tasks; others wake its thread.
+//
+// Threading: `post` and `isCurrent` on any thread, the rest on the loop's.
+// Ownership: shared with everything that may post late; the host lives until `close`.
+class LoopInbox {
+ public:
+  explicit LoopInbox(LoopHost& host);
+  ~LoopInbox();
+  LoopInbox(const LoopInbox&) = delete;
+  LoopInbox& operator=(const LoopInbox&) = delete;
+
+  // Who may run a task. What takes long goes on beside the poster's work on the loop's own thread.
+  enum class Runner { Anybody, OwnThread };
+
+  // False, with the task dropped, once closed. It may have run when this returns.
+  bool post(Task task, Runner runner = Runner::Anybody);
+  // Whether the calling thread is the one that the loop belongs to at the moment.
+  bool isCurrent() const { return owner_.load() == std::this_thread::get_id(); }
+
+  // An edge at each wake-up of the loop's thread; there is nothing to read.
+  int descriptor() const { return wakeUp_; }
+  // The calling thread is the loop's own from `begin`, awake, to `end`.
+  void begin() { owner_ = std::this_thread::get_id(); }
+  void end() { owner_ = std::thread::id(); }
+  std::vector<Task> take();
+  // From here to `endSleep` nothing of the loop's may be touched. False when there are tasks.
+  bool beginSleep();
+  // Waits for the end of a loan.
+  void endSleep();
+  // What has come too late to be run by anybody else than the caller.
+  std::vector<Task> close();
+
+ private:
+  enum class State { Awake, Asleep, Lent, Closed };
+
+  void _runLent();
+  bool _endLoan();
+
+  // Fixed after construction.
+  LoopHost& host_;
+  const int wakeUp_;
+
+  std::atomic<std::thread::id> owner_;
+  Mutex mutex_;
+  CondVar returned_;
+  State state_ ZK_GUARDED_BY(mutex_) = State::Awake;
+  bool awaited_ ZK_GUARDED_BY(mutex_) = false;  // the loop's thread is up and waits for its return
+  std::vector<Task> tasks_ ZK_GUARDED_BY(mutex_);
+};
+
+}  // namespace zelkord
