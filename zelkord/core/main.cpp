@@ -2,11 +2,13 @@
 
 #include <fmt/core.h>
 
+#include <chrono>
 #include <cstdio>
 #include <memory>
 
 #include "corezelkor/Constants.h"
 #include "platform/linux/LinuxPlatform.h"
+#include "platform/linux/process/StartMemory.h"
 #include "zelkord/core/CommandLine.h"
 #include "zelkord/core/Daemon.h"
 
@@ -14,6 +16,8 @@ namespace {
 
 constexpr int kCannotServe = 1;
 constexpr int kWrongUsage = 2;
+// By then what begins with the start has begun.
+constexpr zelkor::Duration kStartTime = std::chrono::seconds(1);
 
 zelkord::LinuxPlatformOptions optionsOf(const zelkord::CommandLine& line) {
   zelkord::LinuxPlatformOptions options;
@@ -38,6 +42,8 @@ int serve(const zelkord::CommandLine& line) {
   const auto refused = daemon.start();
   // Nothing is torn down: work under way refers to the graph, and the process's end is its end.
   if (refused) host->platform().process.exit(fail(*refused));
+  const auto started = host->platform().queues.main().after(
+      kStartTime, [] { zelkord::releaseStartMemory(); }, zelkord::TimeBase::Real);
   host->platform().process.runMainLoop();
   return 0;
 }
