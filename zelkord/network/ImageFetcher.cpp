@@ -6,6 +6,7 @@
 #include "zelkord/feedback/SessionManager.h"
 #include "zelkord/network/ErrorFeedback.h"
 #include "zelkord/network/NetworkTiming.h"
+#include "zelkord/network/URLHost.h"
 #include "zelkord/network/UserAgent.h"
 #include "zelkord/storage/mmapFileHandle.h"
 
@@ -16,9 +17,16 @@ constexpr std::int64_t kImageFault = 500;  // in kZLKErrorDomain
 constexpr std::uint32_t kImageTriggerEvent = 15;
 constexpr std::int32_t kImageEndpoint = 7;
 constexpr int kOK = 200;
+constexpr std::string_view kSharedProtocol = "h2";
 
 bool schemeBeginsWithHTTP(const std::string& url) {
   return url.find(':') != std::string::npos && strncasecmp(url.c_str(), "http", 4) == 0;
+}
+
+// Whose turn in the line it is.
+std::string hostOf(const std::string& url) {
+  auto place = URLHost::parse(url);
+  return place ? std::move(place->host) : std::string();
 }
 
 std::shared_ptr<const HVStartNetworkSearchFeedback> imageFetchStart(const URLRequest& request) {
@@ -64,7 +72,7 @@ ZLKFuture<ImageFetcher::Image> ImageFetcher::fetchImageData(const std::string& u
     assembly_.log(Category::Images).debug("pending {}", _shown(url));
     return pending->future();
   }
-  _begin(std::make_shared<Fetch>(std::move(request), promise, std::move(transaction)));
+  _enqueue(std::make_shared<Fetch>(std::move(request), promise, std::move(transaction)));
   return promise.future();
 }
 
@@ -99,6 +107,22 @@ std::optional<ZLKPromise<ImageFetcher::Image>> ImageFetcher::_join(
   return pending;
 }
 
+void ImageFetcher::_enqueue(const std::shared_ptr<Fetch>& fetch) {
+  const auto& url = fetch->request.url;
+  bool isTaken = false;
+  std::vector<DownloadLine::Begin> due;
+  queue_->sync([&] {
+    queue_->assertCurrent();
+    isTaken = line_.add(hostOf(url), [this, fetch] { _begin(fetch); });
+    if (!isTaken) pendingRequests_.erase(url);
+    due = line_.takeDue();
+  });
+  if (!isTaken) {
+    assembly_.log(Category::Images).error("too many images wait: {}", _shown(url));
+  }
+  for (const auto& begin : due) begin();
+}
+
 void ImageFetcher::_begin(std::shared_ptr<Fetch> fetch) {
   _record(fetch->start);
   const auto task = assembly_.urlSession().downloadTask(
@@ -121,12 +145,19 @@ void ImageFetcher::_finish(Fetch& fetch, const URLTask& task, const URLResult& r
   end->networkTimingData = networkTimingData(task.timingData());
   _record(std::move(end));
   fetch.promise.fulfill(std::move(image));
-  queue_->async([weak = weak_from_this(), url = fetch.request.url] {
-    const auto self = weak.lock();
-    if (!self) return;
-    self->queue_->assertCurrent();
-    self->pendingRequests_.erase(url);
+  const auto connections = task.timingData().protocol == kSharedProtocol
+                               ? DownloadLine::Connections::Shared
+                               : DownloadLine::Connections::OneEach;
+  queue_->async([weak = weak_from_this(), url = fetch.request.url, connections] {
+    if (const auto self = weak.lock()) self->_leave(url, connections);
   });
+}
+
+void ImageFetcher::_leave(const std::string& url, DownloadLine::Connections connections) {
+  queue_->assertCurrent();
+  pendingRequests_.erase(url);
+  line_.ended(hostOf(url), connections);
+  for (const auto& begin : line_.takeDue()) begin();
 }
 
 ImageFetcher::Image ImageFetcher::_imageOf(const Fetch& fetch, const URLResult& result) {

@@ -201,10 +201,56 @@ TEST_F(ImageFetcherTest, GoesThroughTheProxyWhenThatIsInUse) {
   }
 }
 
+TEST_F(ImageFetcherTest, TakesFewConnectionsForManyImages) {
+  std::vector<ZLKFuture<Image>> images;
+  for (int i = 0; i < 40; ++i) images.push_back(fetch("https://img.example/" + std::to_string(i)));
+  const auto other = fetch("https://other.example/");
+  ASSERT_EQ(session().pending().size(), 7u);
+  EXPECT_EQ(recorded<HVStartNetworkSearchFeedback>().size(), 7u);
+  const auto first = session().pending().front();
+  first->setTimingData({.protocol = "h2"});
+  first->succeed(200, "bytes");
+  fakes_.timeline.runUntilIdle();
+  EXPECT_EQ(session().pending().size(), 25u);
+
+  while (!session().pending().empty()) {
+    session().pending().front()->succeed(200, "bytes");
+    fakes_.timeline.runUntilIdle();
+  }
+  images.push_back(other);
+  for (const auto& image : images) {
+    ASSERT_TRUE(image.isFulfilled());
+    EXPECT_EQ(image.get(), Data("bytes"));
+  }
+  EXPECT_EQ(session().tasks().size(), 41u);
+}
+
+TEST_F(ImageFetcherTest, GivesNoneAtOnceWhenTooManyWait) {
+  for (std::size_t i = 0; i < DownloadLine::kMostOfOneHost + DownloadLine::kMostWaiting; ++i) {
+    fetch("https://img.example/" + std::to_string(i));
+  }
+  const auto refused = fetch();
+  ASSERT_TRUE(refused.isFulfilled());
+  EXPECT_EQ(refused.get(), std::nullopt);
+  EXPECT_TRUE(fakes_.log.contains("too many images wait: https://img.example/a.png?<private>"));
+  session().pending().front()->succeed(404);
+  fakes_.timeline.runUntilIdle();
+  EXPECT_FALSE(fetch().isFulfilled());
+}
+
 TEST_F(ImageFetcherTest, LeavesNobodyWaitingWhenItIsGone) {
   const auto image = fetch();
+  const auto waiting = [this] {
+    for (std::size_t i = 1; i < DownloadLine::kMostOfOneHost; ++i) {
+      fetch("https://img.example/" + std::to_string(i));
+    }
+    return fetch("https://img.example/last");
+  }();
   assembly_.setImageFetcher(nullptr);
-  answer(200, "bytes");
+  ASSERT_TRUE(waiting.isFulfilled());
+  EXPECT_EQ(waiting.get(), std::nullopt);
+  for (const auto& task : session().pending()) task->succeed(200, "bytes");
+  fakes_.timeline.runUntilIdle();
   ASSERT_TRUE(image.isFulfilled());
   EXPECT_EQ(image.get(), std::nullopt);
   EXPECT_TRUE(fakes_.transactions.openNames().empty());
