@@ -10,6 +10,8 @@ namespace {
 constexpr std::int64_t kApplicationId = 0x7A6C6B63;
 constexpr std::int64_t kVersion = 1;
 constexpr int kForeignCode = -1;  // none of SQLite's
+constexpr std::int64_t kMaximumCount = std::int64_t{1} << 62;
+constexpr std::int64_t kMaximumEntryCost = std::int64_t{1} << 40;
 
 // Little memory, a short log, and nothing in a foreign file runs. Nobody else opens the file.
 constexpr const char* kSettings =
@@ -33,19 +35,17 @@ sqlite::Failure foreignFile() { return {kForeignCode, "it is of another version"
 std::optional<CacheEntry> entryOfRow(const sqlite::Statement& rows) {
   const auto url = digestFromBytes(rows.bytes(1));
   const auto variant = digestFromBytes(rows.bytes(3));
-  if (rows.integer(0) <= 0 || rows.integer(4) < 0 || rows.integer(5) < 0) return std::nullopt;
-  // Far from the ends: ids and uses are counted on.
-  constexpr std::int64_t kMaximum = std::int64_t{1} << 62;
-  if (rows.integer(0) > kMaximum || rows.integer(4) > kMaximum || rows.integer(5) > kMaximum) {
-    return std::nullopt;
-  }
-  if (!url || !variant) return std::nullopt;
-  return CacheEntry{.id = rows.integer(0),
+  const auto id = rows.integer(0), cost = rows.integer(4), used = rows.integer(5);
+  // Far from the ends: ids and uses are counted on, costs are added up.
+  const bool isSane = id > 0 && id <= kMaximumCount && cost >= 0 && cost <= kMaximumEntryCost &&
+                      used >= 0 && used <= kMaximumCount;
+  if (!isSane || !url || !variant) return std::nullopt;
+  return CacheEntry{.id = id,
                     .url = *url,
                     .vary = std::string(rows.text(2)),
                     .variant = *variant,
-                    .cost = static_cast<std::uint64_t>(rows.integer(4)),
-                    .used = static_cast<std::uint64_t>(rows.integer(5))};
+                    .cost = static_cast<std::uint64_t>(cost),
+                    .used = static_cast<std::uint64_t>(used)};
 }
 
 std::optional<std::int64_t> firstNumber(sqlite::Database& database, const char* sql,
