@@ -3,8 +3,10 @@
 #include <algorithm>
 
 #include "zelkord/assembly/Assembly.h"
+#include "zelkord/network/ImageFetcher.h"
 #include "zelkord/network/URLHost.h"
 #include "zelkord/network/ZelkorBagController.h"
+#include "zelkord/query/ArrivedImages.h"
 
 namespace zelkord {
 namespace {
@@ -28,12 +30,6 @@ ImageHosts hostsNamedBy(const ZLKBag& bag) {
   }
   add(bag.searchURL().value_or(""));
   return hosts;
-}
-
-// The bytes when they have come.
-const Data* bytesIn(const ZLKFuture<ImageFetcher::Image>& future) {
-  const auto* image = future.find();
-  return image && *image && !(*image)->empty() ? &**image : nullptr;
 }
 
 }  // namespace
@@ -81,10 +77,10 @@ void ResponseImages::loadImages(const std::vector<ImageDescriptor>& descriptors,
     collectOrderedImages(descriptor, *bag, nullptr, images);
   }
   const std::shared_ptr<Group> group = assembly_.platform().queues.makeGroup();
-  const auto fetches = _fetch(images, *bag, group);
+  const auto arrived = _fetch(images, *bag, group);
   const auto now = assembly_.platform().clock.realNow();
   group->wait(deadline > now ? deadline - now : Duration::zero());
-  completion(_loaded(descriptors, *bag, fetches));
+  completion(_loaded(descriptors, *bag, *arrived));
 }
 
 ResponseImages::Hosts ResponseImages::_validHosts(const ZLKBag& bag) {
@@ -112,10 +108,11 @@ bool ResponseImages::_mayFetch(const std::string& url, const ImageHosts& hosts) 
   return true;
 }
 
-ResponseImages::Fetches ResponseImages::_fetch(const OrderedImages& images, const ZLKBag& bag,
-                                               const std::shared_ptr<Group>& group) {
-  Fetches fetches;
-  if (images.seen.empty()) return fetches;
+std::shared_ptr<ArrivedImages> ResponseImages::_fetch(const OrderedImages& images,
+                                                      const ZLKBag& bag,
+                                                      const std::shared_ptr<Group>& group) {
+  const auto arrived = std::make_shared<ArrivedImages>();
+  if (images.seen.empty()) return arrived;
   const auto hosts = _validHosts(bag);
   const auto acceptsRedirect = [hosts](const std::string& url) {
     const auto place = URLHost::parse(url);
@@ -128,27 +125,29 @@ ResponseImages::Fetches ResponseImages::_fetch(const OrderedImages& images, cons
       const auto future = assembly_.imageFetcher()->fetchImageData(
           url, bag.timeoutIntervalForRequest(), acceptsRedirect);
       group->enter();
-      future.then([group, &queue](const auto&) { queue.async([group] { group->leave(); }); });
-      fetches.emplace(url, future);
+      future.then([weak = std::weak_ptr(arrived), url, group, &queue](const auto& image) {
+        const auto wanted = weak.lock();
+        if (wanted && image) wanted->add(url, *image);
+        queue.async([group] { group->leave(); });
+      });
     }
   }
-  return fetches;
+  return arrived;
 }
 
 LoadedImages ResponseImages::_loaded(const std::vector<ImageDescriptor>& descriptors,
-                                     const ZLKBag& bag, const Fetches& fetches) const {
+                                     const ZLKBag& bag, const ArrivedImages& arrived) const {
   const auto& log = assembly_.log(Category::Images);
   LoadedImages images;
   std::unordered_set<std::string_view> filed;
-  const auto bytesAt = [&fetches](const std::optional<std::string>& url) -> const Data* {
-    const auto fetch = url ? fetches.find(*url) : fetches.end();
-    return fetch == fetches.end() ? nullptr : bytesIn(fetch->second);
+  const auto bytesAt = [&arrived](const std::optional<std::string>& url) {
+    return url ? arrived.find(*url) : std::nullopt;
   };
   for (const auto& [url, id, data] : descriptors) {
-    if (const auto* bytes = bytesAt(url)) {
+    if (const auto bytes = bytesAt(url)) {
       log.debug("mapping image url {} to {} bytes of data", _shown(*url), bytes->size());
       if (filed.insert(*url).second) images.emplace_back(*url, *bytes);
-    } else if (const auto* named = id ? bytesAt(bag.urlForIdentifier(*id)) : nullptr) {
+    } else if (const auto named = id ? bytesAt(bag.urlForIdentifier(*id)) : std::nullopt) {
       log.debug("mapping image id {} to {} bytes of data", *id, named->size());
       if (filed.insert(*id).second) images.emplace_back(*id, *named);
     }

@@ -3,7 +3,6 @@
 #include <functional>
 #include <memory>
 #include <string>
-#include <unordered_map>
 #include <utility>
 #include <vector>
 
@@ -11,12 +10,13 @@
 #include "base/Time.h"
 #include "corezelkor/ZLKBag.h"
 #include "platform/api/WorkQueues.h"
-#include "zelkord/network/ImageFetcher.h"
 #include "zelkord/query/ImageWalk.h"
 
 namespace zelkord {
 
 class Assembly;
+
+class ArrivedImages;
 
 // Bytes by URL or identifier, each once, in the order in which they were asked for.
 using LoadedImages = std::vector<std::pair<std::string, Data>>;
@@ -42,16 +42,15 @@ class ResponseImages final : public std::enable_shared_from_this<ResponseImages>
 
  private:
   using Hosts = std::shared_ptr<const ImageHosts>;
-  using Fetches = std::unordered_map<std::string, ZLKFuture<ImageFetcher::Image>>;
-
   void _allow(ImageHosts hosts);
   void _add(const ImageHosts& hosts);
   Hosts _validHosts(const ZLKBag& bag);
   bool _mayFetch(const std::string& url, const ImageHosts& hosts) const;
-  Fetches _fetch(const OrderedImages& images, const ZLKBag& bag,
-                 const std::shared_ptr<Group>& group);
+  // Each image enters the group until it has come, or failed.
+  std::shared_ptr<ArrivedImages> _fetch(const OrderedImages& images, const ZLKBag& bag,
+                                        const std::shared_ptr<Group>& group);
   LoadedImages _loaded(const std::vector<ImageDescriptor>& descriptors, const ZLKBag& bag,
-                       const Fetches& fetches) const;
+                       const ArrivedImages& arrived) const;
   std::string _shown(const std::string& url) const;
 
   // Fixed after construction.

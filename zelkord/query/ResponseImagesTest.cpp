@@ -1,6 +1,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include "zelkord/network/ImageFetcher.h"
 #include "zelkord/query/QueryTestSupport.h"
 #include "zelkord/query/ResponseImages.h"
 
@@ -186,6 +187,24 @@ TEST_F(ResponseImagesTest, WaitsNoLongerThanTheSlowestFetch) {
   EXPECT_THAT(load(R"([{"url":"https://img.example/a"},{"id":"pin"}])", Duration::max()),
               IsEmpty());
   EXPECT_EQ(bed_.fakes.timeline.now() - begin, 2s);
+}
+
+TEST_F(ResponseImagesTest, HoldsNoMoreThanSeveralAnswersHold) {
+  bed_.installBag(kImagesBag);
+  learn(R"({"icon":{"id":"pin"}})");
+  const std::string large(8u << 20, 'x');
+  std::map<std::string, std::string> bodies;
+  json::array wanted;
+  for (int i = 0; i < 20; ++i) {
+    const auto url = "https://img.example/" + std::to_string(i);
+    bodies.emplace(url, large);
+    wanted.push_back(json::object{{"url", url}});
+  }
+  bodies["https://img.example/small"] = "S";
+  wanted.push_back(json::object{{"url", "https://img.example/small"}});
+  serve(std::move(bodies));
+  EXPECT_EQ(load(json::serialize(wanted), 10s).size(), 16u);
+  EXPECT_EQ(fetched().size(), 21u);
 }
 
 }  // namespace
