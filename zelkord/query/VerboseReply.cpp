@@ -1,22 +1,33 @@
 #include "zelkord/query/VerboseReply.h"
 
-#include <algorithm>
+#include <map>
 
 #include "base/Text.h"
 
 namespace zelkord {
+namespace {
+
+// Each name once, as it came first, with all its values.
+HTTPHeaders joined(const HTTPHeaders& headers) {
+  HTTPHeaders result;
+  std::map<std::string, std::size_t> places;  // by lower-case name
+  for (const auto& [name, value] : headers) {
+    const auto [place, isNew] = places.try_emplace(lowercased(name), result.size());
+    if (isNew) {
+      result.emplace_back(name, value);
+    } else {
+      result[place->second].second.append(", ").append(value);
+    }
+  }
+  return result;
+}
+
+}  // namespace
 
 void addHTTPExchange(ZLKReply& reply, const URLRequest& request, const URLResponse& response) {
   reply.httpRequest = ZLKHTTPRequest{request.url, request.headers};
-  ZLKHTTPResponse shown{response.url, response.status.value_or(0), {}};
-  for (const auto& [name, value] : response.headers) {
-    const auto same = [wanted = lowercased(name)](const auto& header) {
-      return lowercased(header.first) == wanted;
-    };
-    if (std::any_of(shown.headers.begin(), shown.headers.end(), same)) continue;
-    shown.headers.emplace_back(name, response.header(name).value_or(value));
-  }
-  reply.httpResponse = std::move(shown);
+  reply.httpResponse =
+      ZLKHTTPResponse{response.url, response.status.value_or(0), joined(response.headers)};
 }
 
 }  // namespace zelkord
