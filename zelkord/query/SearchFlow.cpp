@@ -1,5 +1,7 @@
 #include "zelkord/query/SearchFlow.h"
 
+#include <utility>
+
 #include "base/Text.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/feedback/DaemonFeedback.h"
@@ -13,6 +15,16 @@ namespace {
 
 constexpr QueryTraits kSearchTraits = {.name = "search", .category = Category::Search};
 constexpr std::uint32_t kCacheHitTrigger = 4;
+// Of one response, handed to the cache together. Each carries the typed text, so that a long list
+// is not built as a whole.
+constexpr std::size_t kSetsAtOnce = 256;
+
+// Entries without a query complete nothing: the cache would ignore them.
+bool mayBeCached(const json::object& resultSet) {
+  const auto* query = resultSet.if_contains("query");
+  if (!query || !query->is_string() || query->get_string().empty()) return false;
+  return stringIn(resultSet, "status") != "ERROR";
+}
 
 }  // namespace
 
@@ -69,9 +81,10 @@ void SearchFlow::_cacheResponse(const json::value& rawResponse, const Data& data
   std::vector<CachedResultSet::Pointer> resultSets;
   for (const auto& entry : *entries) {
     const auto* resultSet = entry.if_object();
-    if (!resultSet || stringIn(*resultSet, "status") == "ERROR") continue;
+    if (!resultSet || !mayBeCached(*resultSet)) continue;
     resultSets.emplace_back(new CachedResultSet(request_->queryString, httpRequest_, *resultSet,
                                                 request_->uuid, data, now));
+    if (resultSets.size() == kSetsAtOnce) cache->set(std::exchange(resultSets, {}));
   }
   cache->set(std::move(resultSets));
 }

@@ -80,6 +80,16 @@ TEST_F(SearchFlowTest, CachesEveryEntryButThoseInError) {
   EXPECT_EQ(state->queryCache()->count(), 2u);
 }
 
+TEST_F(SearchFlowTest, CachesLongListsWhole) {
+  bed_.installBag(kTestBag);
+  const auto state = bed_.makeState();
+  bed_.search(*state, "s");
+  std::string list = "[";
+  for (int i = 100; i < 400; ++i) list += R"({"query":"s)" + std::to_string(i) + R"("},)";
+  answer(200, list + "{}]");
+  EXPECT_EQ(state->queryCache()->count(), 300u);
+}
+
 TEST_F(SearchFlowTest, FetchesTheBagThatAResponseNames) {
   const std::vector<std::pair<std::string, bool>> cases = {{R"({"bag": 12})", true},
                                                            {R"({"bag": 1})", false},
