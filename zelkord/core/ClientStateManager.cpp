@@ -83,7 +83,7 @@ void ClientStateManager::loadState() {
 }
 
 void ClientStateManager::saveState() {
-  if (!persistSessions_) return;
+  if (!persistSessions_ || saveIsDue_.exchange(true)) return;
   stateCacheQueue_->async([weak = weak_from_this()] {
     if (const auto self = weak.lock()) self->_save();
   });
@@ -91,6 +91,7 @@ void ClientStateManager::saveState() {
 
 void ClientStateManager::_save() {
   stateCacheQueue_->assertCurrent();
+  saveIsDue_ = false;
   json::array entries;
   for (const auto& session : _sessions()) {
     json::object entry;

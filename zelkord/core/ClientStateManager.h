@@ -1,5 +1,6 @@
 #pragma once
 
+#include <atomic>
 #include <map>
 #include <memory>
 #include <string>
@@ -37,6 +38,7 @@ class ClientStateManager final : public std::enable_shared_from_this<ClientState
   std::shared_ptr<ClientState> stateForClientIdentifier(const std::string& identifier);
   // The state of that client if some connection has configured it, else null.
   std::shared_ptr<ClientState> configuredState(const std::string& identifier);
+  // Calls that come before the states have been read share one write.
   void saveState();
   // {"identifier", "agent"} of every state that has a user agent.
   std::vector<ipc::StringMap> sessions();
@@ -70,6 +72,9 @@ class ClientStateManager final : public std::enable_shared_from_this<ClientState
   const bool persistSessions_;
   std::shared_ptr<EndpointListener> endpointListener_;
   std::unique_ptr<ipc::AnonymousListener> listener_;
+
+  // Own synchronisation.
+  std::atomic<bool> saveIsDue_ = false;
 
   // Queue state.
   States stateCache_ ZK_ON(stateCacheQueue_);

@@ -84,9 +84,15 @@ TEST(ClientStateManagerTest, RemembersClientsOnlyWhenToldTo) {
     EXPECT_EQ(manager.states().size(), persists ? 2u : 0u);
     EXPECT_EQ(manager.sessions().size(), persists ? 1u : 0u);
     manager.stateForClientIdentifier("lanthe")->setUserAgent("Lanthe/9");
-    manager.saveState();
+    const auto flushes = fakes.settings.flushes();
+    for (int i = 0; i < 5; ++i) manager.saveState();
     fakes.timeline.runUntilIdle();
     EXPECT_EQ(fakes.settings.value("sessions")->as_array().size(), persists ? 2u : 4u);
+    EXPECT_EQ(fakes.settings.flushes() - flushes, persists ? 1 : 0);
+    manager.stateForClientIdentifier("vocari")->setUserAgent("Vocari/1");
+    manager.saveState();
+    fakes.timeline.runUntilIdle();
+    EXPECT_EQ(fakes.settings.value("sessions")->as_array().size(), persists ? 3u : 4u);
   }
 }
 
