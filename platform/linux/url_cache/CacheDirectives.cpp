@@ -59,7 +59,10 @@ std::optional<std::string_view> takeListElement(std::string_view& rest) {
     if (rest[end] == '"') quoted = !quoted;
     if (quoted && rest[end] == '\\') ++end;
   }
-  if (quoted || end > rest.size()) return std::nullopt;
+  if (quoted || end > rest.size()) {
+    rest = {};
+    return std::nullopt;
+  }
   const auto element = withoutWhiteSpaceAround(rest.substr(0, end));
   rest.remove_prefix(std::min(end + 1, rest.size()));
   return element;

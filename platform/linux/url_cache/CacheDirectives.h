@@ -30,7 +30,7 @@ CacheDirectives parseCacheDirectives(std::string_view header);
 std::optional<std::chrono::seconds> parseDeltaSeconds(std::string_view text);
 
 // Cuts the first element, without the white space around it, off a list with commas; those in
-// quoted strings do not count. None when a quoted string has no end.
+// quoted strings do not count. None when a quoted string has no end; nothing remains then.
 std::optional<std::string_view> takeListElement(std::string_view& rest);
 
 std::string_view withoutWhiteSpaceAround(std::string_view text);

@@ -143,6 +143,9 @@ TEST(CacheValidationTest, TakesOverTheHeadersOfA304) {
   EXPECT_EQ(fresh.requestedAt, kCacheTestTime + 1s);
   EXPECT_EQ(fresh.receivedAt, kCacheTestTime + 2s);
 
+  const auto damaged = headersForTest("Connection: Y, \"open\nY: hop\nZ: end");
+  EXPECT_EQ(endToEndHeaders(damaged), headersForTest("Z: end"));
+
   const auto confirmsTag = [&stored](std::string tag) {
     return confirms({.headers = {{"ETag", std::move(tag)}}}, stored);
   };

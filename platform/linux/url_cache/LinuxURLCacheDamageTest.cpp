@@ -65,7 +65,7 @@ TEST(LinuxURLCacheDamageTest, GivesOutNothingThatWasDamaged) {
        true, 0},
       {"another URL's",
        [](const auto& state) {
-         runSQL(state / kIndexFile, "UPDATE entries SET vary = 'x' WHERE id = 1");
+         runSQL(state / kIndexFile, "UPDATE entries SET vary = '\"' WHERE id = 1");
        },
        true, 0},
       {"senseless row",
