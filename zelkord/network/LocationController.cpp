@@ -13,6 +13,9 @@ constexpr LocationAuthorization kGranted = 4;
 bool isRefused(LocationAuthorization status) { return status == 1 || status == 2; }
 bool isAuthorized(LocationAuthorization status) { return status == 3 || status == 4; }
 
+// Typing makes a request every few moments; asking again would only wake a thread for nothing.
+constexpr Duration kShortestBetweenAsks = 1s;
+
 std::string locationBundle() { return std::string(kLocationBundlePath); }
 
 }  // namespace
@@ -64,7 +67,7 @@ void LocationController::_makeManager() {
   if (isRefused(platform.location.authorization(locationBundle()))) {
     _setNoLocationWithReason(kUserSaidNo);
   } else {
-    askForFix();
+    _startManager();
   }
 }
 
@@ -84,7 +87,14 @@ void LocationController::startUpdatingLocation() {
   if (need != LocationNeed::Nothing) askForFix();
 }
 
-void LocationController::askForFix() { _onManager(&LocationManager::startUpdating); }
+void LocationController::askForFix() {
+  const auto now = assembly_.platform().clock.now();
+  if (now < nextAsk_.load()) return;
+  nextAsk_ = now + kShortestBetweenAsks;
+  _startManager();
+}
+
+void LocationController::_startManager() { _onManager(&LocationManager::startUpdating); }
 void LocationController::_stopUpdatingLocation() { _onManager(&LocationManager::stopUpdating); }
 
 void LocationController::_onManager(void (LocationManager::*operation)()) {
@@ -105,7 +115,7 @@ void LocationController::didUpdateLocations(const std::vector<LocationFix>& fixe
 
 void LocationController::didChangeAuthorizationStatus(LocationAuthorization status) {
   if (assembly_.platform().location.isEnabledSystemWide() && isAuthorized(status)) {
-    askForFix();
+    _startManager();
   } else {
     _setNoLocationWithReason(kUserSaidNo);
   }

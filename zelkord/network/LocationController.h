@@ -1,5 +1,6 @@
 #pragma once
 
+#include <atomic>
 #include <memory>
 #include <string_view>
 #include <vector>
@@ -38,7 +39,8 @@ class LocationController final : public LocationDelegate,
   void setupLocationServices(bool anySourceAllowed);
   // A request is about to be built: asks for a fix unless there is a young one.
   void startUpdatingLocation();
-  // Asks for a fix. Does nothing without a manager.
+  // Asks for a fix on behalf of a request. Does nothing without a manager, and within a second of
+  // the request before: the manager is still at it.
   void askForFix();
 
   void didUpdateLocations(const std::vector<LocationFix>& fixes) override;
@@ -49,6 +51,7 @@ class LocationController final : public LocationDelegate,
   void _setupLocationServices(bool anySourceAllowed);
   void _makeManager();
   void _dropManager();
+  void _startManager();
   void _stopUpdatingLocation();
   void _onManager(void (LocationManager::*operation)());
   void _setNoLocationWithReason(std::string_view reason);
@@ -59,6 +62,7 @@ class LocationController final : public LocationDelegate,
 
   // Own synchronisation.
   Guarded<std::shared_ptr<LocationManager>> manager_;
+  std::atomic<SteadyTime> nextAsk_{SteadyTime::min()};
 
   const std::unique_ptr<SerialQueue> locationQueue_;
 };

@@ -152,6 +152,13 @@ TEST_F(LocationControllerTest, AFixIsAskedForAgainAfterFiveMinutes) {
   run();
   EXPECT_EQ(location_.starts(), starts + 1);
   EXPECT_EQ(told("geosrc"), "gps,65.000000") << "the old one serves meanwhile";
+  // Not by each of the requests that follow closely.
+  for (const auto pause : {Duration(0s), Duration(500ms), Duration(500ms)}) {
+    world_.fake.timeline.advance(pause);
+    world_.request("search");
+    run();
+  }
+  EXPECT_EQ(location_.starts(), starts + 2);
 }
 
 TEST_F(LocationControllerTest, FollowsTheUsersAuthorization) {
