@@ -44,6 +44,9 @@ Comparison Comparison::run(const Size& size, const Contender& ours, const Conten
 
 void Comparison::report(Report& report, const std::string& name, const Limits& limits) const {
   _report(report, name + " p50", median_, limits.median);
+  const double ours = median_.ours.percentile(0);
+  const double floor = median_.floor.percentile(0);
+  report.ratio(name + " p50, best rounds", ours, floor, ours / floor, 0, "us");
   _report(report, name + " p99", tail_, limits.tail);
   _report(report, name + " processor time", processor_, limits.processor);
 }

@@ -16,7 +16,8 @@ struct Contender {
 };
 
 // Ours against the floor, in turns so that both meet the same noise. Every figure is the median of
-// the rounds' figures, a ratio's too.
+// the rounds' figures, a ratio's too. On a loaded machine the best round of each tells more; that
+// is reported beside.
 class Comparison {
  public:
   struct Size {
