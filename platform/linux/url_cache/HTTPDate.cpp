@@ -10,8 +10,8 @@ struct DateFields {
   int year = 0, month = 0, day = 0, hour = 0, minute = 0, second = 0;
 };
 
-bool isAsciiDigit(char c) { return c >= '0' && c <= '9'; }
-bool isAsciiLetter(char c) { return (c >= 'A' && c <= 'Z') || (c >= 'a' && c <= 'z'); }
+bool isDateDigit(char c) { return c >= '0' && c <= '9'; }
+bool isWeekdayLetter(char c) { return (c >= 'A' && c <= 'Z') || (c >= 'a' && c <= 'z'); }
 
 // From 1; 0 for what is no month.
 int monthOf(std::string_view name) {
@@ -49,7 +49,7 @@ std::optional<DateFields> matchDate(std::string_view pattern, std::string_view t
     } else if (pattern[i] == 'd' && text[i] == ' ') {
       continue;
     } else if (int* const field = numberField(fields, pattern[i] == 'd' ? 'D' : pattern[i])) {
-      if (!isAsciiDigit(text[i])) return std::nullopt;
+      if (!isDateDigit(text[i])) return std::nullopt;
       *field = *field * 10 + (text[i] - '0');
     } else if (pattern[i] != text[i]) {
       return std::nullopt;
@@ -88,7 +88,7 @@ std::optional<std::chrono::sys_seconds> parseHTTPDate(std::string_view text,
                                                       std::chrono::sys_seconds now) {
   const auto weekdayEnd = std::min(text.find_first_of(", "), text.size());
   const auto weekday = text.substr(0, weekdayEnd);
-  if (weekday.size() < 3 || !std::ranges::all_of(weekday, isAsciiLetter)) return std::nullopt;
+  if (weekday.size() < 3 || !std::ranges::all_of(weekday, isWeekdayLetter)) return std::nullopt;
   auto rest = text.substr(weekdayEnd);
   const bool hasComma = rest.starts_with(", ");
   rest.remove_prefix(std::min<std::size_t>(hasComma ? 2 : 1, rest.size()));

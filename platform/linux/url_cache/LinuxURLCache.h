@@ -24,8 +24,8 @@ namespace zelkord {
 // What is stored is found at once. It is written soon after, many responses in one transaction; a
 // response over a tenth of the disk part is held in memory only. The rules of HTTP are its user's.
 //
-// States: unopened, in which nothing is on anybody's mind and no file is open; open, from the first
-// use on, with the index of all that is on disk in memory.
+// States: unopened, when nothing is known of the disk and no file is open; open, from the first use
+// on, with the index of all that is on disk in memory.
 //
 // Threading: any thread. The index and what is in memory have a mutex of their own, the disk
 // belongs to a queue. `lookup` and `store` wait for the disk where they must; the rest never does.
