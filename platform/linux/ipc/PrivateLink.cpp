@@ -4,6 +4,7 @@
 #include <sys/ioctl.h>
 #include <sys/socket.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstring>
 #include <utility>
@@ -154,8 +155,7 @@ std::size_t PrivateLink::_queuedMessages() const {
   return count;
 }
 
-// Keeps the sizes of the messages that wait; beyond the limit the client is cut off. The one that
-// is being written does not count: a single answer may be larger than the limit.
+// Keeps the sizes of the messages that wait; when too much piles up the client is cut off.
 void PrivateLink::_accountWrites(std::size_t newestBytes) {
   const auto count = _queuedMessages();
   if (count == 0 && queued_.empty()) return;
@@ -170,9 +170,14 @@ void PrivateLink::_accountWrites(std::size_t newestBytes) {
     context_.loop.changeEvents(sd_bus_get_fd(bus_.get()),
                                waitsForWriting_ ? kLinkEvents | EPOLLOUT : kLinkEvents);
   }
-  if (count > 0 && bytes - queued_.front() > context_.options.queuedBytes) {
-    cutOff("the client does not read");
-  }
+  if (_piledUpBytes() > context_.options.queuedBytes) cutOff("the client does not read");
+}
+
+// What waits besides the message that is being written and the largest other: an answer may be
+// larger than the limit, and follow another one at once.
+std::size_t PrivateLink::_piledUpBytes() const {
+  if (queued_.size() < 2) return 0;
+  return queuedBytes_ - queued_.front() - *std::max_element(queued_.begin() + 1, queued_.end());
 }
 
 }  // namespace zelkord::ipc

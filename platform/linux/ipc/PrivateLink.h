@@ -53,6 +53,7 @@ class PrivateLink final : public Outlet,
   Progress _process();
   std::size_t _queuedMessages() const;
   void _accountWrites(std::size_t newestBytes);
+  std::size_t _piledUpBytes() const;
 
   // Fixed after construction.
   PrivateListener& listener_;

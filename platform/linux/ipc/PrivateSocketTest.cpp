@@ -164,6 +164,19 @@ TEST_F(PrivateSocketTest, AnAnswerMayBeLargerThanWhatMayWait) {
   EXPECT_EQ(size, 20'000'000u);
 }
 
+TEST_F(PrivateSocketTest, ALargeAnswerMayFollowAnother) {
+  auto client = server_.socketClient();
+  ASSERT_EQ(client.call(kTestInterface, "Echo", "s", ""), "");
+  for (int i = 0; i < 2; ++i) {
+    auto call = client.newCall("Many");
+    sd_bus_message_append(call.get(), "u", 20'000'000u);
+    client.send(std::move(call));
+  }
+  EXPECT_TRUE(
+      eventually([&] { return server_.interprocess->statistics().queuedBytes > 39'000'000u; }));
+  EXPECT_EQ(client.call(kTestInterface, "Echo", "s", "after"), "");
+}
+
 TEST_F(PrivateSocketTest, ASlowConnectionDelaysNobody) {
   auto slow = server_.socketClient();
   ASSERT_EQ(slow.call(kTestInterface, "Echo", "s", ""), "");

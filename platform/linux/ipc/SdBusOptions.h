@@ -23,7 +23,7 @@ struct SdBusOptions {
   Duration authenticationTimeout = 5s;
   // One incoming message on a private socket, headers included.
   std::size_t messageBytes = 4u << 20;
-  // Unread messages of one client, besides the one that is being written.
+  // Unread messages of one client, besides the one that is being written and the largest other.
   std::size_t queuedBytes = 16u << 20;
   // Calls of one connection that are not answered yet.
   std::size_t callsUnderWay = 1024;
