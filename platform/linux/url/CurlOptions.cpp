@@ -41,7 +41,6 @@ void setCommonOptions(CURL* handle, const CurlSettings& settings, CURLSH* share)
   curl_easy_setopt(handle, CURLOPT_PATH_AS_IS, 1L);
   curl_easy_setopt(handle, CURLOPT_ACCEPT_ENCODING, "gzip");
   curl_easy_setopt(handle, CURLOPT_HTTP_VERSION, static_cast<long>(CURL_HTTP_VERSION_2TLS));
-  curl_easy_setopt(handle, CURLOPT_PIPEWAIT, settings.multiplexes ? 1L : 0L);
   curl_easy_setopt(handle, CURLOPT_SUPPRESS_CONNECT_HEADERS, 1L);
   // The environment's proxies and exceptions do not count.
   curl_easy_setopt(handle, CURLOPT_PROXY, "");

@@ -51,7 +51,9 @@ std::string endpointText(const std::string& address, long port) {
 }  // namespace
 
 CurlTransfer::CurlTransfer(const CurlSettings& settings, CURLSH* share)
-    : handle_(curl_easy_init()), hasFastOpen_(settings.fastOpen) {
+    : handle_(curl_easy_init()),
+      hasFastOpen_(settings.fastOpen),
+      multiplexes_(settings.multiplexes) {
   ZK_CHECK(handle_, "an easy handle is made");
   setCommonOptions(handle_, settings, share);
   _setCallbacks();
@@ -104,6 +106,9 @@ void CurlTransfer::restart(std::shared_ptr<const URLRequest> request) {
   if (url.size() > kLongURL) {
     curl_easy_setopt(handle_, CURLOPT_UPLOAD_BUFFERSIZE, kLargeUploadBuffer);
   }
+  // Plain HTTP is 1.1 here: requests would wait for the first answer to learn that.
+  const bool mayShareConnection = multiplexes_ && strncasecmp(url.c_str(), "https:", 6) == 0;
+  curl_easy_setopt(handle_, CURLOPT_PIPEWAIT, mayShareConnection ? 1L : 0L);
   headerLines_.set(*order_.request);
   curl_easy_setopt(handle_, CURLOPT_HTTPHEADER, headerLines_.list());
   _setMethodAndBody();

@@ -80,6 +80,7 @@ class CurlTransfer final {
   // Fixed after construction.
   CURL* const handle_;
   const bool hasFastOpen_;
+  const bool multiplexes_;
 
   // Of the task.
   std::shared_ptr<CurlURLTask> task_;

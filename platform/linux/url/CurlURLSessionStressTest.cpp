@@ -71,5 +71,32 @@ TEST(CurlURLSessionStressTest, SessionsEndWhileTasksCompleteAndAreCancelled) {
   lastOnes.wait(kRounds);
 }
 
+TEST(CurlURLSessionStressTest, AnswersWhileAllDownloadsFromTheHostStall) {
+  constexpr std::size_t kDownloads = 48;
+  const auto certificate = TestCertificate::make("127.0.0.1");
+  const URLTestFile roots(certificate.certificate);
+  for (const bool isSecure : {false, true}) {
+    SCOPED_TRACE(isSecure ? "https" : "http");
+    TestHTTPServer server(isSecure ? std::optional(certificate) : std::nullopt);
+    server.reply("/image", TestHTTPReply::hanging());
+    server.reply("/", TestHTTPReply::make(200, "hello"));
+    URLSessionTestBed bed({.rootsFile = roots.path()});
+    const auto session = bed.make({.name = "test", .pipelining = true});
+    URLResults stalled;
+    std::vector<std::shared_ptr<URLTask>> downloads;
+    for (std::size_t i = 0; i < kDownloads; ++i) {
+      downloads.push_back(
+          session->downloadTask({.url = server.url("/image")}, stalled.completion()));
+      downloads.back()->resume();
+    }
+    for (int i = 0; i < 3; ++i) {
+      EXPECT_EQ(loadURL(*session, {.url = server.url("/")}).text(), "hello");
+    }
+    EXPECT_EQ(stalled.count(), 0u);
+    for (const auto& download : downloads) download->cancel();
+    stalled.wait(kDownloads);
+  }
+}
+
 }  // namespace
 }  // namespace zelkord
