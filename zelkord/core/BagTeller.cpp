@@ -31,8 +31,13 @@ void BagTeller::end() {
   released = std::move(observation_);
 }
 
+bool BagTeller::_hasEnded() const {
+  const MutexLock lock(mutex_);
+  return ended_;
+}
+
 void BagTeller::_deliverAsOftenAsWanted() {
-  for (unsigned wanted = deliveriesWanted_; wanted > 0;) {
+  for (unsigned wanted = deliveriesWanted_; wanted > 0 && !_hasEnded();) {
     _deliver();
     wanted = deliveriesWanted_.fetch_sub(wanted) - wanted;
   }
@@ -41,10 +46,12 @@ void BagTeller::_deliverAsOftenAsWanted() {
 void BagTeller::_deliver() {
   const auto state = state_.get();
   state->bag(userAgent_.get(), [this, &state](const auto& bag, const auto& error) {
+    if (_hasEnded()) return;
     _logDelivery(*state, bag.get(), error);
     const MutexLock lock(mutex_);
     _tell(bag.get(), error);
   });
+  if (_hasEnded()) return;
   _observeChanges();
   _catchUp();
   assembly_.clientStateManager()->saveState();

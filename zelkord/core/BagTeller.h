@@ -33,6 +33,7 @@ class BagTeller final : public std::enable_shared_from_this<BagTeller> {
   void end();
 
  private:
+  bool _hasEnded() const;
   void _deliverAsOftenAsWanted();
   void _deliver();
   void _logDelivery(const ClientState& state, const ZLKBag* bag,
@@ -50,7 +51,7 @@ class BagTeller final : public std::enable_shared_from_this<BagTeller> {
   Guarded<std::shared_ptr<ClientState>> state_;
   Guarded<std::optional<std::string>> userAgent_;
   std::atomic<unsigned> deliveriesWanted_ = 0;
-  Mutex mutex_;
+  mutable Mutex mutex_;
   Subscription observation_ ZK_GUARDED_BY(mutex_);
   std::shared_ptr<const json::object> told_ ZK_GUARDED_BY(mutex_);  // null: none, or an error
   unsigned changes_ ZK_GUARDED_BY(mutex_) = 0;

@@ -76,6 +76,19 @@ TEST_F(BagTellerTest, DoesNotCallAClientThatHasGone) {
   });
   bed_.fakes.timeline.advance(5s);
   EXPECT_FALSE(bed_.fakes.log.contains("remote proxy error"));
+  EXPECT_FALSE(bed_.fakes.log.contains("sending bag"));
+}
+
+TEST_F(BagTellerTest, DoesNotWaitForABagForAClientThatHasGone) {
+  const auto& assembly = bed_.daemon.assembly();
+  const auto teller = std::make_shared<BagTeller>(bed_.daemon.assembly(),
+                                                  std::make_shared<InterruptedConnection>(nullptr));
+  teller->clientConfigured(assembly.clientStateManager()->stateForClientIdentifier("lanthe"),
+                           "Lanthe/9");
+  teller->end();
+  const auto begin = bed_.fakes.timeline.now();
+  bed_.run();
+  EXPECT_EQ(bed_.fakes.timeline.now(), begin);
 }
 
 TEST_F(BagTellerTest, HidesTheQueriesOfABagsURLsInTheLog) {
