@@ -136,9 +136,10 @@ void ClientStateManager::processImagesFromResponse(const json::value& response, 
 
 void ClientStateManager::loadImages(const std::vector<ImageDescriptor>& descriptors,
                                     SteadyTime deadline,
-                                    const std::function<void(LoadedImages)>& completion) {
+                                    const std::function<void(LoadedImages)>& completion,
+                                    std::shared_ptr<ImageWait> wait) {
   auto* images = assembly_.responseImages();
-  images ? images->loadImages(descriptors, deadline, completion) : completion({});
+  images ? images->loadImages(descriptors, deadline, completion, std::move(wait)) : completion({});
 }
 
 void ClientStateManager::request(const std::shared_ptr<ZLKRequest>& request,

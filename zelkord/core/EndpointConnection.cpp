@@ -32,8 +32,10 @@ void EndpointConnection::start(const std::weak_ptr<ipc::Connection>& connection)
 }
 
 void EndpointConnection::invalidated() {
-  ended_ = true;
   timer_->cancel();
+  const MutexLock lock(mutex_);
+  ended_ = true;
+  if (wait_) wait_->giveUp();
 }
 
 void EndpointConnection::handle(ipc::Call call) {
@@ -80,11 +82,20 @@ void EndpointConnection::_loadImages(const ipc::Call& call) {
 
 void EndpointConnection::_answerImages(const std::vector<ImageDescriptor>& descriptors,
                                        SteadyTime deadline, ipc::Reply& reply) {
-  const auto manager = ended_ ? nullptr : manager_.lock();
-  if (!manager) return;
-  manager->loadImages(descriptors, deadline, [&reply](LoadedImages images) {
-    reply.send({encodeImages(std::move(images))});
-  });
+  const auto manager = manager_.lock();
+  auto wait = _nextWait();
+  if (!manager || !wait) return;
+  manager->loadImages(
+      descriptors, deadline,
+      [&reply](LoadedImages images) { reply.send({encodeImages(std::move(images))}); },
+      std::move(wait));
+}
+
+std::shared_ptr<ImageWait> EndpointConnection::_nextWait() {
+  const MutexLock lock(mutex_);
+  if (ended_) return nullptr;
+  wait_ = std::make_shared<ImageWait>(assembly_.platform().queues);
+  return wait_;
 }
 
 }  // namespace zelkord

@@ -1,12 +1,13 @@
 #pragma once
 
-#include <atomic>
 #include <memory>
 #include <vector>
 
+#include "base/Mutex.h"
 #include "platform/api/Interprocess.h"
 #include "platform/api/WorkQueues.h"
 #include "zelkord/core/IdleTimer.h"
+#include "zelkord/query/ImageWait.h"
 #include "zelkord/query/ImageWalk.h"
 
 namespace zelkord {
@@ -18,7 +19,8 @@ class ClientStateManager;
 // seconds without a message or a call under way.
 //
 // Threading: on the connection's queue. Images, which may take until their deadline, are loaded on
-// a queue of their own, one call at a time; those that wait at the connection's end are dropped.
+// a queue of their own, one call at a time. The connection's end drops the calls that wait for
+// their turn, and gives up the one that waits for its images.
 class EndpointConnection final : public ipc::CallHandler,
                                  public std::enable_shared_from_this<EndpointConnection> {
  public:
@@ -33,12 +35,17 @@ class EndpointConnection final : public ipc::CallHandler,
   void _loadImages(const ipc::Call& call);
   void _answerImages(const std::vector<ImageDescriptor>& descriptors, SteadyTime deadline,
                      ipc::Reply& reply);
+  // What the next call waits on; null after the end.
+  std::shared_ptr<ImageWait> _nextWait();
 
   Assembly& assembly_;
   const std::weak_ptr<ClientStateManager> manager_;
   const std::unique_ptr<SerialQueue> imagesQueue_;
   std::shared_ptr<IdleTimer> timer_;
-  std::atomic<bool> ended_ = false;
+
+  Mutex mutex_;
+  bool ended_ ZK_GUARDED_BY(mutex_) = false;
+  std::shared_ptr<ImageWait> wait_ ZK_GUARDED_BY(mutex_);  // of the newest call
 };
 
 }  // namespace zelkord

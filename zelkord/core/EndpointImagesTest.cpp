@@ -113,13 +113,16 @@ TEST_F(EndpointImagesTest, EndsWithTheLastImageHoweverLongItMayWait) {
 
 TEST_F(EndpointImagesTest, DropsWhatWaitsWhenTheClientGoes) {
   const auto client = connect();
-  ask(client, {image("a")}, 1000);
-  ask(client, {image("b")}, 1000);
-  const auto departure = bed_.fakes.timeline.global(QualityOfService::Default).after(100ms, [&] {
-    client->disconnect();
-  });
-  bed_.fakes.timeline.advance(10s);
+  auto& timeline = bed_.fakes.timeline;
+  const auto begin = timeline.now();
+  ask(client, {image("a")}, 400'000);
+  ask(client, {image("b")}, 400'000);
+  const auto departure =
+      timeline.global(QualityOfService::Default).after(100ms, [&] { client->disconnect(); });
+  timeline.advance(10s);
   EXPECT_EQ(downloads(), 1u);
+  // The wait for the first one is over too.
+  EXPECT_EQ(timeline.now() - begin, 10s);
 }
 
 TEST(EncodedImagesTest, AreAsManyAsFitIntoOneArray) {

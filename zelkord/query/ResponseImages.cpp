@@ -7,6 +7,7 @@
 #include "zelkord/network/URLHost.h"
 #include "zelkord/network/ZelkorBagController.h"
 #include "zelkord/query/ArrivedImages.h"
+#include "zelkord/query/ImageWait.h"
 
 namespace zelkord {
 namespace {
@@ -69,17 +70,18 @@ void ResponseImages::_add(const ImageHosts& hosts) {
 
 void ResponseImages::loadImages(const std::vector<ImageDescriptor>& descriptors,
                                 SteadyTime deadline,
-                                const std::function<void(LoadedImages)>& completion) {
+                                const std::function<void(LoadedImages)>& completion,
+                                std::shared_ptr<ImageWait> wait) {
   const auto bag = assembly_.bagController()->currentBag();
   if (!bag) return completion({});
   OrderedImages images;
   for (const auto& descriptor : descriptors) {
     collectOrderedImages(descriptor, *bag, nullptr, images);
   }
-  const std::shared_ptr<Group> group = assembly_.platform().queues.makeGroup();
-  const auto arrived = _fetch(images, *bag, group);
+  if (!wait) wait = std::make_shared<ImageWait>(assembly_.platform().queues);
+  const auto arrived = _fetch(images, *bag, wait);
   const auto now = assembly_.platform().clock.realNow();
-  group->wait(deadline > now ? deadline - now : Duration::zero());
+  wait->wait(deadline > now ? deadline - now : Duration::zero());
   completion(_loaded(descriptors, *bag, *arrived));
 }
 
@@ -110,7 +112,7 @@ bool ResponseImages::_mayFetch(const std::string& url, const ImageHosts& hosts) 
 
 std::shared_ptr<ArrivedImages> ResponseImages::_fetch(const OrderedImages& images,
                                                       const ZLKBag& bag,
-                                                      const std::shared_ptr<Group>& group) {
+                                                      const std::shared_ptr<ImageWait>& wait) {
   const auto arrived = std::make_shared<ArrivedImages>();
   if (images.seen.empty()) return arrived;
   const auto hosts = _validHosts(bag);
@@ -124,11 +126,11 @@ std::shared_ptr<ArrivedImages> ResponseImages::_fetch(const OrderedImages& image
       if (!_mayFetch(url, *hosts)) continue;
       const auto future = assembly_.imageFetcher()->fetchImageData(
           url, bag.timeoutIntervalForRequest(), acceptsRedirect);
-      group->enter();
-      future.then([weak = std::weak_ptr(arrived), url, group, &queue](const auto& image) {
+      wait->enter();
+      future.then([weak = std::weak_ptr(arrived), url, wait, &queue](const auto& image) {
         const auto wanted = weak.lock();
         if (wanted && image) wanted->add(url, *image);
-        queue.async([group] { group->leave(); });
+        queue.async([wait] { wait->leave(); });
       });
     }
   }

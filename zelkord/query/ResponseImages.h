@@ -17,6 +17,7 @@ namespace zelkord {
 class Assembly;
 
 class ArrivedImages;
+class ImageWait;
 
 // Bytes by URL or identifier, each once, in the order in which they were asked for.
 using LoadedImages = std::vector<std::pair<std::string, Data>>;
@@ -36,19 +37,22 @@ class ResponseImages final : public std::enable_shared_from_this<ResponseImages>
   // Calls back, on the caller's thread, with what is there at `deadline` (on the clock's real
   // time), blocking until then unless everything has come or failed before. What comes later is
   // in the URL cache for the next time. An image is filed under its identifier when only the
-  // identifier's URL gave it. Nothing without a bag.
+  // identifier's URL gave it. What comes after some 128 MiB is left out. Nothing without a bag. By
+  // `wait`, when there is one, somebody else may give the wait up.
   void loadImages(const std::vector<ImageDescriptor>& descriptors, SteadyTime deadline,
-                  const std::function<void(LoadedImages)>& completion);
+                  const std::function<void(LoadedImages)>& completion,
+                  std::shared_ptr<ImageWait> wait = nullptr);
 
  private:
   using Hosts = std::shared_ptr<const ImageHosts>;
+
   void _allow(ImageHosts hosts);
   void _add(const ImageHosts& hosts);
   Hosts _validHosts(const ZLKBag& bag);
   bool _mayFetch(const std::string& url, const ImageHosts& hosts) const;
-  // Each image enters the group until it has come, or failed.
+  // Each image is waited for until it has come, or failed.
   std::shared_ptr<ArrivedImages> _fetch(const OrderedImages& images, const ZLKBag& bag,
-                                        const std::shared_ptr<Group>& group);
+                                        const std::shared_ptr<ImageWait>& wait);
   LoadedImages _loaded(const std::vector<ImageDescriptor>& descriptors, const ZLKBag& bag,
                        const ArrivedImages& arrived) const;
   std::string _shown(const std::string& url) const;
