@@ -22,8 +22,8 @@ class DownloadLine final {
   enum class Connections { OneEach, Shared };
 
   static constexpr std::size_t kMostUnderWay = 48;
-  static constexpr std::size_t kMostOfOneHost = 6;
-  static constexpr std::size_t kMostOnSharedConnection = 24;
+  static constexpr std::size_t kMostOfOneHost = 16;
+  static constexpr std::size_t kMostOnSharedConnection = 32;
   static constexpr std::size_t kMostWaiting = 10'000;
 
   // False, without taking it, when too many wait already.

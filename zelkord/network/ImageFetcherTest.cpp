@@ -205,13 +205,13 @@ TEST_F(ImageFetcherTest, TakesFewConnectionsForManyImages) {
   std::vector<ZLKFuture<Image>> images;
   for (int i = 0; i < 40; ++i) images.push_back(fetch("https://img.example/" + std::to_string(i)));
   const auto other = fetch("https://other.example/");
-  ASSERT_EQ(session().pending().size(), 7u);
-  EXPECT_EQ(recorded<HVStartNetworkSearchFeedback>().size(), 7u);
+  ASSERT_EQ(session().pending().size(), 17u);
+  EXPECT_EQ(recorded<HVStartNetworkSearchFeedback>().size(), 17u);
   const auto first = session().pending().front();
   first->setTimingData({.protocol = "h2"});
   first->succeed(200, "bytes");
   fakes_.timeline.runUntilIdle();
-  EXPECT_EQ(session().pending().size(), 25u);
+  EXPECT_EQ(session().pending().size(), 33u);
 
   while (!session().pending().empty()) {
     session().pending().front()->succeed(200, "bytes");
