@@ -104,7 +104,9 @@ TEST_F(CachingURLSessionTest, GoesToTheNetworkWhenTheCacheMayNotAnswer) {
     EXPECT_EQ(loadURL(*session_, second).text(), "2");
     EXPECT_EQ(askedWith("If-None-Match"), "");
     EXPECT_EQ(asked(), before + 2);
-    if (std::string_view(name) == "changed by a post") EXPECT_EQ(text(path), "3");
+    if (std::string_view(name) == "changed by a post") {
+      EXPECT_EQ(text(path), "3");
+    }
   }
 }
 
@@ -164,7 +166,9 @@ TEST_F(CachingURLSessionTest, TakesWhatComesInsteadOfA304) {
     for (const auto& one : replies) server_.reply(path, one);
     for (const auto& body : bodies) {
       const auto outcome = load(path);
-      if (body != "*") EXPECT_EQ(outcome.text(), body);
+      if (body != "*") {
+        EXPECT_EQ(outcome.text(), body);
+      }
       EXPECT_EQ(outcome.request.headers, HTTPHeaders{});
     }
   }
@@ -247,15 +251,16 @@ TEST_F(CachingURLSessionTest, RunsCompletionsOneAtATimeAndNeverInline) {
   std::atomic<bool> overlapped = false, inlined = false;
   const auto thread = std::this_thread::get_id();
   for (int i = 0; i < 50; ++i) {
-    const auto task = session_->dataTask(
-        {.url = server_.url(i % 2 ? "/fresh" : "/other")},
-        [&, done = results.completion()](const std::shared_ptr<URLTask>& task, const auto& result) {
-          if (++running > 1) overlapped = true;
-          if (std::this_thread::get_id() == thread) inlined = true;
-          std::this_thread::yield();
-          --running;
-          done(task, result);
-        });
+    const auto task =
+        session_->dataTask({.url = server_.url(i % 2 ? "/fresh" : "/other")},
+                           [&, done = results.completion()](
+                               const std::shared_ptr<URLTask>& finished, const auto& result) {
+                             if (++running > 1) overlapped = true;
+                             if (std::this_thread::get_id() == thread) inlined = true;
+                             std::this_thread::yield();
+                             --running;
+                             done(finished, result);
+                           });
     task->resume();
   }
   results.wait(50);
@@ -277,7 +282,9 @@ TEST_F(CachingURLSessionTest, EndsWithTasksUnderWay) {
           session_->dataTask({.url = server_.url(path)}, [probe](const auto&, const auto&) {});
       task->resume();
     }
-    if (std::string_view(path) == "/loading") EXPECT_TRUE(server_.waitForRequests(before + 4));
+    if (std::string_view(path) == "/loading") {
+      EXPECT_TRUE(server_.waitForRequests(before + 4));
+    }
     session_.reset();
     // One that is looking may hold the session for a moment longer.
     for (int i = 0; i < 10'000 && probe.use_count() > 1; ++i) std::this_thread::sleep_for(1ms);
