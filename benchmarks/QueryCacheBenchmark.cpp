@@ -48,8 +48,9 @@ struct FullCache {
     ++firstLetters[input];
     const json::object resultSet = {
         {"query", query}, {"completion_score", 0.5}, {"max_age", 3'600}};
-    cache->set(CachedResultSet::Pointer(
-        new CachedResultSet(input, {}, resultSet, "uuid", Data("x"), clock.now())));
+    const auto response = std::make_shared<const FetchedResponse>(input, URLRequest(), "uuid",
+                                                                  Data("x"), clock.now());
+    cache->set(CachedResultSet::Pointer(new CachedResultSet(response, resultSet)));
   }
   std::size_t stored() const {
     std::size_t sum = 0;

@@ -10,7 +10,8 @@
 
 namespace zelkord {
 
-// The last records of a session, bounded: the oldest go first.
+// The last records of a session, bounded by their number and, since their texts come from clients
+// and services, by about 4 MiB: the oldest go first. The newest is always kept.
 // Threading: any thread.
 class RecentRecords final {
  public:
@@ -23,9 +24,17 @@ class RecentRecords final {
   std::uint64_t total() const;
 
  private:
+  static constexpr std::size_t kMaximumBytes = 4 * 1024 * 1024;
+
+  struct Record {
+    ZelkorFeedback feedback;
+    std::size_t bytes = 0;  // of its texts
+  };
+
   const std::size_t limit_;
   mutable Mutex mutex_;
-  std::deque<ZelkorFeedback> records_ ZK_GUARDED_BY(mutex_);
+  std::deque<Record> records_ ZK_GUARDED_BY(mutex_);
+  std::size_t bytes_ ZK_GUARDED_BY(mutex_) = 0;
   std::uint64_t total_ ZK_GUARDED_BY(mutex_) = 0;
 };
 

@@ -21,17 +21,23 @@ std::uint32_t lengthOf(const std::string& text) {
 
 }  // namespace
 
-CachedResultSet::CachedResultSet(std::string_view input, const URLRequest& request,
-                                 const json::object& resultSet, std::string uuid, Data data,
-                                 SteadyTime now)
+FetchedResponse::FetchedResponse(std::string_view typed, const URLRequest& request,
+                                 std::string identifier, Data body, SteadyTime now)
+    : input(lowercased(typed)),
+      inputLength(lengthOf(input)),
+      uiScale(scaleOf(request)),
+      uuid(std::move(identifier)),
+      data(std::move(body)),
+      arrival(now) {}
+
+CachedResultSet::CachedResultSet(std::shared_ptr<const FetchedResponse> response,
+                                 const json::object& resultSet)
     : completionScore_(static_cast<float>(numberIn(resultSet, "completion_score").value_or(0))),
-      expireTime_(_expiryOf(resultSet, now)),
-      uiScale_(scaleOf(request)),
-      input_(lowercased(input)),
-      query_(lowercased(stringIn(resultSet, "query").value_or(""))),
-      uuid_(std::move(uuid)),
-      data_(std::move(data)) {
-  inputLength_ = lengthOf(input_);
+      inputLength_(response->inputLength),
+      expireTime_(_expiryOf(resultSet, response->arrival)),
+      uiScale_(response->uiScale),
+      response_(std::move(response)),
+      query_(lowercased(stringIn(resultSet, "query").value_or(""))) {
   queryLength_ = lengthOf(query_);
 }
 

@@ -23,9 +23,9 @@ class QueryCacheTest : public testing::Test {
     if (entry.scale > 0) request.headers = {{"X-Quenta-UI-Scale", std::to_string(entry.scale)}};
     const json::object resultSet = {
         {"query", entry.query}, {"completion_score", entry.score}, {"max_age", entry.maxAge}};
-    cache_->set(CachedResultSet::Pointer(new CachedResultSet(entry.input, request, resultSet,
-                                                             "uuid", Data(std::move(body)),
-                                                             bed_.fakes.timeline.now())));
+    const auto response = std::make_shared<const FetchedResponse>(
+        entry.input, request, "uuid", Data(std::move(body)), bed_.fakes.timeline.now());
+    cache_->set(CachedResultSet::Pointer(new CachedResultSet(response, resultSet)));
     bed_.fakes.timeline.runUntilIdle();
   }
   std::string found(const std::string& text, double scale = 0) {

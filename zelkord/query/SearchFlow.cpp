@@ -77,13 +77,13 @@ void SearchFlow::_cacheResponse(const json::value& rawResponse, const Data& data
   auto* cache = state_->queryCache();
   const auto* entries = rawResponse.if_array();
   if (!cache || !entries || request_->queryString.empty()) return;
-  const auto now = assembly_.platform().clock.now();
+  const auto response = std::make_shared<const FetchedResponse>(
+      request_->queryString, httpRequest_, request_->uuid, data, assembly_.platform().clock.now());
   std::vector<CachedResultSet::Pointer> resultSets;
   for (const auto& entry : *entries) {
     const auto* resultSet = entry.if_object();
     if (!resultSet || !mayBeCached(*resultSet)) continue;
-    resultSets.emplace_back(new CachedResultSet(request_->queryString, httpRequest_, *resultSet,
-                                                request_->uuid, data, now));
+    resultSets.emplace_back(new CachedResultSet(response, *resultSet));
     if (resultSets.size() == kSetsAtOnce) cache->set(std::exchange(resultSets, {}));
   }
   cache->set(std::move(resultSets));
