@@ -75,7 +75,9 @@ std::optional<Data> BodyFiles::map(std::int64_t id, std::uint64_t size) {
 void BodyFiles::remove(std::int64_t id) { ::unlinkat(open_.get(), bodyFileName(id).c_str(), 0); }
 
 void BodyFiles::removeUnless(FunctionRef<bool(std::int64_t id)> isKnown) {
-  const std::unique_ptr<DIR, int (*)(DIR*)> listing(::opendir(folder_.c_str()), ::closedir);
+  const auto folder = _openFolder();
+  const std::unique_ptr<DIR, int (*)(DIR*)> listing(
+      ::fdopendir(::fcntl(folder.get(), F_DUPFD_CLOEXEC, 0)), ::closedir);
   if (!listing) return;
   std::vector<std::string> orphans;
   while (const auto* file = ::readdir(listing.get())) {
