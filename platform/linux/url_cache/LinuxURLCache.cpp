@@ -20,8 +20,8 @@ LinuxURLCache::LinuxURLCache(const Host& host, const URLSessionConfiguration::Ca
       maximumOnDisk_(limits.diskBytes / 10),
       index_(limits.diskBytes),
       memory_(limits.memoryBytes),
-      queue_(host.queues.makeSerialQueue("URLCache")),
-      disk_(host.folder, limits.minimumMappedBytes, Logger(host.log, "")) {}
+      disk_(host.folder, limits.minimumMappedBytes, Logger(host.log, "")),
+      queue_(host.queues.makeSerialQueue("URLCache")) {}
 
 LinuxURLCache::~LinuxURLCache() {
   if (queue_->isCurrent()) {

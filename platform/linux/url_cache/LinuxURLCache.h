@@ -100,11 +100,12 @@ class LinuxURLCache final : public URLCache {
   CacheIndex::Ids removed_ ZK_GUARDED_BY(mutex_);  // from the disk, as soon as may be
   bool writeScheduled_ ZK_GUARDED_BY(mutex_) = false;
 
-  const std::unique_ptr<SerialQueue> queue_;
-
   // Queue state.
   DiskPart disk_ ZK_ON(queue_);
   unsigned knownResets_ ZK_ON(queue_) = 0;
+
+  // The first to go: what still runs on it needs the rest.
+  const std::unique_ptr<SerialQueue> queue_;
 };
 
 }  // namespace zelkord

@@ -158,6 +158,29 @@ TEST_F(LinuxURLCacheTest, RemovesFilesOfWhichNobodyKnows) {
   EXPECT_EQ(countOfBodies(bed_.folder), 2);
 }
 
+TEST_F(LinuxURLCacheTest, RemovesNothingBehindALink) {
+  fs::create_directory(state_ / "elsewhere");
+  state_.write("elsewhere/0000000000000001.body", "of somebody else");
+  fs::create_directory_symlink(state_ / "elsewhere", bed_.folder);
+  EXPECT_EQ(bed_.find("http://h/"), std::nullopt);
+  bed_.stop();
+  EXPECT_TRUE(state_.has("elsewhere/0000000000000001.body"));
+}
+
+TEST_F(LinuxURLCacheTest, EndsWhileItOpens) {
+  bed_.store("http://h/a", bigBody('a'));
+  for (int i = 0; i < 50; ++i) {
+    bed_.restart();
+    if (i % 2 == 0) {
+      bed_.cache->mayHave("http://h/a");
+    } else {
+      bed_.cache->find({.url = "http://h/a"}, [](const StoredPointer&) {});
+    }
+  }
+  bed_.restart();
+  EXPECT_EQ(bed_.find("http://h/a"), bigBody('a'));
+}
+
 TEST_F(LinuxURLCacheTest, StoresAndFindsOnManyThreads) {
   const auto body = [](int key) {
     return std::string(key % 2 ? 6'000 : 100, char('a' + key % 26));
