@@ -155,15 +155,27 @@ void LinuxURLCache::_add(const Digest& key, const URLRequest& request, StoredPoi
   memory_.put(entry.id, stored);
   if (goesToDisk) {
     waiting_.emplace(entry.id, Waiting{{entry, std::move(stored)}});
-  } else if (!memory_.has(entry.id)) {
-    index_.remove(entry.id);
+  } else {
+    _notOnDisk(entry.id);
   }
   _scheduleWrite();
 }
 
+void LinuxURLCache::_notOnDisk(std::int64_t id) {
+  if (!memory_.has(id)) {
+    index_.remove(id);
+    std::erase(removed_, id);  // dropped while it was being written
+  } else {
+    memoryOnly_.insert(id);
+  }
+}
+
+// What never was on disk is not to be removed from it: the list would grow for as long as nothing
+// can be written.
 void LinuxURLCache::_drop(std::int64_t id) {
   index_.remove(id);
   memory_.remove(id);
+  if (memoryOnly_.erase(id) > 0) return;
   const auto found = waiting_.find(id);
   if (found != waiting_.end() && !found->second.beingWritten) {
     waiting_.erase(found);
@@ -221,9 +233,7 @@ void LinuxURLCache::_write() {
 void LinuxURLCache::_settle(const DiskPart::Changes& changes, const DiskPart::Outcome& outcome) {
   const MutexLock lock(mutex_);
   for (const auto& record : changes.added) waiting_.erase(record.entry.id);
-  for (const auto id : outcome.notAdded) {
-    if (!memory_.has(id)) index_.remove(id);
-  }
+  for (const auto id : outcome.notAdded) _notOnDisk(id);
   // Tried again with what is written next.
   if (!outcome.removedRows) {
     removed_.insert(removed_.end(), changes.removed.begin(), changes.removed.end());
@@ -237,6 +247,7 @@ void LinuxURLCache::_forgetAllAfterReset() {
   index_.clear();
   memory_.clear();
   waiting_.clear();
+  memoryOnly_.clear();
   removed_.clear();
 }
 

@@ -6,6 +6,7 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <unordered_set>
 
 #include "base/Mutex.h"
 #include "platform/api/Clock.h"
@@ -83,6 +84,7 @@ class LinuxURLCache final : public URLCache {
   void _scheduleWrite() ZK_REQUIRES(mutex_);
   void _write();
   DiskPart::Changes _takeChanges();
+  void _notOnDisk(std::int64_t id) ZK_REQUIRES(mutex_);
   void _settle(const DiskPart::Changes& changes, const DiskPart::Outcome& outcome);
   void _forgetAllAfterReset();
   void _removeOrphans();
@@ -97,6 +99,8 @@ class LinuxURLCache final : public URLCache {
   CacheIndex index_ ZK_GUARDED_BY(mutex_);
   MemoryPart memory_ ZK_GUARDED_BY(mutex_);
   std::map<std::int64_t, Waiting> waiting_ ZK_GUARDED_BY(mutex_);  // to be written
+  // Held in memory only: they could not be written, or are too large for it.
+  std::unordered_set<std::int64_t> memoryOnly_ ZK_GUARDED_BY(mutex_);
   CacheIndex::Ids removed_ ZK_GUARDED_BY(mutex_);  // from the disk, as soon as may be
   bool writeScheduled_ ZK_GUARDED_BY(mutex_) = false;
 
