@@ -31,7 +31,7 @@ void readAsIndex(const TemporaryDirectory& state, std::string_view bytes) {
     ZK_CHECK(entry.id > 0, "ids are positive");
     disk.read(entry);
   }
-  CacheRecord record{{.id = std::int64_t{1} << 62, .url = cacheKeyOf("http://host/")},
+  CacheRecord record{{.id = std::int64_t{1} << 62, .url = cacheKeyOf("http://host/"), .cost = 4},
                      std::make_shared<const StoredResponse>(StoredResponse{.body = Data("body")})};
   const auto outcome = disk.write({.added = {record}});
   if (disk.resets() > 0) return;  // a file that broke only now; the next one begins empty

@@ -3,6 +3,8 @@
 #include <sqlite3.h>
 #include <unistd.h>
 
+#include "platform/linux/url_cache/CacheVary.h"
+
 namespace zelkord {
 namespace {
 
@@ -11,7 +13,8 @@ constexpr std::int64_t kApplicationId = 0x7A6C6B63;
 constexpr std::int64_t kVersion = 1;
 constexpr int kForeignCode = -1;  // none of SQLite's
 constexpr std::int64_t kMaximumCount = std::int64_t{1} << 62;
-constexpr std::int64_t kMaximumEntryCost = std::int64_t{1} << 40;
+constexpr std::int64_t kMaximumEntryCost = std::int64_t{1} << 30;
+constexpr std::size_t kMaximumRows = 2 * CacheIndex::kMaximumCount;
 
 // Little memory, a short log, and nothing in a foreign file runs. Nobody else opens the file.
 constexpr const char* kSettings =
@@ -21,28 +24,29 @@ constexpr const char* kSettings =
 // The size of the file follows what is in it. Only VACUUM changes that once there is a file.
 constexpr const char* kNewFile = "PRAGMA auto_vacuum=INCREMENTAL; VACUUM";
 
-constexpr const char* kTables =
-    "BEGIN IMMEDIATE;"
+// As it stands in the schema, too.
+constexpr const char* kEntriesTable =
     "CREATE TABLE entries(id INTEGER PRIMARY KEY, url BLOB NOT NULL, vary TEXT NOT NULL,"
     " variant BLOB NOT NULL, cost INTEGER NOT NULL, used INTEGER NOT NULL, head BLOB NOT NULL,"
-    " digest BLOB NOT NULL, size INTEGER NOT NULL, body BLOB);"
-    "PRAGMA application_id=2053925731; PRAGMA user_version=1; COMMIT";
+    " digest BLOB NOT NULL, size INTEGER NOT NULL, body BLOB)";
+constexpr const char* kMark = "; PRAGMA application_id=2053925731; PRAGMA user_version=1; COMMIT";
 static_assert(kApplicationId == 2053925731 && kVersion == 1);
 
-sqlite::Failure foreignFile() { return {kForeignCode, "it is of another version"}; }
+sqlite::Failure foreignFile() { return {kForeignCode, "it is of another version or program"}; }
 
 // None for a row that cannot be ours.
 std::optional<CacheEntry> entryOfRow(const sqlite::Statement& rows) {
   const auto url = digestFromBytes(rows.bytes(1));
   const auto variant = digestFromBytes(rows.bytes(3));
+  const auto vary = rows.text(2);
   const auto id = rows.integer(0), cost = rows.integer(4), used = rows.integer(5);
   // Far from the ends: ids and uses are counted on, costs are added up.
   const bool isSane = id > 0 && id <= kMaximumCount && cost >= 0 && cost <= kMaximumEntryCost &&
-                      used >= 0 && used <= kMaximumCount;
+                      used >= 0 && used <= kMaximumCount && vary.size() <= kMaximumVaryNames;
   if (!isSane || !url || !variant) return std::nullopt;
   return CacheEntry{.id = id,
                     .url = *url,
-                    .vary = std::string(rows.text(2)),
+                    .vary = std::string(vary),
                     .variant = *variant,
                     .cost = static_cast<std::uint64_t>(cost),
                     .used = static_cast<std::uint64_t>(used)};
@@ -79,14 +83,23 @@ std::optional<sqlite::Failure> CacheDatabase::_prepareTables() {
   std::optional<sqlite::Failure> failure;
   const auto version = firstNumber(*database_, "PRAGMA user_version", failure);
   const auto application = firstNumber(*database_, "PRAGMA application_id", failure);
-  const auto tables = firstNumber(*database_, "SELECT count(*) FROM sqlite_schema", failure);
+  const auto count = firstNumber(*database_, "SELECT count(*) FROM sqlite_schema", failure);
   if (failure) return failure;
-  if (version == 0 && application == 0 && tables == 0) {
+  if (version == 0 && application == 0 && count == 0) {
     failure = database_->execute(kNewFile);
-    return failure ? failure : database_->execute(kTables);
+    const auto tables = std::string("BEGIN IMMEDIATE; ") + kEntriesTable + kMark;
+    return failure ? failure : database_->execute(tables.c_str());
   }
   if (version != kVersion || application != kApplicationId) return foreignFile();
-  return std::nullopt;
+  return _checkTables();
+}
+
+// Views, triggers and checks that somebody else has made would run with our statements.
+std::optional<sqlite::Failure> CacheDatabase::_checkTables() {
+  auto schema = database_->prepare("SELECT count(*), max(sql) FROM sqlite_schema");
+  const bool isOurs = schema.step() && schema.integer(0) == 1 && schema.text(1) == kEntriesTable;
+  if (schema.failure()) return schema.failure();
+  return isOurs ? std::nullopt : std::optional(foreignFile());
 }
 
 void CacheDatabase::close() {
@@ -103,6 +116,7 @@ std::optional<sqlite::Failure> CacheDatabase::load(std::vector<CacheEntry>& entr
   auto rows = database_->prepare("SELECT id, url, vary, variant, cost, used FROM entries");
   CacheIndex::Ids senseless;
   while (rows.step()) {
+    if (entries.size() + senseless.size() >= kMaximumRows) return foreignFile();
     if (auto entry = entryOfRow(rows)) {
       entries.push_back(*std::move(entry));
     } else {

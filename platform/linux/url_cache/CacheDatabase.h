@@ -57,6 +57,7 @@ class CacheDatabase final {
 
  private:
   std::optional<sqlite::Failure> _prepareTables();
+  std::optional<sqlite::Failure> _checkTables();
   std::optional<sqlite::Failure> _add(const Changes& changes);
   std::optional<sqlite::Failure> _remove(const CacheIndex::Ids& ids);
   std::optional<sqlite::Failure> _use(const CacheIndex::Uses& uses);

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <set>
+#include <utility>
 
 #include "platform/linux/url_cache/CacheDirectives.h"
 
@@ -32,7 +33,7 @@ std::optional<std::string> varyNames(const URLResponse& response) {
   }
   std::string joined;
   for (const auto& name : names) joined += (joined.empty() ? "" : ",") + name;
-  return joined;
+  return joined.size() <= kMaximumVaryNames ? std::optional(std::move(joined)) : std::nullopt;
 }
 
 Digest variantOf(std::string_view names, const URLRequest& request) {

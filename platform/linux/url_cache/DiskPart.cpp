@@ -70,6 +70,7 @@ StoredPointer DiskPart::read(const CacheEntry& entry) {
   StoredPointer stored;
   std::optional<sqlite::Failure> failure;
   const auto take = [&](const CacheDatabase::Row& row) {
+    if (row.bodySize > entry.cost) return;
     auto response = decodeStoredHead(row.head);
     const auto body =
         row.body ? std::optional(Data(std::string(*row.body))) : files_.map(entry.id, row.bodySize);

@@ -88,6 +88,34 @@ TEST(LinuxURLCacheDamageTest, GivesOutNothingThatWasDamaged) {
       {"another program's",
        [](const auto& state) { runSQL(state / kIndexFile, "PRAGMA application_id = 2"); }, false,
        1},
+      {"a trigger",
+       [](const auto& state) {
+         runSQL(state / kIndexFile,
+                "CREATE TRIGGER t BEFORE INSERT ON entries BEGIN SELECT RAISE(IGNORE); END");
+       },
+       false, 1},
+      {"a view in the table's place",
+       [](const auto& state) {
+         runSQL(state / kIndexFile,
+                "DROP TABLE entries; CREATE VIEW entries AS WITH RECURSIVE n(id) AS"
+                " (SELECT 1 UNION ALL SELECT id + 1 FROM n) SELECT id, zeroblob(32) AS url,"
+                " '' AS vary, zeroblob(32) AS variant, 0 AS cost, 0 AS used FROM n");
+       },
+       false, 1},
+      {"rows without end",
+       [](const auto& state) {
+         runSQL(state / kIndexFile,
+                "WITH RECURSIVE n(i) AS (SELECT 3 UNION ALL SELECT i + 1 FROM n LIMIT 20000)"
+                " INSERT INTO entries SELECT i, zeroblob(32), '', zeroblob(32), 0, 0, '', '', 0,"
+                " '' FROM n");
+       },
+       false, 1},
+      {"a body of a terabyte",
+       [](const auto& state) {
+         std::filesystem::resize_file(state / kBodyFile, std::uintmax_t{1} << 40);
+         runSQL(state / kIndexFile, "UPDATE entries SET size = 1 << 40 WHERE id = 1");
+       },
+       true, 0},
       {"other columns",
        [](const auto& state) {
          runSQL(state / kIndexFile, "ALTER TABLE entries DROP COLUMN head");

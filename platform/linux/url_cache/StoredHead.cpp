@@ -23,6 +23,11 @@ void appendText(std::string& bytes, std::string_view text) {
 std::uint64_t nanosecondsOf(WallTime time) {
   return static_cast<std::uint64_t>(time.time_since_epoch().count());
 }
+// From 1896 to 2116: far from the ends, times are subtracted.
+bool isSaneTime(WallTime time) {
+  const auto count = time.time_since_epoch().count();
+  return count > -(std::int64_t{1} << 61) && count < std::int64_t{1} << 62;
+}
 WallTime timeOfNanoseconds(std::uint64_t count) {
   return WallTime(Duration(static_cast<std::int64_t>(count)));
 }
@@ -80,6 +85,7 @@ std::optional<StoredResponse> decodeStoredHead(std::string_view bytes) {
   if (status != 0) stored.response.status = static_cast<int>(status);
   stored.requestedAt = timeOfNanoseconds(reader.number());
   stored.receivedAt = timeOfNanoseconds(reader.number());
+  if (!isSaneTime(stored.requestedAt) || !isSaneTime(stored.receivedAt)) return std::nullopt;
   for (auto count = reader.number(); count > 0 && !reader.failed(); --count) {
     const auto name = reader.text();
     const auto value = reader.text();
