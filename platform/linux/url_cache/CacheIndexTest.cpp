@@ -82,8 +82,7 @@ TEST(CacheIndexTest, BoundsTheNumberOfEntries) {
 
 TEST(MemoryPartTest, HoldsWhatWasUsedLast) {
   const auto sized = [](std::size_t size) {
-    return std::make_shared<const StoredResponse>(
-        storedForTest({{"A", "1"}}, 200, std::string(size - 2, 'x')));
+    return std::make_shared<const StoredResponse>(storedForTest({}, 200, std::string(size, 'x')));
   };
   MemoryPart memory(100);
   for (int id = 1; id <= 4; ++id) memory.put(id, sized(25));
@@ -97,6 +96,13 @@ TEST(MemoryPartTest, HoldsWhatWasUsedLast) {
   memory.put(1, sized(26));
   EXPECT_FALSE(memory.has(1)) << "not the one before either";
   EXPECT_EQ(memory.cost(), 70u);
+}
+
+TEST(MemoryPartTest, CountsWhatManySmallHeadersTake) {
+  MemoryPart memory(4 << 20);
+  const auto many = storedForTest(HTTPHeaders(64 * 1024, {"a", ""}));
+  memory.put(1, std::make_shared<const StoredResponse>(many));
+  EXPECT_FALSE(memory.has(1)) << "4 MiB of strings";
 }
 
 TEST(StoredHeadTest, ReadsBackWhatItWrote) {
@@ -113,6 +119,10 @@ TEST(StoredHeadTest, ReadsBackWhatItWrote) {
     EXPECT_FALSE(decodeStoredHead(std::string_view(bytes).substr(0, size))) << size;
   }
   EXPECT_FALSE(decodeStoredHead(bytes + "x"));
+  for (const auto time : {Duration::min(), Duration::max()}) {
+    stored.receivedAt = WallTime(time);
+    EXPECT_FALSE(decodeStoredHead(encodeStoredHead(stored))) << "an age would overflow";
+  }
 }
 
 }  // namespace

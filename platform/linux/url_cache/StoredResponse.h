@@ -21,7 +21,7 @@ struct StoredResponse {
 
 using StoredPointer = std::shared_ptr<const StoredResponse>;
 
-// What it takes of the cache's limits: its body and headers, in bytes.
+// What it takes of the cache's limits: its body and headers, in bytes, and 64 more a header.
 std::uint64_t costOf(const StoredResponse& stored);
 
 }  // namespace zelkord
