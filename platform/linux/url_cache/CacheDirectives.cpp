@@ -30,6 +30,8 @@ void meetDirective(CacheDirectives& directives, std::string_view element) {
     directives.noStore = true;
   } else if (name == "no-cache") {
     directives.noCache = true;
+  } else if (name == "must-understand") {
+    directives.mustUnderstand = true;
   } else if (name == "max-age") {
     meetMaxAge(directives, directiveSeconds(value));
   } else if (name == "min-fresh") {

@@ -19,6 +19,7 @@ struct CacheDirectives {
 
   bool noStore = false;
   bool noCache = false;  // with field names too
+  bool mustUnderstand = false;
   std::optional<std::chrono::seconds> maxAge;
   std::chrono::seconds minFresh{0};
 };

@@ -13,11 +13,19 @@
 namespace zelkord {
 namespace {
 
-bool hasAnyHeader(const HTTPHeaders& headers, std::initializer_list<const char*> names) {
-  return std::ranges::any_of(headers, [&](const auto& header) {
-    return std::ranges::any_of(
-        names, [&](const char* name) { return strcasecmp(header.first.c_str(), name) == 0; });
-  });
+using Names = std::initializer_list<const char*>;
+
+// What makes a response fresh, or one to ask about.
+constexpr Names kRulesOfCaching = {"Cache-Control", "Expires", "ETag", "Last-Modified"};
+
+bool isOneOf(Names names, const std::string& header) {
+  return std::ranges::any_of(
+      names, [&](const char* name) { return strcasecmp(header.c_str(), name) == 0; });
+}
+
+bool hasAnyHeader(const HTTPHeaders& headers, Names names) {
+  return std::ranges::any_of(headers,
+                             [&](const auto& header) { return isOneOf(names, header.first); });
 }
 
 // Final, and with a whole content of its own.
@@ -45,15 +53,23 @@ CacheDirectives requestDirectives(const URLRequest& request) {
 }
 
 bool saysHowToStore(const URLResponse& response) {
-  return hasAnyHeader(response.headers, {"Cache-Control", "Expires", "ETag", "Last-Modified"});
+  return hasAnyHeader(response.headers, kRulesOfCaching);
+}
+
+void dropRulesOfCaching(URLResponse& response) {
+  std::erase_if(response.headers,
+                [](const auto& header) { return isOneOf(kRulesOfCaching, header.first); });
 }
 
 bool mayBeStored(const URLResult& result, const StoredResponse& candidate) {
   const int status = candidate.response.status.value_or(0);
   if (result.error || !result.data || !isStorableStatus(status)) return false;
   if (!mayAnswerTasks(candidate) || !varyNames(candidate.response)) return false;
+  const auto control = candidate.response.header("Cache-Control").value_or("");
+  const bool isKnown = isHeuristicallyCacheable(status);
+  if (!isKnown && parseCacheDirectives(control).mustUnderstand) return false;
   if (freshnessLifetime(candidate) > std::chrono::seconds(0)) return true;
-  return isHeuristicallyCacheable(status) && hasValidator(candidate.response);
+  return isKnown && hasValidator(candidate.response);
 }
 
 bool mayAnswerTasks(const StoredResponse& stored) {

@@ -44,6 +44,9 @@ TEST(CacheRulesTest, StoresWhatCanBeOfUseAgain) {
       {"Content-Type: application/json\nVary: Accept", 200, false},
       {"Cache-Control: max-age=60", 200, true},
       {"Cache-Control: max-age=60", 500, true},
+      {"Cache-Control: max-age=60", 599, true},
+      {"Cache-Control: max-age=60, must-understand", 599, false},
+      {"Cache-Control: max-age=60, must-understand", 404, true},
       {"Cache-Control: max-age=60", 206, false},
       {"Cache-Control: max-age=60", 304, false},
       {"Cache-Control: private, max-age=60", 200, true},
@@ -82,6 +85,8 @@ TEST(CacheVaryTest, MatchesByTheNamedHeaders) {
   for (const char* hopeless : {"*", "accept, *", "a b", "accept, \"", "\xFF"}) {
     EXPECT_EQ(namesFor(hopeless), std::nullopt) << hopeless;
   }
+  EXPECT_TRUE(namesFor(std::string(kMaximumVaryNames, 'a')));
+  EXPECT_FALSE(namesFor(std::string(kMaximumVaryNames, 'a') + ", b"));
   const auto variant = [](std::string_view headers) {
     return variantOf("accept,x-mode", requestForTest(headers));
   };

@@ -151,6 +151,14 @@ TEST_F(CachingURLSessionTest, TakesWhatComesInsteadOfA304) {
        {TestHTTPReply::make(200, "1", kStaleWithTag),
         TestHTTPReply::make(304, "", {{"ETag", "\"2\""}}), TestHTTPReply::make(200, "2")},
        {"1", "2", "2"}},
+      {"/not-to-be-kept-any-more",
+       {TestHTTPReply::make(200, "1", kStaleWithTag),
+        TestHTTPReply::make(304, "", {{"Cache-Control", "no-store"}}), TestHTTPReply::make(304)},
+       {"1", "1", ""}},
+      {"/varies-with-all-now",
+       {TestHTTPReply::make(200, "1", kStaleWithTag), TestHTTPReply::make(304, "", {{"Vary", "*"}}),
+        TestHTTPReply::make(304)},
+       {"1", "1", ""}},
       {"/redirected-304",
        {TestHTTPReply::make(200, "1", kStaleWithTag), TestHTTPReply::redirect(302, "/not-modified"),
         TestHTTPReply::make(200, "2")},
@@ -201,6 +209,17 @@ TEST_F(CachingURLSessionTest, GivesTasksNothingThatWasStoredByHandAgainstTheRule
       request, {{.status = 200, .headers = {{"Cache-Control", "no-store"}}}, Data("by hand")});
   EXPECT_EQ(session_->cache()->lookup(request)->data.view(), "by hand");
   EXPECT_EQ(text("/"), "network");
+}
+
+TEST_F(CachingURLSessionTest, GivesTasksNothingThatAnotherURLGave) {
+  const URLRequest request{.url = server_.url("/from")};
+  auto headers = kFreshForAMinute;
+  headers.emplace_back("ETag", "\"theirs\"");
+  session_->cache()->store(request, {{server_.url("/to"), 200, headers}, Data("by hand")});
+  EXPECT_EQ(session_->cache()->lookup(request)->data.view(), "by hand");
+  reply("/from", 200, "its own");
+  EXPECT_EQ(text("/from"), "its own");
+  EXPECT_EQ(askedWith("If-None-Match"), "");
 }
 
 TEST_F(CachingURLSessionTest, DownloadsPastTheCache) {

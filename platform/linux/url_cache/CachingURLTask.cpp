@@ -124,7 +124,11 @@ bool CachingURLTask::_settle304(CachingURLSession& session, const URLResult& res
   if (!isOurs || !confirms(*result.response, *asked)) return false;
   auto fresh = freshened(*asked, *result.response, requestedAt, now);
   const auto answer = answerFromCache(request_, fresh, now);
-  responses.keep(request_, std::move(fresh));
+  if (mayBeStored(result, fresh)) {
+    responses.keep(request_, std::move(fresh));
+  } else {
+    responses.forget(request_.url);
+  }
   _complete(answer);
   return true;
 }

@@ -2,6 +2,7 @@
 
 #include <utility>
 
+#include "platform/linux/url_cache/CacheRules.h"
 #include "platform/linux/url_cache/CacheVary.h"
 
 namespace zelkord {
@@ -95,9 +96,11 @@ std::optional<CachedResponse> LinuxURLCache::lookup(const URLRequest& request) {
 
 void LinuxURLCache::store(const URLRequest& request, CachedResponse response) {
   _makeSureItIsOpen();
-  response.response.url.clear();
+  const auto key = cacheKeyOf(request.url);
+  const auto giver = std::exchange(response.response.url, {});
+  if (!giver.empty() && cacheKeyOf(giver) != key) dropRulesOfCaching(response.response);
   const auto now = clock_.wallNow();
-  _add(cacheKeyOf(request.url), request,
+  _add(key, request,
        std::make_shared<const StoredResponse>(
            StoredResponse{std::move(response.response), std::move(response.data), now, now}));
 }
