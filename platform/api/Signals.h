@@ -20,6 +20,9 @@ class ProcessControl {
   virtual void exit(int status) = 0;
   // Runs the main queue's tasks for ever.
   virtual void runMainLoop() = 0;
+  // Gives memory that the process holds and does not use back to the system. Any thread; may take
+  // some milliseconds.
+  virtual void releaseFreeMemory() = 0;
 };
 
 }  // namespace zelkord

@@ -18,6 +18,8 @@ class RecordingProcess final : public ProcessControl {
   }
   void runMainLoop() override { timeline_.runUntilIdle(); }
 
+  void releaseFreeMemory() override {}
+
   std::optional<int> exitStatus() const { return status_; }
 
  private:

@@ -50,11 +50,11 @@ Options parse(int count, char** arguments) {
   return options;
 }
 
-// MiB; 0 when there is no such process.
+// Memory of its own, without what it maps of files, in MiB; 0 when there is no such process.
 double residentSize(int process) {
   std::ifstream file(fmt::format("/proc/{}/status", process));
   for (std::string word; file >> word;) {
-    if (word == "VmRSS:" && file >> word) return std::stod(word) / 1024;
+    if (word == "RssAnon:" && file >> word) return std::stod(word) / 1024;
   }
   return 0;
 }

@@ -90,6 +90,7 @@ void ZelkorService::_remove(const std::shared_ptr<ClientConnection>& client) {
   if (!connections_.empty()) return;
   assembly_.log(Category::Caching).debug("purging url cache");
   assembly_.urlSession().purgeMemoryCache();
+  assembly_.platform().process.releaseFreeMemory();
 }
 
 std::vector<std::shared_ptr<ClientConnection>> ZelkorService::getClientConnections() {

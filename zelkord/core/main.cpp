@@ -51,6 +51,7 @@ int serve(const zelkord::CommandLine& line) {
 }  // namespace
 
 int main(int count, char** arguments) {
+  zelkord::keepHeapSmall();
   const auto parsed = zelkord::parseCommandLine({arguments + 1, arguments + count});
   if (const auto* problem = std::get_if<std::string>(&parsed)) {
     fmt::print(stderr, "zelkord: {}\n{}", *problem, zelkord::usageText());

@@ -1,5 +1,6 @@
 #include "platform/linux/process/LinuxProcess.h"
 
+#include <malloc.h>
 #include <unistd.h>
 
 #include <utility>
@@ -37,5 +38,7 @@ void LinuxProcess::exit(int status) {
 }
 
 void LinuxProcess::runMainLoop() { queues_.runMainLoop(); }
+
+void LinuxProcess::releaseFreeMemory() { ::malloc_trim(0); }
 
 }  // namespace zelkord

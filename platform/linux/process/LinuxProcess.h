@@ -25,6 +25,7 @@ class LinuxProcess final : public ProcessControl {
   // end. A hook that calls it again ends the process at once.
   [[noreturn]] void exit(int status) override;
   void runMainLoop() override;
+  void releaseFreeMemory() override;
 
  private:
   LinuxWorkQueues& queues_;

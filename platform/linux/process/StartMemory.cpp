@@ -31,6 +31,12 @@ int releaseObject(dl_phdr_info* object, std::size_t, void*) {
 
 }  // namespace
 
+void keepHeapSmall() {
+  constexpr int kLargeBlock = 128 * 1024;  // the heap's own first value, which it would raise
+  ::mallopt(M_MMAP_THRESHOLD, kLargeBlock);
+  ::mallopt(M_TRIM_THRESHOLD, kLargeBlock);
+}
+
 void releaseStartMemory() {
   ::malloc_trim(0);
   ::dl_iterate_phdr(&releaseObject, nullptr);
