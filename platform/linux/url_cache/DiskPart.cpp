@@ -26,11 +26,21 @@ DiskPart::DiskPart(const std::string& folder, std::uint64_t minimumMappedBytes, 
 
 std::vector<CacheEntry> DiskPart::load() {
   std::vector<CacheEntry> entries;
-  if (!database_.exists() || !_open()) return entries;
+  isKnown_ = !database_.exists();
+  if (isKnown_ || !_open()) return entries;
   const auto failure = database_.load(entries);
+  isKnown_ = !failure || _resetAfter(*failure);
   if (!failure) return entries;
-  if (!_resetAfter(*failure)) _complain(failure->text);
+  if (!isKnown_) _complain(failure->text);
   return {};
+}
+
+bool DiskPart::_openToWrite() {
+  if (!isKnown_ && !files_.makeFolder()) {
+    isKnown_ = true;
+    _removeAll();
+  }
+  return _open();
 }
 
 bool DiskPart::_open() {
@@ -56,6 +66,10 @@ bool DiskPart::_resetAfter(const sqlite::Failure& failure) {
 void DiskPart::_reset(const std::string& reason) {
   log_.error("the URL cache begins anew: {}", reason);
   ++resets_;
+  _removeAll();
+}
+
+void DiskPart::_removeAll() {
   database_.remove();
   files_.removeUnless([](std::int64_t) { return false; });
 }
@@ -86,7 +100,7 @@ StoredPointer DiskPart::read(const CacheEntry& entry) {
 
 DiskPart::Outcome DiskPart::write(const Changes& changes) {
   if (changes.added.empty() && !database_.isOpen()) return {.removedRows = !database_.exists()};
-  if (_open()) return _writeOpen(changes);
+  if (_openToWrite()) return _writeOpen(changes);
   Outcome outcome{.removedRows = false};
   for (const auto& record : changes.added) outcome.notAdded.push_back(record.entry.id);
   return outcome;

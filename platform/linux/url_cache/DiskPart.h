@@ -49,8 +49,10 @@ class DiskPart final {
   struct Batch;
 
   bool _open();
+  bool _openToWrite();
   bool _resetAfter(const sqlite::Failure& failure);
   void _reset(const std::string& reason);
+  void _removeAll();
   Outcome _writeOpen(const Changes& changes);
   bool _writeBody(const CacheRecord& record);
   void _addRow(Batch& batch, const CacheRecord& record);
@@ -65,6 +67,9 @@ class DiskPart final {
   CacheDatabase database_;
   unsigned resets_ = 0;
   bool failing_ = false;
+  // Else what is on disk could not be read at the start. It goes with the first write: its entries
+  // would come back later, older than what was kept since.
+  bool isKnown_ = true;
 };
 
 }  // namespace zelkord

@@ -159,6 +159,25 @@ TEST(LinuxURLCacheDamageTest, BeginsAnewWhenItsFolderGoes) {
   EXPECT_EQ(bed.find("http://h/mapped"), kMappedBody);
 }
 
+// An old response must not come back in the place of a newer one.
+TEST(LinuxURLCacheDamageTest, BeginsAnewWhereItCouldNotReadWhatIsThere) {
+  const TemporaryDirectory state;
+  URLCacheTestBed bed(state / "urlcache");
+  bed.store("http://h/first", "first");
+  bed.store("http://h/a", "old");
+  bed.stop();
+  std::filesystem::rename(state / kIndexFile, state / "aside");
+  std::filesystem::create_directory(state / kIndexFile);
+  bed.start();
+  EXPECT_EQ(bed.find("http://h/a"), std::nullopt);
+  std::filesystem::remove(state / kIndexFile);
+  std::filesystem::rename(state / "aside", state / kIndexFile);
+  bed.store("http://h/a", "new");
+  bed.restart();
+  EXPECT_EQ(bed.find("http://h/a"), "new");
+  EXPECT_EQ(bed.find("http://h/first"), std::nullopt);
+}
+
 // Stores forever; each body says which URL it belongs to.
 std::string numberedBody(int number) {
   const auto text = std::to_string(number % 100) + ",";

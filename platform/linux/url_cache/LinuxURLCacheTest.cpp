@@ -160,11 +160,13 @@ TEST_F(LinuxURLCacheTest, RemovesFilesOfWhichNobodyKnows) {
 
 TEST_F(LinuxURLCacheTest, RemovesNothingBehindALink) {
   fs::create_directory(state_ / "elsewhere");
-  state_.write("elsewhere/0000000000000001.body", "of somebody else");
+  const char* const theirs[] = {"elsewhere/0000000000000001.body", "elsewhere/index.db"};
+  for (const char* name : theirs) state_.write(name, "of somebody else");
   fs::create_directory_symlink(state_ / "elsewhere", bed_.folder);
   EXPECT_EQ(bed_.find("http://h/"), std::nullopt);
+  bed_.store("http://h/", "body");
   bed_.stop();
-  EXPECT_TRUE(state_.has("elsewhere/0000000000000001.body"));
+  for (const char* name : theirs) EXPECT_EQ(state_.read(name), "of somebody else") << name;
 }
 
 TEST_F(LinuxURLCacheTest, EndsWhileItOpens) {
