@@ -126,7 +126,8 @@ int EventLoop::_sleep(std::array<epoll_event, kEventsAtOnce>& events) {
 }
 
 void EventLoop::_dispatch(const epoll_event& event) {
-  const auto found = watched_.find(event.data.u64);
+  const std::uint64_t number = event.data.u64;  // the event is packed: no reference to its member
+  const auto found = watched_.find(number);
   if (found == watched_.end()) return;
   const auto watched = found->second;  // may be unwatched by its own call
   watched->ready(event.events);
