@@ -32,9 +32,10 @@ int releaseObject(dl_phdr_info* object, std::size_t, void*) {
 }  // namespace
 
 void keepHeapSmall() {
-  constexpr int kLargeBlock = 128 * 1024;  // the heap's own first value, which it would raise
+  constexpr int kLargeBlock = 1024 * 1024;
+  constexpr int kKeptAtMost = 4 * 1024 * 1024;  // less costs system calls with every message
   ::mallopt(M_MMAP_THRESHOLD, kLargeBlock);
-  ::mallopt(M_TRIM_THRESHOLD, kLargeBlock);
+  ::mallopt(M_TRIM_THRESHOLD, kKeptAtMost);
 }
 
 void releaseStartMemory() {
