@@ -8,7 +8,7 @@
 #include <algorithm>
 #include <map>
 
-#include "benchmarks/QuietPlatform.h"
+#include "benchmarks/QuietLog.h"
 #include "benchmarks/maps/Completions.h"
 #include "platform/linux/queues/LinuxWorkQueues.h"
 #include "platform/testing/FakePlatform.h"
@@ -30,8 +30,7 @@ struct FullCache {
   FakeURLSessions sessions{queues};
   CountedTransactions transactions{clock};
   QuietLog log;
-  Platform platform =
-      withLog(onQueues(fakes.platform(), clock, queues, sessions, transactions), log);
+  Platform platform = onQueues(fakes.platform(), clock, queues, sessions, transactions, &log);
   Assembly assembly{platform};
   std::shared_ptr<QueryCache> cache = std::make_shared<QueryCache>(assembly);
   std::map<std::string, std::size_t> firstLetters;  // and how many entries each has

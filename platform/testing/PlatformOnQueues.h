@@ -4,13 +4,15 @@
 
 namespace zelkord {
 
-// The platform with another clock and other queues, and sessions that run on those: for stress
-// tests and benchmarks of components on real threads. The references stay the caller's.
+// The platform with another clock and other queues, sessions that run on those, and, unless null,
+// another log: for stress tests and benchmarks of components on real threads. All stay the
+// caller's.
 inline Platform onQueues(const Platform& base, Clock& clock, WorkQueues& queues,
-                         URLSessions& sessions, ProcessTransactions& transactions) {
+                         URLSessions& sessions, ProcessTransactions& transactions,
+                         LogSink* log = nullptr) {
   return {.clock = clock,
           .queues = queues,
-          .log = base.log,
+          .log = log ? *log : base.log,
           .settings = base.settings,
           .files = base.files,
           .notificationCenter = base.notificationCenter,
