@@ -18,6 +18,16 @@ const HTTPHeaders kStaleWithTag = {{"Cache-Control", "max-age=0"}, {"ETag", "\"1
 
 class CachingURLSessionTest : public ::testing::Test {
  protected:
+  // The last to let go of a session may be a worker, which needs the queues for it.
+  void TearDown() override {
+    session_.reset();
+    for (int i = 0; i < 10'000 && isBusy(); ++i) std::this_thread::sleep_for(1ms);
+  }
+  bool isBusy() const {
+    const auto workers = bed_.queues.workers();
+    return workers.running + workers.blocked > 0;
+  }
+
   URLOutcome load(const std::string& path, HTTPHeaders headers = {}, std::string method = "GET") {
     return loadURL(*session_,
                    {.url = server_.url(path), .method = method, .headers = std::move(headers)});
