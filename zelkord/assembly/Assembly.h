@@ -12,10 +12,15 @@
 namespace zelkord {
 
 class ClientStateManager;
+class CrowdsourcingFlusher;
 class FeedbackSessions;
+class FeedbackStreams;
+class FlushActivities;
 class ImageFetcher;
+class ResourceVersions;
 class ResponseImages;
 class SessionManager;
+class SessionStorage;
 class UserGUIDSource;
 class ZLKNetworkRequestFactory;
 class ZelkorBagController;
@@ -55,6 +60,13 @@ class Assembly final {
   UserGUIDSource* guidController() const { return guidController_.get(); }
   SessionManager* clientSessionManager() const { return clientSessionManager_.get(); }
   FeedbackSessions* feedbackSessions() const { return feedbackSessions_.get(); }
+  SessionStorage* persistentStorage() const { return persistentStorage_.get(); }
+  FeedbackStreams* flusherXPCListener() const { return flusherXPCListener_.get(); }
+  FlushActivities* backgroundFlusher() const { return backgroundFlusher_.get(); }
+  CrowdsourcingFlusher* crowdsourcingFeedbackFlusher() const {
+    return crowdsourcingFeedbackFlusher_.get();
+  }
+  ResourceVersions* downloadManager() const { return downloadManager_.get(); }
 
   void setRequestFactory(std::shared_ptr<ZLKNetworkRequestFactory> factory) {
     requestFactory_.set(std::move(factory));
@@ -80,11 +92,29 @@ class Assembly final {
   void setFeedbackSessions(std::shared_ptr<FeedbackSessions> sessions) {
     feedbackSessions_.set(std::move(sessions));
   }
+  void setPersistentStorage(std::shared_ptr<SessionStorage> storage) {
+    persistentStorage_.set(std::move(storage));
+  }
+  void setFlusherXPCListener(std::shared_ptr<FeedbackStreams> streams) {
+    flusherXPCListener_.set(std::move(streams));
+  }
+  void setBackgroundFlusher(std::shared_ptr<FlushActivities> activities) {
+    backgroundFlusher_.set(std::move(activities));
+  }
+  void setCrowdsourcingFeedbackFlusher(std::shared_ptr<CrowdsourcingFlusher> flusher) {
+    crowdsourcingFeedbackFlusher_.set(std::move(flusher));
+  }
+  void setDownloadManager(std::shared_ptr<ResourceVersions> manager) {
+    downloadManager_.set(std::move(manager));
+  }
 
   // One feedback session shared by all clients; "ZLKSharedSession" as it was when the service
   // began.
   bool sharedSession() const { return sharedSession_; }
   void setSharedSession(bool shared) { sharedSession_ = shared; }
+  // Sessions keep their records in memory too. For tests; never in the daemon.
+  bool testFeedbacks() const { return testFeedbacks_; }
+  void enableTestFeedbacks() { testFeedbacks_ = true; }
   bool diskBagCacheEnabled() const { return diskBagCacheEnabled_; }
   // For tests; always on in the daemon.
   void disableDiskBagCache() { diskBagCacheEnabled_ = false; }
@@ -112,6 +142,11 @@ class Assembly final {
   const ZelkorDiagnosticDataReporter reporter_;
   ServiceSessions sessions_;
   // In the order in which they are made; released in the reverse one.
+  Slot<SessionStorage> persistentStorage_;
+  Slot<FeedbackStreams> flusherXPCListener_;
+  Slot<FlushActivities> backgroundFlusher_;
+  Slot<CrowdsourcingFlusher> crowdsourcingFeedbackFlusher_;
+  Slot<ResourceVersions> downloadManager_;
   Slot<FeedbackSessions> feedbackSessions_;
   Slot<ZLKNetworkRequestFactory> requestFactory_;
   Slot<ImageFetcher> imageFetcher_;
@@ -121,6 +156,7 @@ class Assembly final {
   Slot<UserGUIDSource> guidController_;
   Slot<SessionManager> clientSessionManager_;
   std::atomic<bool> sharedSession_ = true;
+  std::atomic<bool> testFeedbacks_ = false;
   std::atomic<bool> diskBagCacheEnabled_ = true;
 };
 

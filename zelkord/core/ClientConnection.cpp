@@ -1,9 +1,7 @@
 #include "zelkord/core/ClientConnection.h"
 
-#include <array>
-
-#include "base/UUID.h"
 #include "corezelkor/Constants.h"
+#include "platform/api/RandomUUID.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/core/ClientStateManager.h"
 #include "zelkord/feedback/SessionManager.h"
@@ -12,15 +10,6 @@
 #include "zelkord/query/ErrorCodes.h"
 
 namespace zelkord {
-namespace {
-
-std::string newUuid(RandomSource& random) {
-  std::array<std::uint8_t, 16> bytes{};
-  random.fill(bytes.data(), bytes.size());
-  return UUID::fromRandomBytes(bytes).string();
-}
-
-}  // namespace
 
 ClientConnection::ClientConnection(Assembly& assembly, std::shared_ptr<ipc::Connection> connection,
                                    OtherCalls otherCalls)
@@ -170,7 +159,7 @@ void ClientConnection::_fillMissing(ZLKRequest& request) {
     request.scale = textInput.mainScreenScale();
     assembly_.defaultLog().debug("request scale property not set, using {:.6f}", request.scale);
   }
-  if (request.uuid.empty()) request.uuid = newUuid(assembly_.platform().random);
+  if (request.uuid.empty()) request.uuid = randomUUID(assembly_.platform().random).string();
 }
 
 ReplyCallback ClientConnection::_replyTo(const std::shared_ptr<ipc::Reply>& reply) {

@@ -2,7 +2,7 @@
 
 #include <utility>
 
-#include "zelkord/feedback/DaemonFeedback.h"
+#include "halvane/DaemonFeedback.h"
 
 namespace zelkord {
 namespace {

@@ -2,29 +2,17 @@
 
 #include <utility>
 
-#include "zelkord/feedback/DaemonFeedback.h"
+#include "halvane/DaemonFeedback.h"
 
 namespace zelkord {
 namespace {
 
 std::size_t bytesOf(const std::optional<std::string>& text) { return text ? text->size() : 0; }
 
-// Of the texts that others choose.
 std::size_t textBytes(const HVFeedback* feedback) {
-  std::size_t bytes = 0;
-  if (const auto* start = dynamic_cast<const HVStartNetworkSearchFeedback*>(feedback)) {
-    bytes = start->input.size() + start->url.size();
-    for (const auto& [name, value] : start->headers) bytes += name.size() + value.size();
-  } else if (const auto* end = dynamic_cast<const ZLKEndNetworkSearchFeedback*>(feedback)) {
-    bytes = bytesOf(end->zelkorStatus) + bytesOf(end->fbq) + bytesOf(end->partialClientIp);
-  } else if (const auto* skipped = dynamic_cast<const ZLKSkipSearchFeedback*>(feedback)) {
-    bytes = skipped->input.size();
-  } else if (const auto* hit = dynamic_cast<const ZLKCacheHitFeedback*>(feedback)) {
-    bytes = hit->input.size() + hit->uuid.size();
-  } else if (const auto* failure = dynamic_cast<const HVErrorFeedback*>(feedback)) {
-    for (const auto& [key, value] : failure->error.userInfo) bytes += key.size() + value.size();
-  }
-  return bytes;
+  std::string message;
+  if (feedback) feedback->appendTo(message);
+  return message.size();
 }
 
 }  // namespace

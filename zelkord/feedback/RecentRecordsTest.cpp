@@ -1,6 +1,6 @@
 #include <gtest/gtest.h>
 
-#include "zelkord/feedback/DaemonFeedback.h"
+#include "halvane/DaemonFeedback.h"
 #include "zelkord/feedback/RecentRecords.h"
 
 namespace zelkord {
@@ -13,7 +13,7 @@ ZelkorFeedback endWith(std::size_t bytes, std::int64_t queryId) {
 }
 
 TEST(RecentRecordsTest, StaysSmallWhateverTheServiceSends) {
-  constexpr std::size_t kMiB = 1024 * 1024;
+  constexpr std::size_t kMiB = 1000 * 1000;
   const struct {
     std::size_t bytes;
     std::size_t kept;

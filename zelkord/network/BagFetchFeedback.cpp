@@ -1,46 +1,38 @@
 #include "zelkord/network/BagFetchFeedback.h"
 
+#include "platform/api/RandomUUID.h"
 #include "zelkord/assembly/Assembly.h"
+#include "zelkord/encoding/ErrorEncoding.h"
 #include "zelkord/feedback/UserGUIDSource.h"
-#include "zelkord/network/NetworkTiming.h"
+#include "zelkord/network/NetworkSearchRecords.h"
 
 namespace zelkord {
 namespace {
 
-constexpr std::uint32_t kBagFetchTriggerEvent = 16;
+constexpr std::int32_t kBagFetchTrigger = 16;
 constexpr std::int32_t kBagFetchEndpoint = 10;
-
-std::shared_ptr<const HVStartNetworkSearchFeedback> bagFetchStart(const URLRequest& request) {
-  auto start = std::make_shared<HVStartNetworkSearchFeedback>();
-  start->url = request.url;
-  start->headers = request.headers;
-  start->triggerEvent = kBagFetchTriggerEvent;
-  start->endpoint = kBagFetchEndpoint;
-  return start;
-}
 
 }  // namespace
 
 BagFetchFeedback::BagFetchFeedback(const Assembly& assembly, const URLRequest& request,
                                    std::optional<std::string> userAgent)
-    : userAgent_(std::move(userAgent)), start_(bagFetchStart(request)) {
+    : userAgent_(std::move(userAgent)), uuid_(randomUUID(assembly.platform().random).string()) {
   if (auto* guids = assembly.guidController()) userGuid_ = guids->currentUserGUID();
-  if (auto* sessions = assembly.feedbackSessions())
-    session_ = sessions->makeSession(_record(start_));
+  auto* sessions = assembly.feedbackSessions();
+  if (!sessions) return;
+  session_ = sessions->makeSession(_record(startNetworkSearch(
+      request,
+      {.triggerEvent = kBagFetchTrigger, .endpointType = kBagFetchEndpoint, .uuid = uuid_})));
 }
 
 void BagFetchFeedback::recordEnd(const URLResult& result, const TimingData& timing) {
   if (!session_) return;
-  auto end = std::make_shared<HVEndNetworkSearchFeedback>();
-  end->startSearch = start_;
-  end->responseSize = static_cast<std::int64_t>(result.dataLength());
-  end->statusCode = result.status();
-  end->networkTimingData = networkTimingData(timing);
-  session_->addFeedback(_record(std::move(end)));
+  session_->addFeedback(_record(endNetworkSearch(uuid_, result, timing)));
 }
 
 void BagFetchFeedback::recordError(const Error& error) {
-  if (session_) session_->addFeedback(_record(std::make_shared<HVErrorFeedback>(error)));
+  if (!session_) return;
+  session_->addFeedback(_record(std::make_shared<HVErrorFeedback>(errorRecordOf(error))));
 }
 
 void BagFetchFeedback::sessionComplete() {

@@ -29,7 +29,7 @@ class BagFetchFeedback final {
   ZelkorFeedback _record(std::shared_ptr<const HVFeedback> feedback) const;
 
   const std::optional<std::string> userAgent_;
-  const std::shared_ptr<const HVStartNetworkSearchFeedback> start_;
+  const std::string uuid_;
   std::optional<UUID> userGuid_;
   std::shared_ptr<FeedbackSession> session_;  // may be null
 };

@@ -2,10 +2,11 @@
 
 #include <strings.h>
 
+#include "platform/api/RandomUUID.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/feedback/SessionManager.h"
 #include "zelkord/network/ErrorFeedback.h"
-#include "zelkord/network/NetworkTiming.h"
+#include "zelkord/network/NetworkSearchRecords.h"
 #include "zelkord/network/URLHost.h"
 #include "zelkord/network/UserAgent.h"
 #include "zelkord/storage/mmapFileHandle.h"
@@ -14,7 +15,7 @@ namespace zelkord {
 namespace {
 
 constexpr std::int64_t kImageFault = 500;  // in kZLKErrorDomain
-constexpr std::uint32_t kImageTriggerEvent = 15;
+constexpr std::int32_t kImageTrigger = 15;
 constexpr std::int32_t kImageEndpoint = 7;
 constexpr int kOK = 200;
 constexpr std::string_view kSharedProtocol = "h2";
@@ -29,24 +30,16 @@ std::string hostOf(const std::string& url) {
   return place ? std::move(place->host) : std::string();
 }
 
-std::shared_ptr<const HVStartNetworkSearchFeedback> imageFetchStart(const URLRequest& request) {
-  auto start = std::make_shared<HVStartNetworkSearchFeedback>();
-  start->url = request.url;
-  start->headers = request.headers;
-  start->triggerEvent = kImageTriggerEvent;
-  start->endpoint = kImageEndpoint;
-  return start;
-}
-
 }  // namespace
 
 // One download. Whatever becomes of it, its promise is fulfilled at its end.
 struct ImageFetcher::Fetch {
-  Fetch(URLRequest imageRequest, ZLKPromise<Image> imagePromise, Transaction imageTransaction)
+  Fetch(URLRequest imageRequest, ZLKPromise<Image> imagePromise, Transaction imageTransaction,
+        std::string identifier)
       : request(std::move(imageRequest)),
         promise(std::move(imagePromise)),
         transaction(std::move(imageTransaction)),
-        start(imageFetchStart(request)) {}
+        uuid(std::move(identifier)) {}
   ~Fetch() { promise.fulfill(std::nullopt); }
   Fetch(const Fetch&) = delete;
   Fetch& operator=(const Fetch&) = delete;
@@ -54,7 +47,7 @@ struct ImageFetcher::Fetch {
   const URLRequest request;
   const ZLKPromise<Image> promise;
   const Transaction transaction;
-  const std::shared_ptr<const HVStartNetworkSearchFeedback> start;
+  const std::string uuid;  // of its records
 };
 
 ImageFetcher::ImageFetcher(Assembly& assembly)
@@ -72,7 +65,8 @@ ZLKFuture<ImageFetcher::Image> ImageFetcher::fetchImageData(const std::string& u
     assembly_.log(Category::Images).debug("pending {}", _shown(url));
     return pending->future();
   }
-  _enqueue(std::make_shared<Fetch>(std::move(request), promise, std::move(transaction)));
+  _enqueue(std::make_shared<Fetch>(std::move(request), promise, std::move(transaction),
+                                   randomUUID(assembly_.platform().random).string()));
   return promise.future();
 }
 
@@ -124,7 +118,9 @@ void ImageFetcher::_enqueue(const std::shared_ptr<Fetch>& fetch) {
 }
 
 void ImageFetcher::_begin(std::shared_ptr<Fetch> fetch) {
-  _record(fetch->start);
+  _record(startNetworkSearch(
+      fetch->request,
+      {.triggerEvent = kImageTrigger, .endpointType = kImageEndpoint, .uuid = fetch->uuid}));
   const auto task = assembly_.urlSession().downloadTask(
       fetch->request,
       [weak = weak_from_this(), fetch](const auto& finished, const URLResult& result) {
@@ -138,12 +134,7 @@ void ImageFetcher::_begin(std::shared_ptr<Fetch> fetch) {
 
 void ImageFetcher::_finish(Fetch& fetch, const URLTask& task, const URLResult& result) {
   auto image = _imageOf(fetch, result);
-  auto end = std::make_shared<HVEndNetworkSearchFeedback>();
-  end->startSearch = fetch.start;
-  end->responseSize = static_cast<std::int64_t>(result.dataLength());
-  end->statusCode = result.status();
-  end->networkTimingData = networkTimingData(task.timingData());
-  _record(std::move(end));
+  _record(endNetworkSearch(fetch.uuid, result, task.timingData()));
   fetch.promise.fulfill(std::move(image));
   const auto connections = task.timingData().protocol == kSharedProtocol
                                ? DownloadLine::Connections::Shared

@@ -3,8 +3,10 @@
 
 #include <cerrno>
 
+#include "halvane/ModelFeedback.h"
 #include "platform/testing/FakePlatform.h"
 #include "zelkord/assembly/Assembly.h"
+#include "zelkord/encoding/ErrorEncoding.h"
 #include "zelkord/feedback/InMemorySessions.h"
 #include "zelkord/network/ImageFetcher.h"
 #include "zelkord/network/UserAgent.h"
@@ -111,16 +113,17 @@ TEST_F(ImageFetcherTest, RecordsTheFetch) {
   const auto start = recorded<HVStartNetworkSearchFeedback>().at(0);
   const auto agent = zelkordUserAgent(fakes_.device);
   EXPECT_EQ(start->url, kImageURL);
-  EXPECT_EQ(start->headers, (HTTPHeaders{{"User-Agent", *agent}}));
-  EXPECT_EQ(start->headers, session().tasks().at(0)->request().headers);
+  EXPECT_EQ(start->headers, (StringMap{{"User-Agent", *agent}}));
+  EXPECT_EQ(session().tasks().at(0)->request().headers, (HTTPHeaders{{"User-Agent", *agent}}));
   EXPECT_EQ(session().tasks().at(0)->request().timeout, 7s);
-  EXPECT_EQ(start->triggerEvent, 15u);
-  EXPECT_EQ(start->endpoint, 7);
+  EXPECT_EQ(start->triggerEvent.value, 15);
+  EXPECT_EQ(start->endpointType.value, 7);
   const auto end = recorded<HVEndNetworkSearchFeedback>().at(0);
-  EXPECT_EQ(end->startSearch, start);
+  EXPECT_EQ(start->uuid->size(), 36u);
+  EXPECT_EQ(end->uuid, start->uuid);
   EXPECT_EQ(end->responseSize, 5);
   EXPECT_EQ(end->statusCode, 200);
-  EXPECT_EQ(end->networkTimingData->at("domain_lookup"), 3.0);
+  EXPECT_THAT(end->networkTimingData->text, testing::HasSubstr(R"("domain_lookup":3E0)"));
   for (const auto& record : sessions_->records().all()) EXPECT_EQ(record.userAgent, agent);
 }
 
@@ -164,7 +167,7 @@ TEST_F(ImageFetcherTest, AnyFailureGivesNoneIsRecordedAndNotKept) {
     const auto errors = recorded<HVErrorFeedback>();
     EXPECT_EQ(errors.size() - errorsBefore, row.error ? 1u : 0u);
     if (row.error) {
-      EXPECT_EQ(errors.back()->error, *row.error);
+      EXPECT_EQ(errors.back()->error, errorRecordOf(*row.error));
     }
     EXPECT_EQ(recorded<HVEndNetworkSearchFeedback>().size(),
               recorded<HVStartNetworkSearchFeedback>().size());

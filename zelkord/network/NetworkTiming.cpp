@@ -5,7 +5,7 @@ namespace zelkord {
 json::object networkTimingData(const TimingData& timing) {
   json::object data;
   const auto put = [&data](std::string_view key, double milliseconds) {
-    if (milliseconds >= 0) data[key] = milliseconds;
+    data[key] = milliseconds >= 0 ? json::value(milliseconds) : nullptr;
   };
   put("domain_lookup", timing.domainLookup);
   put("connect", timing.connect);

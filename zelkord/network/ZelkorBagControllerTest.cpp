@@ -4,6 +4,7 @@
 #include <cerrno>
 
 #include "corezelkor/Constants.h"
+#include "halvane/ModelFeedback.h"
 #include "platform/testing/FakePlatform.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/feedback/SessionManager.h"
@@ -474,14 +475,16 @@ TEST_F(ZelkorBagControllerTest, RecordsAFetchAsFeedback) {
       dynamic_cast<const HVStartNetworkSearchFeedback&>(*sessions->records[0].feedback);
   EXPECT_EQ(start.input, "");
   EXPECT_EQ(start.url, "https://api.zelkor.example/bag?v=none");
-  EXPECT_EQ(start.headers, (HTTPHeaders{{"User-Agent", kUserAgent}}));
-  EXPECT_EQ(start.triggerEvent, 16u);
-  EXPECT_EQ(start.endpoint, 10);
+  EXPECT_EQ(start.headers, (StringMap{{"User-Agent", kUserAgent}}));
+  EXPECT_EQ(start.triggerEvent.value, 16);
+  EXPECT_EQ(start.endpointType.value, 10);
   const auto& end = dynamic_cast<const HVEndNetworkSearchFeedback&>(*sessions->records[1].feedback);
-  EXPECT_EQ(end.startSearch.get(), &start);
+  EXPECT_EQ(start.uuid->size(), 36u);
+  EXPECT_EQ(end.uuid, start.uuid);
+  EXPECT_FALSE(end.connectionReused || end.interface || end.peerAddress);
   EXPECT_EQ(end.responseSize, 4);
   EXPECT_EQ(end.statusCode, 404);
-  EXPECT_TRUE(end.networkTimingData->contains("bytes_sent"));
+  EXPECT_THAT(end.networkTimingData->text, testing::HasSubstr("bytes_sent"));
   for (const auto& record : sessions->records) {
     EXPECT_EQ(record.queryId, 0);
     EXPECT_EQ(record.userGuid, guids->currentUserGUID());

@@ -1,7 +1,6 @@
 #include "zelkord/network/ZelkorUserGUIDController.h"
 
-#include <array>
-
+#include "platform/api/RandomUUID.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/network/NotificationNames.h"
 
@@ -15,7 +14,7 @@ constexpr Duration kUserGUIDLifetime = 900s;
 ZelkorUserGUIDController::ZelkorUserGUIDController(Assembly& assembly)
     : assembly_(assembly),
       queue_(assembly.platform().queues.makeSerialQueue("com.quenta.zelkor.guid")),
-      lastKnownUserGUID_(_randomUUID()),
+      lastKnownUserGUID_(randomUUID(assembly.platform().random)),
       lastKnownUserGUIDExpirationDate_(assembly.platform().clock.now() + kUserGUIDLifetime) {}
 
 UUID ZelkorUserGUIDController::currentUserGUID() {
@@ -32,15 +31,9 @@ void ZelkorUserGUIDController::reset() {
   queue_->async([this] { _rollGUID(); });
 }
 
-UUID ZelkorUserGUIDController::_randomUUID() const {
-  std::array<std::uint8_t, 16> bytes{};
-  assembly_.platform().random.fill(bytes.data(), bytes.size());
-  return UUID::fromRandomBytes(bytes);
-}
-
 void ZelkorUserGUIDController::_rollGUID() {
   queue_->assertCurrent();
-  lastKnownUserGUID_ = _randomUUID();
+  lastKnownUserGUID_ = randomUUID(assembly_.platform().random);
   lastKnownUserGUIDExpirationDate_ = assembly_.platform().clock.now() + kUserGUIDLifetime;
   queue_->async([&assembly = assembly_] {
     assembly.reporter().addValue(1, "com.quenta.zelkord.userguid");

@@ -26,7 +26,6 @@ class ZelkorUserGUIDController final : public UserGUIDSource {
   void reset() override;
 
  private:
-  UUID _randomUUID() const;
   void _rollGUID();
 
   // Fixed after construction.

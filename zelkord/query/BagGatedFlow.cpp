@@ -1,7 +1,7 @@
 #include "zelkord/query/BagGatedFlow.h"
 
+#include "halvane/DaemonFeedback.h"
 #include "zelkord/assembly/Assembly.h"
-#include "zelkord/feedback/DaemonFeedback.h"
 #include "zelkord/feedback/UserGUIDSource.h"
 #include "zelkord/query/ErrorCodes.h"
 
@@ -54,7 +54,7 @@ std::optional<QueryFlow::Refusal> BagGatedFlow::_refusalOfAnswer(const URLResult
 
 void BagGatedFlow::_skip(SkipReason reason, std::optional<Error> error) {
   state_->record(
-      std::make_shared<ZLKSkipSearchFeedback>(static_cast<std::uint32_t>(reason), _input()),
+      std::make_shared<ZLKSkipSearchFeedback>(static_cast<std::int32_t>(reason), _input()),
       *request_, state_->guidController().currentUserGUID());
   _reply(std::nullopt, std::move(error));
 }

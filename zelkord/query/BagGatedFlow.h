@@ -14,7 +14,7 @@ class BagGatedFlow : public QueryFlow {
   using QueryFlow::QueryFlow;
 
   // Why a query is not sent; the numbers are recorded.
-  enum class SkipReason : std::uint32_t { TooShort = 1, BagDisabled = 2, NoBag = 3 };
+  enum class SkipReason : std::int32_t { TooShort = 1, BagDisabled = 2, NoBag = 3 };
 
   bool _passesGates() override;
   void _logDispatch() const override;

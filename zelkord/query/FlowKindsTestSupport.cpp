@@ -12,6 +12,7 @@ auto asking(void (ClientState::*operation)(std::shared_ptr<const Request>, Reply
   request.queryId = 7;
   request.clientQueryId = 70;
   request.queryString = "snow";
+  request.uuid = "uuid of snow";
   request.triggerEvent = 5;
   request.scale = 2;
   return [operation, request](QueryBed& bed, ClientState& state, bool verbose) {

@@ -2,8 +2,8 @@
 
 #include <algorithm>
 
+#include "halvane/DaemonFeedback.h"
 #include "zelkord/assembly/Assembly.h"
-#include "zelkord/feedback/DaemonFeedback.h"
 #include "zelkord/network/ZLKNetworkRequestFactory.h"
 #include "zelkord/query/NetworkRecords.h"
 
@@ -28,12 +28,11 @@ std::optional<URLRequest> LookupFlow::_makeRequest(const ZLKBag* bag,
   return assembly_.requestFactory()->lookupRequest(*lookup_, bag, userGuid);
 }
 
-std::shared_ptr<const HVStartNetworkSearchFeedback> LookupFlow::_makeStart(
-    const URLRequest& request) const {
+std::shared_ptr<const HVFeedback> LookupFlow::_makeStart(const URLRequest& request) const {
   auto start = std::make_shared<ZLKLookupStartNetworkSearchFeedback>();
-  fillStart(*start, request, _input(), kLookupTrigger, traits_.endpoint);
+  fillStart(*start, request, _origin(kLookupTrigger));
   const auto type = lookup_->lookupSelectionType;
-  start->lookupSelectionType = type > kLastSelectionType ? 0 : type;
+  start->lookupSelectionType = type > kLastSelectionType ? 0 : static_cast<std::int32_t>(type);
   return start;
 }
 

@@ -15,8 +15,7 @@ class LookupFlow final : public BagGatedFlow {
   std::optional<URLRequest> _makeRequest(const ZLKBag* bag,
                                          const std::optional<UUID>& userGuid) override;
   std::string _input() const override { return lookup_->queryString; }
-  std::shared_ptr<const HVStartNetworkSearchFeedback> _makeStart(
-      const URLRequest& request) const override;
+  std::shared_ptr<const HVFeedback> _makeStart(const URLRequest& request) const override;
   std::optional<SteadyTime> _deadline(const ZLKBag* bag) const override;
   void _didSend() override { state_->_setPerformedSearch(); }
 

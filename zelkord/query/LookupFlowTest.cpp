@@ -1,6 +1,6 @@
 #include <gtest/gtest.h>
 
-#include "zelkord/feedback/DaemonFeedback.h"
+#include "halvane/DaemonFeedback.h"
 #include "zelkord/query/LookupFlow.h"
 #include "zelkord/query/QueryTestSupport.h"
 
@@ -9,7 +9,7 @@ namespace {
 
 TEST(LookupFlowTest, RecordsTheWayTheTextWasSelected) {
   for (const auto& [type, recorded] :
-       std::vector<std::pair<std::uint32_t, std::uint32_t>>{{0, 0}, {1, 1}, {2, 2}, {3, 0}}) {
+       std::vector<std::pair<std::uint32_t, std::int32_t>>{{0, 0}, {1, 1}, {2, 2}, {3, 0}}) {
     SCOPED_TRACE(type);
     QueryBed bed;
     bed.installBag(kTestBag);
@@ -19,7 +19,7 @@ TEST(LookupFlowTest, RecordsTheWayTheTextWasSelected) {
     const auto records = bed.records();
     const auto& start =
         dynamic_cast<const ZLKLookupStartNetworkSearchFeedback&>(*records[0].feedback);
-    EXPECT_EQ(start.lookupSelectionType, recorded);
+    EXPECT_EQ(start.lookupSelectionType.value, recorded);
   }
 }
 

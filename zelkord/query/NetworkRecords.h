@@ -13,29 +13,20 @@ namespace zelkord {
 
 class ClientState;
 
-// The feedback about one network request of a client.
-
-void fillStart(HVStartNetworkSearchFeedback& start, const URLRequest& request, std::string input,
-               std::uint32_t triggerEvent, std::int32_t endpoint);
-std::shared_ptr<const HVStartNetworkSearchFeedback> startNetworkFeedback(const URLRequest& request,
-                                                                         std::string input,
-                                                                         std::uint32_t triggerEvent,
-                                                                         std::int32_t endpoint);
+// The ends of a client's network requests, as feedback.
 
 // A request that got no usable answer: an error record when there is an error (which also counts
 // "noconnection"), then the end record.
 void failSearchFeedback(const ClientState& state, const std::optional<Error>& error,
-                        const ZLKRequest& request,
-                        const std::shared_ptr<const HVStartNetworkSearchFeedback>& start,
-                        const URLResult& result, const TimingData& timing);
+                        const ZLKRequest& request, const URLResult& result,
+                        const TimingData& timing);
 
 // The end record of a request that was answered. `rawResponse` is the parsed body, null when it did
 // not parse: of a non-empty list, the service's own fields are kept; of several entries the last
 // with each field wins. For a routed request the record waits for what the proxy knows of the
 // connection.
-void endNetworkFeedback(const std::shared_ptr<ClientState>& state,
-                        const std::shared_ptr<const HVStartNetworkSearchFeedback>& start,
+void endNetworkFeedback(const std::shared_ptr<ClientState>& state, const ZLKRequest& request,
                         const json::value* rawResponse, const URLResult& result,
-                        const std::shared_ptr<URLTask>& task, std::int64_t queryId);
+                        const std::shared_ptr<URLTask>& task);
 
 }  // namespace zelkord

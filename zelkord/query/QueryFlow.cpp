@@ -39,8 +39,7 @@ void QueryFlow::_send() {
   if (!request) return _reply(std::nullopt, zelkorError(kBagFault, "no URL"));
   httpRequest_ = *std::move(request);
   _logRequest();
-  start_ = _makeStart(httpRequest_);
-  state_->record(start_, *request_, guid);
+  state_->record(_makeStart(httpRequest_), *request_, guid);
   const auto task = _makeTask(bag.get());
   if (traits_.routing == QueryRouting::ThroughProxy) useRoutingProxy(assembly_, *task);
   task->resume();
@@ -55,9 +54,15 @@ void QueryFlow::_logRequest() const {
                priv(headersForLog(httpRequest_.headers)));
 }
 
-std::shared_ptr<const HVStartNetworkSearchFeedback> QueryFlow::_makeStart(
-    const URLRequest& request) const {
-  return startNetworkFeedback(request, _input(), request_->triggerEvent, traits_.endpoint);
+std::shared_ptr<const HVFeedback> QueryFlow::_makeStart(const URLRequest& request) const {
+  return startNetworkSearch(request, _origin(request_->triggerEvent));
+}
+
+NetworkSearchOrigin QueryFlow::_origin(std::uint32_t triggerEvent) const {
+  return {.triggerEvent = static_cast<std::int32_t>(triggerEvent),
+          .endpointType = traits_.endpoint,
+          .input = _input(),
+          .uuid = request_->uuid};
 }
 
 std::shared_ptr<URLTask> QueryFlow::_makeTask(const ZLKBag* bag) {
@@ -93,8 +98,7 @@ void QueryFlow::_accept(const std::shared_ptr<URLTask>& task, const URLResult& r
   body.parsed = parseJson(body.data.view(), &body.problem);
   if (const auto refusal = _refusalOfBody(body)) return _fail(*task, result, *refusal);
   if (body.parsed) _use(*body.parsed, body.data);
-  endNetworkFeedback(state_, start_, body.parsed ? &*body.parsed : nullptr, result, task,
-                     request_->queryId);
+  endNetworkFeedback(state_, *request_, body.parsed ? &*body.parsed : nullptr, result, task);
   auto reply = _makeReply(body.data);
   if (request_->verboseReply) addHTTPExchange(reply, httpRequest_, *result.response);
   _willReply(*result.response);
@@ -109,7 +113,7 @@ void QueryFlow::_use(const json::value& rawResponse, const Data& data) {
 }
 
 void QueryFlow::_fail(const URLTask& task, const URLResult& result, const Refusal& refusal) {
-  failSearchFeedback(*state_, refusal.error, *request_, start_, result, task.timingData());
+  failSearchFeedback(*state_, refusal.error, *request_, result, task.timingData());
   _reply(std::nullopt, refusal.error);
 }
 

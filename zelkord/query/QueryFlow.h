@@ -7,6 +7,7 @@
 
 #include "platform/api/URLSession.h"
 #include "zelkord/ZelkorLogging/ZelkorLogging.h"
+#include "zelkord/network/NetworkSearchRecords.h"
 #include "zelkord/query/ClientState.h"
 
 namespace zelkord {
@@ -77,8 +78,7 @@ class QueryFlow : public std::enable_shared_from_this<QueryFlow> {
                                                  const std::optional<UUID>& userGuid) = 0;
   // The text that the records show as the query's.
   virtual std::string _input() const { return {}; }
-  virtual std::shared_ptr<const HVStartNetworkSearchFeedback> _makeStart(
-      const URLRequest& request) const;
+  virtual std::shared_ptr<const HVFeedback> _makeStart(const URLRequest& request) const;
   // No attempt begins after it.
   virtual std::optional<SteadyTime> _deadline(const ZLKBag*) const { return std::nullopt; }
   virtual void _didSend() {}
@@ -89,6 +89,7 @@ class QueryFlow : public std::enable_shared_from_this<QueryFlow> {
   virtual void _didParse(const json::value&, const Data&) {}
   virtual void _willReply(const URLResponse&) {}
 
+  NetworkSearchOrigin _origin(std::uint32_t triggerEvent) const;
   void _reply(std::optional<ZLKReply> reply, std::optional<Error> error);
   ZLKReply _makeReply(Data data) const;
   const Logger& _log() const;
@@ -114,9 +115,6 @@ class QueryFlow : public std::enable_shared_from_this<QueryFlow> {
 
   // Fixed after construction.
   const ReplyCallback reply_;
-
-  // Set before the task begins, read by its completion.
-  std::shared_ptr<const HVStartNetworkSearchFeedback> start_;
 };
 
 }  // namespace zelkord

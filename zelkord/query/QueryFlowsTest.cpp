@@ -1,7 +1,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include "zelkord/feedback/DaemonFeedback.h"
+#include "halvane/DaemonFeedback.h"
 #include "zelkord/network/ImageFetcher.h"
 #include "zelkord/query/FlowKindsTestSupport.h"
 #include "zelkord/query/QueryCache.h"
@@ -51,16 +51,19 @@ TEST(QueryFlowsTest, RecordBothEndsOfTheRequest) {
     SCOPED_TRACE(kind.name);
     AskedQuery query(kind);
     query.ask(true);
-    query.task().setTimingData({.bytesSent = 99});
+    query.task().setTimingData(
+        {.bytesSent = 99, .reused = true, .interface = "10.0.0.2", .peerAddress = "10.0.0.1:443"});
     query.succeed(200, kFlowResponse);
     EXPECT_THAT(query.bed.recordedClasses(),
                 ElementsAre(kind.startClass, "ZLKEndNetworkSearchFeedback"));
-    const auto& start = query.record<HVStartNetworkSearchFeedback>(0);
+    const auto& start = query.record<NetworkSearchStart>(0);
     EXPECT_EQ(start.input, kind.input);
-    EXPECT_EQ(start.triggerEvent, kind.trigger);
-    EXPECT_EQ(start.endpoint, kind.endpoint);
+    EXPECT_EQ(start.triggerEvent.value, static_cast<std::int32_t>(kind.trigger));
+    EXPECT_EQ(start.endpointType.value, kind.endpoint);
+    EXPECT_EQ(start.uuid, "uuid of snow");
     EXPECT_EQ(start.url, query.task().request().url);
-    EXPECT_EQ(start.headers, query.task().request().headers);
+    const auto& headers = query.task().request().headers;
+    EXPECT_EQ(start.headers, StringMap(headers.begin(), headers.end()));
     const auto records = query.bed.records();
     EXPECT_EQ(records[0].clientQueryId, 70u);
     for (const auto& record : records) {
@@ -69,10 +72,15 @@ TEST(QueryFlowsTest, RecordBothEndsOfTheRequest) {
       EXPECT_EQ(record.userAgent, "Lanthe/9");
     }
     const auto& end = query.record<ZLKEndNetworkSearchFeedback>(1);
-    EXPECT_EQ(end.startSearch.get(), &start);
+    EXPECT_EQ(end.uuid, start.uuid);
+    EXPECT_EQ(end.connectionReused, true);
+    EXPECT_EQ(end.interface, "10.0.0.2");
+    EXPECT_EQ(end.peerAddress, "10.0.0.1:443");
     EXPECT_EQ(end.statusCode, 200);
     EXPECT_EQ(end.responseSize, static_cast<std::int64_t>(std::string_view(kFlowResponse).size()));
-    EXPECT_EQ(end.networkTimingData->at("bytes_sent"), 99);
+    const auto timing = parseJson(end.networkTimingData->text)->as_object();
+    EXPECT_EQ(timing.at("bytes_sent"), 99);
+    EXPECT_TRUE(timing.at("tls").is_null());  // it did not happen
     EXPECT_EQ(end.zelkorStatus, "OK");
     EXPECT_EQ(end.fbq, "f");
     EXPECT_EQ(end.partialClientIp, "10.0");
@@ -104,7 +112,7 @@ TEST(QueryFlowsTest, WaitForABagOnlyWhereTheyNeedOne) {
     EXPECT_EQ(query.takeLog().back(), kind.noBag);
     EXPECT_THAT(query.bed.recordedClasses(), ElementsAre("ZLKSkipSearchFeedback"));
     const auto& skip = query.record<ZLKSkipSearchFeedback>(0);
-    EXPECT_EQ(skip.triggerEvent, 3u);
+    EXPECT_EQ(skip.triggerEvent.value, 3);
     EXPECT_EQ(skip.input, kind.input);
   }
 }
@@ -121,7 +129,7 @@ TEST(QueryFlowsTest, MindWhatTheBagForbidsOnlyWhereTheyNeedOne) {
     EXPECT_EQ(query.takeLog().back(), kind.disabled);
     EXPECT_THAT(query.bed.recordedClasses(), ElementsAre("ZLKSkipSearchFeedback"));
     const auto& skip = query.record<ZLKSkipSearchFeedback>(0);
-    EXPECT_EQ(skip.triggerEvent, 2u);
+    EXPECT_EQ(skip.triggerEvent.value, 2);
     EXPECT_EQ(skip.input, kind.input);
     EXPECT_EQ(query.bed.records()[0].clientQueryId, 70u);
   }
@@ -216,10 +224,11 @@ TEST(QueryFlowsTest, TakeOnlyTheAnswersTheyCanUse) {
       EXPECT_EQ(query.clientCounter("noconnection"), error ? 1 : 0);
       EXPECT_EQ(query.bed.fakes.log.count(LogLevel::Error), fails ? 1 : 0);
       ASSERT_EQ(query.bed.records().size(), error ? 3u : 2u);
-      const auto& end = query.record<HVEndNetworkSearchFeedback>(error ? 2 : 1);
+      const auto& end = query.record<NetworkSearchEnd>(error ? 2 : 1);
       EXPECT_EQ(end.statusCode, reply.status.value_or(0));
       EXPECT_EQ(end.responseSize, static_cast<std::int64_t>(body.size()));
-      if (const auto* full = dynamic_cast<const ZLKEndNetworkSearchFeedback*>(&end)) {
+      const auto& record = *query.bed.records().back().feedback;
+      if (const auto* full = dynamic_cast<const ZLKEndNetworkSearchFeedback*>(&record)) {
         EXPECT_FALSE(full->zelkorStatus || full->fbq || full->partialClientIp ||
                      full->zelkorDuration);
       }

@@ -3,8 +3,8 @@
 #include <utility>
 
 #include "base/Text.h"
+#include "halvane/DaemonFeedback.h"
 #include "zelkord/assembly/Assembly.h"
-#include "zelkord/feedback/DaemonFeedback.h"
 #include "zelkord/feedback/UserGUIDSource.h"
 #include "zelkord/network/ZLKNetworkRequestFactory.h"
 #include "zelkord/network/ZelkorBagController.h"
@@ -14,7 +14,7 @@ namespace zelkord {
 namespace {
 
 constexpr QueryTraits kSearchTraits = {.name = "search", .category = Category::Search};
-constexpr std::uint32_t kCacheHitTrigger = 4;
+constexpr std::int32_t kCacheHitTrigger = 4;
 // Of one response, handed to the cache together. Each carries the typed text, so that a long list
 // is not built as a whole.
 constexpr std::size_t kSetsAtOnce = 256;

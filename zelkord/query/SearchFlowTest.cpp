@@ -1,7 +1,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include "zelkord/feedback/DaemonFeedback.h"
+#include "halvane/DaemonFeedback.h"
 #include "zelkord/network/NotificationNames.h"
 #include "zelkord/query/QueryCache.h"
 #include "zelkord/query/QueryTestSupport.h"
@@ -35,7 +35,7 @@ TEST_F(SearchFlowTest, TellsThatATextWasTooShort) {
   const auto records = bed_.records();
   ASSERT_EQ(records.size(), 1u);
   const auto& skip = dynamic_cast<const ZLKSkipSearchFeedback&>(*records[0].feedback);
-  EXPECT_EQ(skip.triggerEvent, 1u);
+  EXPECT_EQ(skip.triggerEvent.value, 1);
   EXPECT_EQ(skip.input, "snow");
   EXPECT_TRUE(records[0].userGuid);
   EXPECT_TRUE(bed_.fakes.log.contains("query[3] input '<private>' less than minQueryLength"));
@@ -161,9 +161,11 @@ TEST_F(SearchFlowTest, AddsWhatTheProxyKnowsToTheRecordOfARoutedRequest) {
   lastTask().setConnectionInformation({{"proxy", "https://proxy.example:8443"}});
   answer(200, kOneResultSet);
   const auto records = bed_.records();
-  const auto& end = dynamic_cast<const HVEndNetworkSearchFeedback&>(*records.back().feedback);
-  ASSERT_TRUE(end.networkTimingData->contains("Morvane"));
-  EXPECT_EQ(end.networkTimingData->at("Morvane").at("proxy"), "https://proxy.example:8443");
+  const auto& end = dynamic_cast<const NetworkSearchEnd&>(*records.back().feedback);
+  const auto timing = parseJson(end.networkTimingData->text)->as_object();
+  EXPECT_TRUE(timing.contains("bytes_sent"));
+  ASSERT_TRUE(timing.contains("Morvane"));
+  EXPECT_EQ(timing.at("Morvane").at("proxy"), "https://proxy.example:8443");
 }
 
 TEST_F(SearchFlowTest, KeepsTypedTextOutOfTheLog) {

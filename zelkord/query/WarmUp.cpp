@@ -1,17 +1,17 @@
 #include "zelkord/query/WarmUp.h"
 
+#include "platform/api/RandomUUID.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/feedback/SessionManager.h"
-#include "zelkord/network/NetworkTiming.h"
+#include "zelkord/network/NetworkSearchRecords.h"
 #include "zelkord/network/UserAgent.h"
 #include "zelkord/network/ZLKNetworkRequestFactory.h"
-#include "zelkord/query/NetworkRecords.h"
 #include "zelkord/query/RoutingProxy.h"
 
 namespace zelkord {
 namespace {
 
-constexpr std::uint32_t kWarmTrigger = 19;
+constexpr std::int32_t kWarmTrigger = 19;
 constexpr std::int32_t kWarmEndpoint = 12;
 
 void recordWarm(Assembly& assembly, std::shared_ptr<const HVFeedback> feedback) {
@@ -21,18 +21,12 @@ void recordWarm(Assembly& assembly, std::shared_ptr<const HVFeedback> feedback) 
       {std::move(feedback), 0, std::nullopt, zelkordUserAgent(assembly.platform().device), 0});
 }
 
-void finishWarm(Assembly& assembly,
-                const std::shared_ptr<const HVStartNetworkSearchFeedback>& start,
-                const URLTask& task, const URLResult& result) {
+void finishWarm(Assembly& assembly, const std::string& uuid, const URLTask& task,
+                const URLResult& result) {
   assembly.log(Category::Search)
       .info("Status for warm request: ({}) error: ({})", result.status(),
             result.error ? result.error->description() : "(null)");
-  auto end = std::make_shared<HVEndNetworkSearchFeedback>();
-  end->startSearch = start;
-  end->responseSize = static_cast<std::int64_t>(result.dataLength());
-  end->statusCode = result.status();
-  end->networkTimingData = networkTimingData(task.timingData());
-  recordWarm(assembly, std::move(end));
+  recordWarm(assembly, endNetworkSearch(uuid, result, task.timingData()));
 }
 
 }  // namespace
@@ -40,11 +34,13 @@ void finishWarm(Assembly& assembly,
 void sendWarmRequest(Assembly& assembly, const std::string& url) {
   const auto request = assembly.requestFactory()->warmRequest(url);
   if (!request) return;
-  const auto start = startNetworkFeedback(*request, "", kWarmTrigger, kWarmEndpoint);
-  recordWarm(assembly, start);
+  const auto uuid = randomUUID(assembly.platform().random).string();
+  recordWarm(assembly, startNetworkSearch(*request, {.triggerEvent = kWarmTrigger,
+                                                     .endpointType = kWarmEndpoint,
+                                                     .uuid = uuid}));
   const auto task = assembly.urlSession().dataTask(
-      *request, [&assembly, start](const auto& finished, const URLResult& result) {
-        finishWarm(assembly, start, *finished, result);
+      *request, [&assembly, uuid](const auto& finished, const URLResult& result) {
+        finishWarm(assembly, uuid, *finished, result);
       });
   useRoutingProxy(assembly, *task);
   task->resume();

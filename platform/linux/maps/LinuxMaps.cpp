@@ -1,6 +1,6 @@
 #include "platform/linux/maps/LinuxMaps.h"
 
-#include "base/UUID.h"
+#include "platform/api/RandomUUID.h"
 #include "platform/linux/locale/LocaleText.h"
 
 namespace zelkord {
@@ -12,11 +12,7 @@ LinuxMaps::LinuxMaps(const DeviceProfileStore& store, const LocaleService& local
   session_ = freshSession();
 }
 
-std::string LinuxMaps::freshSession() {
-  std::array<std::uint8_t, 16> bytes{};
-  random_.fill(bytes.data(), bytes.size());
-  return UUID::fromRandomBytes(bytes).string();
-}
+std::string LinuxMaps::freshSession() { return randomUUID(random_).string(); }
 
 std::string LinuxMaps::countryCode() const {
   const auto profile = store_.current();

@@ -1,0 +1,35 @@
+#pragma once
+
+#include <functional>
+#include <memory>
+
+#include "halvane/StoredFeedback.h"
+#include "zelkord/feedback/ZelkorFeedback.h"
+
+namespace zelkord {
+
+// Where one session writes itself as it happens.
+//
+// Threading: any thread; nothing waits for the disk, and what one thread hands over is written in
+// that order. Errors: what cannot be written is logged and counted by the container.
+class SessionContainer {
+ public:
+  virtual ~SessionContainer() = default;
+  // First, once.
+  virtual void writeSessionHeader(const CZClientSession& header) = 0;
+  // `done`, when given, runs after the attempt, on the storage's queue; never for a closed
+  // container.
+  virtual void writeFeedback(const ZelkorFeedback& feedback, std::function<void()> done) = 0;
+};
+
+// Hands out containers and collects those of sessions that ended. Threading: any thread.
+class SessionStorage {
+ public:
+  virtual ~SessionStorage() = default;
+  // Open for writing; null when there can be none.
+  virtual std::shared_ptr<SessionContainer> createFileContainerForWriting() = 0;
+  // No record follows; the container may be read and uploaded.
+  virtual void closeSession(std::shared_ptr<SessionContainer> container) = 0;
+};
+
+}  // namespace zelkord
