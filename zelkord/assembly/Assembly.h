@@ -13,6 +13,7 @@ namespace zelkord {
 
 class ClientStateManager;
 class CrowdsourcingFlusher;
+class FeedbackGate;
 class FeedbackSessions;
 class FeedbackStreams;
 class FlushActivities;
@@ -62,6 +63,7 @@ class Assembly final {
   FeedbackSessions* feedbackSessions() const { return feedbackSessions_.get(); }
   SessionStorage* persistentStorage() const { return persistentStorage_.get(); }
   FeedbackStreams* flusherXPCListener() const { return flusherXPCListener_.get(); }
+  FeedbackGate* feedbackGate() const { return feedbackGate_.get(); }
   FlushActivities* backgroundFlusher() const { return backgroundFlusher_.get(); }
   CrowdsourcingFlusher* crowdsourcingFeedbackFlusher() const {
     return crowdsourcingFeedbackFlusher_.get();
@@ -98,6 +100,7 @@ class Assembly final {
   void setFlusherXPCListener(std::shared_ptr<FeedbackStreams> streams) {
     flusherXPCListener_.set(std::move(streams));
   }
+  void setFeedbackGate(std::shared_ptr<FeedbackGate> gate) { feedbackGate_.set(std::move(gate)); }
   void setBackgroundFlusher(std::shared_ptr<FlushActivities> activities) {
     backgroundFlusher_.set(std::move(activities));
   }
@@ -144,6 +147,7 @@ class Assembly final {
   // In the order in which they are made; released in the reverse one.
   Slot<SessionStorage> persistentStorage_;
   Slot<FeedbackStreams> flusherXPCListener_;
+  Slot<FeedbackGate> feedbackGate_;
   Slot<FlushActivities> backgroundFlusher_;
   Slot<CrowdsourcingFlusher> crowdsourcingFeedbackFlusher_;
   Slot<ResourceVersions> downloadManager_;

@@ -2,6 +2,8 @@
 
 #include <functional>
 #include <map>
+#include <memory>
+#include <optional>
 #include <string>
 
 #include "zelkord/feedback/ZelkorFeedback.h"
@@ -32,6 +34,14 @@ class CrowdsourcingFlusher {
   virtual ~CrowdsourcingFlusher() = default;
   virtual void flush(std::shared_ptr<const HVFeedback> feedback,
                      std::function<void()> callback) = 0;
+};
+
+// Whether the service wants feedback.
+class FeedbackGate {
+ public:
+  virtual ~FeedbackGate() = default;
+  // Of clients with that user agent; false while nothing is known.
+  virtual bool dropsFeedback(const std::optional<std::string>& userAgent) = 0;
 };
 
 // The versions of the data files that the daemon has, by identifier.
