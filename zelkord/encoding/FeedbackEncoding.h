@@ -16,22 +16,35 @@ namespace zelkord {
 // Threading: any thread. Requires records whose enumerations are in their tables, as the readers of
 // messages see to.
 
+// The type of kinds that have none of their own.
+inline constexpr std::uint32_t kGenericFeedbackType = 21;
+
 // The feedback type: the row of the record in the table of event types.
 std::uint32_t typeOf(const HVFeedback& feedback);
 
 // Whether what is sent carries the query identifiers.
 bool requiresQueryId(const HVFeedback& feedback);
 
-// Appends the members of what is sent, `"key":value` joined by commas, without braces. False, with
-// `text` as it was, when JSON cannot express them: a number that is not finite, or custom feedback
-// that is not a JSON object. A kind without an encoder has no members and logs an error.
-bool appendMembers(const HVFeedback& feedback, const Logger& errors, std::string& text);
+// Appends the members of what is sent, `"key":value` joined by commas, without braces, to a text
+// in which the object's first member would stand at `begin`. False, with `text` as it was, when
+// JSON cannot express them: a number that is not finite, or custom feedback that is not a JSON
+// object. A kind without an encoder has no members and logs an error.
+//
+// Custom feedback is the client's own object, its text as it came; members that every record sets
+// by itself ("query_id", "client_query_id", "type", "timestamp") are left out of it.
+bool appendMembers(const HVFeedback& feedback, const Logger& errors, std::size_t begin,
+                   std::string& text);
 
 // What is sent as a value; empty when JSON cannot express it.
 json::object dictionaryOf(const HVFeedback& feedback, const Logger& errors);
 
-// The record with its identifiers prepared for sending: each result's and suggestion's replaced,
-// references and descriptions reported. The same record when it has none.
+// The value of a JSON text that was written here: nested as deep as what clients may send, and a
+// little more. Null when it does not parse.
+json::value valueOfOwnJson(std::string_view text);
+
+// The record with its identifiers prepared for sending: each result's and suggestion's is replaced;
+// those that the record describes are reported as expanded, those that it only names as
+// referenced. The same record when it has none.
 std::shared_ptr<const HVFeedback> processed(std::shared_ptr<const HVFeedback> feedback,
                                             IdentifierProcessor& processor);
 
