@@ -8,7 +8,7 @@
 #include "platform/testing/FakePlatform.h"
 #include "platform/testing/PlatformOnQueues.h"
 #include "zelkord/assembly/Assembly.h"
-#include "zelkord/network/NotificationNames.h"
+#include "zelkord/assembly/NotificationNames.h"
 #include "zelkord/network/ZLKNetworkRequestFactory.h"
 #include "zelkord/network/ZelkorBagController.h"
 

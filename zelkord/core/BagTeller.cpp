@@ -2,9 +2,9 @@
 
 #include "corezelkor/Constants.h"
 #include "zelkord/assembly/Assembly.h"
+#include "zelkord/assembly/NotificationNames.h"
 #include "zelkord/core/ClientStateManager.h"
 #include "zelkord/core/Wire.h"
-#include "zelkord/network/NotificationNames.h"
 #include "zelkord/network/RequestLogText.h"
 #include "zelkord/network/ZelkorBagController.h"
 

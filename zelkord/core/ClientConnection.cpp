@@ -3,10 +3,10 @@
 #include "corezelkor/Constants.h"
 #include "platform/api/RandomUUID.h"
 #include "zelkord/assembly/Assembly.h"
+#include "zelkord/assembly/UserAgent.h"
 #include "zelkord/core/ClientStateManager.h"
 #include "zelkord/feedback/SessionManager.h"
 #include "zelkord/network/ErrorFeedback.h"
-#include "zelkord/network/UserAgent.h"
 #include "zelkord/query/ErrorCodes.h"
 
 namespace zelkord {

@@ -4,11 +4,11 @@
 #include <csignal>
 
 #include "corezelkor/Constants.h"
+#include "zelkord/assembly/NotificationNames.h"
 #include "zelkord/core/ClientStateManager.h"
 #include "zelkord/core/CommandLine.h"
 #include "zelkord/core/DaemonTestSupport.h"
 #include "zelkord/core/ZelkorService.h"
-#include "zelkord/network/NotificationNames.h"
 
 namespace zelkord {
 namespace {

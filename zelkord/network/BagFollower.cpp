@@ -3,8 +3,8 @@
 #include <utility>
 
 #include "zelkord/assembly/Assembly.h"
+#include "zelkord/assembly/NotificationNames.h"
 #include "zelkord/network/LocationController.h"
-#include "zelkord/network/NotificationNames.h"
 #include "zelkord/network/VisibilityRestrictions.h"
 
 namespace zelkord {

@@ -1,7 +1,7 @@
 #include <gmock/gmock.h>
 
+#include "zelkord/assembly/NotificationNames.h"
 #include "zelkord/network/ContextUpdater.h"
-#include "zelkord/network/NotificationNames.h"
 #include "zelkord/network/RequestFactoryTestSupport.h"
 #include "zelkord/network/VisibilityRestrictions.h"
 

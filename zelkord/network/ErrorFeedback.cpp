@@ -2,10 +2,10 @@
 
 #include "halvane/ModelFeedback.h"
 #include "zelkord/assembly/Assembly.h"
+#include "zelkord/assembly/UserAgent.h"
 #include "zelkord/encoding/ErrorEncoding.h"
 #include "zelkord/feedback/SessionManager.h"
 #include "zelkord/feedback/UserGUIDSource.h"
-#include "zelkord/network/UserAgent.h"
 
 namespace zelkord {
 

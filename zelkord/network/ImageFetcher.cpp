@@ -4,11 +4,11 @@
 
 #include "platform/api/RandomUUID.h"
 #include "zelkord/assembly/Assembly.h"
+#include "zelkord/assembly/UserAgent.h"
 #include "zelkord/feedback/SessionManager.h"
 #include "zelkord/network/ErrorFeedback.h"
 #include "zelkord/network/NetworkSearchRecords.h"
 #include "zelkord/network/URLHost.h"
-#include "zelkord/network/UserAgent.h"
 #include "zelkord/storage/mmapFileHandle.h"
 
 namespace zelkord {

@@ -6,10 +6,10 @@
 #include "halvane/ModelFeedback.h"
 #include "platform/testing/FakePlatform.h"
 #include "zelkord/assembly/Assembly.h"
+#include "zelkord/assembly/UserAgent.h"
 #include "zelkord/encoding/ErrorEncoding.h"
 #include "zelkord/feedback/InMemorySessions.h"
 #include "zelkord/network/ImageFetcher.h"
-#include "zelkord/network/UserAgent.h"
 #include "zelkord/network/ZelkorUserGUIDController.h"
 
 namespace zelkord {

@@ -1,6 +1,6 @@
 #include "zelkord/network/RequestFactoryTestSupport.h"
 
-#include "zelkord/network/NotificationNames.h"
+#include "zelkord/assembly/NotificationNames.h"
 
 namespace zelkord {
 

@@ -3,15 +3,15 @@
 #include <utility>
 
 #include "zelkord/assembly/Assembly.h"
+#include "zelkord/assembly/NotificationNames.h"
+#include "zelkord/assembly/UserAgent.h"
 #include "zelkord/network/AppSignatureSource.h"
 #include "zelkord/network/BagFollower.h"
 #include "zelkord/network/ContextUpdater.h"
 #include "zelkord/network/HeaderJson.h"
 #include "zelkord/network/LocationController.h"
-#include "zelkord/network/NotificationNames.h"
 #include "zelkord/network/RequestContextStore.h"
 #include "zelkord/network/RequestItems.h"
-#include "zelkord/network/UserAgent.h"
 #include "zelkord/network/ZelkorBagController.h"
 #include "zelkord/network/ZelkorURLRequestBuilder.h"
 

@@ -5,14 +5,14 @@
 #include "base/Text.h"
 #include "corezelkor/Constants.h"
 #include "zelkord/assembly/Assembly.h"
+#include "zelkord/assembly/NotificationNames.h"
+#include "zelkord/assembly/UserAgent.h"
 #include "zelkord/network/BagFetchFeedback.h"
 #include "zelkord/network/BagRefreshRule.h"
 #include "zelkord/network/BagRequests.h"
 #include "zelkord/network/BagResponse.h"
-#include "zelkord/network/NotificationNames.h"
 #include "zelkord/network/RequestLogText.h"
 #include "zelkord/network/URLComponents.h"
-#include "zelkord/network/UserAgent.h"
 #include "zelkord/network/ZLKRetryableNetworkRequest.h"
 
 namespace zelkord {

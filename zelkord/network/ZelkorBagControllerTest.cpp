@@ -7,9 +7,9 @@
 #include "halvane/ModelFeedback.h"
 #include "platform/testing/FakePlatform.h"
 #include "zelkord/assembly/Assembly.h"
+#include "zelkord/assembly/NotificationNames.h"
 #include "zelkord/feedback/SessionManager.h"
 #include "zelkord/network/BagRequests.h"
-#include "zelkord/network/NotificationNames.h"
 #include "zelkord/network/ZelkorBagController.h"
 #include "zelkord/network/ZelkorUserGUIDController.h"
 

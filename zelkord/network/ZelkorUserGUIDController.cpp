@@ -2,7 +2,7 @@
 
 #include "platform/api/RandomUUID.h"
 #include "zelkord/assembly/Assembly.h"
-#include "zelkord/network/NotificationNames.h"
+#include "zelkord/assembly/NotificationNames.h"
 
 namespace zelkord {
 namespace {

@@ -2,7 +2,7 @@
 
 #include "platform/testing/FakePlatform.h"
 #include "zelkord/assembly/Assembly.h"
-#include "zelkord/network/NotificationNames.h"
+#include "zelkord/assembly/NotificationNames.h"
 #include "zelkord/network/ZelkorUserGUIDController.h"
 
 namespace zelkord {

@@ -1,9 +1,9 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include "zelkord/assembly/ClientShortName.h"
+#include "zelkord/assembly/NotificationNames.h"
 #include "zelkord/feedback/UserGUIDSource.h"
-#include "zelkord/network/NotificationNames.h"
-#include "zelkord/query/ClientShortName.h"
 #include "zelkord/query/ClientState.h"
 #include "zelkord/query/QueryCache.h"
 #include "zelkord/query/QueryTestSupport.h"

@@ -4,7 +4,7 @@
 
 #include "base/Text.h"
 #include "zelkord/assembly/Assembly.h"
-#include "zelkord/network/NotificationNames.h"
+#include "zelkord/assembly/NotificationNames.h"
 
 namespace zelkord {
 namespace {

@@ -1,6 +1,6 @@
 #include <gtest/gtest.h>
 
-#include "zelkord/network/NotificationNames.h"
+#include "zelkord/assembly/NotificationNames.h"
 #include "zelkord/query/QueryCache.h"
 #include "zelkord/query/QueryTestSupport.h"
 

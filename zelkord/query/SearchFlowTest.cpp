@@ -2,7 +2,7 @@
 #include <gtest/gtest.h>
 
 #include "halvane/DaemonFeedback.h"
-#include "zelkord/network/NotificationNames.h"
+#include "zelkord/assembly/NotificationNames.h"
 #include "zelkord/query/QueryCache.h"
 #include "zelkord/query/QueryTestSupport.h"
 #include "zelkord/query/SearchFlow.h"

@@ -2,9 +2,9 @@
 
 #include "platform/api/RandomUUID.h"
 #include "zelkord/assembly/Assembly.h"
+#include "zelkord/assembly/UserAgent.h"
 #include "zelkord/feedback/SessionManager.h"
 #include "zelkord/network/NetworkSearchRecords.h"
-#include "zelkord/network/UserAgent.h"
 #include "zelkord/network/ZLKNetworkRequestFactory.h"
 #include "zelkord/query/RoutingProxy.h"
 

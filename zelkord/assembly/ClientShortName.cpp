@@ -1,4 +1,4 @@
-#include "zelkord/query/ClientShortName.h"
+#include "zelkord/assembly/ClientShortName.h"
 
 #include <array>
 

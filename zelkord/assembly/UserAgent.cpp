@@ -1,4 +1,4 @@
-#include "zelkord/network/UserAgent.h"
+#include "zelkord/assembly/UserAgent.h"
 
 #include <fmt/core.h>
 

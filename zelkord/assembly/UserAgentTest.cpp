@@ -1,7 +1,7 @@
 #include <gtest/gtest.h>
 
 #include "platform/testing/FakeDevice.h"
-#include "zelkord/network/UserAgent.h"
+#include "zelkord/assembly/UserAgent.h"
 
 namespace zelkord {
 namespace {
