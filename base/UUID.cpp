@@ -10,6 +10,39 @@ UUID UUID::fromRandomBytes(std::array<std::uint8_t, 16> random) {
   return {random};
 }
 
+namespace {
+
+constexpr bool isDash(std::size_t position) {
+  return position == 8 || position == 13 || position == 18 || position == 23;
+}
+
+int digitOf(char character) {
+  if (character >= '0' && character <= '9') return character - '0';
+  if (character >= 'A' && character <= 'F') return character - 'A' + 10;
+  if (character >= 'a' && character <= 'f') return character - 'a' + 10;
+  return -1;
+}
+
+}  // namespace
+
+std::optional<UUID> UUID::fromString(std::string_view text) {
+  constexpr std::size_t kLength = 36;
+  if (text.size() != kLength) return std::nullopt;
+  UUID uuid;
+  std::size_t digits = 0;
+  for (std::size_t i = 0; i < kLength; ++i) {
+    if (isDash(i)) {
+      if (text[i] != '-') return std::nullopt;
+      continue;
+    }
+    const int digit = digitOf(text[i]);
+    if (digit < 0) return std::nullopt;
+    auto& byte = uuid.bytes[digits++ / 2];
+    byte = static_cast<std::uint8_t>(byte << 4 | digit);
+  }
+  return uuid;
+}
+
 std::string UUID::string() const {
   constexpr std::string_view kDigits = "0123456789ABCDEF";
   std::string text;

@@ -9,7 +9,8 @@
 #include "zelkord/core/Diagnostics.h"
 #include "zelkord/core/ServiceInterfaces.h"
 #include "zelkord/core/ZelkorService.h"
-#include "zelkord/feedback/InMemorySessions.h"
+#include "zelkord/feedback/StoredSessions.h"
+#include "zelkord/network/BagFeedbackGate.h"
 #include "zelkord/network/ImageFetcher.h"
 #include "zelkord/network/ZLKNetworkRequestFactory.h"
 #include "zelkord/network/ZelkorBagController.h"
@@ -47,8 +48,8 @@ void Daemon::_registerDefaults() {
 // The order is required: a service finds earlier ones in the assembly.
 void Daemon::_makeServices() {
   auto& assembly = *assembly_;
-  assembly.setFeedbackSessions(
-      std::make_shared<InMemorySessions>(boolSetting(platform_.settings, "ZLKSharedSession")));
+  assembly.setFeedbackGate(std::make_shared<BagFeedbackGate>(assembly));
+  assembly.setFeedbackSessions(std::make_shared<StoredSessions>(assembly));
   const auto factory = std::make_shared<ZLKNetworkRequestFactory>(assembly);
   assembly.setRequestFactory(factory);
   factory->start();

@@ -20,8 +20,10 @@ ZelkorService::ZelkorService(Assembly& assembly, std::shared_ptr<ipc::CallHandle
       otherCalls_(std::move(otherCalls)),
       queue_(assembly.platform().queues.makeSerialQueue("com.quenta.zelkor.serviceQueue")) {
   assembly.setSharedSession(boolSetting(assembly.userDefaults(), "ZLKSharedSession"));
-  assembly.setGuidController(std::make_shared<ZelkorUserGUIDController>(assembly));
-  assembly.setClientSessionManager(assembly.feedbackSessions()->makeManager("zelkor"));
+  const auto guidController = std::make_shared<ZelkorUserGUIDController>(assembly);
+  assembly.setGuidController(guidController);
+  assembly.setClientSessionManager(
+      assembly.feedbackSessions()->makeManager("zelkor", guidController));
 }
 
 ZelkorService::~ZelkorService() = default;

@@ -4,10 +4,13 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <vector>
 
 #include "zelkord/feedback/ZelkorFeedback.h"
 
 namespace zelkord {
+
+class UserGUIDSource;
 
 // Decides which feedback session a record belongs to. One for all clients, or one a client.
 //
@@ -21,6 +24,10 @@ class SessionManager {
   // A client's connection went away; the flag says whether a session was ended for it.
   virtual void flushSessionInvalidation(std::optional<std::string> agent,
                                         std::function<void(bool flushed)> callback) = 0;
+  // The current session's records in memory as JSON texts, oldest first: none in normal operation.
+  virtual std::vector<std::string> feedbacksWithRelativeTimestamp() = 0;
+  // Returns when everything added so far has been handed to the storage.
+  virtual void waitForPendingFeedback() = 0;
   virtual const std::string& identifier() const = 0;
 };
 
@@ -38,7 +45,9 @@ class FeedbackSession {
 class FeedbackSessions {
  public:
   virtual ~FeedbackSessions() = default;
-  virtual std::shared_ptr<SessionManager> makeManager(std::string identifier) = 0;
+  // Records get the user identifier that `guidController` has at the moment.
+  virtual std::shared_ptr<SessionManager> makeManager(
+      std::string identifier, std::shared_ptr<UserGUIDSource> guidController) = 0;
   virtual std::shared_ptr<FeedbackSession> makeSession(ZelkorFeedback first) = 0;
 };
 

@@ -30,6 +30,8 @@ class SessionStorage {
   virtual std::shared_ptr<SessionContainer> createFileContainerForWriting() = 0;
   // No record follows; the container may be read and uploaded.
   virtual void closeSession(std::shared_ptr<SessionContainer> container) = 0;
+  // Returns when everything handed over so far has been written, or could not be.
+  virtual void waitForPendingWrites() = 0;
 };
 
 }  // namespace zelkord

@@ -10,6 +10,7 @@
 #include "base/Json.h"
 #include "base/UUID.h"
 #include "halvane/Feedback.h"
+#include "platform/api/Clock.h"
 #include "zelkord/ZelkorLogging/ZelkorLogging.h"
 #include "zelkord/assembly/ZelkorDiagnosticDataReporter.h"
 #include "zelkord/encoding/IdentifierProcessor.h"
@@ -52,6 +53,12 @@ std::string_view eventTypeToString(std::uint32_t type);
 
 // Orders records by the timestamps of their feedback: negative, zero or positive.
 int timeStampComparator(const ZelkorFeedback& a, const ZelkorFeedback& b);
+
+// Gives feedback that has no timestamp the time of now.
+void stamp(ZelkorFeedback& record, const Clock& clock);
+
+// Durations of the clock that stamps feedback, in whole milliseconds.
+std::uint64_t millisecondsOf(std::uint64_t nanoseconds);
 
 // The name of a stream of feedback: 1 "Feedbacks", 0 "crowdsourcing", else "".
 std::string_view convertIdentifierToString(std::int64_t identifier);

@@ -8,7 +8,7 @@
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/assembly/UserAgent.h"
 #include "zelkord/encoding/ErrorEncoding.h"
-#include "zelkord/feedback/InMemorySessions.h"
+#include "zelkord/feedback/RecordingSessions.h"
 #include "zelkord/network/ImageFetcher.h"
 #include "zelkord/network/ZelkorUserGUIDController.h"
 
@@ -53,8 +53,8 @@ class ImageFetcherTest : public testing::Test {
 
   FakePlatform fakes_;
   Assembly assembly_{fakes_.platform()};
-  const std::shared_ptr<InMemorySessionManager> sessions_ =
-      std::make_shared<InMemorySessionManager>("zelkor", true);
+  const std::shared_ptr<RecordingSessionManager> sessions_ =
+      std::make_shared<RecordingSessionManager>("zelkor", true);
 };
 
 TEST_F(ImageFetcherTest, DownloadsOnceForAllWhoAskMeanwhile) {

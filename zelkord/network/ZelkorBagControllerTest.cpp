@@ -42,12 +42,15 @@ class FakeBagRequests final : public BagRequests {
 };
 
 // Writes down what the sessions of fetches get.
-class RecordingSessions final : public FeedbackSessions {
+class FetchSessions final : public FeedbackSessions {
  public:
   std::vector<std::string> events;
   std::vector<ZelkorFeedback> records;
 
-  std::shared_ptr<SessionManager> makeManager(std::string) override { return nullptr; }
+  std::shared_ptr<SessionManager> makeManager(std::string,
+                                              std::shared_ptr<UserGUIDSource>) override {
+    return nullptr;
+  }
   std::shared_ptr<FeedbackSession> makeSession(ZelkorFeedback first) override {
     note(std::move(first));
     return std::make_shared<Session>(*this);
@@ -56,12 +59,12 @@ class RecordingSessions final : public FeedbackSessions {
  private:
   class Session final : public FeedbackSession {
    public:
-    explicit Session(RecordingSessions& owner) : owner_(owner) {}
+    explicit Session(FetchSessions& owner) : owner_(owner) {}
     void addFeedback(ZelkorFeedback feedback) override { owner_.note(std::move(feedback)); }
     void sessionComplete() override { owner_.events.emplace_back("complete"); }
 
    private:
-    RecordingSessions& owner_;
+    FetchSessions& owner_;
   };
 
   void note(ZelkorFeedback record) {
@@ -457,7 +460,7 @@ TEST_F(ZelkorBagControllerTest, ChoosesWhereToFetchFrom) {
 }
 
 TEST_F(ZelkorBagControllerTest, RecordsAFetchAsFeedback) {
-  const auto sessions = std::make_shared<RecordingSessions>();
+  const auto sessions = std::make_shared<FetchSessions>();
   const auto guids = std::make_shared<ZelkorUserGUIDController>(assembly_);
   make();
   readVersion();  // before these services have been made: recorded nowhere

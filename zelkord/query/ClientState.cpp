@@ -43,7 +43,7 @@ ClientState::ClientState(std::string identifier, Assembly& assembly)
   if (!assembly.sharedSession() || !assembly.guidController() || !assembly.clientSessionManager()) {
     session.info("Zelkor is using individual instance of guid controller {}", identifier_);
     ownGuidController_ = std::make_shared<ZelkorUserGUIDController>(assembly);
-    ownSessionManager_ = assembly.feedbackSessions()->makeManager(identifier_);
+    ownSessionManager_ = assembly.feedbackSessions()->makeManager(identifier_, ownGuidController_);
   } else {
     session.info("Zelkor is using shared instance of guid controller");
   }

@@ -6,7 +6,7 @@
 namespace zelkord {
 
 QueryBed::QueryBed() : assembly(fakes.platform()) {
-  assembly.setFeedbackSessions(std::make_shared<InMemorySessions>(true));
+  assembly.setFeedbackSessions(std::make_shared<RecordingSessions>(true));
   const auto factory = std::make_shared<ZLKNetworkRequestFactory>(assembly);
   assembly.setRequestFactory(factory);
   factory->start();
@@ -14,7 +14,7 @@ QueryBed::QueryBed() : assembly(fakes.platform()) {
   assembly.setBagController(bagController);
   bagController->start();
   assembly.setGuidController(std::make_shared<ZelkorUserGUIDController>(assembly));
-  sessions = std::make_shared<InMemorySessionManager>("zelkor", true);
+  sessions = std::make_shared<RecordingSessionManager>("zelkor", true);
   assembly.setClientSessionManager(sessions);
   assembly.urlSession();
   fakes.timeline.runUntilIdle();

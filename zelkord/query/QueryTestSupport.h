@@ -7,7 +7,7 @@
 
 #include "platform/testing/FakePlatform.h"
 #include "zelkord/assembly/Assembly.h"
-#include "zelkord/feedback/InMemorySessions.h"
+#include "zelkord/feedback/RecordingSessions.h"
 #include "zelkord/network/ZLKNetworkRequestFactory.h"
 #include "zelkord/network/ZelkorBagController.h"
 #include "zelkord/query/ClientState.h"
@@ -55,7 +55,7 @@ class QueryBed {
 
   FakePlatform fakes;
   Assembly assembly;
-  std::shared_ptr<InMemorySessionManager> sessions;
+  std::shared_ptr<RecordingSessionManager> sessions;
 
  private:
   static ReplyCallback _into(std::shared_ptr<Answer> answer);
