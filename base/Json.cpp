@@ -1,8 +1,50 @@
 #include "base/Json.h"
 
+#include <boost/json/basic_parser_impl.hpp>
 #include <boost/json/parse.hpp>
 
 namespace zelkor {
+namespace {
+
+// Takes what the parser finds, and keeps nothing.
+struct NullHandler {
+  static constexpr std::size_t max_object_size = static_cast<std::size_t>(-1);
+  static constexpr std::size_t max_array_size = static_cast<std::size_t>(-1);
+  static constexpr std::size_t max_key_size = static_cast<std::size_t>(-1);
+  static constexpr std::size_t max_string_size = static_cast<std::size_t>(-1);
+
+  using Code = json::error_code;
+  using Text = json::string_view;
+  bool on_document_begin(Code&) { return true; }
+  bool on_document_end(Code&) { return true; }
+  bool on_object_begin(Code&) { return true; }
+  bool on_object_end(std::size_t, Code&) { return true; }
+  bool on_array_begin(Code&) { return true; }
+  bool on_array_end(std::size_t, Code&) { return true; }
+  bool on_key_part(Text, std::size_t, Code&) { return true; }
+  bool on_key(Text, std::size_t, Code&) { return true; }
+  bool on_string_part(Text, std::size_t, Code&) { return true; }
+  bool on_string(Text, std::size_t, Code&) { return true; }
+  bool on_number_part(Text, Code&) { return true; }
+  bool on_int64(std::int64_t, Text, Code&) { return true; }
+  bool on_uint64(std::uint64_t, Text, Code&) { return true; }
+  bool on_double(double, Text, Code&) { return true; }
+  bool on_bool(bool, Code&) { return true; }
+  bool on_null(Code&) { return true; }
+  bool on_comment_part(Text, Code&) { return true; }
+  bool on_comment(Text, Code&) { return true; }
+};
+
+}  // namespace
+
+bool isJson(std::string_view text) {
+  json::parse_options options;
+  options.max_depth = kMaximumJsonDepth;
+  json::basic_parser<NullHandler> parser(options);
+  json::error_code code;
+  const auto read = parser.write_some(false, text.data(), text.size(), code);
+  return !code && read == text.size();
+}
 
 std::optional<json::value> parseJson(std::string_view text, std::string* problem) {
   json::parse_options options;

@@ -4,7 +4,6 @@
 #include <array>
 
 #include "base/Json.h"
-#include "base/Text.h"
 
 namespace zelkord {
 namespace {
@@ -112,7 +111,7 @@ bool appendMembersOf(const HVSuggestionEngagementFeedback& feedback, std::size_t
 
 bool appendMembersOf(const HVCustomFeedback& feedback, std::size_t begin, std::string& text) {
   const auto& json = feedback.jsonFeedback;
-  auto parsed = isValidUtf8(json) ? parseJson(json) : std::nullopt;
+  auto parsed = parseJson(json);
   auto* object = parsed ? parsed->if_object() : nullptr;
   if (!object) return false;
   const bool hasOwn = removeOwnMembers(*object);

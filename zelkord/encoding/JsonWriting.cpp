@@ -5,7 +5,6 @@
 #include <cmath>
 
 #include "base/Json.h"
-#include "base/Text.h"
 
 namespace zelkord {
 namespace {
@@ -32,6 +31,13 @@ constexpr auto kEscapes = [] {
   escapes['\t'] = 't';
   return escapes;
 }();
+
+// Without the white space around it.
+std::string_view trimmed(std::string_view json) {
+  constexpr std::string_view kSpace = " \t\r\n";
+  const auto begin = json.find_first_not_of(kSpace);
+  return json.substr(begin, json.find_last_not_of(kSpace) - begin + 1);
+}
 
 void appendEscaped(unsigned char character, char escape, std::string& text) {
   constexpr std::string_view kDigits = "0123456789abcdef";
@@ -76,8 +82,7 @@ void appendJsonKey(std::string_view key, std::size_t begin, std::string& text) {
 }
 
 bool appendJson(const JsonText& value, std::string& text) {
-  const auto parsed = isValidUtf8(value.text) ? parseJson(value.text) : std::nullopt;
-  text += parsed ? json::serialize(*parsed) : "null";
+  text += isJson(value.text) ? trimmed(value.text) : "null";
   return true;
 }
 

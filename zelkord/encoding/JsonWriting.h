@@ -45,7 +45,7 @@ inline bool appendJson(const std::string& value, std::string& text) {
   return true;
 }
 
-// The value that the text holds; null when it holds none.
+// The text itself, when it is a JSON document; else null.
 bool appendJson(const JsonText& value, std::string& text);
 
 bool appendJson(const std::map<std::string, std::string>& map, std::string& text);
