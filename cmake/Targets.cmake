@@ -102,8 +102,13 @@ function(zk_use_programs target)
   endforeach()
 endfunction()
 
-# zk_proto_library(<name>): the current folder's *.proto, included as "<folder>/<File>.pb.h".
+# zk_proto_library(<name> [WITHOUT_PRESENCE <field>...]): the current folder's *.proto, included as "<folder>/<File>.pb.h".
+#
+# WITHOUT_PRESENCE: optional fields whose generated `has_FIELD` would collide with a field of that name; the C++ class
+# has them without presence. The messages on the wire are the same.
 function(zk_proto_library name)
+  cmake_parse_arguments(PARSE_ARGV 1 arg "" "" "WITHOUT_PRESENCE")
+  list(JOIN arg_WITHOUT_PRESENCE "|" without_presence)
   zk_note_links("" ${name} "" "")
   file(GLOB protos CONFIGURE_DEPENDS *.proto)
   if(NOT protos)
@@ -111,14 +116,17 @@ function(zk_proto_library name)
     return()
   endif()
   set(out "${PROJECT_BINARY_DIR}/generated")
-  file(MAKE_DIRECTORY "${out}")
+  set(copies "${PROJECT_BINARY_DIR}/protos")
   set(generated)
   foreach(proto IN LISTS protos)
     file(RELATIVE_PATH stem "${PROJECT_SOURCE_DIR}" "${proto}")
     string(REGEX REPLACE "\\.proto$" "" stem "${stem}")
+    cmake_path(GET stem PARENT_PATH folder)
+    file(MAKE_DIRECTORY "${out}" "${copies}/${folder}")
     add_custom_command(
       OUTPUT "${out}/${stem}.pb.cc" "${out}/${stem}.pb.h"
-      COMMAND protobuf::protoc "--proto_path=${PROJECT_SOURCE_DIR}" "--cpp_out=${out}" "${proto}"
+      COMMAND sed -E "s/optional ([a-z0-9]+ (${without_presence}) =)/\\1/" "${proto}" > "${copies}/${stem}.proto"
+      COMMAND protobuf::protoc "--proto_path=${copies}" "--cpp_out=${out}" "${copies}/${stem}.proto"
       DEPENDS ${protos} protobuf::protoc
       COMMENT "protoc ${stem}.proto"
       VERBATIM)
