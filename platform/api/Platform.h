@@ -5,6 +5,7 @@
 #include "platform/api/Device.h"
 #include "platform/api/FileManager.h"
 #include "platform/api/Interprocess.h"
+#include "platform/api/KnowledgeStore.h"
 #include "platform/api/LaunchEvents.h"
 #include "platform/api/LocationService.h"
 #include "platform/api/Log.h"
@@ -52,6 +53,7 @@ struct Platform {
   TextInputService& textInput;
   RandomSource& random;
   MemoryPressure& memoryPressure;
+  KnowledgeStore& knowledge;
 };
 
 }  // namespace zelkord

@@ -13,6 +13,7 @@
 #include "platform/linux/files/LinuxFileManager.h"
 #include "platform/linux/files/StateLock.h"
 #include "platform/linux/ipc/SdBusInterprocess.h"
+#include "platform/linux/knowledge/LinuxKnowledgeStore.h"
 #include "platform/linux/locale/HostLocaleWatcher.h"
 #include "platform/linux/locale/LinuxLocale.h"
 #include "platform/linux/location/GeoClueSource.h"
@@ -139,6 +140,7 @@ struct LinuxPlatform::Services {
         queues(clock),
         settings(std::make_shared<LinuxSettings>(settingsOptions(files, configuration), files,
                                                  queues, log)),
+        knowledge(hostDataHome(options.environment), files, queues, clock, log),
         interprocess(queues, log, busOptions(options, files)),
         urlSessions(queues, urlServices(settings, networkProxy, meteredNetwork,
                                         {clock, log, files.directories().state + "/urlcache"})) {
@@ -146,6 +148,7 @@ struct LinuxPlatform::Services {
       const auto alive = weak.lock();
       return alive && boolSetting(*alive, "ZLKLogPrivateData");
     });
+    process.atExit([this] { knowledge.flush(); });
     process.atExit([this] { counters.save(); });
     process.atExit([this] { settings->flush(); });
     process.atExit([this] { log.flush(); });
@@ -202,6 +205,8 @@ struct LinuxPlatform::Services {
   const std::shared_ptr<LinuxNetworkProxy> networkProxy =
       std::make_shared<LinuxNetworkProxy>(profile, log);
 
+  LinuxKnowledgeStore knowledge;
+
   ipc::SdBusInterprocess interprocess;
   BusNotifications notifications{[this](const BusSignal& signal) {
                                    interprocess.postNotification(signal.argument);
@@ -238,7 +243,8 @@ struct LinuxPlatform::Services {
                     .tagger = tagger,
                     .textInput = textInput,
                     .random = random,
-                    .memoryPressure = memoryPressure};
+                    .memoryPressure = memoryPressure,
+                    .knowledge = knowledge};
 };
 
 std::unique_ptr<LinuxPlatform> LinuxPlatform::make(const LinuxPlatformOptions& options,

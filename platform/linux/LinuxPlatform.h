@@ -28,7 +28,7 @@ struct LinuxPlatformOptions {
 
 // The host services on Linux, built once by `main`.
 //
-// The process's end runs: counters saved, settings flushed, log flushed.
+// The process's end runs: donations written, counters saved, settings flushed, log flushed.
 //
 // Threading: made and destroyed on the main thread; the services on any.
 // Ownership: outlives the daemon's objects.

@@ -8,6 +8,7 @@
 #include "platform/testing/FakeDevice.h"
 #include "platform/testing/FakeFileManager.h"
 #include "platform/testing/FakeInterprocess.h"
+#include "platform/testing/FakeKnowledgeStore.h"
 #include "platform/testing/FakeLocale.h"
 #include "platform/testing/FakeLocation.h"
 #include "platform/testing/FakeManagement.h"
@@ -74,6 +75,7 @@ class FakePlatform final {
   FakeTextInput textInput;
   SeededRandom random;
   FakeMemoryPressure memoryPressure;
+  FakeKnowledgeStore knowledge;
 
  private:
   Platform platform_{timeline,
@@ -102,7 +104,8 @@ class FakePlatform final {
                      tagger,
                      textInput,
                      random,
-                     memoryPressure};
+                     memoryPressure,
+                     knowledge};
 };
 
 }  // namespace zelkord

@@ -36,7 +36,8 @@ inline Platform onQueues(const Platform& base, Clock& clock, WorkQueues& queues,
           .tagger = base.tagger,
           .textInput = base.textInput,
           .random = base.random,
-          .memoryPressure = base.memoryPressure};
+          .memoryPressure = base.memoryPressure,
+          .knowledge = base.knowledge};
 }
 
 }  // namespace zelkord

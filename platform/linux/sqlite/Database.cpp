@@ -18,6 +18,12 @@ void makePrivateFile(const std::string& path) {
   if (file >= 0) ::close(file);
 }
 
+const char* journalOf(const DatabaseOptions& options) {
+  if (options.isShared) return "PRAGMA synchronous=FULL";
+  return options.writeAheadLog ? "PRAGMA journal_mode=WAL; PRAGMA synchronous=NORMAL"
+                               : "PRAGMA journal_mode=DELETE; PRAGMA synchronous=FULL";
+}
+
 }  // namespace
 
 bool Failure::isDamage() const {
@@ -50,9 +56,7 @@ std::optional<Database> Database::open(const std::string& path, Failure* failure
   sqlite3_busy_timeout(
       raw, static_cast<int>(
                std::chrono::duration_cast<std::chrono::milliseconds>(options.busyTimeout).count()));
-  auto problem = database.execute(options.writeAheadLog
-                                      ? "PRAGMA journal_mode=WAL; PRAGMA synchronous=NORMAL"
-                                      : "PRAGMA journal_mode=DELETE; PRAGMA synchronous=FULL");
+  auto problem = database.execute(journalOf(options));
   if (!problem) return database;
   if (failure) *failure = std::move(*problem);
   return std::nullopt;

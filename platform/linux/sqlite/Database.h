@@ -71,6 +71,7 @@ class Statement final {
 struct DatabaseOptions {
   Duration busyTimeout = 1s;   // real time
   bool writeAheadLog = false;  // else a rollback journal: one file, but a write syncs twice
+  bool isShared = false;       // with other programs: the journal stays as they want it
 };
 
 // A SQLite database in a file of mode 0600, made when missing.
