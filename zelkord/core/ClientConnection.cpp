@@ -17,6 +17,7 @@ ClientConnection::ClientConnection(Assembly& assembly, std::shared_ptr<ipc::Conn
       clientStateManager_(*assembly.clientStateManager()),
       connection_(std::move(connection)),
       otherCalls_(std::move(otherCalls)),
+      reports_(assembly),
       bagTeller_(std::make_shared<BagTeller>(assembly, connection_)),
       transaction_(assembly.platform().transactions.open("clientConnection")) {}
 
@@ -51,6 +52,9 @@ void ClientConnection::_handleDaemonCall(const ipc::Call& call) {
   if (call.member == "Configure") return _handleConfigure(call);
   if (call.member == "Bag") return bag(call.reply);
   if (call.member == "Request") return _handleRequest(call);
+  if (call.member == "ReportEvent") return _handleReportEvent(call);
+  if (call.member == "ReportEventData") return _handleReportEventData(call);
+  if (call.member == "Feedback") return feedback(call.reply);
   if (call.member == "ListSessions") return listSessions(call.reply);
 }
 
@@ -65,6 +69,15 @@ void ClientConnection::_handleRequest(const ipc::Call& call) {
                                *call.arguments.at(1).get<ipc::Dictionary>());
   if (const auto* fault = std::get_if<WireFault>(&decoded)) return _refuse(call, *fault);
   request(std::get<MutableRequest>(std::move(decoded)), call.reply);
+}
+
+void ClientConnection::_handleReportEvent(const ipc::Call& call) {
+  reportEvent(call, decodeFeedback(*call.arguments.at(2).get<std::string>(),
+                                   call.arguments.at(3).get<Data>()->view()));
+}
+
+void ClientConnection::_handleReportEventData(const ipc::Call& call) {
+  reportEvent(call, decodeFeedbackPayload(call.arguments.at(2).get<Data>()->view()));
 }
 
 void ClientConnection::_refuse(const ipc::Call& call, const WireFault& fault) {
@@ -248,6 +261,19 @@ void ClientConnection::flightSearch(std::shared_ptr<const ZLKFlightSearchRequest
 bool ClientConnection::_accepts(std::int64_t queryId) {
   auto current = currentQueryId_.load();
   return queryId > current && currentQueryId_.compare_exchange_strong(current, queryId);
+}
+
+// The event's name, the first argument, says nothing that the feedback does not.
+void ClientConnection::reportEvent(const ipc::Call& call, Decoded<MutableFeedback> feedback) {
+  if (const auto* fault = std::get_if<WireFault>(&feedback)) return _refuse(call, *fault);
+  reports_.reportPayload(std::get<MutableFeedback>(std::move(feedback)),
+                         *call.arguments.at(1).get<std::int64_t>(), state_.get());
+}
+
+void ClientConnection::feedback(const std::shared_ptr<ipc::Reply>& reply) {
+  if (const auto state = state_.get()) {
+    reply->send({state->sessionManager().feedbacksWithRelativeTimestamp(), ipc::Dictionary{}});
+  }
 }
 
 void ClientConnection::listSessions(const std::shared_ptr<ipc::Reply>& reply) {

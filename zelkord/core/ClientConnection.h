@@ -11,6 +11,8 @@
 #include "platform/api/ProcessTransactions.h"
 #include "zelkord/ZelkorLogging/Tracing.h"
 #include "zelkord/core/BagTeller.h"
+#include "zelkord/core/FeedbackReports.h"
+#include "zelkord/core/FeedbackWire.h"
 #include "zelkord/core/IdleTimer.h"
 #include "zelkord/core/Wire.h"
 #include "zelkord/query/ClientState.h"
@@ -68,10 +70,15 @@ class ClientConnection final : public ipc::CallHandler,
   void lookup(std::shared_ptr<const ZLKLookupRequest> request, ReplyCallback reply);
   void flightLookup(std::shared_ptr<const ZLKFlightLookupRequest> request, ReplyCallback reply);
   void flightSearch(std::shared_ptr<const ZLKFlightSearchRequest> request, ReplyCallback reply);
+  void reportEvent(const ipc::Call& call, Decoded<MutableFeedback> feedback);
+  // The records of the client's session, to the bound client only.
+  void feedback(const std::shared_ptr<ipc::Reply>& reply);
   void listSessions(const std::shared_ptr<ipc::Reply>& reply);
 
   void _handleConfigure(const ipc::Call& call);
   void _handleRequest(const ipc::Call& call);
+  void _handleReportEvent(const ipc::Call& call);
+  void _handleReportEventData(const ipc::Call& call);
   void _handleDaemonCall(const ipc::Call& call);
   void _refuse(const ipc::Call& call, const WireFault& fault);
   void _ensureState();
@@ -96,6 +103,7 @@ class ClientConnection final : public ipc::CallHandler,
   ClientStateManager& clientStateManager_;
   const std::shared_ptr<ipc::Connection> connection_;
   const OtherCalls otherCalls_;
+  const FeedbackReports reports_;
   const std::shared_ptr<BagTeller> bagTeller_;
   const Transaction transaction_;
   std::shared_ptr<IdleTimer> timer_;

@@ -10,6 +10,9 @@ ipc::Interface daemonInterface() {
               {"Configure", "a{sv}", "s"},
               {"Bag", "", "a{sv}a{sv}"},
               {"Request", "sa{sv}", "xa{sv}a{sv}"},
+              {"ReportEvent", "sxsay", "", true},
+              {"ReportEventData", "sxay", "", true},
+              {"Feedback", "s", "asa{sv}"},
               {"ListSessions", "", "aa{ss}"},
           },
           {{"Invalidated", ""}}};

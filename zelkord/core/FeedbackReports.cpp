@@ -1,0 +1,132 @@
+#include "zelkord/core/FeedbackReports.h"
+
+#include <algorithm>
+#include <string_view>
+
+#include "base/Json.h"
+#include "halvane/ModelFeedback.h"
+#include "zelkord/assembly/Assembly.h"
+#include "zelkord/assembly/UserAgent.h"
+#include "zelkord/core/ClientQueryId.h"
+#include "zelkord/encoding/ErrorEncoding.h"
+#include "zelkord/feedback/FeedbackSeams.h"
+#include "zelkord/feedback/SessionManager.h"
+#include "zelkord/feedback/UserGUIDSource.h"
+#include "zelkord/query/ClientState.h"
+#include "zelkord/query/ErrorCodes.h"
+
+namespace zelkord {
+namespace {
+
+// After these the user is likely to search: today view, keyboard shortcut, click on the menu, tap
+// to input, new window, click, pull-down of the home screen, notification center, partial
+// pull-down.
+constexpr std::int32_t kWarmingEvents[] = {2, 5, 6, 9, 10, 11, 22, 23, 24};
+
+constexpr std::int32_t kCountedEngagementType = 1;
+
+// Types of custom feedback.
+constexpr std::int32_t kBrelinAutofill = 1;
+constexpr std::int32_t kCrowdsourcing = 2;
+constexpr std::int32_t kLantheResultFeatures = 3;
+
+// Clients whose engagements are donated, and the domain under which.
+constexpr std::pair<std::string_view, std::string_view> kDonors[] = {{"brelin", "Brelin"},
+                                                                     {"lanthe", "Lanthe"}};
+
+bool isWarming(const HVFeedback& feedback) {
+  if (feedback.kind() != FeedbackKind::SearchViewAppear) return false;
+  const auto& view = static_cast<const HVSearchViewAppearFeedback&>(feedback);
+  return !view.onLockScreen && std::ranges::count(kWarmingEvents, view.triggerEvent.value) > 0;
+}
+
+std::uint64_t nanosecondsSinceBoot(const Clock& clock) {
+  return static_cast<std::uint64_t>(clock.now().time_since_epoch().count());
+}
+
+}  // namespace
+
+void FeedbackReports::reportPayload(std::shared_ptr<HVFeedback> feedback, std::int64_t queryId,
+                                    const std::shared_ptr<ClientState>& state) const {
+  assembly_.tracing().emit(TraceCode::FeedbackStart);
+  if (feedback->timestamp == 0) {
+    feedback->timestamp = nanosecondsSinceBoot(assembly_.platform().clock);
+  }
+  if (!state) {
+    _recordError("client state nil");
+    assembly_.log(Category::Feedback).error("state must not be nil");
+  } else if (feedback->kind() == FeedbackKind::Custom) {
+    const auto& log = assembly_.log(Category::Flusher);
+    handleCustomFeedback(std::static_pointer_cast<const HVCustomFeedback>(std::move(feedback)),
+                         queryId, *state, [&log] { log.notice("flushed custom feedback"); });
+  } else {
+    _report(std::move(feedback), queryId, *state);
+  }
+  assembly_.tracing().emit(TraceCode::FeedbackEnd);
+}
+
+void FeedbackReports::_recordError(const char* reason) const {
+  const auto error = errorRecordOf(zelkorError(kConnectionFault, reason));
+  const auto guid = assembly_.guidController()->currentUserGUID();
+  const auto session =
+      assembly_.feedbackSessions()->makeSession({std::make_shared<HVErrorFeedback>(error), 0, guid,
+                                                 zelkordUserAgent(assembly_.platform().device), 0});
+  session->sessionComplete();
+}
+
+void FeedbackReports::_report(std::shared_ptr<const HVFeedback> feedback, std::int64_t queryId,
+                              ClientState& state) const {
+  if (isWarming(*feedback)) state.warm();
+  const auto clientQueryId = clientQueryIdOf(*feedback);
+  if (feedback->kind() == FeedbackKind::ResultEngagement) {
+    _noteEngagement(static_cast<const HVResultEngagementFeedback&>(*feedback), state);
+  }
+  state.sessionManager().addZelkorFeedback({std::move(feedback), queryId,
+                                            state.guidController().currentUserGUID(),
+                                            state.userAgent(), clientQueryId});
+}
+
+void FeedbackReports::_noteEngagement(const HVResultEngagementFeedback& engagement,
+                                      const ClientState& state) const {
+  if (const auto& result = engagement.result) {
+    if (result->topHit.value != 0) state.count("tophit.engagements");
+    if (result->resultType.value == kCountedEngagementType) state.count("zelkor.engagements");
+  }
+  _donate(engagement, state);
+}
+
+void FeedbackReports::_donate(const HVResultEngagementFeedback& engagement,
+                              const ClientState& state) const {
+  const auto& query = engagement.completedQuery;
+  if (!query || query->empty()) return;
+  for (const auto& [client, domain] : kDonors) {
+    if (state.clientShortName() != client) continue;
+    assembly_.platform().knowledge.donate({std::string(domain), "Engagement",
+                                           json::serialize(json::object{{"input", *query}}),
+                                           assembly_.platform().clock.wallNow()});
+  }
+}
+
+void FeedbackReports::handleCustomFeedback(std::shared_ptr<const HVCustomFeedback> feedback,
+                                           std::int64_t queryId, const ClientState& state,
+                                           std::function<void()> callback) const {
+  switch (feedback->feedbackType.value) {
+    case kBrelinAutofill:
+    case kLantheResultFeatures:
+      assembly_.feedbackSessions()
+          ->makeSession({std::move(feedback), queryId, std::nullopt, state.userAgent(), 0})
+          ->sessionComplete();
+      if (callback) callback();
+      return;
+    case kCrowdsourcing:
+      assembly_.reporter().addValue(1, "com.quenta.zelkord.dp.submit");
+      if (auto* flusher = assembly_.crowdsourcingFeedbackFlusher()) {
+        flusher->flush(std::move(feedback), std::move(callback));
+      }
+      return;
+    default:
+      return;
+  }
+}
+
+}  // namespace zelkord

@@ -1,0 +1,48 @@
+#pragma once
+
+#include <cstdint>
+#include <functional>
+#include <memory>
+
+#include "halvane/Feedback.h"
+
+namespace zelkor {
+struct HVCustomFeedback;
+struct HVResultEngagementFeedback;
+}  // namespace zelkor
+
+namespace zelkord {
+
+class Assembly;
+class ClientState;
+
+// What becomes of feedback that a client reports: a record of its session. Besides, a search view
+// that appears warms the connection to the service, and engagements are counted and donated to the
+// host's knowledge. Custom feedback goes ways of its own.
+//
+// Threading: any thread; nothing waits. Ownership: the assembly outlives it.
+// Errors: feedback of a client without a state is recorded as an error of the daemon's own.
+class FeedbackReports final {
+ public:
+  explicit FeedbackReports(Assembly& assembly) : assembly_(assembly) {}
+
+  // `state` is null for a client that is not configured. Feedback without a timestamp gets one.
+  void reportPayload(std::shared_ptr<HVFeedback> feedback, std::int64_t queryId,
+                     const std::shared_ptr<ClientState>& state) const;
+  // Autofill and result features become sessions of their own, crowdsourcing goes to its flusher;
+  // then `callback`, if there is one, runs. Anything else is ignored.
+  void handleCustomFeedback(std::shared_ptr<const HVCustomFeedback> feedback, std::int64_t queryId,
+                            const ClientState& state, std::function<void()> callback) const;
+
+ private:
+  void _recordError(const char* reason) const;
+  void _report(std::shared_ptr<const HVFeedback> feedback, std::int64_t queryId,
+               ClientState& state) const;
+  void _noteEngagement(const HVResultEngagementFeedback& engagement,
+                       const ClientState& state) const;
+  void _donate(const HVResultEngagementFeedback& engagement, const ClientState& state) const;
+
+  Assembly& assembly_;
+};
+
+}  // namespace zelkord
