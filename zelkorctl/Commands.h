@@ -27,6 +27,9 @@ int runImages(const Invocation& invocation);
 int runBag(const Invocation& invocation);
 int runDefaults(const Invocation& invocation);
 int runSessions(const Invocation& invocation);
+int runFeedback(const Invocation& invocation);
+int runReport(const Invocation& invocation);
+int runContainers(const Invocation& invocation);
 int runMetrics(const Invocation& invocation);
 int runStatus(const Invocation& invocation);
 

@@ -18,6 +18,9 @@ Commands:
   bag              show the configuration document
   defaults         read and write settings
   sessions         list the clients that the daemon knows
+  feedback         show the feedback records that the daemon has in memory
+  report CLASS     report feedback
+  containers       show the feedback sessions on the disk
   metrics          show the daemon's counters
   status           show the daemon's state
   version          show this tool's version
@@ -154,6 +157,30 @@ constexpr std::string_view kSessions = R"(usage: zelkorctl sessions [OPTION...]
 Lists the clients that the daemon knows, with their user agents.
 )";
 
+constexpr std::string_view kFeedback = R"(usage: zelkorctl feedback [OPTION...]
+
+Shows the records of the current feedback session that the daemon has in memory, one JSON object a
+line. In normal operation there are none: sessions keep their records on the disk.
+)";
+
+constexpr std::string_view kReport = R"(usage: zelkorctl report [OPTION...] CLASS [JSON]
+
+Reports feedback of CLASS, such as HVResultEngagementFeedback, with the fields in JSON: names and
+types are those of its message in Feedback.proto, enumerations are numbers. Without JSON all fields
+have their defaults; "-" reads it from standard input. Waits until the daemon has taken or refused
+it.
+
+  --event NAME         the event's name
+  --query-id N         the query that it belongs to (default: 0)
+)";
+
+constexpr std::string_view kContainers = R"(usage: zelkorctl containers [OPTION...] [NUMBER]
+
+Lists the feedback sessions on the disk, or shows one: its version, its header and its records,
+with the field names of Feedback.proto. A damaged file is refused, with the reason and the place.
+Reads the files themselves; no daemon is needed.
+)";
+
 constexpr std::string_view kMetrics = R"(usage: zelkorctl metrics [OPTION...]
 
 Shows the daemon's counters, cumulative over its restarts.
@@ -193,6 +220,12 @@ std::string_view helpText(Command command) {
       return kDefaults;
     case Command::Sessions:
       return kSessions;
+    case Command::Feedback:
+      return kFeedback;
+    case Command::Report:
+      return kReport;
+    case Command::Containers:
+      return kContainers;
     case Command::Metrics:
       return kMetrics;
     case Command::Status:

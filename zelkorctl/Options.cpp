@@ -5,6 +5,7 @@
 #include <charconv>
 #include <cmath>
 #include <initializer_list>
+#include <limits>
 
 namespace zelkorctl {
 namespace {
@@ -40,13 +41,23 @@ struct CommandRule {
 };
 
 constexpr std::array kCommands{
-    CommandRule{"search", Command::Search},     CommandRule{"type", Command::Type},
-    CommandRule{"more", Command::More},         CommandRule{"card", Command::Card},
-    CommandRule{"lookup", Command::Lookup},     CommandRule{"zkw", Command::ZeroKeyword},
-    CommandRule{"images", Command::Images},     CommandRule{"bag", Command::Bag},
-    CommandRule{"defaults", Command::Defaults}, CommandRule{"sessions", Command::Sessions},
-    CommandRule{"metrics", Command::Metrics},   CommandRule{"status", Command::Status},
-    CommandRule{"version", Command::Version},   CommandRule{"help", Command::Help},
+    CommandRule{"search", Command::Search},
+    CommandRule{"type", Command::Type},
+    CommandRule{"more", Command::More},
+    CommandRule{"card", Command::Card},
+    CommandRule{"lookup", Command::Lookup},
+    CommandRule{"zkw", Command::ZeroKeyword},
+    CommandRule{"images", Command::Images},
+    CommandRule{"bag", Command::Bag},
+    CommandRule{"defaults", Command::Defaults},
+    CommandRule{"sessions", Command::Sessions},
+    CommandRule{"feedback", Command::Feedback},
+    CommandRule{"report", Command::Report},
+    CommandRule{"containers", Command::Containers},
+    CommandRule{"metrics", Command::Metrics},
+    CommandRule{"status", Command::Status},
+    CommandRule{"version", Command::Version},
+    CommandRule{"help", Command::Help},
 };
 
 constexpr std::array kKinds{
@@ -190,6 +201,13 @@ const std::array kOptions{
     OptionRule{
         "--deadline", setOf({Command::Images}), true,
         [](Options& o, const std::string& v) { return readMilliseconds(o.deadline, v, 600'000); }},
+    OptionRule{"--event", setOf({Command::Report}), true,
+               [](Options& o, const std::string& v) { return readText(o.event, v); }},
+    OptionRule{"--query-id", setOf({Command::Report}), true,
+               [](Options& o, const std::string& v) {
+                 using Limits = std::numeric_limits<std::int64_t>;
+                 return readCount(o.queryId, v, Limits::min(), Limits::max());
+               }},
     OptionRule{"--domain", setOf({Command::Defaults}), true,
                [](Options& o, const std::string& v) { return readText(o.domain, v); }},
 };
@@ -283,6 +301,10 @@ class Parsing {
       checkDefaults();
     } else if (options_.command == Command::Help) {
       if (count > 1) problem_ = "help takes one command";
+    } else if (options_.command == Command::Report) {
+      if (count < 1 || count > 2) problem_ = "report takes a class and its fields as JSON";
+    } else if (options_.command == Command::Containers) {
+      if (count > 1) problem_ = "containers takes one number";
     } else if (takesText()) {
       if (count == 0 && needsText()) problem_ = std::string(command_->name) + " needs a text";
     } else if (count > 0) {

@@ -26,6 +26,9 @@ enum class Command {
   Bag,
   Defaults,
   Sessions,
+  Feedback,
+  Report,
+  Containers,
   Metrics,
   Status,
   Version,
@@ -71,6 +74,10 @@ struct Options {
   std::vector<std::string> identifiers;
   std::string folder;  // where they are saved; empty: they are not
   Duration deadline = 5s;
+
+  // Of reports.
+  std::string event;
+  std::int64_t queryId = 0;
 
   // Of settings.
   std::string domain;

@@ -54,6 +54,12 @@ int runCommand(const Invocation& invocation) {
       return runDefaults(invocation);
     case Command::Sessions:
       return runSessions(invocation);
+    case Command::Feedback:
+      return runFeedback(invocation);
+    case Command::Report:
+      return runReport(invocation);
+    case Command::Containers:
+      return runContainers(invocation);
     case Command::Metrics:
       return runMetrics(invocation);
     case Command::Status:
