@@ -1,6 +1,7 @@
 #pragma once
 
 #include "platform/api/Clock.h"
+#include "platform/api/ContainerFiles.h"
 #include "platform/api/Counters.h"
 #include "platform/api/Device.h"
 #include "platform/api/FileManager.h"
@@ -31,6 +32,7 @@ struct Platform {
   LogSink& log;
   SettingsStore& settings;
   FileManager& files;
+  ContainerFiles& containerFiles;
   NotificationCenter& notificationCenter;
   SystemNotifications& systemNotifications;
   ProcessTransactions& transactions;

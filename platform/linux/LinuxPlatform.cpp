@@ -10,6 +10,7 @@
 #include "platform/linux/counters/LinuxCounters.h"
 #include "platform/linux/device_profile/DeviceProfileLoader.h"
 #include "platform/linux/device_profile/LinuxDevice.h"
+#include "platform/linux/files/LinuxContainerFiles.h"
 #include "platform/linux/files/LinuxFileManager.h"
 #include "platform/linux/files/StateLock.h"
 #include "platform/linux/ipc/SdBusInterprocess.h"
@@ -166,6 +167,7 @@ struct LinuxPlatform::Services {
 
   const StateLock lock;
   LinuxFileManager files;
+  LinuxContainerFiles containerFiles;
   const ConfigurationDirectories configuration;
   LinuxClock clock;
   LinuxLog log;
@@ -222,6 +224,7 @@ struct LinuxPlatform::Services {
                     .log = log,
                     .settings = *settings,
                     .files = files,
+                    .containerFiles = containerFiles,
                     .notificationCenter = notificationCenter,
                     .systemNotifications = notifications,
                     .transactions = transactions,

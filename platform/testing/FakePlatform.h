@@ -83,6 +83,7 @@ class FakePlatform final {
                      log,
                      settings,
                      files,
+                     files,
                      notificationCenter,
                      systemNotifications,
                      transactions,
