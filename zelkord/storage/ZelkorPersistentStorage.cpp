@@ -1,0 +1,227 @@
+#include "zelkord/storage/ZelkorPersistentStorage.h"
+
+#include <algorithm>
+#include <cerrno>
+#include <limits>
+#include <set>
+#include <utility>
+
+#include "zelkord/assembly/Assembly.h"
+#include "zelkord/assembly/UserAgent.h"
+#include "zelkord/storage/ContainerFormat.h"
+
+namespace zelkord {
+namespace {
+
+constexpr std::string_view kFileTooOld = "com.quenta.zelkord.filetooold";
+constexpr std::string_view kNamePrefix = "session.";
+constexpr std::uint64_t kDefaultSizeLimit = 2'097'152;
+constexpr double kDefaultMaxAge = 172'800;
+constexpr std::uint32_t kHandles = 1u << 31;
+
+double maxAgeIn(const SettingsStore& settings) {
+  const auto value = settings.value("ZLKSessionMaxAge");
+  return value && value->is_number() ? value->to_number<double>() : kDefaultMaxAge;
+}
+
+// None for other names.
+std::optional<std::int64_t> handleNumber(std::string_view name) {
+  if (!name.starts_with(kNamePrefix) || name == kNamePrefix) return std::nullopt;
+  std::int64_t number = 0;
+  for (const char digit : name.substr(kNamePrefix.size())) {
+    if (digit < '0' || digit > '9') return std::nullopt;
+    number = number * 10 + (digit - '0');
+    if (number >= kHandles) return std::nullopt;
+  }
+  return number;
+}
+
+FileContainer::Services makeServices(Assembly& assembly) {
+  auto& platform = assembly.platform();
+  auto queue = platform.queues.makeSerialQueue("com.quenta.zelkord.persistentStorageQueue");
+  return std::make_shared<const ContainerServices>(ContainerServices{
+      .queue = std::move(queue),
+      .files = platform.files,
+      .containerFiles = platform.containerFiles,
+      .transactions = platform.transactions,
+      .log = assembly.log(Category::FeedbackStorage),
+      .reporter = assembly.reporter(),
+      .version = zelkordUserAgent(platform.device).value_or(std::string()),
+      .maxFileSize = unsignedSetting(platform.settings, "ZLKSessionSizeLimit", kDefaultSizeLimit)});
+}
+
+}  // namespace
+
+ZelkorPersistentStorage::ZelkorPersistentStorage(Assembly& assembly)
+    : assembly_(assembly),
+      log_(assembly.log(Category::FeedbackStorage)),
+      cachesUrl_(assembly.fileManager().directories().caches),
+      maxFileAge_(maxAgeIn(assembly.userDefaults())),
+      services_(makeServices(assembly)),
+      queue_(*services_->queue) {}
+
+// Numbers must be known before the first new container; all the rest can wait.
+void ZelkorPersistentStorage::start() {
+  queue_.async([weak = weak_from_this(), scan = _scanCacheDirectory()] {
+    if (const auto self = weak.lock()) self->_offer(scan);
+  });
+}
+
+std::shared_ptr<SessionContainer> ZelkorPersistentStorage::createFileContainerForWriting() {
+  const auto url = _newFileUrl();
+  if (!url) {
+    log_.error("Could not get a file url");
+    return nullptr;
+  }
+  log_.info("new file url {}", *url);
+  auto handle = services_->containerFiles.openForAppending(*url, nullptr);
+  if (handle) return std::make_shared<FileContainer>(services_, *url, std::move(handle));
+  log_.error("Could not open file for writing {}", *url);
+  services_->files.remove(*url);
+  return nullptr;
+}
+
+// The numbers go round, so that a file with the last one does not end them.
+std::optional<std::string> ZelkorPersistentStorage::_newFileUrl() {
+  constexpr int kAttempts = 100'000;
+  if (cachesUrl_.empty()) return std::nullopt;
+  services_->files.createDirectory(cachesUrl_);
+  for (int i = 0; i < kAttempts; ++i) {
+    const auto number = handleId_.fetch_add(1) % kHandles;
+    auto path = cachesUrl_ + "/" + std::string(kNamePrefix) + std::to_string(number);
+    const auto error = services_->containerFiles.createExclusively(path);
+    if (!error) return path;
+    if (error->code != EEXIST) return std::nullopt;
+  }
+  return std::nullopt;
+}
+
+void ZelkorPersistentStorage::closeSession(std::shared_ptr<SessionContainer> container) {
+  auto file = std::dynamic_pointer_cast<FileContainer>(std::move(container));
+  if (!file) return;
+  file->close();
+  queue_.async([weak = weak_from_this(), file = std::move(file)] {
+    const auto self = weak.lock();
+    if (!self) return;
+    self->queue_.assertCurrent();
+    self->fileContainers_.push_back(file);
+  });
+}
+
+std::vector<std::shared_ptr<FileContainer>> ZelkorPersistentStorage::getAvailableSessionHandles() {
+  Containers available;
+  queue_.sync([&] {
+    queue_.assertCurrent();
+    available = fileContainers_;
+  });
+  for (const auto& container : available) {
+    log_.info("available file url {}", container->fileUrl());
+  }
+  return available;
+}
+
+void ZelkorPersistentStorage::deleteSessionWithFileContainer(
+    std::shared_ptr<FileContainer> container) {
+  if (!container) return;
+  container->close();
+  queue_.async([self = shared_from_this(), container = std::move(container)] {
+    self->queue_.assertCurrent();
+    auto& all = self->fileContainers_;
+    all.erase(std::remove(all.begin(), all.end(), container), all.end());
+    self->_deleteSessionFile(container->fileUrl());
+  });
+}
+
+void ZelkorPersistentStorage::waitForPendingWrites() {
+  queue_.sync([] {});
+}
+
+ZelkorPersistentStorage::Scan ZelkorPersistentStorage::_scanCacheDirectory() {
+  Scan scan;
+  if (cachesUrl_.empty()) {
+    log_.error("error scanning cache directory, could not get path");
+    return scan;
+  }
+  Error error;
+  const auto names = services_->containerFiles.list(cachesUrl_, &error);
+  if (!names) {
+    log_.error("error scanning cache directory {}", error.description());
+    return scan;
+  }
+  auto largest = std::numeric_limits<std::int64_t>::min();
+  for (const auto& name : *names) _scanFile(name, scan, largest);
+  _continueAfter(largest);
+  return scan;
+}
+
+void ZelkorPersistentStorage::_scanFile(const std::string& name, Scan& scan,
+                                        std::int64_t& largest) {
+  const auto number = handleNumber(name);
+  if (!number) return;
+  const auto path = cachesUrl_ + "/" + name;
+  Error error;
+  const auto attributes = services_->containerFiles.attributes(path, &error);
+  if (!attributes || !attributes->isRegular) {
+    log_.error("{} is not a container: {}", path,
+               attributes ? "not a regular file" : error.description());
+    return;
+  }
+  const double now = secondsSince1970(assembly_.platform().clock.wallNow());
+  if (now - secondsSince1970(attributes->created) > maxFileAge_) {
+    services_->reporter.addValue(1, kFileTooOld);
+    scan.tooOld.push_back(path);
+    return;
+  }
+  largest = std::max(largest, *number);
+  scan.kept.push_back(path);
+}
+
+void ZelkorPersistentStorage::_continueAfter(std::int64_t largest) {
+  auto current = handleId_.load();
+  if (largest < static_cast<std::int64_t>(current)) return;
+  handleId_.compare_exchange_strong(current, static_cast<std::uint32_t>(largest + 1));
+}
+
+void ZelkorPersistentStorage::_offer(const Scan& scan) {
+  queue_.assertCurrent();
+  for (const auto& path : scan.tooOld) _deleteSessionFile(path);
+  std::set<std::string> known;
+  for (const auto& container : fileContainers_) known.insert(container->fileUrl());
+  for (const auto& path : scan.kept) {
+    if (known.contains(path)) continue;
+    _trim(path);
+    fileContainers_.push_back(std::make_shared<FileContainer>(services_, path));
+  }
+}
+
+// Without a mapping there is nothing to cut: an empty file, or one that reading will complain of.
+void ZelkorPersistentStorage::_trim(const std::string& path) {
+  std::optional<std::uint64_t> end;
+  std::uint64_t size = 0;
+  if (const auto file = services_->files.openForReading(path, nullptr)) {
+    const auto data = file->map(nullptr);
+    if (!data) return;
+    size = data->size();
+    end = endOfWholeRecords(data->view(), services_->maxFileSize);
+  }
+  if (!end) return;
+  const auto error = services_->containerFiles.cut(path, *end);
+  if (error) {
+    log_.error("could not cut {} back to {} bytes: {}", path, *end, error->description());
+  } else {
+    log_.notice("cut {} back from {} to {} bytes, the end of its last whole record", path, size,
+                *end);
+  }
+}
+
+void ZelkorPersistentStorage::_deleteSessionFile(const std::string& path) {
+  queue_.assertCurrent();
+  if (path.empty()) {
+    log_.fault("Handle {} does not have a File URL", "(null)");
+    return;
+  }
+  log_.info("delete file url {}", path);
+  if (services_->files.remove(path)) log_.error("File {} delete failed", path);
+}
+
+}  // namespace zelkord

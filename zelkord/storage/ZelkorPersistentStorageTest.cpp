@@ -1,0 +1,188 @@
+#include <gmock/gmock.h>
+
+#include <cerrno>
+
+#include "platform/testing/FakePlatform.h"
+#include "zelkord/assembly/Assembly.h"
+#include "zelkord/assembly/UserAgent.h"
+#include "zelkord/storage/StorageTestSupport.h"
+#include "zelkord/storage/ZelkorPersistentStorage.h"
+
+namespace zelkord {
+namespace {
+
+using testing::ElementsAre;
+using testing::UnorderedElementsAre;
+
+class ZelkorPersistentStorageTest : public testing::Test {
+ protected:
+  std::shared_ptr<ZelkorPersistentStorage> start() {
+    auto storage = std::make_shared<ZelkorPersistentStorage>(assembly_);
+    storage->start();
+    return storage;
+  }
+  std::string url(const std::shared_ptr<SessionContainer>& container) {
+    return container ? std::dynamic_pointer_cast<FileContainer>(container)->fileUrl() : "none";
+  }
+  std::vector<std::string> available(ZelkorPersistentStorage& storage) {
+    std::vector<std::string> urls;
+    for (const auto& container : storage.getAvailableSessionHandles()) {
+      urls.push_back(container->fileUrl());
+    }
+    return urls;
+  }
+  std::string whole() { return containerBytes(*zelkordUserAgent(fakes_.device), 2); }
+
+  FakePlatform fakes_;
+  Assembly assembly_{fakes_.platform()};
+};
+
+TEST_F(ZelkorPersistentStorageTest, NumbersFilesBeyondThoseFound) {
+  const struct {
+    std::vector<const char*> found;
+    const char* next;
+  } cases[] = {{{}, "session.0"},
+               {{"session.3", "session.7"}, "session.8"},
+               {{"session.7", "session.3"}, "session.8"},
+               {{"session.2147483648", "session.99999999999999999999"}, "session.0"},
+               {{"session.", "session.-5", "session.5x", "session.+5", "session 5", "Session.5",
+                 "bag.plist"},
+                "session.0"},
+               // The numbers go round.
+               {{"session.2147483647", "session.0"}, "session.1"}};
+  for (const auto& test : cases) {
+    SCOPED_TRACE(test.next);
+    FakePlatform fakes;
+    Assembly assembly(fakes.platform());
+    for (const auto* name : test.found) fakes.files.put("/caches/" + std::string(name), "x");
+    const auto storage = std::make_shared<ZelkorPersistentStorage>(assembly);
+    storage->start();
+    EXPECT_EQ(url(storage->createFileContainerForWriting()), "/caches/" + std::string(test.next));
+    for (const auto* name : test.found) {
+      EXPECT_TRUE(fakes.files.bytes("/caches/" + std::string(name)));
+    }
+  }
+}
+
+TEST_F(ZelkorPersistentStorageTest, TakesTheNextFreeNumber) {
+  const auto storage = start();
+  fakes_.files.put("/caches/session.0", "somebody's");
+  fakes_.files.putDirectory("/caches/session.1");
+  EXPECT_EQ(url(storage->createFileContainerForWriting()), "/caches/session.2");
+  EXPECT_EQ(fakes_.files.bytes("/caches/session.0"), "somebody's");
+  EXPECT_EQ(fakes_.files.mode("/caches/session.2"), 0600u);
+  EXPECT_TRUE(fakes_.log.contains("new file url /caches/session.2"));
+}
+
+TEST_F(ZelkorPersistentStorageTest, LeadsAContainerFromWritingToDeletion) {
+  const auto storage = start();
+  const auto session = storage->createFileContainerForWriting();
+  session->writeSessionHeader(testHeader());
+  session->writeFeedback(numberedFeedback(1), nullptr);
+  EXPECT_THAT(available(*storage), ElementsAre());
+  storage->closeSession(session);
+  const auto handles = storage->getAvailableSessionHandles();
+  ASSERT_EQ(handles.size(), 1u);
+  EXPECT_TRUE(fakes_.log.contains("available file url /caches/session.0"));
+  EXPECT_EQ(handles[0]->read()->feedbacks.size(), 1u);
+
+  // An uploader's copy of the list outlives the file.
+  storage->deleteSessionWithFileContainer(handles[0]);
+  EXPECT_THAT(available(*storage), ElementsAre());
+  EXPECT_FALSE(fakes_.files.bytes("/caches/session.0"));
+  EXPECT_TRUE(fakes_.log.contains("delete file url /caches/session.0"));
+  storage->deleteSessionWithFileContainer(handles[0]);
+  fakes_.timeline.runUntilIdle();
+  EXPECT_TRUE(fakes_.log.contains("File /caches/session.0 delete failed"));
+}
+
+TEST_F(ZelkorPersistentStorageTest, WritesEverythingBeforeItEnds) {
+  auto storage = start();
+  auto session = storage->createFileContainerForWriting();
+  session->writeSessionHeader(testHeader());
+  session->writeFeedback(numberedFeedback(1), nullptr);
+  session->writeFeedback(numberedFeedback(2), nullptr);
+  session.reset();
+  storage->waitForPendingWrites();
+  EXPECT_EQ(fakes_.files.bytes("/caches/session.0"), whole());
+}
+
+TEST_F(ZelkorPersistentStorageTest, FindsWhatAnEarlierProcessLeft) {
+  fakes_.files.put("/caches/session.3", whole());
+  fakes_.files.put("/caches/session.7", whole());
+  fakes_.files.putDirectory("/caches/session.9");
+  const auto storage = start();
+  EXPECT_THAT(available(*storage), UnorderedElementsAre("/caches/session.3", "/caches/session.7"));
+  EXPECT_EQ(storage->getAvailableSessionHandles()[0]->read()->feedbacks.size(), 2u);
+}
+
+TEST_F(ZelkorPersistentStorageTest, CutsAnEndedContainerBackToItsLastWholeRecord) {
+  const auto bytes = whole();
+  const auto lastRecord = framed(storedMessage(numberedFeedback(2))).size();
+  for (std::size_t cut = 1; cut < lastRecord; ++cut) {
+    SCOPED_TRACE(cut);
+    fakes_.log.clear();
+    fakes_.files.put("/caches/session.3", bytes.substr(0, bytes.size() - cut));
+    const auto handles = start()->getAvailableSessionHandles();
+    ASSERT_EQ(handles.size(), 1u);
+    EXPECT_EQ(fakes_.files.bytes("/caches/session.3"), bytes.substr(0, bytes.size() - lastRecord));
+    EXPECT_EQ(fakes_.log.count("cut /caches/session.3 back from"), 1);
+    EXPECT_EQ(handles[0]->read()->feedbacks.size(), 1u);
+  }
+}
+
+TEST_F(ZelkorPersistentStorageTest, LeavesDamageAsItIs) {
+  const auto damaged = whole() + std::string(8, '\0') + "x";
+  fakes_.files.put("/caches/session.1", damaged);
+  fakes_.files.put("/caches/session.2", "");
+  const auto storage = start();
+  for (const auto& container : storage->getAvailableSessionHandles()) {
+    EXPECT_FALSE(container->read());
+  }
+  EXPECT_EQ(fakes_.files.bytes("/caches/session.1"), damaged);
+  EXPECT_EQ(available(*storage).size(), 2u);
+}
+
+TEST_F(ZelkorPersistentStorageTest, DeletesWhatIsTooOld) {
+  const auto now = fakes_.timeline.wallNow();
+  const auto keptAt = [&](WallTime clock) {
+    fakes_.files.put("/caches/session.1", whole());
+    fakes_.files.setCreated("/caches/session.1", now - 48h - 1s);
+    fakes_.files.put("/caches/session.2", whole());
+    fakes_.files.setCreated("/caches/session.2", now - 48h);
+    fakes_.timeline.setWall(clock);
+    return available(*start()).size();
+  };
+  EXPECT_EQ(keptAt(now - 24h), 2u);
+  EXPECT_EQ(keptAt(now), 1u);
+  EXPECT_FALSE(fakes_.files.bytes("/caches/session.1"));
+  EXPECT_EQ(fakes_.counters.value("com.quenta.zelkord.filetooold"), 1);
+  EXPECT_EQ(keptAt(now + 365 * 24h), 0u);
+  fakes_.settings.set("ZLKSessionMaxAge", 1e9);
+  EXPECT_EQ(keptAt(now + 365 * 24h), 2u);
+}
+
+TEST_F(ZelkorPersistentStorageTest, LivesWithACachesDirectoryThatFails) {
+  using Operation = FakeFileManager::Operation;
+  const struct {
+    Operation operation;
+    const char* text;
+  } cases[] = {{Operation::List, "error scanning cache directory {"},
+               {Operation::CreateExclusively, "Could not get a file url"},
+               {Operation::OpenForAppending, "Could not open file for writing /caches/session.0"}};
+  for (const auto& test : cases) {
+    SCOPED_TRACE(test.text);
+    fakes_.log.clear();
+    fakes_.files.fail(test.operation, EACCES);
+    const auto storage = start();
+    const auto container = storage->createFileContainerForWriting();
+    EXPECT_EQ(container == nullptr, test.operation != Operation::List);
+    EXPECT_EQ(fakes_.files.paths().size(), container ? 1u : 0u);
+    EXPECT_TRUE(fakes_.log.contains(test.text));
+    fakes_.files.fail(test.operation, 0);
+    fakes_.files.remove("/caches/session.0");
+  }
+}
+
+}  // namespace
+}  // namespace zelkord
