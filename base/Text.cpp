@@ -6,12 +6,21 @@
 #include <unicode/utf8.h>
 
 #include <algorithm>
+#include <cstdint>
+#include <cstring>
 
 namespace zelkor {
 namespace {
 
 bool isAscii(std::string_view text) {
   return std::all_of(text.begin(), text.end(), [](unsigned char c) { return c < 0x80; });
+}
+
+bool beginsWithEightOfAscii(std::string_view text) {
+  std::uint64_t word = 0;
+  if (text.size() < sizeof word) return false;
+  std::memcpy(&word, text.data(), sizeof word);
+  return (word & 0x8080808080808080) == 0;
 }
 
 bool isDigit(char c) { return c >= '0' && c <= '9'; }
@@ -53,6 +62,10 @@ std::size_t utf16Length(std::string_view utf8) {
 bool isValidUtf8(std::string_view bytes) {
   const auto size = static_cast<int64_t>(bytes.size());
   for (int64_t at = 0; at < size;) {
+    if (beginsWithEightOfAscii(bytes.substr(static_cast<std::size_t>(at)))) {
+      at += 8;
+      continue;
+    }
     UChar32 point = 0;
     U8_NEXT(bytes.data(), at, size, point);
     if (point < 0) return false;

@@ -27,7 +27,7 @@ void appendStoredFeedback(const CZZelkorFeedback& record, std::string& bytes) {
   Envelope envelope;
   if (record.feedback) {
     record.feedback->appendTo(message);
-    envelope.payload = {std::string(record.feedback->className()), message};
+    envelope.payload = {record.feedback->className(), message};
   }
   envelope.queryId = record.queryId;
   envelope.clientQueryId = record.clientQueryId;

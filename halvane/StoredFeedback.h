@@ -18,7 +18,7 @@ namespace zelkor {
 
 // A feedback with the name of its class. Views: they borrow.
 struct CZFeedbackPayload {
-  std::string feedbackClass;
+  std::string_view feedbackClass;
   std::string_view feedback;  // its message
 
   static constexpr auto fields() {
@@ -50,14 +50,13 @@ struct CZClientSession {
 
   static constexpr auto fields() {
     using T = CZClientSession;
-    return std::tuple{
-        stored(1, "agent", &T::agent),
-        stored(2, "user_guid_string", &T::userGuidString),
-        stored(3, "previous_session_end_reason", &T::previousSessionEndReason),
-        stored(4, "remove_timestamps", &T::removeTimestamps),
-        stored(5, "session_start_since_1970", &T::sessionStartSince1970),
-        stored(6, "first_use_of_the_day", &T::firstUseOfTheDay),
-        stored(7, "cp_resource_versions", &T::cpResourceVersions)};
+    return std::tuple{stored(1, "agent", &T::agent),
+                      stored(2, "user_guid_string", &T::userGuidString),
+                      stored(3, "previous_session_end_reason", &T::previousSessionEndReason),
+                      stored(4, "remove_timestamps", &T::removeTimestamps),
+                      stored(5, "session_start_since_1970", &T::sessionStartSince1970),
+                      stored(6, "first_use_of_the_day", &T::firstUseOfTheDay),
+                      stored(7, "cp_resource_versions", &T::cpResourceVersions)};
   }
 };
 

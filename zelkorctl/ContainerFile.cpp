@@ -90,7 +90,7 @@ std::optional<ContainerFault> readRecords(Frames& frames, ContainerFile& file) {
     if (!record) return undecodable(frames, reason);
     const auto payload = payloadOf(*bytes);
     file.records.push_back(
-        {payload.feedbackClass, std::string(payload.feedback), *std::move(record)});
+        {std::string(payload.feedbackClass), std::string(payload.feedback), *std::move(record)});
   }
   return std::nullopt;
 }
