@@ -9,12 +9,15 @@
 #include "zelkord/core/Diagnostics.h"
 #include "zelkord/core/ServiceInterfaces.h"
 #include "zelkord/core/ZelkorService.h"
+#include "zelkord/feedback/SessionManager.h"
 #include "zelkord/feedback/StoredSessions.h"
 #include "zelkord/network/BagFeedbackGate.h"
 #include "zelkord/network/ImageFetcher.h"
 #include "zelkord/network/ZLKNetworkRequestFactory.h"
 #include "zelkord/network/ZelkorBagController.h"
+#include "zelkord/query/ClientState.h"
 #include "zelkord/query/ResponseImages.h"
+#include "zelkord/storage/ZelkorPersistentStorage.h"
 
 namespace zelkord {
 
@@ -48,6 +51,9 @@ void Daemon::_registerDefaults() {
 // The order is required: a service finds earlier ones in the assembly.
 void Daemon::_makeServices() {
   auto& assembly = *assembly_;
+  const auto storage = std::make_shared<ZelkorPersistentStorage>(assembly);
+  assembly.setPersistentStorage(storage);
+  storage->start();
   assembly.setFeedbackGate(std::make_shared<BagFeedbackGate>(assembly));
   assembly.setFeedbackSessions(std::make_shared<StoredSessions>(assembly));
   const auto factory = std::make_shared<ZLKNetworkRequestFactory>(assembly);
@@ -96,14 +102,23 @@ void Daemon::_warm() {
   });
 }
 
+// Every record is in its file; the sessions stay as they are, for the next start to find.
+void Daemon::_finishRecording() {
+  if (auto* shared = assembly_->clientSessionManager()) shared->waitForPendingFeedback();
+  for (const auto& state : assembly_->clientStateManager()->states()) {
+    state->sessionManager().waitForPendingFeedback();
+  }
+  assembly_->persistentStorage()->waitForPendingWrites();
+}
+
 void Daemon::_handleSignals() {
   auto& queue = platform_.queues.global(QualityOfService::Default);
   const auto leaveOn = [&](int number, const char* name) {
-    return platform_.signals.on(number, queue,
-                                [&platform = platform_, &assembly = *assembly_, name] {
-                                  assembly.defaultLog().debug("{}", name);
-                                  platform.process.exit(0);
-                                });
+    return platform_.signals.on(number, queue, [this, name] {
+      assembly_->defaultLog().debug("{}", name);
+      _finishRecording();
+      platform_.process.exit(0);
+    });
   };
   interrupt_ = leaveOn(SIGINT, "SIGINT");
   terminate_ = leaveOn(SIGTERM, "SIGTERM");

@@ -34,6 +34,7 @@ class Daemon final {
   std::optional<Error> _listen();
   void _handleLaunchEvents();
   void _warm();
+  void _finishRecording();
   void _handleSignals();
 
   Platform& platform_;
