@@ -10,12 +10,14 @@
 #include <array>
 #include <atomic>
 #include <chrono>
+#include <deque>
 #include <memory>
 #include <string>
 #include <thread>
 #include <vector>
 
 #include "benchmarks/QuietLog.h"
+#include "corezelkor/proto/Feedback.pb.h"
 #include "platform/linux/files/Descriptor.h"
 #include "platform/linux/files/LinuxContainerFiles.h"
 #include "platform/linux/files/LinuxFileManager.h"
@@ -157,12 +159,37 @@ BENCHMARK(BM_RecordFromEightThreads)
     ->UseManualTime()
     ->Unit(benchmark::kMillisecond);
 
+constexpr std::size_t kFull = std::size_t{2} << 20;
+
+// The floor: the messages of a full container, in memory, and the feedback in each, parsed by the
+// generated code. Kept are all of them, as by the reader, or (0) only the last one.
+void BM_ParseMessages(benchmark::State& state) {
+  const auto message = storedMessage(commonFeedback(1));
+  const std::vector<std::string> messages(kFull / (kLengthSize + message.size()), message);
+  for (auto _ : state) {
+    std::deque<corezelkor::CZZelkorFeedback> records(1);
+    std::deque<corezelkor::CZCustomFeedback> feedbacks(1);
+    for (const auto& bytes : messages) {
+      if (!records.back().ParseFromString(bytes) ||
+          !feedbacks.back().ParseFromString(records.back().payload().feedback())) {
+        state.SkipWithError("cannot parse");
+      }
+      if (state.range(0) == 0) continue;
+      records.emplace_back();
+      feedbacks.emplace_back();
+    }
+    benchmark::DoNotOptimize(feedbacks);
+  }
+  state.counters["records"] = static_cast<double>(messages.size());
+}
+BENCHMARK(BM_ParseMessages)->ArgName("kept")->Arg(1)->Arg(0)->Unit(benchmark::kMicrosecond);
+
 // A container of two mebibytes, as an uploader reads it.
 void BM_ReadFullContainer(benchmark::State& state) {
-  ContainerStore store(std::int64_t{2} << 20);
+  ContainerStore store(kFull);
   const auto one = framed(storedMessage(commonFeedback(1)));
   auto bytes = containerBytes(*zelkordUserAgent(store.fakes.device), 0);
-  while (bytes.size() + one.size() < (std::size_t{2} << 20)) bytes += one;
+  while (bytes.size() + one.size() < kFull) bytes += one;
   store.root.write("session.0", bytes);
   store.storage->start();
   const auto handles = store.storage->getAvailableSessionHandles();

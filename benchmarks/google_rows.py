@@ -21,6 +21,7 @@ FLOORS = {
     "BM_BuildSearchRequest": "BM_CopySearchRequest",
     "BM_SearchRequest": "BM_CopyRequestFloor",
     "BM_RecordToFile": "BM_WritevLoop",
+    "BM_ReadFullContainer": "BM_ParseMessages",
 }
 
 # What a figure is to be at most, in microseconds.
