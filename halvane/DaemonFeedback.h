@@ -49,11 +49,11 @@ struct ZLKEndNetworkSearchFeedback final : FeedbackRecord<ZLKEndNetworkSearchFee
 
   static constexpr auto fields() {
     using T = ZLKEndNetworkSearchFeedback;
-    return std::tuple_cat(endFields(),
-                          std::tuple{sent(9, "zelkor_status", &T::zelkorStatus),
-                                     sent(10, "zelkor_duration", &T::zelkorDuration),
-                                     sent(11, "fbq", &T::fbq),
-                                     sent(12, "zelkor_partial_client_ip", &T::partialClientIp)});
+    return std::tuple_cat(
+        endFields(),
+        std::tuple{sent(9, "zelkor_status", &T::zelkorStatus),
+                   sent(10, "zelkor_duration", &T::zelkorDuration), sent(11, "fbq", &T::fbq),
+                   sent(12, "zelkor_partial_client_ip", &T::partialClientIp)});
   }
 };
 

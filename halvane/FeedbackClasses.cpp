@@ -41,17 +41,17 @@ std::vector<FeedbackClass> allClasses() {
          HVStartLocalSearchFeedback, HVEndLocalSearchFeedback, HVSearchViewAppearFeedback,
          HVSearchViewDisappearFeedback, HVRankingFeedback, CZZLKRankerFeedback,
          HVResultEngagementFeedback, HVCardSectionEngagementFeedback,
-         HVMapsCardSectionEngagementFeedback, HVStoreCardSectionEngagementFeedback,
-         HVErrorFeedback, HVSuggestionEngagementFeedback, HVCardViewDisappearFeedback,
-         HVStartSearchFeedback, HVEndSearchFeedback, HVVisibleSuggestionsFeedback,
-         HVCustomFeedback, HVResultsReceivedAfterTimeoutFeedback, HVLateSectionsAppendedFeedback,
+         HVMapsCardSectionEngagementFeedback, HVStoreCardSectionEngagementFeedback, HVErrorFeedback,
+         HVSuggestionEngagementFeedback, HVCardViewDisappearFeedback, HVStartSearchFeedback,
+         HVEndSearchFeedback, HVVisibleSuggestionsFeedback, HVCustomFeedback,
+         HVResultsReceivedAfterTimeoutFeedback, HVLateSectionsAppendedFeedback,
          HVClearInputFeedback, HVSectionEngagementFeedback, HVVisibleSectionHeaderFeedback,
          HVDidGoToSiteFeedback, HVDidGoToSearchFeedback, HVResultGradingFeedback>(
       classes, FeedbackOrigin::Client);
   addAll<ZLKLookupStartNetworkSearchFeedback, ZLKEndNetworkSearchFeedback, ZLKSkipSearchFeedback,
          ZLKCacheHitFeedback, ZelkorSessionEndFeedback, ZelkorSessionMissingResults,
          ZelkorSessionMissingSuggestions, ZelkorConnectionInvalidated>(classes,
-                                                                      FeedbackOrigin::Daemon);
+                                                                       FeedbackOrigin::Daemon);
   std::sort(classes.begin(), classes.end(),
             [](const auto& a, const auto& b) { return a.name < b.name; });
   return classes;

@@ -24,13 +24,10 @@ struct FeedbackRecord : HVFeedback {
   void appendTo(std::string& bytes) const final {
     appendRecord(static_cast<const T&>(*this), kTimestamp, bytes);
   }
-  bool read(RecordReader& reader) final {
-    return reader.read(static_cast<T&>(*this), kTimestamp);
-  }
+  bool read(RecordReader& reader) final { return reader.read(static_cast<T&>(*this), kTimestamp); }
 
  private:
-  static constexpr auto kTimestamp =
-      std::tuple{stored(1, "timestamp", &HVFeedback::timestamp)};
+  static constexpr auto kTimestamp = std::tuple{stored(1, "timestamp", &HVFeedback::timestamp)};
 };
 
 }  // namespace zelkor

@@ -49,9 +49,12 @@ struct HVStartNetworkSearchFeedback final : FeedbackRecord<HVStartNetworkSearchF
 
   static constexpr auto fields() {
     using T = NetworkSearchStart;
-    return std::tuple{sent(2, "trigger_event", &T::triggerEvent), sent(3, "input", &T::input),
-                      sent(4, "uuid", &T::uuid),                  sent(5, "headers", &T::headers),
-                      sent(6, "url", &T::url), sent(7, "endpoint_type", &T::endpointType)};
+    return std::tuple{sent(2, "trigger_event", &T::triggerEvent),
+                      sent(3, "input", &T::input),
+                      sent(4, "uuid", &T::uuid),
+                      sent(5, "headers", &T::headers),
+                      sent(6, "url", &T::url),
+                      sent(7, "endpoint_type", &T::endpointType)};
   }
 };
 
@@ -251,8 +254,8 @@ struct HVStoreCardSectionEngagementFeedback final
   Term<vocabulary::kProductPageResults> productPageResult;
 
   static constexpr auto fields() {
-    return std::tuple{stored(2, "product_page_result",
-                             &HVStoreCardSectionEngagementFeedback::productPageResult)};
+    return std::tuple{
+        stored(2, "product_page_result", &HVStoreCardSectionEngagementFeedback::productPageResult)};
   }
 };
 
@@ -303,9 +306,7 @@ struct HVEndSearchFeedback final : FeedbackRecord<HVEndSearchFeedback> {
 
   std::optional<std::string> uuid;
 
-  static constexpr auto fields() {
-    return std::tuple{sent(2, "uuid", &HVEndSearchFeedback::uuid)};
-  }
+  static constexpr auto fields() { return std::tuple{sent(2, "uuid", &HVEndSearchFeedback::uuid)}; }
 };
 
 struct HVVisibleSuggestionsFeedback final : FeedbackRecord<HVVisibleSuggestionsFeedback> {

@@ -25,8 +25,7 @@ const std::uint8_t* bytesOf(std::string_view message) {
 
 // What is longer than the library can address counts as an empty message that did not end.
 int lengthOf(std::string_view message) {
-  return static_cast<int>(
-      std::min<std::size_t>(message.size(), std::numeric_limits<int>::max()));
+  return static_cast<int>(std::min<std::size_t>(message.size(), std::numeric_limits<int>::max()));
 }
 
 }  // namespace

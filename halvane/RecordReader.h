@@ -171,8 +171,7 @@ bool RecordReader::_matches(std::uint32_t tag, const OneField& field, Record& re
 }
 
 template <typename Record, typename Fields>
-bool RecordReader::_readField(std::uint32_t tag, Record& record, const Fields& fields,
-                              bool& good) {
+bool RecordReader::_readField(std::uint32_t tag, Record& record, const Fields& fields, bool& good) {
   return std::apply(
       [&](const auto&... field) { return (_matches(tag, field, record, good) || ...); }, fields);
 }
@@ -181,8 +180,7 @@ template <typename Record, typename... Extra>
 bool RecordReader::read(Record& record, const std::tuple<Extra...>& extra) {
   bool good = true;
   while (const auto tag = input_.ReadTag()) {
-    if (!_readField(tag, record, Record::fields(), good) &&
-        !_readField(tag, record, extra, good)) {
+    if (!_readField(tag, record, Record::fields(), good) && !_readField(tag, record, extra, good)) {
       good = _skip(tag);
     }
     if (!good) return false;

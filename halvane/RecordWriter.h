@@ -71,7 +71,7 @@ template <typename Value>
 struct Codec;  // of a nested record
 
 template <typename Value>
-  requires std::is_integral_v<Value>
+requires std::is_integral_v<Value>
 struct Codec<Value> {
   static constexpr Type kType = Type::Varint;
   static bool isDefault(Value value) { return value == 0; }
@@ -118,16 +118,14 @@ struct Codec<std::string> : Codec<std::string_view> {};
 template <>
 struct Codec<JsonText> {
   static constexpr Type kType = Type::Bytes;
-  static std::size_t size(const JsonText& json) {
-    return Codec<std::string_view>::size(json.text);
-  }
+  static std::size_t size(const JsonText& json) { return Codec<std::string_view>::size(json.text); }
   static std::uint8_t* write(const JsonText& json, std::uint8_t* out) {
     return Codec<std::string_view>::write(json.text, out);
   }
 };
 
 template <typename Record>
-  requires requires { Record::fields(); }
+requires requires { Record::fields(); }
 struct Codec<Record> {
   static constexpr Type kType = Type::Bytes;
   static std::size_t size(const Record& record) {

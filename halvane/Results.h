@@ -117,8 +117,7 @@ struct HVSuggestion {
   static constexpr auto fields() {
     using T = HVSuggestion;
     return std::tuple{sent(1, "id", &T::identifier), sent(2, "suggestion", &T::suggestion),
-                      sent(3, "score", &T::score),
-                      sent(4, "suggestion_type", &T::suggestionType),
+                      sent(3, "score", &T::score), sent(4, "suggestion_type", &T::suggestionType),
                       sentIfSet(5, "fbr", &T::fbr)};
   }
 };

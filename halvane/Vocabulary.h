@@ -31,13 +31,12 @@ inline constexpr auto kResultTypes =
           "calculator", "conversion", "dictionary_definition", "google", "yahoo", "bing",
           "duckduckgo", "yandex", "baidu");
 inline constexpr auto kTopHitTypes = table("tophit_no", "tophit_should_be", "tophit_must_be");
-inline constexpr auto kViewAppearEvents =
-    table("unknown", "swipe_down", "today_view", "lock_screen", "breadcrumb", "keyboard_shortcut",
-          "mouse_click_on_menu", "app_launch", "new_tab", "tap_to_input", "new_window", "click",
-          "tab_switch", "orb", "contextual_menu", "lookup_hint_tap", "lookup_tap", "swipe_up",
-          "swipe_left", "swipe_right", "start_composing", "find_popular_items",
-          "pull_down_home_screen", "notification_center", "partial_pull_down", "unlock_device",
-          "did_enter_foreground");
+inline constexpr auto kViewAppearEvents = table(
+    "unknown", "swipe_down", "today_view", "lock_screen", "breadcrumb", "keyboard_shortcut",
+    "mouse_click_on_menu", "app_launch", "new_tab", "tap_to_input", "new_window", "click",
+    "tab_switch", "orb", "contextual_menu", "lookup_hint_tap", "lookup_tap", "swipe_up",
+    "swipe_left", "swipe_right", "start_composing", "find_popular_items", "pull_down_home_screen",
+    "notification_center", "partial_pull_down", "unlock_device", "did_enter_foreground");
 inline constexpr auto kViewDisappearEvents =
     table("unknown", "killed", "home_button", "task_switcher", "cancel", "escape",
           "close_window_by_keyboard", "close_window_by_mouse", "minimize_window_by_keyboard",
@@ -65,9 +64,8 @@ inline constexpr auto kVisibleResultsEvents =
     table("unknown", "result_list_updated", "scroll", "show_more", "peek", "pop", "show_less",
           "card_swipe", "click", "view_resized", "scroll_up", "scroll_down", "resume_search",
           "arrow_up", "arrow_down");
-inline constexpr auto kCardSectionEvents =
-    table("unknown", "enter", "tap", "click", "double_click", "peek", "pop", "reveal", "arrow_up",
-          "arrow_down");
+inline constexpr auto kCardSectionEvents = table("unknown", "enter", "tap", "click", "double_click",
+                                                 "peek", "pop", "reveal", "arrow_up", "arrow_down");
 inline constexpr auto kCardTypes =
     table("unknown", "normal", "maps", "tunevo_sheet", "hosted_html_page");
 inline constexpr auto kCardActionTargets =
