@@ -106,7 +106,7 @@ class FeedbackCommandsTest : public testing::Test {
     std::filesystem::create_directory(cachesFolder());
     daemon_.reply("Configure", "s", "unix:path=/nowhere");
   }
-  ~FeedbackCommandsTest() override {
+  void TearDown() override {
     ::unsetenv("XDG_CACHE_HOME");
     std::filesystem::remove_all(folder_);
   }

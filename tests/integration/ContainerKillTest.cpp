@@ -101,7 +101,7 @@ class ContainerKillTest : public testing::Test {
       : acknowledged_(
             static_cast<Acknowledged*>(::mmap(nullptr, sizeof(Acknowledged), PROT_READ | PROT_WRITE,
                                               MAP_SHARED | MAP_ANONYMOUS, -1, 0))) {}
-  ~ContainerKillTest() override { ::munmap(acknowledged_, sizeof(Acknowledged)); }
+  void TearDown() override { ::munmap(acknowledged_, sizeof(Acknowledged)); }
 
   void recordAndKill() {
     for (auto& records : acknowledged_->records) records = 0;
