@@ -46,6 +46,17 @@ bool isJson(std::string_view text) {
   return !code && read == text.size();
 }
 
+bool isJsonObject(std::string_view text) {
+  return trimmedJson(text).substr(0, 1) == "{" && isJson(text);
+}
+
+std::string_view trimmedJson(std::string_view text) {
+  constexpr std::string_view kSpace = " \t\r\n";
+  const auto begin = text.find_first_not_of(kSpace);
+  if (begin == std::string_view::npos) return {};
+  return text.substr(begin, text.find_last_not_of(kSpace) - begin + 1);
+}
+
 std::optional<json::value> parseJson(std::string_view text, std::string* problem) {
   json::parse_options options;
   options.max_depth = kMaximumJsonDepth;

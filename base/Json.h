@@ -22,8 +22,13 @@ inline constexpr std::size_t kMaximumJsonDepth = 512;
 // kMaximumJsonDepth; `problem`, when given, then gets a one-line text. Throws nothing.
 std::optional<json::value> parseJson(std::string_view text, std::string* problem = nullptr);
 
+// Without the white space around it.
+std::string_view trimmedJson(std::string_view text);
+
 // Whether `parseJson` would accept the text; builds no value.
 bool isJson(std::string_view text);
+// The same, for documents that are an object.
+bool isJsonObject(std::string_view text);
 
 // The member of that name when it has the type; a value of another type counts as absent.
 const json::object* objectIn(const json::object& object, std::string_view key);

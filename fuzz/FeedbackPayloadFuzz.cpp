@@ -9,6 +9,7 @@
 #include "halvane/FeedbackClasses.h"
 #include "zelkord/core/ClientQueryId.h"
 #include "zelkord/core/FeedbackWire.h"
+#include "zelkord/encoding/FeedbackEncoding.h"
 #include "zelkord/feedback/ZelkorFeedback.h"
 
 namespace zelkord {
@@ -45,6 +46,7 @@ void use(MutableFeedback feedback) {
   std::string text;
   const bool isSent = record.appendDictionary(Logger(sink, ""), text);
   ZK_CHECK(isSent != text.empty(), "a record is sent whole or not at all");
+  ZK_CHECK(!isSent || valueOfOwnJson(text).is_object(), "what is sent is a JSON object");
 }
 
 }  // namespace

@@ -18,4 +18,11 @@ struct JsonText {
   friend bool operator==(const JsonText&, const JsonText&) = default;
 };
 
+// The same of a text that is to hold an object; anything else counts as nothing.
+struct JsonObjectText : JsonText {
+  JsonObjectText() = default;
+  JsonObjectText(JsonText json)  // NOLINT(google-explicit-constructor): a text, with a demand
+      : JsonText(std::move(json)) {}
+};
+
 }  // namespace zelkor

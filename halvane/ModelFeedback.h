@@ -62,7 +62,7 @@ struct HVStartNetworkSearchFeedback final : FeedbackRecord<HVStartNetworkSearchF
 struct NetworkSearchEnd {
   std::int64_t responseSize = 0;  // bytes
   std::int32_t statusCode = 0;
-  std::optional<JsonText> networkTimingData;  // an object
+  std::optional<JsonObjectText> networkTimingData;
   std::optional<bool> connectionReused;
   std::optional<std::string> interface;
   std::optional<std::string> peerAddress;  // "[ADDRESS]:PORT" or "ADDRESS:PORT"

@@ -132,7 +132,7 @@ bool RecordReader::_readOne(Value& value) {
     if constexpr (std::is_same_v<Value, std::string>) {
       if (!_readText(bytes)) return false;
       value.assign(bytes);
-    } else if constexpr (std::is_same_v<Value, JsonText>) {
+    } else if constexpr (std::is_base_of_v<JsonText, Value>) {
       if (!_readText(bytes)) return false;
       value.text.assign(bytes);
     } else {

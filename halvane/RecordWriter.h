@@ -123,6 +123,8 @@ struct Codec<JsonText> {
     return Codec<std::string_view>::write(json.text, out);
   }
 };
+template <>
+struct Codec<JsonObjectText> : Codec<JsonText> {};
 
 template <typename Record>
 requires requires { Record::fields(); }

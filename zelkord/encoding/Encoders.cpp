@@ -1,9 +1,7 @@
 #include "zelkord/encoding/Encoders.h"
 
-#include <algorithm>
-#include <array>
-
 #include "base/Json.h"
+#include "zelkord/encoding/ObjectMembers.h"
 
 namespace zelkord {
 namespace {
@@ -25,42 +23,19 @@ bool isOfOutsideEngine(const HVSearchResult& result) {
 }
 
 // The result of an engagement, as an object.
-void appendEngagedResult(const HVResultEngagementFeedback& feedback, std::string& text) {
+bool appendEngagedResult(const HVResultEngagementFeedback& feedback, std::string& text) {
   const auto& result = *feedback.result;
   text += '{';
   const auto begin = text.size();
-  appendMember("id", result.identifier, begin, text);
+  bool good = appendMember("id", result.identifier, begin, text);
   if (isOfOutsideEngine(result) && (result.hasTitle || result.title)) {
-    appendMember("third_party_suggestion", result.title, begin, text);
+    good = good && appendMember("third_party_suggestion", result.title, begin, text);
   }
-  appendMember("action_destination", actionDestinationFromResult(result, feedback.actionEngaged),
-               begin, text);
+  good = good &&
+         appendMember("action_destination",
+                      actionDestinationFromResult(result, feedback.actionEngaged), begin, text);
   text += '}';
-}
-
-// Members that every record sets by itself.
-constexpr std::array<std::string_view, 4> kOwnMembers = {"query_id", "client_query_id", "type",
-                                                         "timestamp"};
-
-// Takes our members out of a client's object; false when there were none.
-bool removeOwnMembers(json::object& object) {
-  const auto old = object.size();
-  for (const auto key : kOwnMembers) {
-    const auto found = object.find(key);
-    if (found != object.end()) object.stable_erase(found);
-  }
-  return object.size() != old;
-}
-
-// What stands between the braces of an object's text.
-std::string_view insideBraces(std::string_view object) {
-  const auto first = object.find('{');
-  const auto last = object.rfind('}');
-  auto inside = object.substr(first + 1, last - first - 1);
-  constexpr std::string_view kSpace = " \t\r\n";
-  const auto begin = inside.find_first_not_of(kSpace);
-  if (begin == std::string_view::npos) return {};
-  return inside.substr(begin, inside.find_last_not_of(kSpace) - begin + 1);
+  return good;
 }
 
 }  // namespace
@@ -84,9 +59,9 @@ bool appendMembersOf(const HVResultEngagementFeedback& feedback, std::size_t beg
     text += "null";
     return true;
   }
-  appendEngagedResult(feedback, text);
-  if (feedback.actionEngaged) appendMember("action_target", feedback.actionTarget, begin, text);
-  return true;
+  if (!appendEngagedResult(feedback, text)) return false;
+  return !feedback.actionEngaged ||
+         appendMember("action_target", feedback.actionTarget, begin, text);
 }
 
 bool appendMembersOf(const HVMapsCardSectionEngagementFeedback& feedback, std::size_t begin,
@@ -109,17 +84,10 @@ bool appendMembersOf(const HVSuggestionEngagementFeedback& feedback, std::size_t
   return appendMember("id", suggestion ? suggestion->identifier : std::nullopt, begin, text);
 }
 
-bool appendMembersOf(const HVCustomFeedback& feedback, std::size_t begin, std::string& text) {
-  const auto& json = feedback.jsonFeedback;
-  auto parsed = parseJson(json);
-  auto* object = parsed ? parsed->if_object() : nullptr;
-  if (!object) return false;
-  const bool hasOwn = removeOwnMembers(*object);
-  const auto changed = hasOwn ? json::serialize(*object) : std::string();
-  const auto members = insideBraces(hasOwn ? changed : json);
-  if (members.empty()) return true;
-  if (text.size() > begin) text += ',';
-  text += members;
+bool appendMembersOf(const HVCustomFeedback& feedback, LeftOut leftOut, std::size_t begin,
+                     std::string& text) {
+  if (!isJsonObject(feedback.jsonFeedback)) return false;
+  appendMembersOfObject(feedback.jsonFeedback, leftOut, begin, text);
   return true;
 }
 

@@ -5,6 +5,7 @@
 #include "halvane/DaemonFeedback.h"
 #include "halvane/ModelFeedback.h"
 #include "zelkord/encoding/JsonWriting.h"
+#include "zelkord/encoding/ObjectMembers.h"
 
 namespace zelkord {
 
@@ -23,7 +24,8 @@ bool appendMembersOf(const HVStoreCardSectionEngagementFeedback& feedback, std::
                      std::string& text);
 bool appendMembersOf(const HVSuggestionEngagementFeedback& feedback, std::size_t begin,
                      std::string& text);
-bool appendMembersOf(const HVCustomFeedback& feedback, std::size_t begin, std::string& text);
+bool appendMembersOf(const HVCustomFeedback& feedback, LeftOut leftOut, std::size_t begin,
+                     std::string& text);
 bool appendMembersOf(const HVResultGradingFeedback& feedback, std::size_t begin, std::string& text);
 // Where an engagement led to: the address that the service's own results name, null when they name
 // none; "non_zelkor_result" for all others.

@@ -13,20 +13,27 @@ namespace {
 struct KindEncoding {
   std::uint32_t type = kGenericFeedbackType;
   bool requiresQueryId = true;
-  bool (*encode)(const HVFeedback& feedback, std::size_t begin, std::string& text) = nullptr;
-  void (*process)(HVFeedback& feedback, IdentifierProcessor& processor) = nullptr;
+  bool (*encode)(const HVFeedback& feedback, LeftOut leftOut, std::size_t begin,
+                 std::string& text) = nullptr;
+  bool (*process)(HVFeedback& feedback, IdentifierProcessor& processor) = nullptr;
 };
 
 using KindTable = std::array<KindEncoding, kFeedbackKinds>;
 
 template <typename T>
-bool encode(const HVFeedback& feedback, std::size_t begin, std::string& text) {
-  return appendMembersOf(static_cast<const T&>(feedback), begin, text);
+bool encode(const HVFeedback& feedback, [[maybe_unused]] LeftOut leftOut, std::size_t begin,
+            std::string& text) {
+  const auto& record = static_cast<const T&>(feedback);
+  if constexpr (T::kKind == FeedbackKind::Custom) {
+    return appendMembersOf(record, leftOut, begin, text);
+  } else {
+    return appendMembersOf(record, begin, text);
+  }
 }
 
 template <typename T>
-void process(HVFeedback& feedback, IdentifierProcessor& processor) {
-  processItemsOf(static_cast<T&>(feedback), processor);
+bool process(HVFeedback& feedback, IdentifierProcessor& processor) {
+  return processItemsOf(static_cast<T&>(feedback), processor);
 }
 
 template <typename T>
@@ -110,15 +117,17 @@ bool requiresQueryId(const HVFeedback& feedback) {
 }
 
 bool appendMembers(const HVFeedback& feedback, const Logger& errors, std::size_t begin,
-                   std::string& text) {
+                   std::string& text, LeftOut leftOut) {
   const auto& encoding = encodingOf(feedback);
   if (!encoding.encode) {
-    errors.error("Feedback dictionary translation for {} fell back to default implementation.",
-                 feedback.className());
+    if (feedback.family == FeedbackFamily::Message) {
+      errors.error("Feedback dictionary translation for {} fell back to default implementation.",
+                   feedback.className());
+    }
     return true;
   }
   const auto old = text.size();
-  if (encoding.encode(feedback, begin, text)) return true;
+  if (encoding.encode(feedback, leftOut, begin, text)) return true;
   text.resize(old);
   return false;
 }
@@ -143,8 +152,8 @@ std::shared_ptr<const HVFeedback> processed(std::shared_ptr<const HVFeedback> fe
   auto* const process = encodingOf(*feedback).process;
   if (!process) return feedback;
   auto copy = feedback->clone();
-  process(*copy, processor);
-  return copy;
+  if (process(*copy, processor)) return copy;
+  return feedback;
 }
 
 }  // namespace zelkord

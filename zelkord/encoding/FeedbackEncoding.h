@@ -8,6 +8,7 @@
 #include "halvane/Feedback.h"
 #include "zelkord/ZelkorLogging/ZelkorLogging.h"
 #include "zelkord/encoding/IdentifierProcessor.h"
+#include "zelkord/encoding/ObjectMembers.h"
 
 namespace zelkord {
 
@@ -27,13 +28,14 @@ bool requiresQueryId(const HVFeedback& feedback);
 
 // Appends the members of what is sent, `"key":value` joined by commas, without braces, to a text
 // in which the object's first member would stand at `begin`. False, with `text` as it was, when
-// JSON cannot express them: a number that is not finite, or custom feedback that is not a JSON
-// object. A kind without an encoder has no members and logs an error.
+// JSON cannot express them: a number that is not finite, a text that is not UTF-8, or custom
+// feedback that is not a JSON object. A kind without an encoder has no members; a message of one
+// logs an error.
 //
-// Custom feedback is the client's own object, its text as it came; members that every record sets
-// by itself ("query_id", "client_query_id", "type", "timestamp") are left out of it.
+// Custom feedback is the client's own object, its text as it came. A caller that sets members of
+// its own leaves those names out of it.
 bool appendMembers(const HVFeedback& feedback, const Logger& errors, std::size_t begin,
-                   std::string& text);
+                   std::string& text, LeftOut leftOut = {});
 
 // What is sent as a value; empty when JSON cannot express it.
 json::object dictionaryOf(const HVFeedback& feedback, const Logger& errors);

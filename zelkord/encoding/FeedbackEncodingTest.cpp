@@ -354,8 +354,13 @@ TEST_F(FeedbackEncodingTest, AnEngagementTellsWhereItLed) {
 TEST_F(FeedbackEncodingTest, CustomFeedbackPassesThroughUntouched) {
   EXPECT_EQ(custom(R"({"b": 1.0, "a":[ ]})"), R"("b": 1.0, "a":[ ])");
   EXPECT_EQ(custom(" {\n} "), "");
-  EXPECT_EQ(custom(R"({"type":"mine","a":1,"timestamp":2,"query_id":3,"client_query_id":4})"),
-            R"("a":1)");
+  HVCustomFeedback named;
+  named.jsonFeedback = R"({"type":"mine","a":1})";
+  constexpr std::string_view kSet[] = {"type"};
+  std::string text = R"({"x":1)";
+  EXPECT_TRUE(appendMembers(named, errors_, 1, text, kSet));
+  EXPECT_EQ(text, R"({"x":1,"a":1)");
+  EXPECT_EQ(custom(R"({"type":"mine","n":0.1e1,"n":2})"), R"("type":"mine","n":0.1e1,"n":2)");
   const std::pair<std::int32_t, std::pair<std::uint32_t, bool>> types[] = {
       {0, {17, true}}, {1, {19, true}}, {2, {18, true}}, {3, {20, false}}};
   for (const auto& [customType, expected] : types) {
@@ -385,6 +390,19 @@ TEST_F(FeedbackEncodingTest, WhatJsonCannotExpressLeavesTheTextAsItWas) {
     visible.results[1].score = odd;
     refused(visible);
   }
+  const std::string broken = "eight bytes and \xC3";
+  HVStartNetworkSearchFeedback start;
+  start.headers = {{"a", broken}, {"b", "c"}};
+  refused(start);
+  start.headers = {{broken, "a"}};
+  refused(start);
+  HVResultEngagementFeedback engagement;
+  engagement.result = fullResult();
+  engagement.result->punchout->urls = {"tel:" + broken};
+  refused(engagement);
+  engagement.result = fullResult();
+  engagement.result->identifier = broken;
+  refused(engagement);
   for (const auto* json : {"", "[]", "7", "{", "{}{}", "\"x\"", "{\"a\":\"\xFF\"}"}) {
     HVCustomFeedback feedback;
     feedback.jsonFeedback = json;
@@ -398,6 +416,13 @@ TEST_F(FeedbackEncodingTest, EmbeddedTextsCountAsNothingWhenTheyAreNoJson) {
     EXPECT_TRUE(appendJson(JsonText(text), written));
     EXPECT_EQ(written, "null") << text;
   }
+  for (const auto& [text, wanted] :
+       {std::pair("[]", "null"), {" \"{}\"", "null"}, {"", "null"}, {"\n{ }\n", "{ }"}}) {
+    HVEndNetworkSearchFeedback end;
+    end.networkTimingData = JsonText(text);
+    EXPECT_THAT(members(end), testing::HasSubstr(std::string(R"("network_timing_data":)") + wanted +
+                                                 R"(,"connection_reused")"));
+  }
 }
 
 struct UnencodedFeedback final : HVFeedback {
@@ -409,7 +434,10 @@ struct UnencodedFeedback final : HVFeedback {
 };
 
 TEST_F(FeedbackEncodingTest, AKindWithoutAnEncoderIsNoticed) {
-  const UnencodedFeedback feedback;
+  UnencodedFeedback feedback;
+  EXPECT_EQ(members(feedback), "");
+  EXPECT_TRUE(log_.entries().empty());  // only a message's is an error
+  feedback.family = FeedbackFamily::Message;
   EXPECT_EQ(members(feedback), "");
   EXPECT_EQ(typeOf(feedback), 21u);
   EXPECT_TRUE(requiresQueryId(feedback));
@@ -425,11 +453,12 @@ TEST_F(FeedbackEncodingTest, TextsAndNumbersReadBackAsTheyWere) {
   for (int i = 0; i < 2000; ++i) {
     std::string text;
     for (std::size_t length = random() % 40; length > 0; --length) {
-      text += static_cast<char>(random() % 128);
+      text += static_cast<char>(random() % 4 == 0 ? random() % 128 : 'a' + random() % 26);
+      if (random() % 64 == 0) text += "\xE2\x82\xAC";
     }
     std::string written;
-    appendJsonString(text, written);
-    EXPECT_EQ(*parseJson(written), json::value(text)) << written;
+    EXPECT_TRUE(appendJsonString(text, written));
+    EXPECT_EQ(written, json::serialize(json::value(text)));
     const auto number = std::bit_cast<double>(random());
     written.clear();
     if (!appendJsonNumber(number, written)) continue;
@@ -488,15 +517,19 @@ TEST_F(FeedbackEncodingTest, IdentifiersAreReplacedInACopyAndReported) {
   auto engagement = made<HVResultEngagementFeedback>([](auto& f) { f.result = fullResult(); });
   EXPECT_NE(processed(engagement, processor), engagement);
   EXPECT_THAT(processor.seen, testing::ElementsAre("result r is new r"));
-  const auto plain = made<HVClearInputFeedback>();
-  EXPECT_EQ(processed(plain, processor), plain);
+  const std::shared_ptr<HVFeedback> withoutIdentifiers[] = {
+      made<HVClearInputFeedback>(), made<HVVisibleResultsFeedback>(),
+      made<HVSuggestionEngagementFeedback>(),
+      made<HVResultGradingFeedback>([](auto& f) { f.result.emplace().identifier = ""; })};
+  for (const auto& plain : withoutIdentifiers) EXPECT_EQ(processed(plain, processor), plain);
+  EXPECT_EQ(processor.seen.size(), 1u);
 }
 
 TEST_F(FeedbackEncodingTest, PropertiesOfARecordAreTexts) {
   ZLKSkipSearchFeedback skip(1, "text");
   const auto properties = dictionaryWithPropertiesOfObject(skip);
   EXPECT_EQ(json::serialize(properties),
-            R"({"trigger_event":"\"less_than_minimum_query_length\"","input":"text"})");
+            R"({"trigger_event":"less_than_minimum_query_length","input":"text"})");
   EXPECT_EQ(dictionaryWithPropertiesOfObject(HVError{})["reason"], "");
 }
 

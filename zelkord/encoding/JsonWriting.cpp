@@ -1,10 +1,13 @@
 #include "zelkord/encoding/JsonWriting.h"
 
+#include <algorithm>
 #include <array>
 #include <charconv>
 #include <cmath>
+#include <cstring>
 
 #include "base/Json.h"
+#include "base/Text.h"
 
 namespace zelkord {
 namespace {
@@ -32,11 +35,17 @@ constexpr auto kEscapes = [] {
   return escapes;
 }();
 
-// Without the white space around it.
-std::string_view trimmed(std::string_view json) {
-  constexpr std::string_view kSpace = " \t\r\n";
-  const auto begin = json.find_first_not_of(kSpace);
-  return json.substr(begin, json.find_last_not_of(kSpace) - begin + 1);
+// Whether the eight bytes at `bytes` are ASCII and stand for themselves: none is below 0x20, a
+// quote or a backslash. Each subtraction borrows, and sets a high bit, where a byte is too small.
+bool areEightPlain(const char* bytes) {
+  constexpr std::uint64_t kOnes = 0x0101010101010101;
+  constexpr std::uint64_t kHighBits = kOnes * 0x80;
+  std::uint64_t word = 0;
+  std::memcpy(&word, bytes, sizeof word);
+  const auto low = word - kOnes * 0x20;
+  const auto quote = (word ^ kOnes * '"') - kOnes;
+  const auto backslash = (word ^ kOnes * '\\') - kOnes;
+  return ((word | low | quote | backslash) & kHighBits) == 0;
 }
 
 void appendEscaped(unsigned char character, char escape, std::string& text) {
@@ -51,19 +60,29 @@ void appendEscaped(unsigned char character, char escape, std::string& text) {
 
 }  // namespace
 
-void appendJsonString(std::string_view value, std::string& text) {
+bool appendJsonString(std::string_view value, std::string& text) {
   text += '"';
-  std::size_t plain = 0;  // where the run that needs no escape begins
-  for (std::size_t i = 0; i < value.size(); ++i) {
-    const auto character = static_cast<unsigned char>(value[i]);
-    const char escape = kEscapes[character];
-    if (escape == 0) continue;
-    text.append(value, plain, i - plain);
-    appendEscaped(character, escape, text);
-    plain = i + 1;
+  std::size_t plain = 0;   // where the run that needs no escape begins
+  unsigned char seen = 0;  // the bits of all characters that were looked at singly
+  for (std::size_t i = 0; i < value.size();) {
+    const auto left = std::min<std::size_t>(value.size() - i, 8);
+    if (left == 8 && areEightPlain(value.data() + i)) {
+      i += 8;
+      continue;
+    }
+    for (const auto end = i + left; i < end; ++i) {
+      const auto character = static_cast<unsigned char>(value[i]);
+      seen |= character;
+      const char escape = kEscapes[character];
+      if (escape == 0) continue;
+      text.append(value, plain, i - plain);
+      appendEscaped(character, escape, text);
+      plain = i + 1;
+    }
   }
   text.append(value, plain);
   text += '"';
+  return seen < 0x80 || isValidUtf8(value);
 }
 
 bool appendJsonNumber(double value, std::string& text) {
@@ -76,25 +95,32 @@ void appendJsonInteger(std::int64_t value, std::string& text) { appendNumber(val
 void appendJsonInteger(std::uint64_t value, std::string& text) { appendNumber(value, text); }
 
 void appendJsonKey(std::string_view key, std::size_t begin, std::string& text) {
-  if (text.size() > begin) text += ',';
-  appendJsonString(key, text);
-  text += ':';
+  text += text.size() > begin ? ",\"" : "\"";
+  text += key;
+  text += "\":";
 }
 
 bool appendJson(const JsonText& value, std::string& text) {
-  text += isJson(value.text) ? trimmed(value.text) : "null";
+  text += isJson(value.text) ? trimmedJson(value.text) : std::string_view("null");
+  return true;
+}
+
+bool appendJson(const JsonObjectText& value, std::string& text) {
+  text += isJsonObject(value.text) ? trimmedJson(value.text) : std::string_view("null");
   return true;
 }
 
 bool appendJson(const std::map<std::string, std::string>& map, std::string& text) {
   text += '{';
-  const auto begin = text.size();
+  bool good = true;
   for (const auto& [key, value] : map) {
-    appendJsonKey(key, begin, text);
-    appendJsonString(value, text);
+    if (text.back() != '{') text += ',';
+    good = good && appendJsonString(key, text);
+    text += ':';
+    good = good && appendJsonString(value, text);
   }
   text += '}';
-  return true;
+  return good;
 }
 
 }  // namespace zelkord

@@ -18,11 +18,12 @@ namespace zelkord {
 // when JSON cannot express the value: a number that is not finite, a text that is not UTF-8; what
 // `text` then ends with is the caller's to cut off.
 
-void appendJsonString(std::string_view value, std::string& text);
+bool appendJsonString(std::string_view value, std::string& text);
 bool appendJsonNumber(double value, std::string& text);
 void appendJsonInteger(std::int64_t value, std::string& text);
 void appendJsonInteger(std::uint64_t value, std::string& text);
-// `"key":`, after a comma unless `text` ends with a brace or is no longer than `begin`.
+// `"key":`, after a comma unless it is the first member of an object whose members begin at
+// `begin`. Requires a key that needs no escapes.
 void appendJsonKey(std::string_view key, std::size_t begin, std::string& text);
 
 inline bool appendJson(bool value, std::string& text) {
@@ -41,12 +42,13 @@ requires(std::is_integral_v<Number> &&
 inline bool appendJson(double value, std::string& text) { return appendJsonNumber(value, text); }
 
 inline bool appendJson(const std::string& value, std::string& text) {
-  appendJsonString(value, text);
-  return true;
+  return appendJsonString(value, text);
 }
 
 // The text itself, when it is a JSON document; else null.
 bool appendJson(const JsonText& value, std::string& text);
+// The same, for objects only.
+bool appendJson(const JsonObjectText& value, std::string& text);
 
 bool appendJson(const std::map<std::string, std::string>& map, std::string& text);
 
@@ -54,11 +56,10 @@ bool appendJson(const std::map<std::string, std::string>& map, std::string& text
 template <const auto& Table, typename Value>
 bool appendJson(const Term<Table, Value>& term, std::string& text) {
   const auto name = term.text();
-  if (name.data() == nullptr) {
-    text += "null";
-  } else {
-    appendJsonString(name, text);
-  }
+  const std::string_view quote = name.data() != nullptr ? "\"" : "";
+  text += quote;
+  text += name.data() != nullptr ? name : "null";  // names need no escapes
+  text += quote;
   return true;
 }
 
@@ -111,9 +112,10 @@ bool appendField(const Record& record, const OneField& field, std::size_t begin,
 // The fields that are sent, as members of an object whose text began at `begin`.
 template <typename Record>
 bool appendFields(const Record& record, std::size_t begin, std::string& text) {
+  static constexpr auto kFields = Record::fields();
   return std::apply(
       [&](const auto&... field) { return (appendField(record, field, begin, text) && ...); },
-      Record::fields());
+      kFields);
 }
 
 template <typename Record>

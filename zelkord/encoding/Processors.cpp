@@ -13,34 +13,34 @@ std::optional<std::string> replaceIdentifier(Item& item, IdentifierProcessor& pr
 }
 
 template <typename Item>
-void expand(Item& item, IdentifierProcessor& processor) {
-  if (const auto identifier = replaceIdentifier(item, processor)) {
-    processor.identifierExpanded(*identifier);
-  }
+bool expand(Item& item, IdentifierProcessor& processor) {
+  const auto identifier = replaceIdentifier(item, processor);
+  if (identifier) processor.identifierExpanded(*identifier);
+  return identifier.has_value();
 }
 
 }  // namespace
 
-void processExpanded(HVSearchResult& result, IdentifierProcessor& processor) {
-  expand(result, processor);
+bool processExpanded(HVSearchResult& result, IdentifierProcessor& processor) {
+  return expand(result, processor);
 }
 
-void processExpanded(HVSuggestion& suggestion, IdentifierProcessor& processor) {
-  expand(suggestion, processor);
+bool processExpanded(HVSuggestion& suggestion, IdentifierProcessor& processor) {
+  return expand(suggestion, processor);
 }
 
-void processItemsOf(HVResultEngagementFeedback& feedback, IdentifierProcessor& processor) {
-  if (!feedback.result) return;
-  if (const auto identifier = replaceIdentifier(*feedback.result, processor)) {
-    processor.identifierReferencedForResult(*identifier, *feedback.result);
-  }
+bool processItemsOf(HVResultEngagementFeedback& feedback, IdentifierProcessor& processor) {
+  if (!feedback.result) return false;
+  const auto identifier = replaceIdentifier(*feedback.result, processor);
+  if (identifier) processor.identifierReferencedForResult(*identifier, *feedback.result);
+  return identifier.has_value();
 }
 
-void processItemsOf(HVSuggestionEngagementFeedback& feedback, IdentifierProcessor& processor) {
-  if (!feedback.suggestion) return;
-  if (const auto identifier = replaceIdentifier(*feedback.suggestion, processor)) {
-    processor.identifierReferencedForSuggestion(*identifier, *feedback.suggestion);
-  }
+bool processItemsOf(HVSuggestionEngagementFeedback& feedback, IdentifierProcessor& processor) {
+  if (!feedback.suggestion) return false;
+  const auto identifier = replaceIdentifier(*feedback.suggestion, processor);
+  if (identifier) processor.identifierReferencedForSuggestion(*identifier, *feedback.suggestion);
+  return identifier.has_value();
 }
 
 }  // namespace zelkord

@@ -11,38 +11,47 @@
 
 namespace zelkord {
 
-// Replaces the identifier of an item that is described in full.
-void processExpanded(HVSearchResult& result, IdentifierProcessor& processor);
-void processExpanded(HVSuggestion& suggestion, IdentifierProcessor& processor);
+// Replaces the identifiers of items that are described in full; whether there were any.
+bool processExpanded(HVSearchResult& result, IdentifierProcessor& processor);
+bool processExpanded(HVSuggestion& suggestion, IdentifierProcessor& processor);
 
 // Everything else has no identifier of its own, or holds items.
 template <typename Value>
-void processExpanded(Value& value, IdentifierProcessor& processor);
+bool processExpanded(Value& value, IdentifierProcessor& processor);
 template <typename Value>
-void processExpanded(std::optional<Value>& value, IdentifierProcessor& processor) {
-  if (value) processExpanded(*value, processor);
+bool processExpanded(std::optional<Value>& value, IdentifierProcessor& processor) {
+  return value && processExpanded(*value, processor);
 }
 template <typename Value>
-void processExpanded(std::vector<Value>& values, IdentifierProcessor& processor) {
-  for (auto& value : values) processExpanded(value, processor);
+bool processExpanded(std::vector<Value>& values, IdentifierProcessor& processor) {
+  bool replaced = false;
+  for (auto& value : values) replaced |= processExpanded(value, processor);
+  return replaced;
 }
 
 // What is sent of a record describes its items in full, unless its kind is one of those below.
 template <typename Record>
-void processItemsOf(Record& record, IdentifierProcessor& processor) {
+bool processItemsOf(Record& record, IdentifierProcessor& processor) {
   const auto processField = [&](const auto& field) {
-    if (field.use != FieldUse::StoredOnly) processExpanded(record.*field.member, processor);
+    return field.use != FieldUse::StoredOnly && processExpanded(record.*field.member, processor);
   };
-  std::apply([&](const auto&... field) { (processField(field), ...); }, Record::fields());
+  bool replaced = false;
+  std::apply([&](const auto&... field) { ((replaced |= processField(field)), ...); },
+             Record::fields());
+  return replaced;
 }
 
 // These only name the item.
-void processItemsOf(HVResultEngagementFeedback& feedback, IdentifierProcessor& processor);
-void processItemsOf(HVSuggestionEngagementFeedback& feedback, IdentifierProcessor& processor);
+bool processItemsOf(HVResultEngagementFeedback& feedback, IdentifierProcessor& processor);
+bool processItemsOf(HVSuggestionEngagementFeedback& feedback, IdentifierProcessor& processor);
 
 template <typename Value>
-void processExpanded(Value& value, IdentifierProcessor& processor) {
-  if constexpr (requires { Value::fields(); }) processItemsOf(value, processor);
+bool processExpanded(Value& value, IdentifierProcessor& processor) {
+  if constexpr (requires { Value::fields(); }) {
+    return processItemsOf(value, processor);
+  } else {
+    return false;
+  }
 }
 
 }  // namespace zelkord

@@ -46,13 +46,23 @@ constexpr std::array<std::string_view, 35> kFeedbackTypeNames = {
     "did_go_to_search",
 };
 
+// Members that a record sets over the feedback's own.
+constexpr std::array<std::string_view, 4> kSetMembers = {"type", "timestamp", "query_id",
+                                                         "client_query_id"};
+
+LeftOut membersSetBy(const ZelkorFeedback& record) {
+  const LeftOut all = kSetMembers;
+  if (!requiresQueryId(*record.feedback)) return all.first(2);
+  return all.first(record.clientQueryId != 0 ? 4 : 3);
+}
+
 // The record with that timestamp, as an object.
 bool appendObject(const ZelkorFeedback& record, std::uint64_t timestamp, const Logger& errors,
                   std::string& text) {
   const auto old = text.size();
   text += '{';
   const auto begin = text.size();
-  if (!appendMembers(*record.feedback, errors, begin, text)) {
+  if (!appendMembers(*record.feedback, errors, begin, text, membersSetBy(record))) {
     text.resize(old);
     return false;
   }

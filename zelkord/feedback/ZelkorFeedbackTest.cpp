@@ -27,7 +27,9 @@ TEST_F(ZelkorFeedbackTest, CarriesQueryIdentifiersOnlyWhereTheyBelong) {
     std::string expected;
   };
   auto custom = std::make_shared<HVCustomFeedback>();
-  custom->jsonFeedback = R"({"query_id":"mine","a":1,"type":2})";
+  custom->jsonFeedback = R"({"query_id":"mine","a":1,"type":2,"client_query_id":3})";
+  auto anonymous = std::make_shared<HVCustomFeedback>(*custom);
+  anonymous->feedbackType = 3;
   const std::vector<Case> cases = {
       {std::make_shared<HVDidGoToSiteFeedback>(), -5, std::numeric_limits<std::uint64_t>::max(),
        R"({"input":null,"query_id":-5,"client_query_id":18446744073709551615,)"
@@ -38,7 +40,13 @@ TEST_F(ZelkorFeedbackTest, CarriesQueryIdentifiersOnlyWhereTheyBelong) {
        R"({"uuid":null,"type":"local_search_end","timestamp":7})"},
       {std::make_shared<ZelkorConnectionInvalidated>(), 3, 4,
        R"({"type":"connection_invalidated","timestamp":7})"},
-      {custom, 1, 0, R"({"a":1,"query_id":1,"type":"custom_unknown","timestamp":7})"},
+      {custom, 1, 0,
+       R"({"a":1,"client_query_id":3,"query_id":1,"type":"custom_unknown","timestamp":7})"},
+      {custom, 1, 9,
+       R"({"a":1,"query_id":1,"client_query_id":9,"type":"custom_unknown","timestamp":7})"},
+      {anonymous, 1, 9,
+       R"({"query_id":"mine","a":1,"client_query_id":3,"type":"custom_lanthe_result_features",)"
+       R"("timestamp":7})"},
   };
   for (const auto& row : cases) {
     ZelkorFeedback record;
