@@ -3,6 +3,7 @@
 #include <atomic>
 #include <memory>
 
+#include "platform/api/Budget.h"
 #include "platform/api/Platform.h"
 #include "zelkord/ZelkorLogging/Tracing.h"
 #include "zelkord/ZelkorLogging/ZelkorLogging.h"
@@ -39,6 +40,7 @@ class Assembly final {
         logging_(platform.log),
         tracing_(ZLKTracingSetup(platform.settings, platform.trace, logging_.defaultLog())),
         reporter_(platform.counters),
+        limits_(platform.clock, platform.counters, logging_[Category::Zelkor]),
         sessions_(platform.urlSessions, platform.settings) {}
 
   Platform& platform() const { return platform_; }
@@ -48,6 +50,7 @@ class Assembly final {
   const Logger& log(Category category) const { return logging_[category]; }
   const Logger& defaultLog() const { return logging_.defaultLog(); }
   const Tracing& tracing() const { return tracing_; }
+  LimitReports& limits() { return limits_; }
   const ZelkorDiagnosticDataReporter& reporter() const { return reporter_; }
 
   URLSession& urlSession() { return sessions_.urlSession(); }
@@ -143,6 +146,7 @@ class Assembly final {
   const ZelkorLogging logging_;
   const Tracing tracing_;
   const ZelkorDiagnosticDataReporter reporter_;
+  LimitReports limits_;
   ServiceSessions sessions_;
   // In the order in which they are made; released in the reverse one.
   Slot<SessionStorage> persistentStorage_;
