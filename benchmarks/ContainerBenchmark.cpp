@@ -16,66 +16,21 @@
 #include <thread>
 #include <vector>
 
-#include "benchmarks/QuietLog.h"
+#include "benchmarks/ContainerStore.h"
 #include "corezelkor/proto/Feedback.pb.h"
 #include "platform/linux/files/Descriptor.h"
-#include "platform/linux/files/LinuxContainerFiles.h"
-#include "platform/linux/files/LinuxFileManager.h"
-#include "platform/linux/queues/LinuxWorkQueues.h"
-#include "platform/testing/FakePlatform.h"
-#include "platform/testing/PlatformOnQueues.h"
 #include "platform/testing/TemporaryDirectory.h"
-#include "zelkord/assembly/Assembly.h"
 #include "zelkord/assembly/UserAgent.h"
 #include "zelkord/storage/SessionUnarchiver.h"
 #include "zelkord/storage/StorageTestSupport.h"
-#include "zelkord/storage/ZelkorPersistentStorage.h"
 
 namespace zelkord {
 namespace {
-
-using Steady = std::chrono::steady_clock;
-
-double microsecondsSince(Steady::time_point start) {
-  return std::chrono::duration<double, std::micro>(Steady::now() - start).count();
-}
 
 double median(std::vector<double>& values) {
   const auto middle = values.begin() + static_cast<std::ptrdiff_t>(values.size() / 2);
   std::nth_element(values.begin(), middle, values.end());
   return *middle;
-}
-
-struct ContainerStore {
-  explicit ContainerStore(std::int64_t limit = std::int64_t{1} << 40) {
-    fakes.settings.set("ZLKSessionSizeLimit", limit);
-    fakes.settings.set("ZLKSessionMaxAge", 1e9);
-  }
-  std::shared_ptr<SessionContainer> container() {
-    auto container = storage->createFileContainerForWriting();
-    container->writeSessionHeader(testHeader());
-    return container;
-  }
-
-  TemporaryDirectory root;
-  LinuxClock clock;
-  LinuxWorkQueues queues{clock};
-  FakePlatform fakes;
-  FakeURLSessions sessions{queues};
-  CountedTransactions transactions{clock};
-  QuietLog log;
-  LinuxFileManager files{{root.path(), root.path(), root.path()}};
-  LinuxContainerFiles containerFiles;
-  Platform platform = onQueues(fakes.platform(), clock, queues, sessions, transactions, &log,
-                               {&files, &containerFiles});
-  Assembly assembly{platform};
-  std::shared_ptr<ZelkorPersistentStorage> storage =
-      std::make_shared<ZelkorPersistentStorage>(assembly);
-};
-
-// An engagement's size.
-ZelkorFeedback commonFeedback(std::int64_t number) {
-  return numberedFeedback(number, 1, std::string(200, 'x'));
 }
 
 // The floor: each record, laid out in advance, with one `writev` of its length and its bytes.
