@@ -4,7 +4,7 @@
 #   ZK_BUILD   the build directory whose programs are used
 #
 #   bed_open           directories, bus and service; the environment then points everything there
-#   bed_daemon ARG...  starts the daemon and waits until it answers
+#   bed_daemon ARG...  starts the daemon, with at most BED_DESCRIPTORS descriptors if set, and waits until it answers
 #   bed_daemon_stop    SIGTERM; its status is the function's
 #   bed_close          ends everything; runs by itself at the script's end
 
@@ -75,7 +75,10 @@ bed_service() {
 bed_ask() { curl --silent --show-error --fail --cacert "$SSL_CERT_FILE" "$BED_URL/control/$1" "${@:2}"; }
 
 bed_daemon() {
-  "$zelkord" --log-file "$BED_LOG" --log-level debug "$@" &
+  (
+    [ -z "${BED_DESCRIPTORS:-}" ] || ulimit -n "$BED_DESCRIPTORS"
+    exec "$zelkord" --log-file "$BED_LOG" --log-level debug "$@"
+  ) &
   BED_DAEMON=$!
   BED_PIDS+=("$BED_DAEMON")
   bed_wait "the daemon" "$zelkorctl" --socket "$BED/run/com.quenta.zelkord/socket" status

@@ -1,8 +1,10 @@
 #pragma once
 
+#include <algorithm>
 #include <cstdint>
 #include <map>
 #include <string>
+#include <vector>
 
 namespace zelkord::soak {
 
@@ -16,11 +18,19 @@ struct Tally {
   std::int64_t disconnected = 0;               // their connection was closed meanwhile
   std::map<std::string, std::int64_t> errors;  // "domain code", by count
   std::map<std::string, std::int64_t> faults;  // what should not have happened, by count
+  std::vector<double> milliseconds;            // from each search to its data
 
   std::int64_t ended() const {
     std::int64_t sum = answered + stale + withoutAnswer + disconnected;
     for (const auto& entry : errors) sum += entry.second;
     return sum;
+  }
+  // What that share of the searches took at most, in milliseconds; 0 without any. Sorts them.
+  double latency(double share) {
+    if (milliseconds.empty()) return 0;
+    std::ranges::sort(milliseconds);
+    return milliseconds[static_cast<std::size_t>(share *
+                                                 static_cast<double>(milliseconds.size() - 1))];
   }
 };
 

@@ -27,6 +27,10 @@ bool isKnownError(const zelkor::Error& error) {
          std::ranges::find(kTransport, error.code) != kTransport.end();
 }
 
+double millisecondsSince(SteadyClock::time_point begin) {
+  return std::chrono::duration<double, std::milli>(SteadyClock::now() - begin).count();
+}
+
 std::shared_ptr<zelkor::ZLKRequest> anyOther(unsigned choice) {
   switch (choice % 4) {
     case 0:
@@ -46,7 +50,8 @@ struct TypingClient::Question {
   TypingClient& client;
   std::int64_t queryId;  // 0: the configuration
   bool isSearch;
-  zelkor::SlotPointer slot;
+  SteadyClock::time_point asked = SteadyClock::now();
+  zelkor::SlotPointer slot = nullptr;
 };
 
 TypingClient::TypingClient(Habits habits, const Words& words, Tally& tally, unsigned seed)
@@ -125,7 +130,7 @@ void TypingClient::_ask(std::shared_ptr<zelkor::ZLKRequest> request) {
 }
 
 void TypingClient::_send(zelkor::MessagePointer call, bool isSearch) {
-  auto question = std::make_unique<Question>(Question{*this, queryId_, isSearch, nullptr});
+  auto question = std::make_unique<Question>(Question{*this, queryId_, isSearch});
   sd_bus_slot* slot = nullptr;
   const int result = sd_bus_call_async(
       bus_.get(), &slot, call.get(),
@@ -161,6 +166,7 @@ void TypingClient::_judge(const Question& question, sd_bus_message* reply) {
     ++tally_.errors[answer.error->domain + " " + std::to_string(answer.error->code)];
   } else if (answer.reply) {
     ++tally_.answered;
+    if (question.isSearch) tally_.milliseconds.push_back(millisecondsSince(question.asked));
   } else if (!question.isSearch) {
     ++tally_.withoutAnswer;
   } else {

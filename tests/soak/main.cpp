@@ -1,15 +1,18 @@
 // usage: zelkord_soak --address ADDRESS --words FILE [--clients N] [--keystrokes N] [--pause MS]
-//                     [--seed N] [--daemon PID] [--growth-limit MIB]
+//                     [--seed N] [--daemon PID] [--growth-limit MIB] [--seconds N] [--latency-limit
+//                     MS]
 //
 // Simulated clients at a daemon's private door, in two halves with the same load. Status 0 when
-// every question was answered exactly once, or not for a reason that can be seen from outside, and
-// the daemon is not larger after the second half than after the first one.
+// every question was answered exactly once, or not for a reason that can be seen from outside, the
+// daemon is not larger after the second half than after the first one, and 99 of 100 searches had
+// their data within the limit. With --seconds the halves end after that time instead.
 
 #include <fmt/core.h>
 
 #include <algorithm>
 #include <fstream>
 #include <functional>
+#include <limits>
 #include <stdexcept>
 #include <thread>
 
@@ -29,7 +32,9 @@ struct Options {
   int pause = 20;
   unsigned seed = std::random_device()();
   int daemon = 0;
-  double growthLimit = 6;  // MiB
+  double growthLimit = 6;   // MiB
+  double latencyLimit = 0;  // ms of the 99th percentile; 0: none
+  int seconds = 0;          // 0: keystrokes end it
 };
 
 Options parse(int count, char** arguments) {
@@ -42,6 +47,8 @@ Options parse(int count, char** arguments) {
       {"--pause", [&](const auto& text) { options.pause = std::stoi(text); }},
       {"--seed", [&](const auto& text) { options.seed = std::stoul(text); }},
       {"--daemon", [&](const auto& text) { options.daemon = std::stoi(text); }},
+      {"--seconds", [&](const auto& text) { options.seconds = std::stoi(text); }},
+      {"--latency-limit", [&](const auto& text) { options.latencyLimit = std::stod(text); }},
       {"--growth-limit", [&](const auto& text) { options.growthLimit = std::stod(text); }}};
   for (int i = 1; i + 1 < count; i += 2) known.at(arguments[i])(arguments[i + 1]);
   if (count % 2 == 0 || options.address.empty() || options.words.empty()) {
@@ -70,8 +77,14 @@ void serve(const Clients& clients, SteadyClock::time_point end) {
   for (const auto& client : clients) client->process();
 }
 
-void typeUntil(const Clients& clients, const Tally& tally, std::int64_t keystrokes) {
-  while (tally.keystrokes < keystrokes && tally.faults.size() < 20) {
+struct End {
+  std::int64_t keystrokes;
+  SteadyClock::time_point time;
+};
+
+void typeUntil(const Clients& clients, const Tally& tally, const End& end) {
+  while (tally.keystrokes < end.keystrokes && SteadyClock::now() < end.time &&
+         tally.faults.size() < 20) {
     auto next = SteadyClock::time_point::max();
     for (const auto& client : clients) {
       if (client->nextAct() <= SteadyClock::now()) client->act();
@@ -95,7 +108,7 @@ void collectAnswers(const Clients& clients, Tally& tally) {
 }
 
 // One half of the run; gives the daemon's size when all clients are gone.
-double runHalf(const Options& options, const Words& words, Tally& tally, std::int64_t until) {
+double runHalf(const Options& options, const Words& words, Tally& tally, const End& end) {
   {
     Clients clients;
     for (std::size_t i = 0; i < options.clients; ++i) {
@@ -104,11 +117,19 @@ double runHalf(const Options& options, const Words& words, Tally& tally, std::in
       const auto seed = options.seed + static_cast<unsigned>(i + tally.keystrokes);
       clients.push_back(std::make_unique<TypingClient>(std::move(habits), words, tally, seed));
     }
-    typeUntil(clients, tally, until);
+    typeUntil(clients, tally, end);
     collectAnswers(clients, tally);
   }
   std::this_thread::sleep_for(kSettling);
   return residentSize(options.daemon);
+}
+
+End endOfHalf(const Options& options, int half) {
+  if (options.seconds == 0) {
+    return {options.keystrokes * half / 2, SteadyClock::time_point::max()};
+  }
+  return {std::numeric_limits<std::int64_t>::max(),
+          SteadyClock::now() + std::chrono::milliseconds(options.seconds * 500)};
 }
 
 int run(const Options& options) {
@@ -116,8 +137,8 @@ int run(const Options& options) {
   Tally tally;
   fmt::print("seed {}\n", options.seed);
   const auto begin = SteadyClock::now();
-  const double first = runHalf(options, words, tally, options.keystrokes / 2);
-  const double second = runHalf(options, words, tally, options.keystrokes);
+  const double first = runHalf(options, words, tally, endOfHalf(options, 1));
+  const double second = runHalf(options, words, tally, endOfHalf(options, 2));
   const auto seconds = std::chrono::duration<double>(SteadyClock::now() - begin).count();
   fmt::print("{} keystrokes and {} questions by {} clients in {:.0f} s\n", tally.keystrokes,
              tally.asked, options.clients, seconds);
@@ -125,6 +146,11 @@ int run(const Options& options) {
              tally.stale, tally.withoutAnswer, tally.disconnected);
   for (const auto& [error, times] : tally.errors) fmt::print("error {}: {}\n", error, times);
   fmt::print("daemon {:.1f} MiB after the first half, {:.1f} after the second\n", first, second);
+  const auto p99 = tally.latency(0.99);
+  fmt::print("searches with data: p50 {:.1f} ms, p99 {:.1f} ms, longest {:.1f} ms\n",
+             tally.latency(0.5), p99, tally.latency(1));
+  if (options.latencyLimit > 0 && (p99 == 0 || p99 >= options.latencyLimit))
+    ++tally.faults["searches are slow"];
   if (tally.ended() != tally.asked) ++tally.faults["questions and endings do not add up"];
   if (second > first + options.growthLimit) ++tally.faults["the daemon has grown"];
   for (const auto& [fault, times] : tally.faults) fmt::print("FAULT {}: {}\n", fault, times);
