@@ -18,6 +18,23 @@ std::uint64_t bigEndian(std::string_view bytes) {
   return value;
 }
 
+// The decoder ends a text at its first zero character, and the process when the text had another
+// length.
+bool isAsciiText(std::optional<std::string_view> text) {
+  return text && std::ranges::all_of(*text, [](char c) { return static_cast<signed char>(c) > 0; });
+}
+
+bool isUtf16Text(std::optional<std::string_view> text) {
+  bool inPair = false;
+  for (std::size_t at = 0; text && at < text->size(); at += 2) {
+    const auto unit = bigEndian(text->substr(at, 2));
+    const bool ends = unit >= 0xDC00 && unit <= 0xDFFF;
+    if (unit == 0 || ends != inPair) return false;
+    inPair = unit >= 0xD800 && unit <= 0xDBFF;
+  }
+  return text && !inPair;
+}
+
 // Walks the objects without recursion, each once, children first.
 class PlistWalk {
  public:
@@ -37,6 +54,7 @@ class PlistWalk {
     State state = State::New;
     std::size_t depth = 0;   // of the tree below it, itself included
     std::size_t values = 0;  // in that tree
+    std::size_t bytes = 0;   // of the texts and data in it
   };
   struct Place {
     std::size_t object;
@@ -70,7 +88,7 @@ class PlistWalk {
     auto& object = objects_[place.object];
     if (object.state == State::New) {
       object.state = State::Open;
-      if (!readChildren(place)) return fail("an object lies outside the file");
+      if (!readObject(place)) return fail("an object is broken or lies outside the file");
       if (stack_.size() > limits_.depth) return fail("too deep");
     }
     if (place.next < place.children.size()) return descend(place);
@@ -93,7 +111,9 @@ class PlistWalk {
     for (const auto child : place.children) {
       object.depth = std::max(object.depth, objects_[child].depth + 1);
       object.values += objects_[child].values;
+      object.bytes += objects_[child].bytes;
       if (object.values > limits_.values) return fail("too many values");
+      if (object.bytes > limits_.bytes) return fail("too many bytes");
     }
     if (object.depth > limits_.depth) fail("too deep");
   }
@@ -110,12 +130,13 @@ class PlistWalk {
     return bigEndian(bytes_.substr(at - width, width));
   }
 
-  bool readChildren(Place& place) const {
+  bool readObject(Place& place) {
     const auto offset = bigEndian(bytes_.substr(table_ + place.object * offsetSize_, offsetSize_));
     if (offset < kPlistMagic.size() || offset >= table_) return false;
     std::size_t at = offset + 1;
     const auto marker = static_cast<unsigned char>(bytes_[offset]);
     const unsigned low = marker & 0xF;
+    auto& bytes = objects_[place.object].bytes;
     switch (marker >> 4) {
       case 0x0:
         return true;
@@ -125,10 +146,11 @@ class PlistWalk {
       case 0x3:
         return 8 <= table_ - at;
       case 0x4:
+        return readBytes(at, low, 1, bytes).has_value();
       case 0x5:
-        return fits(at, low, 1);
+        return isAsciiText(readBytes(at, low, 1, bytes));
       case 0x6:
-        return fits(at, low, 2);
+        return isUtf16Text(readBytes(at, low, 2, bytes));
       case 0x8:
         return low + 1 <= table_ - at;
       case 0xA:
@@ -141,9 +163,13 @@ class PlistWalk {
     }
   }
 
-  bool fits(std::size_t at, unsigned low, std::size_t unit) const {
+  // What is in a text or data object, whose size is noted.
+  std::optional<std::string_view> readBytes(std::size_t at, unsigned low, std::size_t unit,
+                                            std::size_t& bytes) const {
     const auto size = readSize(at, low);
-    return size && *size <= (table_ - at) / unit;
+    if (!size || *size > (table_ - at) / unit) return std::nullopt;
+    bytes = *size * unit;
+    return bytes_.substr(at, bytes);
   }
 
   bool readReferences(std::size_t at, unsigned low, std::size_t each,
