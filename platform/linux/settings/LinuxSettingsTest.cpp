@@ -141,6 +141,20 @@ TEST_F(LinuxSettingsTest, TakesAnotherTableForDamage) {
   EXPECT_TRUE(root_.has("defaults.db.damaged-1"));
 }
 
+TEST_F(LinuxSettingsTest, TakesAViewForDamageAndRunsNoTrigger) {
+  auto database = sqlite::Database::open(root_ / "defaults.db", nullptr);
+  ASSERT_FALSE(database->execute(
+      "CREATE VIEW defaults(domain, key, value) AS WITH RECURSIVE n(i) AS "
+      "(SELECT 1 UNION ALL SELECT i + 1 FROM n) SELECT 'd', 'k' || i, '1' FROM n"));
+  make()->set("a", 1);
+  EXPECT_TRUE(root_.has("defaults.db.damaged-1"));
+  database = sqlite::Database::open(root_ / "defaults.db", nullptr);
+  ASSERT_FALSE(database->execute(
+      "CREATE TRIGGER t AFTER INSERT ON defaults BEGIN DELETE FROM defaults; END"));
+  make()->set("b", 2);
+  EXPECT_EQ(make()->all(), (json::object{{"a", 1}, {"b", 2}}));
+}
+
 TEST_F(LinuxSettingsTest, KeepsInMemoryWhatALockKeepsOut) {
   const auto settings = make();
   auto database = sqlite::Database::open(root_ / "defaults.db", nullptr);

@@ -18,6 +18,14 @@ void makePrivateFile(const std::string& path) {
   if (file >= 0) ::close(file);
 }
 
+// A file's tables are all that is wanted of it: its views and triggers could run for ever. In a
+// file that belongs to others too their triggers keep their tables in order.
+void trustOnlyTables(sqlite3* database, bool isShared) {
+  sqlite3_db_config(database, SQLITE_DBCONFIG_ENABLE_VIEW, 0, nullptr);
+  sqlite3_db_config(database, SQLITE_DBCONFIG_TRUSTED_SCHEMA, 0, nullptr);
+  if (!isShared) sqlite3_db_config(database, SQLITE_DBCONFIG_ENABLE_TRIGGER, 0, nullptr);
+}
+
 const char* journalOf(const DatabaseOptions& options) {
   if (options.isShared) return "PRAGMA synchronous=FULL";
   return options.writeAheadLog ? "PRAGMA journal_mode=WAL; PRAGMA synchronous=NORMAL"
@@ -53,6 +61,7 @@ std::optional<Database> Database::open(const std::string& path, Failure* failure
     return std::nullopt;
   }
   sqlite3_extended_result_codes(raw, 1);
+  trustOnlyTables(raw, options.isShared);
   sqlite3_busy_timeout(
       raw, static_cast<int>(
                std::chrono::duration_cast<std::chrono::milliseconds>(options.busyTimeout).count()));
