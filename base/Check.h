@@ -1,11 +1,12 @@
 #pragma once
 
+#include "base/Export.h"
 #include "base/Namespace.h"
 
 namespace zelkor {
 
 // Prints "assertion failed: TEXT (UNIT)" to standard error and aborts.
-[[noreturn]] void failCheck(const char* text, const char* unit);
+[[noreturn]] ZK_EXPORT void failCheck(const char* text, const char* unit);
 
 }  // namespace zelkor
 

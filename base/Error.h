@@ -6,13 +6,14 @@
 #include <string>
 #include <string_view>
 
+#include "base/Export.h"
 #include "base/Namespace.h"
 
 namespace zelkor {
 
 // A failure as a value. `code` is meaningful within `domain`; `userInfo` has at most the key
 // "reason".
-struct Error {
+struct ZK_EXPORT Error {
   std::string domain;
   std::int64_t code = 0;
   std::map<std::string, std::string> userInfo;
@@ -44,8 +45,8 @@ enum class URLErrorCode : std::int64_t {
   TLSFailure = -1200,
 };
 
-Error zelkorError(std::int64_t code, std::string reason);
-Error posixError(int number);
-Error urlError(URLErrorCode code, std::string reason = {});
+ZK_EXPORT Error zelkorError(std::int64_t code, std::string reason);
+ZK_EXPORT Error posixError(int number);
+ZK_EXPORT Error urlError(URLErrorCode code, std::string reason = {});
 
 }  // namespace zelkor

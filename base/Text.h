@@ -4,30 +4,31 @@
 #include <string>
 #include <string_view>
 
+#include "base/Export.h"
 #include "base/Namespace.h"
 
 namespace zelkor {
 
 // The length of a UTF-8 text in UTF-16 code units, the unit of every length in this system.
-std::size_t utf16Length(std::string_view utf8);
+ZK_EXPORT std::size_t utf16Length(std::string_view utf8);
 
-bool isValidUtf8(std::string_view bytes);
+ZK_EXPORT bool isValidUtf8(std::string_view bytes);
 
 // U+0000 to U+001F and U+007F to U+009F. Requires valid UTF-8.
-bool hasControlCharacters(std::string_view utf8);
+ZK_EXPORT bool hasControlCharacters(std::string_view utf8);
 
 // Lower-cased with the root locale.
-std::string lowercased(std::string_view utf8);
-std::string uppercased(std::string_view utf8);
+ZK_EXPORT std::string lowercased(std::string_view utf8);
+ZK_EXPORT std::string uppercased(std::string_view utf8);
 
 // Whether `text` contains `part`, both lower-cased first.
-bool containsIgnoringCase(std::string_view text, std::string_view part);
+ZK_EXPORT bool containsIgnoringCase(std::string_view text, std::string_view part);
 
 // Compares as people read numbers: runs of digits compare by value, everything else by code unit.
 // Negative, zero or positive like strcmp.
-int compareNumerically(std::string_view a, std::string_view b);
+ZK_EXPORT int compareNumerically(std::string_view a, std::string_view b);
 
 // Orders by UTF-16 code unit (which differs from UTF-8 byte order above U+FFFF).
-bool lessByCodeUnit(std::string_view a, std::string_view b);
+ZK_EXPORT bool lessByCodeUnit(std::string_view a, std::string_view b);
 
 }  // namespace zelkor

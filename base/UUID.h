@@ -6,12 +6,13 @@
 #include <string>
 #include <string_view>
 
+#include "base/Export.h"
 #include "base/Namespace.h"
 
 namespace zelkor {
 
 // A 128-bit identifier.
-struct UUID {
+struct ZK_EXPORT UUID {
   std::array<std::uint8_t, 16> bytes{};
 
   // Version 4, variant 1 (RFC 4122) from 16 random bytes.

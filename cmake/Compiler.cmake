@@ -10,7 +10,7 @@ set(ZK_SANITIZE "" CACHE STRING "Sanitizers, as -fsanitize= takes them")
 option(ZK_FUZZ "Make libFuzzer executables of the fuzz targets" OFF)
 
 add_compile_options(
-  -Wall -Wextra -Wpedantic -Wshadow -Wnon-virtual-dtor -Werror
+  -Wall -Wextra -Wpedantic -Wshadow -Wnon-virtual-dtor $<$<BOOL:${ZK_WERROR}>:-Werror>
   # A designated initializer that leaves out fields is how requests and test cases are written here.
   -Wno-missing-field-initializers)
 if(CMAKE_CXX_COMPILER_ID STREQUAL "Clang")

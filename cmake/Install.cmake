@@ -1,4 +1,6 @@
-# What `cmake --install` puts where. A file ending in .in has its @VARIABLES@ filled first.
+# What `cmake --install` puts where.
+
+include(CMakePackageConfigHelpers)
 
 foreach(program IN ITEMS zelkord zelkorctl zelkor-sandbox)
   if(TARGET ${program})
@@ -6,16 +8,31 @@ foreach(program IN ITEMS zelkord zelkorctl zelkor-sandbox)
   endif()
 endforeach()
 
+# A file that names places: its @ZK_…@ are filled at the installation, with the prefix that it is given.
+function(zk_install_template template destination)
+  cmake_path(GET template STEM LAST_ONLY name)
+  install(CODE "
+    cmake_path(ABSOLUTE_PATH CMAKE_INSTALL_PREFIX NORMALIZE OUTPUT_VARIABLE ZK_PREFIX)
+    foreach(place IN ITEMS BINDIR LIBDIR INCLUDEDIR)
+      set(BINDIR \"${CMAKE_INSTALL_BINDIR}\")
+      set(LIBDIR \"${CMAKE_INSTALL_LIBDIR}\")
+      set(INCLUDEDIR \"${CMAKE_INSTALL_INCLUDEDIR}\")
+      cmake_path(APPEND ZK_PREFIX \"\${\${place}}\" OUTPUT_VARIABLE ZK_\${place})
+    endforeach()
+    set(ZK_VERSION \"${PROJECT_VERSION}\")
+    configure_file(\"${template}\" \"${PROJECT_BINARY_DIR}/packaging/${name}\" @ONLY)
+    file(INSTALL \"${PROJECT_BINARY_DIR}/packaging/${name}\" DESTINATION \"\${ZK_PREFIX}/${destination}\")")
+endfunction()
+
 # zk_install_files(<pattern below the repository> <destination>)
 function(zk_install_files pattern destination)
   file(GLOB files CONFIGURE_DEPENDS "${PROJECT_SOURCE_DIR}/${pattern}")
   foreach(file IN LISTS files)
     if(file MATCHES "\\.in$")
-      cmake_path(GET file STEM LAST_ONLY name)
-      configure_file("${file}" "${PROJECT_BINARY_DIR}/packaging/${name}" @ONLY)
-      set(file "${PROJECT_BINARY_DIR}/packaging/${name}")
+      zk_install_template("${file}" "${destination}")
+    else()
+      install(FILES "${file}" DESTINATION "${destination}")
     endif()
-    install(FILES "${file}" DESTINATION "${destination}")
   endforeach()
 endfunction()
 
@@ -32,12 +49,23 @@ zk_install_files("packaging/completions/bash/*" share/bash-completion/completion
 zk_install_files("packaging/completions/zsh/*" share/zsh/site-functions)
 zk_install_files("packaging/completions/fish/*" share/fish/vendor_completions.d)
 
-# The client library for other programs: find_package(corezelkor), then link corezelkor::zk_corezelkor.
-install(TARGETS zk_corezelkor zk_halvane zk_base zk_proto EXPORT corezelkor ARCHIVE DESTINATION "${CMAKE_INSTALL_LIBDIR}")
-install(EXPORT corezelkor NAMESPACE corezelkor:: DESTINATION "${CMAKE_INSTALL_LIBDIR}/cmake/corezelkor")
-install(FILES "${PROJECT_SOURCE_DIR}/cmake/corezelkorConfig.cmake"
-  DESTINATION "${CMAKE_INSTALL_LIBDIR}/cmake/corezelkor")
-install(DIRECTORY base halvane corezelkor "${PROJECT_BINARY_DIR}/generated/corezelkor"
-  DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}/corezelkor"
-  FILES_MATCHING PATTERN "*.h" PATTERN "*TestSupport.h" EXCLUDE PATTERN examples EXCLUDE
-  PATTERN internal EXCLUDE)
+# The client library for other programs: find_package(corezelkor 1.0), then link corezelkor::corezelkor; or pkg-config.
+# With COMPONENTS static also corezelkor::zk_corezelkor, the archives, which need all that they link.
+set(package "${CMAKE_INSTALL_LIBDIR}/cmake/corezelkor")
+if(TARGET corezelkor)
+  install(TARGETS corezelkor EXPORT corezelkor LIBRARY DESTINATION "${CMAKE_INSTALL_LIBDIR}")
+  install(EXPORT corezelkor NAMESPACE corezelkor:: DESTINATION "${package}")
+  install(TARGETS zk_corezelkor zk_halvane zk_base zk_proto EXPORT corezelkorStatic
+    ARCHIVE DESTINATION "${CMAKE_INSTALL_LIBDIR}")
+  install(EXPORT corezelkorStatic NAMESPACE corezelkor:: DESTINATION "${package}")
+  write_basic_package_version_file("${PROJECT_BINARY_DIR}/corezelkorConfigVersion.cmake"
+    VERSION ${PROJECT_VERSION} COMPATIBILITY SameMajorVersion)
+  install(FILES "${PROJECT_SOURCE_DIR}/cmake/corezelkorConfig.cmake" "${PROJECT_BINARY_DIR}/corezelkorConfigVersion.cmake"
+    DESTINATION "${package}")
+  zk_install_template("${PROJECT_SOURCE_DIR}/packaging/corezelkor.pc.in" "${CMAKE_INSTALL_LIBDIR}/pkgconfig")
+  install(DIRECTORY base halvane corezelkor "${PROJECT_BINARY_DIR}/generated/corezelkor"
+    DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}/corezelkor"
+    FILES_MATCHING PATTERN "*.h" PATTERN "*TestSupport.h" EXCLUDE PATTERN examples EXCLUDE
+    PATTERN internal EXCLUDE)
+endif()
+install(FILES "${PROJECT_SOURCE_DIR}/LICENSE" DESTINATION "${CMAKE_INSTALL_DOCDIR}")

@@ -23,12 +23,13 @@ function(zk_note_links path name deps test_deps)
   set_property(GLOBAL APPEND_STRING PROPERTY ZK_LAYERS "${path}\t${name}\t${deps}\t${test_deps}\n")
 endfunction()
 
-# zk_library(<name> [RECURSE] [DEPS <target>...] [DEFINES <definition>...] [TEST_DEPS <target>...])
+# zk_library(<name> [RECURSE] [PUBLISHED] [DEPS <target>...] [DEFINES <definition>...] [TEST_DEPS <target>...])
 #
 # The current folder (with RECURSE: and those below) as a library, and its tests as <name>_tests.
-# DEPS are handed on to whoever links the library; DEFINES are seen in this folder only, also by its tests.
+# A PUBLISHED one can be linked into other programs and their plug-ins: its code is position-independent, and only what
+# ZK_EXPORT marks is seen outside. DEPS are handed on to whoever links the library; DEFINES are seen in this folder only, also by its tests.
 function(zk_library name)
-  cmake_parse_arguments(PARSE_ARGV 1 arg "RECURSE" "" "DEPS;DEFINES;TEST_DEPS")
+  cmake_parse_arguments(PARSE_ARGV 1 arg "RECURSE;PUBLISHED" "" "DEPS;DEFINES;TEST_DEPS")
   set(glob GLOB)
   if(arg_RECURSE)
     set(glob GLOB_RECURSE)
@@ -42,6 +43,9 @@ function(zk_library name)
     add_library(${name} STATIC ${sources})
     set(scope PUBLIC)
     target_compile_definitions(${name} PRIVATE ${arg_DEFINES})
+    if(arg_PUBLISHED)
+      zk_publish(${name})
+    endif()
   else()
     add_library(${name} INTERFACE)
     set(scope INTERFACE)
@@ -52,6 +56,11 @@ function(zk_library name)
 
   zk_note_links("" ${name} "${arg_DEPS}" "${arg_TEST_DEPS}")
   zk_tests(${name}_tests SOURCES ${tests} DEPS ${name} ${arg_TEST_DEPS} DEFINES ${arg_DEFINES})
+endfunction()
+
+function(zk_publish name)
+  set_target_properties(${name} PROPERTIES
+    POSITION_INDEPENDENT_CODE ON CXX_VISIBILITY_PRESET hidden VISIBILITY_INLINES_HIDDEN ON)
 endfunction()
 
 # zk_executable(<name> DEPS <target>...): the program whose main file is the current folder's main.cpp.
@@ -70,7 +79,7 @@ endfunction()
 # One GoogleTest executable, one entry in ctest.
 function(zk_tests name)
   cmake_parse_arguments(PARSE_ARGV 1 arg "" "TIMEOUT" "SOURCES;DEPS;DEFINES")
-  if(NOT arg_SOURCES)
+  if(NOT arg_SOURCES OR NOT ZK_BUILD_TESTS)
     return()
   endif()
   if(NOT arg_TIMEOUT)
@@ -140,6 +149,7 @@ function(zk_proto_library name)
   # Generated code is not ours to mend: no warnings in it, nor in what includes its headers.
   target_compile_options(${name} PRIVATE -w)
   set_target_properties(${name} PROPERTIES UNITY_BUILD OFF)
+  zk_publish(${name})
   target_include_directories(${name} SYSTEM PUBLIC "$<BUILD_INTERFACE:${out}>")
   target_link_libraries(${name} PUBLIC protobuf::libprotobuf)
 endfunction()

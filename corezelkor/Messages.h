@@ -9,12 +9,13 @@
 #include <vector>
 
 #include "base/Data.h"
+#include "base/Export.h"
 #include "base/Namespace.h"
 
 namespace zelkor {
 
 // What a client says of itself.
-struct ZLKSessionConfiguration {
+struct ZK_EXPORT ZLKSessionConfiguration {
   std::string identifier;  // such as "lanthe"
   std::string userAgent;
 
@@ -25,7 +26,7 @@ struct ZLKSessionConfiguration {
 using QueryItem = std::pair<std::string, std::string>;
 
 // One query. The classes below say which; immutable once it is shared.
-struct ZLKRequest {
+struct ZK_EXPORT ZLKRequest {
   ZLKRequest() = default;
   ZLKRequest(const ZLKRequest&) = default;
   virtual ~ZLKRequest() = default;
@@ -42,37 +43,37 @@ struct ZLKRequest {
   bool verboseReply = false;
 };
 
-struct ZLKSearchRequest final : ZLKRequest {};
-struct ZLKMoreResultsRequest final : ZLKRequest {
+struct ZK_EXPORT ZLKSearchRequest final : ZLKRequest {};
+struct ZK_EXPORT ZLKMoreResultsRequest final : ZLKRequest {
   std::string moreResultsURL;  // empty: the bag's
 };
-struct ZLKCardRequest final : ZLKRequest {
+struct ZK_EXPORT ZLKCardRequest final : ZLKRequest {
   std::string cardURL;  // empty: the bag's
 };
-struct ZLKZeroKeywordRequest final : ZLKRequest {};
-struct ZLKLookupRequest final : ZLKRequest {
+struct ZK_EXPORT ZLKZeroKeywordRequest final : ZLKRequest {};
+struct ZK_EXPORT ZLKLookupRequest final : ZLKRequest {
   std::string appBundleId;
   std::string domain;
   std::uint32_t lookupSelectionType = 0;  // 1 explicit, 2 hint
   std::string queryContext;
 };
-struct ZLKFlightLookupRequest final : ZLKRequest {};
-struct ZLKFlightSearchRequest final : ZLKRequest {};
+struct ZK_EXPORT ZLKFlightLookupRequest final : ZLKRequest {};
+struct ZK_EXPORT ZLKFlightSearchRequest final : ZLKRequest {};
 
 using HeaderFields = std::vector<std::pair<std::string, std::string>>;
 
 // The request as it was built, and the final response, for clients that asked for a verbose reply.
-struct ZLKHTTPRequest {
+struct ZK_EXPORT ZLKHTTPRequest {
   std::string url;
   HeaderFields headers;
 };
-struct ZLKHTTPResponse {
+struct ZK_EXPORT ZLKHTTPResponse {
   std::string url;
   std::int32_t status = 0;
   HeaderFields headers;  // repeated ones joined by ", "
 };
 
-struct ZLKReply {
+struct ZK_EXPORT ZLKReply {
   double scale = 0;
   Data data;  // the service's JSON, byte for byte
   std::optional<std::string> geoSessionEntityString;

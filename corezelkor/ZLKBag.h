@@ -8,6 +8,7 @@
 #include <string_view>
 #include <vector>
 
+#include "base/Export.h"
 #include "base/Json.h"
 #include "base/Time.h"
 
@@ -20,7 +21,7 @@ namespace zelkor {
 // A value of the wrong type counts as absent; where an override's value counts as absent, the one
 // below it holds. Building never fails. Threading: immutable, any thread. Copies share the
 // dictionary.
-class ZLKBag {
+class ZK_EXPORT ZLKBag {
  public:
   ZLKBag(std::shared_ptr<const json::object> dictionary, std::optional<std::string> userAgent);
 

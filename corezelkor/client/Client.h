@@ -8,6 +8,7 @@
 #include <utility>
 #include <vector>
 
+#include "base/Export.h"
 #include "corezelkor/Messages.h"
 #include "corezelkor/ZLKFuture.h"
 #include "corezelkor/client/ClientOptions.h"
@@ -27,7 +28,7 @@ class ClientCore;
 // what runs there must neither block nor wait for another future nor destroy the client.
 // Ownership: destroying the client ends its calls as ClientErrorCode::Cancelled.
 // Errors: in the results; see ClientErrorCode for the library's own.
-class Client {
+class ZK_EXPORT Client {
  public:
   explicit Client(ClientOptions options);
   ~Client();

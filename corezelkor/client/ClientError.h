@@ -5,6 +5,7 @@
 #include <string_view>
 
 #include "base/Error.h"
+#include "base/Export.h"
 
 namespace zelkor {
 
@@ -20,7 +21,7 @@ enum class ClientErrorCode : std::int64_t {
   Cancelled = 6,     // the client object is gone
 };
 
-Error clientError(ClientErrorCode code, std::string reason);
-bool isClientError(const Error& error, ClientErrorCode code);
+ZK_EXPORT Error clientError(ClientErrorCode code, std::string reason);
+ZK_EXPORT bool isClientError(const Error& error, ClientErrorCode code);
 
 }  // namespace zelkor

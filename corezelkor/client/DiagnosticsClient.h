@@ -6,6 +6,7 @@
 #include <string_view>
 #include <vector>
 
+#include "base/Export.h"
 #include "corezelkor/client/Client.h"
 
 namespace zelkor {
@@ -13,7 +14,7 @@ namespace zelkor {
 // A look inside the daemon, for tools. Needs no configuration.
 //
 // Threading, errors: as Client. Ownership: the client outlives it.
-class DiagnosticsClient {
+class ZK_EXPORT DiagnosticsClient {
  public:
   explicit DiagnosticsClient(Client& client) : core_(*client.core_) {}
 

@@ -7,6 +7,7 @@
 #include <utility>
 #include <vector>
 
+#include "base/Export.h"
 #include "base/Time.h"
 #include "corezelkor/client/Client.h"
 
@@ -16,7 +17,7 @@ namespace zelkor {
 // Its address comes with the client's configuration. The daemon serves few of them at a time.
 //
 // Threading, errors: as Client. Ownership: the client outlives it; copies are the same connection.
-class EndpointClient {
+class ZK_EXPORT EndpointClient {
  public:
   explicit EndpointClient(Client& client) : core_(*client.core_) {}
 
