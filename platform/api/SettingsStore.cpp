@@ -1,9 +1,21 @@
 #include "platform/api/SettingsStore.h"
 
+#include "base/Check.h"
+#include "platform/api/KnownSettings.h"
+
 namespace zelkord {
+namespace {
+
+// A setting that is read stands in the table, and so in the documentation.
+std::optional<json::value> ownSetting(const SettingsStore& settings, std::string_view key) {
+  ZK_CHECK(knownSetting(key), "the setting stands in the table");
+  return settings.value(key);
+}
+
+}  // namespace
 
 bool boolSetting(const SettingsStore& settings, std::string_view key, bool fallback) {
-  const auto value = settings.value(key);
+  const auto value = ownSetting(settings, key);
   if (!value) return fallback;
   if (value->is_bool()) return value->get_bool();
   const auto number = asNumber(*value);
@@ -11,13 +23,13 @@ bool boolSetting(const SettingsStore& settings, std::string_view key, bool fallb
 }
 
 std::string stringSetting(const SettingsStore& settings, std::string_view key) {
-  const auto value = settings.value(key);
+  const auto value = ownSetting(settings, key);
   return value && value->is_string() ? std::string(value->get_string()) : std::string();
 }
 
 std::uint64_t unsignedSetting(const SettingsStore& settings, std::string_view key,
                               std::uint64_t fallback) {
-  const auto value = settings.value(key);
+  const auto value = ownSetting(settings, key);
   if (!value) return fallback;
   if (const auto* number = value->if_uint64()) return *number;
   const auto number = asNumber(*value);

@@ -3,6 +3,7 @@
 #include <csignal>
 
 #include "corezelkor/Constants.h"
+#include "platform/api/KnownSettings.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/assembly/NotificationNames.h"
 #include "zelkord/core/ClientStateManager.h"
@@ -25,7 +26,7 @@ Daemon::Daemon(Platform& platform) : platform_(platform) {}
 Daemon::~Daemon() = default;
 
 std::optional<Error> Daemon::start() {
-  _registerDefaults();
+  platform_.settings.registerDefaults(registeredSettings());
   assembly_ = std::make_unique<Assembly>(platform_);
   _makeServices();
   if (auto error = _listen()) return error;
@@ -33,19 +34,6 @@ std::optional<Error> Daemon::start() {
   _warm();
   _handleSignals();
   return std::nullopt;
-}
-
-void Daemon::_registerDefaults() {
-  platform_.settings.registerDefaults({
-      {"ZLKSharedSession", true},
-      {"ZLKSessionSizeLimit", 2'097'152},
-      {"ZLKSessionMaxAge", 172'800},
-      {"ZLKUseMorvane", true},
-      {"ZLKLogPrivateData", false},
-      {"ZLKMaximumResponseSize", 8'388'608},
-      {"ZLKMaximumResourceSize", 268'435'456},
-      {"ZLKMaximumBagSize", 1'048'576},
-  });
 }
 
 // The order is required: a service finds earlier ones in the assembly.

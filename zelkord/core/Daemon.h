@@ -29,7 +29,6 @@ class Daemon final {
   Assembly& assembly() { return *assembly_; }
 
  private:
-  void _registerDefaults();
   void _makeServices();
   std::optional<Error> _listen();
   void _handleLaunchEvents();
