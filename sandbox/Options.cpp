@@ -48,6 +48,8 @@ Outcome<Options> parseOptions(std::span<const char* const> arguments) {
       options.help = true;
     } else if (name == "--quiet") {
       options.quiet = true;
+    } else if (name == "--background") {
+      options.background = true;
     } else if (!takesValue(name)) {
       return Failure{"unknown argument " + name};
     } else if (++at == arguments.size()) {
@@ -62,7 +64,7 @@ Outcome<Options> parseOptions(std::span<const char* const> arguments) {
 
 std::string usage() {
   return R"(usage: zelkor-sandbox --state DIR [--port N] [--port-file PATH] [--data-from DIR] [--threads N]
-                      [--quiet] [--help]
+                      [--background] [--quiet] [--help]
 
 A complete suggestion service for this machine, on https://localhost:PORT.
 
@@ -71,6 +73,7 @@ A complete suggestion service for this machine, on https://localhost:PORT.
   --port-file PATH  writes the service's URL to PATH once it is serving
   --data-from DIR   looks for wordnet/, iso-codes/json/, unicode/ and flags/ below DIR instead of /usr/share
   --threads N       serves on N threads instead of one a processor
+  --background      returns once it is serving, and serves on by itself
   --quiet           says nothing on standard output
 )";
 }

@@ -17,6 +17,7 @@ struct Options {
   std::filesystem::path dataRoot = "/usr/share";
   unsigned threads = 0;  // 0: as many as there are processors
   bool quiet = false;
+  bool background = false;
   bool help = false;
 };
 

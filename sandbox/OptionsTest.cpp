@@ -7,9 +7,9 @@
 namespace sandbox {
 
 TEST(OptionsTest, ReadsEveryOption) {
-  const std::vector<const char*> arguments = {"--state",     "/s",        "--port",  "8443",
-                                              "--port-file", "/p",        "--quiet", "--data-from",
-                                              "/d",          "--threads", "3"};
+  const std::vector<const char*> arguments = {
+      "--state", "/s",          "--port", "8443",      "--port-file", "/p",
+      "--quiet", "--data-from", "/d",     "--threads", "3",           "--background"};
   const auto options = parseOptions(arguments);
   ASSERT_TRUE(options);
   EXPECT_EQ(options->state, "/s");
@@ -18,6 +18,7 @@ TEST(OptionsTest, ReadsEveryOption) {
   EXPECT_EQ(options->dataRoot, "/d");
   EXPECT_EQ(options->threads, 3U);
   EXPECT_TRUE(options->quiet);
+  EXPECT_TRUE(options->background);
 }
 
 TEST(OptionsTest, RefusesWhatItDoesNotUnderstand) {

@@ -1,7 +1,9 @@
 #include <csignal>
 #include <cstdio>
+#include <functional>
 #include <thread>
 
+#include "sandbox/Background.h"
 #include "sandbox/Options.h"
 #include "sandbox/Sandbox.h"
 #include "sandbox/core/Files.h"
@@ -28,7 +30,8 @@ int fail(const std::string& reason, int status) {
   return status;
 }
 
-int serve(const sandbox::Options& options) {
+// `started` is called once the service can be asked.
+int serve(const sandbox::Options& options, const std::function<void()>& started) {
   const sigset_t signals = blockEndSignals();
   const unsigned threads =
       options.threads > 0 ? options.threads : std::max(2U, std::thread::hardware_concurrency());
@@ -44,6 +47,7 @@ int serve(const sandbox::Options& options) {
   }
   if (!options.quiet) std::printf("%s\n", url.c_str());
   std::fflush(stdout);
+  started();
   waitForEnd(signals);
   return 0;
 }
@@ -58,5 +62,8 @@ int main(int argc, char** argv) {
     std::printf("%s", sandbox::usage().c_str());
     return 0;
   }
-  return serve(*options);
+  if (!options->background) return serve(*options, [] {});
+  auto background = sandbox::Background::begin();
+  if (!background) return fail(background.reason(), 1);
+  return serve(*options, [&background] { background->ready(); });
 }
