@@ -3,6 +3,7 @@
 #include <unicode/bytestream.h>
 #include <unicode/casemap.h>
 #include <unicode/stringpiece.h>
+#include <unicode/utf.h>
 #include <unicode/utf8.h>
 
 #include <algorithm>
@@ -21,6 +22,24 @@ bool beginsWithEightOfAscii(std::string_view text) {
   if (text.size() < sizeof word) return false;
   std::memcpy(&word, text.data(), sizeof word);
   return (word & 0x8080808080808080) == 0;
+}
+
+// Where the first noncharacter at or after `at` begins; `end` is behind it. The size when there is
+// none.
+std::size_t findNoncharacter(std::string_view text, std::size_t at, std::size_t& end) {
+  const auto size = static_cast<int64_t>(text.size());
+  for (auto next = static_cast<int64_t>(at); next < size;) {
+    if (beginsWithEightOfAscii(text.substr(static_cast<std::size_t>(next)))) {
+      next += 8;
+      continue;
+    }
+    const auto begin = next;
+    UChar32 point = 0;
+    U8_NEXT(text.data(), next, size, point);
+    end = static_cast<std::size_t>(next);
+    if (point >= 0 && U_IS_UNICODE_NONCHAR(point)) return static_cast<std::size_t>(begin);
+  }
+  return text.size();
 }
 
 bool isDigit(char c) { return c >= '0' && c <= '9'; }
@@ -81,6 +100,24 @@ bool hasControlCharacters(std::string_view utf8) {
       return true;
   }
   return false;
+}
+
+bool hasNoncharacters(std::string_view text) {
+  std::size_t end = 0;
+  return findNoncharacter(text, 0, end) < text.size();
+}
+
+std::string replaceNoncharacters(std::string_view text) {
+  constexpr std::string_view kReplacement = "\xEF\xBF\xBD";
+  std::string replaced;
+  std::size_t from = 0;
+  std::size_t end = 0;
+  for (auto at = findNoncharacter(text, 0, end); at < text.size();
+       at = findNoncharacter(text, from, end)) {
+    replaced.append(text.substr(from, at - from)).append(kReplacement);
+    from = end;
+  }
+  return replaced.append(text.substr(from));
 }
 
 std::string lowercased(std::string_view utf8) {

@@ -17,6 +17,12 @@ ZK_EXPORT bool isValidUtf8(std::string_view bytes);
 // U+0000 to U+001F and U+007F to U+009F. Requires valid UTF-8.
 ZK_EXPORT bool hasControlCharacters(std::string_view utf8);
 
+// U+FFFE and U+FFFF of every plane, U+FDD0 to U+FDEF: valid in UTF-8, but refused by what carries
+// messages. Bytes that are not UTF-8 are none.
+bool hasNoncharacters(std::string_view text);
+// Each of them as U+FFFD; everything else as it is.
+std::string replaceNoncharacters(std::string_view text);
+
 // Lower-cased with the root locale.
 ZK_EXPORT std::string lowercased(std::string_view utf8);
 ZK_EXPORT std::string uppercased(std::string_view utf8);
