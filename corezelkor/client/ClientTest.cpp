@@ -1,8 +1,12 @@
 #include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
 
 #include <algorithm>
 #include <atomic>
+#include <filesystem>
 
+#include "base/RuntimeDirectory.h"
 #include "corezelkor/ZLKPromise.h"
 #include "corezelkor/client/Client.h"
 #include "corezelkor/client/ClientError.h"
@@ -166,6 +170,39 @@ TEST_F(ClientTest, RefusesTextThatCannotTravel) {
   }
 }
 
+TEST_F(ClientTest, SendsNoncharactersAsReplacements) {
+  std::vector<std::string> sent;
+  daemon_.on("Request", [&](sd_bus_message* call) {
+    sd_bus_message_skip(call, "s");
+    sd_bus_message_enter_container(call, 'a', "{sv}");
+    while (sd_bus_message_enter_container(call, 'e', "sv") > 0) {
+      const char* type = nullptr;
+      const char* text = nullptr;
+      sd_bus_message_skip(call, "s");
+      sd_bus_message_peek_type(call, nullptr, &type);
+      if (std::string_view(type) == "s") {
+        sd_bus_message_read(call, "v", "s", &text);
+        sent.emplace_back(text);
+      } else if (std::string_view(type) == "a(ss)") {
+        const char* value = nullptr;
+        sd_bus_message_read(call, "v", "a(ss)", 1, &text, &value);
+        sent.insert(sent.end(), {text, value});
+      } else {
+        sd_bus_message_skip(call, "v");
+      }
+      sd_bus_message_exit_container(call);
+    }
+    sd_bus_reply_method_return(call, "xa{sv}a{sv}", std::int64_t{1}, 0, 0);
+  });
+  Client client(optionsFor(daemon_));
+  auto request = searchFor(1, "a\xEF\xBF\xBF");
+  request.queryItems = {{"\xEF\xB7\x90", "\xF0\x9F\xBF\xBE"}};
+  const auto future = client.request(std::move(request));
+  ASSERT_TRUE(future.getWithin(kPatience));
+  EXPECT_FALSE(future.get().error) << future.get().error->description();
+  EXPECT_EQ(sent, (std::vector<std::string>{"a\xEF\xBF\xBD", "\xEF\xBF\xBD", "\xEF\xBF\xBD"}));
+}
+
 TEST_F(ClientTest, ALostConnectionFailsTheCallsUnderWayAndTheNextCallMakesANewOne) {
   const ZLKPromise<bool> disconnected;
   const ZLKPromise<bool> asked;
@@ -247,6 +284,84 @@ TEST_F(ClientTest, SaysWhenThereIsNoDaemon) {
     ASSERT_TRUE(*error);
     EXPECT_TRUE(isClientError(**error, ClientErrorCode::NotReachable)) << (*error)->description();
   }
+}
+
+// A socket that somebody else's process listens on: the kernel notes who called listen.
+int makeForeignSocket(const std::string& path) {
+  constexpr uid_t kNobody = 65534;
+  const int listener = ::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0);
+  sockaddr_un address{};
+  address.sun_family = AF_UNIX;
+  path.copy(address.sun_path, sizeof address.sun_path - 1);
+  ::bind(listener, reinterpret_cast<const sockaddr*>(&address), sizeof address);
+  const auto child = ::fork();
+  if (child == 0) ::_exit(::setuid(kNobody) == 0 && ::listen(listener, 4) == 0 ? 0 : 1);
+  int status = 0;
+  ::waitpid(child, &status, 0);
+  EXPECT_EQ(status, 0);
+  return listener;
+}
+
+TEST_F(ClientTest, TellsNothingToSomebodyElsesProcess) {
+  if (::geteuid() != 0) GTEST_SKIP() << "only root can be two users";
+  auto options = optionsFor(daemon_);
+  options.socketPath += ".foreign";
+  const int listener = makeForeignSocket(options.socketPath);
+  Client client(options);
+  const auto future = client.request(searchFor(1, "secret"));
+  ASSERT_TRUE(future.getWithin(kPatience));
+  const auto& error = future.get().error;
+  ASSERT_TRUE(error && isClientError(*error, ClientErrorCode::NotReachable));
+  EXPECT_NE(error->reason()->find("user 65534"), std::string::npos) << *error->reason();
+  const int accepted = ::accept4(listener, nullptr, nullptr, SOCK_CLOEXEC | SOCK_NONBLOCK);
+  char bytes[4096];
+  const auto count = ::read(accepted, bytes, sizeof bytes);
+  const std::string told(bytes, count > 0 ? static_cast<std::size_t>(count) : 0);
+  EXPECT_EQ(told.find("secret"), std::string::npos);
+  EXPECT_EQ(told.find("lanthe"), std::string::npos);
+  ::close(accepted);
+  ::close(listener);
+  ::unlink(options.socketPath.c_str());
+}
+
+// Sets a variable, or takes it away, until it ends.
+class ChangedVariable {
+ public:
+  ChangedVariable(const char* name, const char* value) : name_(name) {
+    if (const char* before = ::getenv(name)) before_ = before;
+    value ? ::setenv(name, value, 1) : ::unsetenv(name);
+  }
+  ~ChangedVariable() { before_ ? ::setenv(name_, before_->c_str(), 1) : ::unsetenv(name_); }
+  ChangedVariable(const ChangedVariable&) = delete;
+  ChangedVariable& operator=(const ChangedVariable&) = delete;
+
+ private:
+  const char* const name_;
+  std::optional<std::string> before_;
+};
+
+TEST_F(ClientTest, FindsTheDaemonInATemporaryDirectory) {
+  const auto root = daemon_.path() + ".d";
+  const ChangedVariable runtime("XDG_RUNTIME_DIR", nullptr);
+  const ChangedVariable temporary("TMPDIR", root.c_str());
+  const auto usual = root + "/zelkord-" + std::to_string(::getuid());
+  std::filesystem::create_directories(usual + ".aB3/com.quenta.zelkord");
+  std::filesystem::create_directory(usual);  // left by a daemon that is gone
+  for (const auto& path : {usual, usual + ".aB3"}) ::chmod(path.c_str(), 0700);
+  std::filesystem::create_symlink(daemon_.path(), usual + ".aB3/com.quenta.zelkord/socket");
+  if (findRuntimeDirectories(RuntimeEnvironment::ofProcess()).front() != usual) {
+    std::filesystem::remove_all(root);
+    GTEST_SKIP() << "the host has a runtime directory";
+  }
+  daemon_.reply("Metrics", "a{sx}", 0);
+  auto options = optionsFor(daemon_);
+  options.socketPath.clear();
+  options.busAddress = "unix:path=/nowhere/bus";
+  Client client(options);
+  const auto future = DiagnosticsClient(client).metrics();
+  ASSERT_TRUE(future.getWithin(kPatience));
+  EXPECT_TRUE(future.get().value) << future.get().error->description();
+  std::filesystem::remove_all(root);
 }
 
 TEST_F(ClientTest, TheEndpointIsReachedThroughTheConfiguration) {

@@ -8,6 +8,7 @@
 #include <utility>
 
 #include "corezelkor/client/ClientError.h"
+#include "corezelkor/client/internal/SocketAddress.h"
 
 namespace zelkor {
 namespace {
@@ -40,6 +41,16 @@ std::unique_ptr<BusConnection> startedConnection(const Prepare& prepare, std::st
   return nullptr;
 }
 
+// Nothing but the sign-on has gone out yet. Null unless the daemon's user is ours.
+std::unique_ptr<BusConnection> withOwnPeer(std::unique_ptr<BusConnection> connection,
+                                           std::string& why) {
+  if (!connection) return nullptr;
+  auto problem = problemWithPeer(sd_bus_get_fd(connection->bus()));
+  if (problem.empty()) return connection;
+  why = std::move(problem);
+  return nullptr;
+}
+
 }  // namespace
 
 Error errorOfReply(const sd_bus_error& error) {
@@ -62,8 +73,9 @@ Error errorOfReply(const sd_bus_error& error) {
 }
 
 std::unique_ptr<BusConnection> BusConnection::toPeer(const std::string& address, std::string& why) {
-  return startedConnection([&](sd_bus* bus) { return sd_bus_set_address(bus, address.c_str()); },
-                           why);
+  return withOwnPeer(
+      startedConnection([&](sd_bus* bus) { return sd_bus_set_address(bus, address.c_str()); }, why),
+      why);
 }
 
 std::unique_ptr<BusConnection> BusConnection::toPeer(int ownedDescriptor, std::string& why) {
@@ -76,7 +88,7 @@ std::unique_ptr<BusConnection> BusConnection::toPeer(int ownedDescriptor, std::s
       },
       why);
   if (!taken) ::close(ownedDescriptor);
-  return connection;
+  return withOwnPeer(std::move(connection), why);
 }
 
 std::unique_ptr<BusConnection> BusConnection::toBus(const std::string& address, std::string& why) {

@@ -27,8 +27,8 @@ struct BusCall {
 // Threading: the client's thread only. Ownership: the calls end before it does.
 class BusConnection {
  public:
-  // Null, with the reason in `why`, when the attempt fails at once. `ownedDescriptor` is taken over
-  // either way.
+  // Null, with the reason in `why`, when the attempt fails at once, or somebody else's process
+  // serves that socket. `ownedDescriptor` is taken over either way.
   static std::unique_ptr<BusConnection> toPeer(const std::string& address, std::string& why);
   static std::unique_ptr<BusConnection> toPeer(int ownedDescriptor, std::string& why);
   // An empty address: the session bus of the user.

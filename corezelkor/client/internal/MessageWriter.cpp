@@ -20,7 +20,7 @@ void MessageWriter::text(std::string_view value) {
   if (status_ != 0) return;
   const bool fits = value.find('\0') == std::string_view::npos && isValidUtf8(value);
   if (!_keep(fits ? 0 : -EINVAL)) return;
-  _basic('s', std::string(value).c_str());
+  _basic('s', replaceNoncharacters(value).c_str());
 }
 
 void MessageWriter::flag(bool value) {

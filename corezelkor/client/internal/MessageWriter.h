@@ -20,6 +20,7 @@ class MessageWriter {
 
   int status() const { return status_; }
 
+  // Noncharacters, which messages do not carry, go out as U+FFFD.
   void text(std::string_view value);
   void int64(std::int64_t value) { _basic('x', &value); }
   void uint64(std::uint64_t value) { _basic('t', &value); }

@@ -65,8 +65,15 @@ void ServiceOpener::_connectTo(const std::string& address) {
 }
 
 void ServiceOpener::_fallBack(const std::string& why) {
-  tried_ = why + "; ";
-  _connectTo(addressOfSocket(defaultSocketPath()));
+  tried_ = why;
+  for (const auto& path : defaultSocketPaths()) {
+    const auto address = addressOfSocket(path);
+    std::string problem;
+    auto connection = BusConnection::toPeer(address, problem);
+    if (connection) return _finish(std::move(connection), "");
+    tried_ += "; " + address + " (" + problem + ")";
+  }
+  _finish(nullptr, "");
 }
 
 void ServiceOpener::_finish(std::unique_ptr<BusConnection> connection, const std::string& why) {

@@ -1,11 +1,12 @@
 #include "corezelkor/client/internal/SocketAddress.h"
 
-#include <sys/stat.h>
+#include <sys/socket.h>
 #include <unistd.h>
 
-#include <cstdlib>
+#include <cerrno>
 #include <cstring>
 
+#include "base/RuntimeDirectory.h"
 #include "corezelkor/Constants.h"
 
 namespace zelkor {
@@ -14,24 +15,6 @@ namespace {
 bool standsForItself(char c) {
   return (c >= '0' && c <= '9') || (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') ||
          (c != '\0' && std::strchr("-_/.*", c));
-}
-
-bool isOurDirectory(const std::string& path) {
-  struct stat status {};
-  return ::lstat(path.c_str(), &status) == 0 && S_ISDIR(status.st_mode) &&
-         status.st_uid == ::getuid();
-}
-
-std::string absoluteVariableOr(const char* name, const std::string& otherwise) {
-  const char* value = std::getenv(name);
-  return value && value[0] == '/' ? value : otherwise;
-}
-
-std::string userRuntimeDirectory() {
-  const auto user = std::to_string(::getuid());
-  const auto usual = "/run/user/" + user;
-  const auto temporary = absoluteVariableOr("TMPDIR", "/tmp") + "/zelkord-" + user;
-  return absoluteVariableOr("XDG_RUNTIME_DIR", isOurDirectory(usual) ? usual : temporary);
 }
 
 }  // namespace
@@ -52,8 +35,22 @@ std::string addressOfSocket(const std::string& path) {
   return address;
 }
 
-std::string defaultSocketPath() {
-  return userRuntimeDirectory() + "/" + std::string(kServiceName) + "/socket";
+std::vector<std::string> defaultSocketPaths() {
+  std::vector<std::string> paths;
+  for (const auto& directory : findRuntimeDirectories(RuntimeEnvironment::ofProcess())) {
+    paths.push_back(directory + "/" + std::string(kServiceName) + "/socket");
+  }
+  return paths;
+}
+
+std::string problemWithPeer(int descriptor) {
+  ucred peer{};
+  socklen_t size = sizeof peer;
+  if (::getsockopt(descriptor, SOL_SOCKET, SO_PEERCRED, &peer, &size) != 0) {
+    return std::string("nobody knows who serves it: ") + std::strerror(errno);
+  }
+  if (peer.uid == ::geteuid()) return {};
+  return "user " + std::to_string(peer.uid) + " serves it, not user " + std::to_string(::geteuid());
 }
 
 }  // namespace zelkor

@@ -1,11 +1,10 @@
 #include "platform/linux/files/HostDirectories.h"
 
 #include <pwd.h>
-#include <sys/stat.h>
-#include <unistd.h>
 
 #include <algorithm>
-#include <cstdlib>
+
+#include "base/RuntimeDirectory.h"
 
 namespace zelkord {
 namespace {
@@ -19,11 +18,13 @@ std::string withoutTrailingSlashes(std::string path) {
   return path;
 }
 
+RuntimeEnvironment runtimeEnvironment(const DirectoryEnvironment& environment) {
+  return {environment.environment, environment.user, environment.runtimeRoot};
+}
+
 std::optional<std::string> absoluteVariable(const DirectoryEnvironment& environment,
                                             const std::string& name) {
-  auto value = environment.environment(name);
-  if (!value || value->empty() || value->front() != '/') return std::nullopt;
-  return withoutTrailingSlashes(std::move(*value));
+  return absolutePathIn(runtimeEnvironment(environment), name);
 }
 
 std::string homeBase(const DirectoryEnvironment& environment, const std::string& variable,
@@ -33,43 +34,13 @@ std::string homeBase(const DirectoryEnvironment& environment, const std::string&
   return withoutTrailingSlashes(home == "/" ? below : home + below);
 }
 
-// A directory that belongs to the user and that nobody else may enter.
-bool isPrivateDirectory(const std::string& path, uid_t user) {
-  struct stat status {};
-  return ::lstat(path.c_str(), &status) == 0 && S_ISDIR(status.st_mode) && status.st_uid == user &&
-         (status.st_mode & 0077) == 0;
-}
-
-// Somebody else may have taken the usual name; then it is a fresh one.
-std::string temporaryRuntimeBase(const DirectoryEnvironment& environment) {
-  const auto temporary = absoluteVariable(environment, "TMPDIR").value_or("/tmp");
-  const auto usual = temporary + "/zelkord-" + std::to_string(environment.user);
-  ::mkdir(usual.c_str(), 0700);
-  if (isPrivateDirectory(usual, environment.user)) return usual;
-  auto fresh = usual + ".XXXXXX";
-  return ::mkdtemp(fresh.data()) ? fresh : usual;
-}
-
-std::string runtimeBase(const DirectoryEnvironment& environment) {
-  if (auto path = absoluteVariable(environment, "XDG_RUNTIME_DIR")) return *path;
-  const auto usual = environment.runtimeRoot + "/" + std::to_string(environment.user);
-  struct stat status {};
-  if (::lstat(usual.c_str(), &status) == 0 && S_ISDIR(status.st_mode) &&
-      status.st_uid == environment.user) {
-    return usual;
-  }
-  return temporaryRuntimeBase(environment);
-}
-
 }  // namespace
 
 DirectoryEnvironment DirectoryEnvironment::ofProcess() {
   DirectoryEnvironment result;
-  result.environment = [](const std::string& name) -> std::optional<std::string> {
-    const char* value = std::getenv(name.c_str());
-    return value ? std::optional<std::string>(value) : std::nullopt;
-  };
-  result.user = ::getuid();
+  const auto runtime = RuntimeEnvironment::ofProcess();
+  result.environment = runtime.environment;
+  result.user = runtime.user;
   const auto* account = ::getpwuid(result.user);
   result.home = account && account->pw_dir && account->pw_dir[0] == '/' ? account->pw_dir : "/";
   return result;
@@ -78,7 +49,7 @@ DirectoryEnvironment DirectoryEnvironment::ofProcess() {
 Directories hostDirectories(const DirectoryEnvironment& environment) {
   return {inServiceFolder(homeBase(environment, "XDG_CACHE_HOME", "/.cache")),
           inServiceFolder(homeBase(environment, "XDG_STATE_HOME", "/.local/state")),
-          inServiceFolder(runtimeBase(environment))};
+          inServiceFolder(makeRuntimeDirectory(runtimeEnvironment(environment)))};
 }
 
 ConfigurationDirectories hostConfigurationDirectories(const DirectoryEnvironment& environment) {
