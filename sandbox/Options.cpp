@@ -1,81 +1,86 @@
 #include "sandbox/Options.h"
 
+#include <CLI/App.hpp>
+#include <CLI/Config.hpp>
+#include <CLI/Formatter.hpp>
+#include <algorithm>
 #include <charconv>
-#include <optional>
-#include <string_view>
+#include <vector>
 
 namespace sandbox {
 
 namespace {
 
+// A decimal number that fits the target.
 template <typename Number>
-std::optional<Number> parseNumber(std::string_view text) {
-  Number number{};
-  const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
-  if (error != std::errc() || end != text.data() + text.size()) return std::nullopt;
-  return number;
+void addNumber(CLI::App& app, const std::string& name, Number& target, const std::string& what) {
+  app.add_option_function<std::string>(
+         name,
+         [name, &target](const std::string& text) {
+           const auto* end = text.data() + text.size();
+           const auto [stop, error] = std::from_chars(text.data(), end, target);
+           if (error != std::errc() || stop != end) {
+             throw CLI::ValidationError("bad value of " + name + ": " + text);
+           }
+         },
+         what)
+      ->type_name("N");
 }
 
-template <typename Number>
-bool assignNumber(Number& target, std::string_view text) {
-  const auto number = parseNumber<Number>(text);
-  if (number) target = *number;
-  return number.has_value();
+void addPath(CLI::App& app, const std::string& name, std::filesystem::path& target,
+             const std::string& type, const std::string& what) {
+  app.add_option_function<std::string>(
+         name,
+         [name, &target](const std::string& text) {
+           if (text.empty()) throw CLI::ValidationError(name + " needs a path");
+           target = text;
+         },
+         what)
+      ->type_name(type);
 }
 
-// False when the value is no good for this option.
-bool applyOption(Options& options, std::string_view name, std::string_view value) {
-  if (name == "--port") return assignNumber(options.port, value);
-  if (name == "--threads") return assignNumber(options.threads, value);
-  if (name == "--state") options.state = value;
-  if (name == "--port-file") options.portFile = value;
-  if (name == "--data-from") options.dataRoot = value;
-  return !value.empty();
-}
-
-bool takesValue(std::string_view name) {
-  return name == "--state" || name == "--port" || name == "--port-file" || name == "--data-from" ||
-         name == "--threads";
+void describe(CLI::App& app, Options& options) {
+  app.set_help_flag();
+  addPath(app, "--state", options.state, "DIR",
+          "Keep the certificate, the index, the request log and the uploads in DIR");
+  addNumber(app, "--port", options.port, "Listen on port N; 0, the default, takes any free one");
+  addPath(app, "--port-file", options.portFile, "PATH",
+          "Write the service's URL to PATH once it is serving");
+  addPath(app, "--data-from", options.dataRoot, "DIR",
+          "Look for wordnet/, iso-codes/json/, unicode/ and flags/ below DIR, not /usr/share");
+  addNumber(app, "--threads", options.threads, "Serve on N threads instead of one a processor");
+  app.add_flag("--background", options.background,
+               "Return once it is serving, and serve on by itself")
+      ->disable_flag_override();
+  app.add_flag("--quiet", options.quiet, "Say nothing on standard output")->disable_flag_override();
+  app.add_flag("--version", options.version, "Show the version")->disable_flag_override();
+  app.add_flag("-h,--help", options.help, "Show this help")->disable_flag_override();
 }
 
 }  // namespace
 
 Outcome<Options> parseOptions(std::span<const char* const> arguments) {
   Options options;
-  for (std::size_t at = 0; at < arguments.size(); ++at) {
-    const std::string name = arguments[at];
-    if (name == "--help") {
-      options.help = true;
-    } else if (name == "--quiet") {
-      options.quiet = true;
-    } else if (name == "--background") {
-      options.background = true;
-    } else if (!takesValue(name)) {
-      return Failure{"unknown argument " + name};
-    } else if (++at == arguments.size()) {
-      return Failure{name + " needs a value"};
-    } else if (!applyOption(options, name, arguments[at])) {
-      return Failure{"bad value of " + name + ": " + arguments[at]};
-    }
+  CLI::App app;
+  describe(app, options);
+  try {
+    app.parse(std::vector<std::string>(arguments.rbegin(), arguments.rend()));
+  } catch (const CLI::ParseError& problem) {
+    return Failure{problem.what()};
   }
-  if (options.state.empty() && !options.help) return Failure{"--state is needed"};
+  const bool serves = !options.help && !options.version;
+  if (serves && options.state.empty()) return Failure{"--state is needed"};
   return options;
 }
 
 std::string usage() {
-  return R"(usage: zelkor-sandbox --state DIR [--port N] [--port-file PATH] [--data-from DIR] [--threads N]
-                      [--background] [--quiet] [--help]
-
-A complete suggestion service for this machine, on https://localhost:PORT.
-
-  --state DIR       keeps the certificate, the index, the request log and the uploads in DIR
-  --port N          listens on port N; 0, the default, takes any free one
-  --port-file PATH  writes the service's URL to PATH once it is serving
-  --data-from DIR   looks for wordnet/, iso-codes/json/, unicode/ and flags/ below DIR instead of /usr/share
-  --threads N       serves on N threads instead of one a processor
-  --background      returns once it is serving, and serves on by itself
-  --quiet           says nothing on standard output
-)";
+  Options unused;
+  CLI::App app("A complete suggestion service for this machine, on https://localhost:PORT.",
+               "zelkor-sandbox");
+  describe(app, unused);
+  return app.help();
 }
+
+std::string version() { return "zelkor-sandbox " ZK_VERSION "\n"; }
 
 }  // namespace sandbox

@@ -19,6 +19,7 @@ struct Options {
   bool quiet = false;
   bool background = false;
   bool help = false;
+  bool version = false;
 };
 
 // `arguments` without the program's name. The failure is a line for people.
@@ -26,5 +27,7 @@ Outcome<Options> parseOptions(std::span<const char* const> arguments);
 
 // What --help prints.
 std::string usage();
+// What --version prints.
+std::string version();
 
 }  // namespace sandbox

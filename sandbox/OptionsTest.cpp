@@ -7,9 +7,9 @@
 namespace sandbox {
 
 TEST(OptionsTest, ReadsEveryOption) {
-  const std::vector<const char*> arguments = {
-      "--state", "/s",          "--port", "8443",      "--port-file", "/p",
-      "--quiet", "--data-from", "/d",     "--threads", "3",           "--background"};
+  const std::vector<const char*> arguments = {"--state",   "/s",      "--port=8443", "--port-file",
+                                              "/p",        "--quiet", "--data-from", "/d",
+                                              "--threads", "3",       "--background"};
   const auto options = parseOptions(arguments);
   ASSERT_TRUE(options);
   EXPECT_EQ(options->state, "/s");
@@ -30,10 +30,13 @@ TEST(OptionsTest, RefusesWhatItDoesNotUnderstand) {
                                                        {"--state", "/s", "--port", "-1"},
                                                        {"--state", "/s", "--port", "80x"},
                                                        {"--state", "/s", "extra"},
+                                                       {"--state", "/s", "--quiet=no"},
                                                        {"--stat", "/s"}}) {
     EXPECT_FALSE(parseOptions(arguments));
   }
-  EXPECT_TRUE(parseOptions(std::vector<const char*>{"--help"}));
+  for (const auto* option : {"--help", "-h", "--version"}) {
+    EXPECT_TRUE(parseOptions(std::vector<const char*>{option})) << option;
+  }
 }
 
 }  // namespace sandbox

@@ -62,6 +62,10 @@ int main(int argc, char** argv) {
     std::printf("%s", sandbox::usage().c_str());
     return 0;
   }
+  if (options->version) {
+    std::printf("%s", sandbox::version().c_str());
+    return 0;
+  }
   if (!options->background) return serve(*options, [] {});
   auto background = sandbox::Background::begin();
   if (!background) return fail(background.reason(), 1);

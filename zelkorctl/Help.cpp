@@ -34,12 +34,17 @@ Options of every command:
   --socket PATH        the same, as a socket's path
   --timeout SECONDS    for every call (default: 60)
   --verbose            say more, on standard error
-  --help               the command's help
+  --version            show this tool's version
+  -h, --help           the command's help
+
+Options of a command stand behind its name. A value stands behind its option, or behind "=". Words
+behind "--" are no options, and a word "++" stands there.
 
 Without --address and --socket the session bus is asked, which starts the daemon when needed;
 without a session bus the socket in the runtime directory is used.
 
-Exit status: 0 answered, 1 an error came back, 2 wrong usage, 3 the daemon cannot be reached.
+Exit status: 0 answered, 1 an error came back or the output cannot be written, 2 wrong usage, 3 the
+daemon cannot be reached.
 )";
 
 constexpr std::string_view kSearch = R"(usage: zelkorctl search [OPTION...] TEXT...
@@ -62,8 +67,8 @@ stands where the answer is from: the daemon's cache, or the network.
 constexpr std::string_view kType = R"(usage: zelkorctl type [OPTION...]
 
 Searches on every keystroke and shows the results under the line, with how long the answer took
-and whether it is from the daemon's cache or the network. Backspace deletes, Ctrl-U
-clears, Enter starts afresh, Ctrl-C or Ctrl-D ends.
+and whether it is from the daemon's cache or the network, on a screen of its own. Backspace deletes,
+Ctrl-U clears, Enter starts afresh, Ctrl-C or Ctrl-D ends.
 
 When standard input is no terminal, each of its characters is a keystroke and each line a query;
 every answer is one line.
@@ -188,7 +193,7 @@ Shows the daemon's counters, cumulative over its restarts.
 
 constexpr std::string_view kStatus = R"(usage: zelkorctl status [OPTION...]
 
-Shows what the daemon says of itself.
+Shows what the daemon says of itself, and how its last attempt to fetch the configuration failed.
 )";
 
 constexpr std::string_view kVersion = R"(usage: zelkorctl version

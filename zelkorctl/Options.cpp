@@ -1,11 +1,16 @@
 #include "zelkorctl/Options.h"
 
+#include <CLI/App.hpp>
+#include <CLI/Config.hpp>
+#include <CLI/Formatter.hpp>
 #include <algorithm>
 #include <array>
 #include <charconv>
 #include <cmath>
 #include <initializer_list>
 #include <limits>
+
+#include "base/CommandLineWords.h"
 
 namespace zelkorctl {
 namespace {
@@ -218,135 +223,168 @@ const CommandRule* findCommand(std::string_view name) {
   return found == kCommands.end() ? nullptr : found;
 }
 
-// One pass over the command line.
-class Parsing {
+// The tables above as the parser knows them. Options of every command are the program's; the others
+// and the words belong to the commands.
+class ToolParser {
  public:
-  explicit Parsing(const std::vector<std::string>& words) : words_(words) {}
+  ToolParser() {
+    app_.set_help_flag();
+    app_.require_subcommand(0, 1);
+    app_.allow_extras();  // named here, with what is wrong about them
+    for (const auto& rule : kOptions) {
+      if (rule.commands == kEvery) _add(app_, rule);
+    }
+    app_.add_flag_callback("--version", [this] { showsVersion_ = true; })->disable_flag_override();
+    for (const auto& rule : kCommands) _addCommand(rule);
+  }
 
-  std::variant<Options, UsageError> result() {
-    while (next_ < words_.size() && problem_.empty()) takeWord(words_[next_++]);
-    if (problem_.empty()) checkOptions();
-    if (problem_.empty() && !options_.help) checkArguments();
-    if (!problem_.empty()) return UsageError{problem_};
+  std::variant<Options, UsageError> parse(std::vector<std::string> words) {
+    std::reverse(words.begin(), words.end());  // as the parser takes them
+    try {
+      app_.parse(std::move(words));
+    } catch (const CLI::ParseError& problem) {
+      return UsageError{problem.what()};
+    }
+    auto problem = _takeCommand();
+    if (problem.empty()) problem = _problemWithOptions();
+    if (problem.empty() && !options_.help) problem = _problemWithArguments();
+    if (!problem.empty()) return UsageError{std::move(problem)};
     return options_;
   }
 
  private:
-  void takeWord(const std::string& word) {
-    if (onlyArguments_ || word == "-" || word.empty() || word.front() != '-') {
-      takeArgument(word);
-    } else if (word == "--") {
-      onlyArguments_ = true;
-    } else {
-      takeOption(word == "-h" ? "--help" : word);
+  void _addCommand(const CommandRule& rule) {
+    auto& command = *app_.add_subcommand(std::string(rule.name))->fallthrough();
+    command.set_help_flag();
+    for (const auto& option : kOptions) {
+      if (option.commands != kEvery && (option.commands & setOf({rule.command})) != 0) {
+        _add(command, option);
+      }
     }
+    // All words, each as it is: a list's "[a,b]" would be taken apart.
+    constexpr int kMany = 1 << 20;
+    command.add_option("words")->expected(kMany)->allow_extra_args(false)->multi_option_policy(
+        CLI::MultiOptionPolicy::TakeAll);
   }
 
-  void takeArgument(const std::string& word) {
-    if (command_) {
-      options_.arguments.push_back(word);
+  void _add(CLI::App& app, const OptionRule& rule) {
+    const auto name = std::string(rule.name);
+    const auto names = name == "--help" ? "-h,--help" : name;
+    if (!rule.takesValue) {
+      app.add_flag_callback(names, [this, &rule] { rule.apply(options_, {}); })
+          ->disable_flag_override();
       return;
     }
-    command_ = findCommand(word);
+    const auto apply = [this, name, &rule](const CLI::results_t& values) {
+      for (const auto& value : values) {
+        const auto wanted = rule.apply(options_, value);
+        if (!wanted.empty()) throw CLI::ValidationError(name + " takes " + wanted);
+      }
+      return true;
+    };
+    // The last one counts, or all of them: the rule knows.
+    app.add_option(names, apply)
+        ->type_name("value")
+        ->multi_option_policy(CLI::MultiOptionPolicy::TakeAll);
+  }
+
+  Problem _takeCommand() {
+    const auto parsed = app_.get_subcommands();
+    command_ = parsed.empty() ? nullptr : findCommand(parsed.front()->get_name());
     if (command_) {
       options_.command = command_->command;
-    } else {
-      problem_ = "no command '" + word + "'";
+      options_.arguments = parsed.front()->get_option("words")->results();
     }
+    if (showsVersion_ && !options_.help) options_.command = Command::Version;
+    for (const auto& extra : app_.remaining()) {
+      if (extra != "--") return _problemWith(extra);
+    }
+    return {};
   }
 
-  void takeOption(const std::string& word) {
-    const auto equals = word.find('=');
-    const auto name = word.substr(0, equals);
-    const auto* rule = std::find_if(kOptions.begin(), kOptions.end(),
-                                    [&](const auto& option) { return option.name == name; });
-    if (rule == kOptions.end()) {
-      problem_ = "no option '" + name + "'";
-    } else if (!rule->takesValue) {
-      if (equals != std::string::npos) problem_ = name + " takes no value";
-      if (problem_.empty()) apply(*rule, {});
-    } else if (equals != std::string::npos) {
-      apply(*rule, word.substr(equals + 1));
-    } else if (next_ < words_.size()) {
-      apply(*rule, words_[next_++]);
-    } else {
-      problem_ = name + " needs a value";
-    }
+  Problem _problemWith(const std::string& extra) const {
+    if (!command_ && !extra.starts_with('-')) return "no command '" + extra + "'";
+    const auto name = extra.substr(0, extra.find('='));
+    const bool known = std::any_of(kOptions.begin(), kOptions.end(),
+                                   [&](const auto& rule) { return rule.name == name; });
+    return known ? name + " is for other commands" : "no option '" + name + "'";
   }
 
-  void apply(const OptionRule& rule, const std::string& value) {
-    const auto wanted = rule.apply(options_, value);
-    if (!wanted.empty()) problem_ = std::string(rule.name) + " takes " + wanted;
-    if (rule.commands != kEvery) special_.push_back(&rule);
+  Problem _problemWithOptions() const {
+    if (options_.address.empty() || options_.socket.empty()) return {};
+    return "--address and --socket exclude each other";
   }
 
-  void checkOptions() {
-    const auto own = command_ ? setOf({command_->command}) : CommandSet{0};
-    for (const auto* rule : special_) {
-      if ((rule->commands & own) != 0) continue;
-      problem_ = std::string(rule->name) + " is for other commands";
-    }
-    if (!options_.address.empty() && !options_.socket.empty()) {
-      problem_ = "--address and --socket exclude each other";
-    }
-  }
-
-  void checkArguments() {
-    if (!command_) {
-      problem_ = "no command given";
-      return;
-    }
+  Problem _problemWithArguments() const {
+    if (!command_) return showsVersion_ ? Problem() : "no command given";
     const auto count = options_.arguments.size();
-    if (options_.command == Command::Defaults) {
-      checkDefaults();
-    } else if (options_.command == Command::Help) {
-      if (count > 1) problem_ = "help takes one command";
-    } else if (options_.command == Command::Report) {
-      if (count < 1 || count > 2) problem_ = "report takes a class and its fields as JSON";
-    } else if (options_.command == Command::Containers) {
-      if (count > 1) problem_ = "containers takes one number";
-    } else if (takesText()) {
-      if (count == 0 && needsText()) problem_ = std::string(command_->name) + " needs a text";
-    } else if (count > 0) {
-      problem_ = std::string(command_->name) + " takes no arguments";
+    const auto name = std::string(command_->name);
+    switch (command_->command) {
+      case Command::Defaults:
+        return _problemWithSettings();
+      case Command::Help:
+        return count > 1 ? "help takes one command" : Problem();
+      case Command::Report:
+        return count < 1 || count > 2 ? "report takes a class and its fields as JSON" : Problem();
+      case Command::Containers:
+        return count > 1 ? "containers takes one number" : Problem();
+      default:
+        break;
     }
+    if (!_takesText()) return count > 0 ? name + " takes no arguments" : Problem();
+    return count == 0 && _needsText() ? name + " needs a text" : Problem();
   }
 
-  bool takesText() const {
+  bool _takesText() const {
     constexpr auto kTakers =
         setOf({Command::Search, Command::More, Command::Card, Command::Lookup, Command::Images});
-    return (kTakers & setOf({options_.command})) != 0;
+    return (kTakers & setOf({command_->command})) != 0;
   }
 
   // Something that the query is made from is there already.
-  bool needsText() const {
+  bool _needsText() const {
     return options_.kind != QueryKind::ZeroKeyword && options_.urls.empty() &&
            options_.identifiers.empty();
   }
 
-  void checkDefaults() {
+  Problem _problemWithSettings() const {
     static constexpr std::array<std::pair<std::string_view, std::size_t>, 4> kActions{
         {{"read", 2}, {"write", 3}, {"delete", 2}, {"list", 1}}};
     const auto& words = options_.arguments;
     const bool fits = std::any_of(kActions.begin(), kActions.end(), [&](const auto& action) {
       return words.size() == action.second && words.front() == action.first;
     });
-    if (!fits) problem_ = "defaults takes read KEY, write KEY JSON, delete KEY or list";
+    return fits ? Problem() : "defaults takes read KEY, write KEY JSON, delete KEY or list";
   }
 
-  const std::vector<std::string>& words_;
-  std::size_t next_ = 0;
+  CLI::App app_;
   Options options_;
+  bool showsVersion_ = false;
   const CommandRule* command_ = nullptr;
-  std::vector<const OptionRule*> special_;
-  bool onlyArguments_ = false;
-  Problem problem_;
 };
 
 }  // namespace
 
 std::variant<Options, UsageError> parseArguments(const std::vector<std::string>& arguments) {
-  return Parsing(arguments).result();
+  const auto words = withSeparateEmptyValues(arguments);
+  // The parser ends a command there, and would search for the words before it.
+  const auto end = std::find(words.begin(), words.end(), "--");
+  if (std::find(words.begin(), end, "++") != end) return UsageError{"++ stands behind --"};
+  return ToolParser().parse(words);
+}
+
+std::vector<std::string_view> optionsOf(Command command) {
+  std::vector<std::string_view> names;
+  for (const auto& rule : kOptions) {
+    if ((rule.commands & setOf({command})) != 0) names.push_back(rule.name);
+  }
+  return names;
+}
+
+std::vector<std::pair<std::string_view, Command>> allCommands() {
+  std::vector<std::pair<std::string_view, Command>> commands;
+  for (const auto& rule : kCommands) commands.emplace_back(rule.name, rule.command);
+  return commands;
 }
 
 std::optional<Command> commandNamed(std::string_view name) {

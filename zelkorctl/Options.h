@@ -93,6 +93,10 @@ std::variant<Options, UsageError> parseArguments(const std::vector<std::string>&
 // Nothing for a name that no command has.
 std::optional<Command> commandNamed(std::string_view name);
 
+// What the command line is read by, for those that hold the documents against it.
+std::vector<std::pair<std::string_view, Command>> allCommands();
+std::vector<std::string_view> optionsOf(Command command);  // every command's too
+
 // The address that was given for further results or a card; empty for none.
 std::string urlOf(const Options& options);
 

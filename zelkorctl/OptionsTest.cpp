@@ -31,12 +31,12 @@ TEST(OptionsTest, RefusesWhatItCannotDo) {
       {{"serach"}, "no command 'serach'"},
       {{"search"}, "search needs a text"},
       {{"search", "a", "--cuont"}, "no option '--cuont'"},
-      {{"search", "a", "--count"}, "--count needs a value"},
+      {{"search", "++"}, "++ stands behind --"},
+      {{"bag", "-x"}, "no option '-x'"},
       {{"search", "a", "--count", "0"}, "--count takes a number from 1 to 100000"},
       {{"search", "a", "--count", "1x"}, "--count takes a number from 1 to 100000"},
       {{"search", "a", "--timeout", "nan"}, "--timeout takes seconds, above 0 and up to 86400"},
       {{"search", "a", "--item", "=v"}, "--item takes NAME=VALUE"},
-      {{"search", "a", "--json=1"}, "--json takes no value"},
       {{"bag", "--count", "2"}, "--count is for other commands"},
       {{"more"}, "more needs a text"},
       {{"images", "--save", "d"}, "images needs a text"},
@@ -56,6 +56,45 @@ TEST(OptionsTest, RefusesWhatItCannotDo) {
     ASSERT_TRUE(std::holds_alternative<UsageError>(parsed));
     EXPECT_EQ(std::get<UsageError>(parsed).text, problem);
   }
+}
+
+TEST(OptionsTest, RefusesValuesInTheWrongPlace) {
+  for (const auto& words : {Words{"search", "a", "--json=1"}, Words{"search", "a", "--count"},
+                            Words{"search", "a", "--count="}, Words{"--count"}}) {
+    SCOPED_TRACE(testing::PrintToString(words));
+    EXPECT_TRUE(std::holds_alternative<UsageError>(parseArguments(words)));
+  }
+}
+
+TEST(OptionsTest, LeavesWordsAsTheyAre) {
+  const struct {
+    Words words;
+    Words arguments;
+  } cases[] = {
+      {{"defaults", "write", "KEY", "-5"}, {"write", "KEY", "-5"}},
+      {{"defaults", "write", "KEY", "-0.5e3"}, {"write", "KEY", "-0.5e3"}},
+      {{"defaults", "write", "KEY", "[1,2]"}, {"write", "KEY", "[1,2]"}},
+      {{"defaults", "write", "KEY", "{}"}, {"write", "KEY", "{}"}},
+      {{"defaults", "write", "KEY", "[]"}, {"write", "KEY", "[]"}},
+      {{"search", "[a,b]", "", "more", "search"}, {"[a,b]", "", "more", "search"}},
+      {{"search", "--", "++", "--count=", "--"}, {"++", "--count=", "--"}},
+      {{"search", "a=b", "c:d", "%", "/x"}, {"a=b", "c:d", "%", "/x"}},
+      {{"report", "HVX", "-"}, {"HVX", "-"}},
+      {{"lookup", "--context=", "bank"}, {"bank"}},
+      {{"search", "a", "--item", "n=[1,2]", "b"}, {"a", "b"}},
+      {{"help", "search"}, {"search"}},
+  };
+  for (const auto& [words, arguments] : cases) {
+    SCOPED_TRACE(testing::PrintToString(words));
+    const auto parsed = parseArguments(words);
+    ASSERT_TRUE(std::holds_alternative<Options>(parsed)) << std::get<UsageError>(parsed).text;
+    EXPECT_EQ(std::get<Options>(parsed).arguments, arguments);
+  }
+  const auto items = parseArguments({"search", "a", "--item", "n=[1,2]", "--item=[x]=y"});
+  EXPECT_EQ(std::get<Options>(items).items,
+            (std::vector<std::pair<std::string, std::string>>{{"n", "[1,2]"}, {"[x]", "y"}}));
+  EXPECT_EQ(std::get<Options>(parseArguments({"--version"})).command, Command::Version);
+  EXPECT_TRUE(std::get<Options>(parseArguments({"bag", "-h"})).help);
 }
 
 TEST(OptionsTest, AsksForNoTextWhereNoneIsNeeded) {

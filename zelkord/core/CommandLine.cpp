@@ -1,13 +1,27 @@
 #include "zelkord/core/CommandLine.h"
 
+#include <CLI/App.hpp>
+#include <CLI/Config.hpp>
+#include <CLI/Formatter.hpp>
+#include <algorithm>
 #include <charconv>
 #include <cmath>
 #include <map>
+
+#include "base/CommandLineWords.h"
 
 namespace zelkord {
 namespace {
 
 constexpr double kHighestClockRate = 100'000;
+
+const std::map<std::string, LogLevel>& levelsByName() {
+  static const std::map<std::string, LogLevel> kLevels = {{"debug", LogLevel::Debug},
+                                                          {"info", LogLevel::Info},
+                                                          {"default", LogLevel::Default},
+                                                          {"error", LogLevel::Error}};
+  return kLevels;
+}
 
 std::optional<double> decimalNumber(const std::string& text) {
   double number = 0;
@@ -18,73 +32,96 @@ std::optional<double> decimalNumber(const std::string& text) {
   return number;
 }
 
-// Sets one option; the text says what is wrong, empty when nothing is.
-std::string setOption(CommandLine& line, const std::string& name, const std::string& value) {
-  static const std::map<std::string, LogLevel> kLevels = {{"debug", LogLevel::Debug},
-                                                          {"info", LogLevel::Info},
-                                                          {"default", LogLevel::Default},
-                                                          {"error", LogLevel::Error}};
-  if (name == "--log-file") {
-    if (value.empty()) return "--log-file needs a path";
-    line.logFile = value;
-  } else if (name == "--log-level") {
-    const auto level = kLevels.find(value);
-    if (level == kLevels.end()) return "--log-level is debug, info, default or error";
-    line.logLevel = level->second;
-  } else if (name == "--exit-when-idle") {
-    const auto seconds = decimalNumber(value);
-    if (!seconds || *seconds < 0) return "--exit-when-idle needs a number of seconds";
-    line.exitWhenIdle = durationOfSeconds(*seconds);
-  } else if (name == "--clock-rate") {
-    const auto rate = decimalNumber(value);
-    if (!rate || *rate < 1 || *rate > kHighestClockRate) {
-      return "--clock-rate needs a number of 1 to 100000";
-    }
-    line.clockRate = *rate;
-  } else {
-    return "unknown option " + name;
-  }
-  return {};
+double numberFrom(const std::string& text, double least, double most, const std::string& wanted) {
+  const auto number = decimalNumber(text);
+  if (!number || *number < least || *number > most) throw CLI::ValidationError(wanted);
+  return *number;
 }
 
-bool setFlag(CommandLine& line, const std::string& name) {
-  if (name == "--no-session-bus") {
-    line.sessionBus = false;
-  } else if (name == "--version") {
-    line.action = CommandLine::Action::ShowVersion;
-  } else if (name == "--help") {
-    line.action = CommandLine::Action::ShowHelp;
-  } else {
-    return false;
-  }
-  return true;
+void addLogOptions(CLI::App& app, CommandLine& line) {
+  app.add_option_function<std::string>(
+         "--log-file",
+         [&line](const std::string& path) {
+           if (path.empty()) throw CLI::ValidationError("--log-file needs a path");
+           line.logFile = path;
+         },
+         "Log to this file instead of the journal")
+      ->type_name("PATH");
+  app.add_option_function<std::string>(
+         "--log-level",
+         [&line](const std::string& name) {
+           const auto level = levelsByName().find(name);
+           if (level == levelsByName().end()) {
+             throw CLI::ValidationError("--log-level is debug, info, default or error");
+           }
+           line.logLevel = level->second;
+         },
+         "The lowest level that is printed")
+      ->type_name("debug|info|default|error");
+}
+
+void addTimeOptions(CLI::App& app, CommandLine& line) {
+  app.add_option_function<std::string>(
+         "--exit-when-idle",
+         [&line](const std::string& text) {
+           constexpr double kForEver = 1e12;
+           line.exitWhenIdle = durationOfSeconds(
+               numberFrom(text, 0, kForEver, "--exit-when-idle needs a number of seconds"));
+         },
+         "Leave when nothing has been under way for that long")
+      ->type_name("SECONDS");
+  app.add_option_function<std::string>(
+         "--clock-rate",
+         [&line](const std::string& text) {
+           line.clockRate =
+               numberFrom(text, 1, kHighestClockRate, "--clock-rate needs a number of 1 to 100000");
+         },
+         "Time runs N times as fast, for simulation: 1 to 100000")
+      ->type_name("N");
+}
+
+void addFlags(CLI::App& app, CommandLine& line) {
+  const auto asksFor = [&line](CommandLine::Action action) {
+    return [&line, action] { line.action = action; };
+  };
+  app.add_flag_callback(
+         "--no-session-bus", [&line] { line.sessionBus = false; }, "Serve the socket alone")
+      ->disable_flag_override();
+  app.add_flag_callback("--version", asksFor(CommandLine::Action::ShowVersion), "Show the version")
+      ->disable_flag_override();
+  app.add_flag_callback("-h,--help", asksFor(CommandLine::Action::ShowHelp), "Show this help")
+      ->disable_flag_override();
+}
+
+void describe(CLI::App& app, CommandLine& line) {
+  app.set_help_flag();
+  addLogOptions(app, line);
+  addTimeOptions(app, line);
+  addFlags(app, line);
 }
 
 }  // namespace
 
 std::variant<CommandLine, std::string> parseCommandLine(const std::vector<std::string>& arguments) {
   CommandLine line;
-  for (std::size_t i = 0; i < arguments.size(); ++i) {
-    const auto& argument = arguments[i];
-    if (setFlag(line, argument)) continue;
-    if (argument.rfind("--", 0) != 0) return "unexpected argument " + argument;
-    const auto equals = argument.find('=');
-    const auto name = argument.substr(0, equals);
-    std::string value;
-    if (equals != std::string::npos) {
-      value = argument.substr(equals + 1);
-    } else if (i + 1 < arguments.size()) {
-      value = arguments[++i];
-    }
-    if (auto problem = setOption(line, name, value); !problem.empty()) return problem;
+  CLI::App app;
+  describe(app, line);
+  auto words = withSeparateEmptyValues(arguments);
+  std::reverse(words.begin(), words.end());  // as the parser takes them
+  try {
+    app.parse(std::move(words));
+  } catch (const CLI::ParseError& problem) {
+    return std::string(problem.what());
   }
   return line;
 }
 
 std::string usageText() {
-  return "usage: zelkord [--log-file PATH] [--log-level debug|info|default|error]\n"
-         "               [--exit-when-idle SECONDS] [--clock-rate N] [--no-session-bus]\n"
-         "               [--version] [--help]\n";
+  CommandLine unused;
+  CLI::App app("The one broker between a device's search clients and a search-suggestion service.",
+               "zelkord");
+  describe(app, unused);
+  return app.help();
 }
 
 }  // namespace zelkord

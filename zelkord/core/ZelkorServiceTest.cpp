@@ -270,6 +270,7 @@ TEST(CommandLineTest, ReadsEachOptionAndRefusesTheRest) {
         "100000"},
        true},
       {{"--no-session-bus", "--version"}, true},
+      {{"-h"}, true},
       {{"--log-level", "fault"}, false},
       {{"--clock-rate", "0.5"}, false},
       {{"--clock-rate", "100001"}, false},
@@ -279,6 +280,8 @@ TEST(CommandLineTest, ReadsEachOptionAndRefusesTheRest) {
       {{"--exit-when-idle", "-1"}, false},
       {{"--exit-when-idle"}, false},
       {{"--log-file", ""}, false},
+      {{"--log-file=", "--no-session-bus"}, false},
+      {{"--no-session-bus=false"}, false},
       {{"--unknown"}, false},
       {{"word"}, false},
   };
