@@ -6,6 +6,7 @@
 #include <string>
 
 #include "corezelkor/client/Client.h"
+#include "corezelkor/client/Results.h"
 
 int main(int count, char** words) {
   if (count != 2) {
@@ -37,9 +38,9 @@ int main(int count, char** words) {
     return 1;
   }
   // Nothing at all is an answer too: the text is too short, or the service is switched off.
-  if (answer.reply) {
-    const auto json = answer.reply->data.view();
-    std::printf("%.*s\n", static_cast<int>(json.size()), json.data());
-  }
+  // An answer out of the daemon's cache also holds results for other texts, which are left out
+  // here.
+  const auto sets = zelkor::resultsFor(words[1], answer);
+  if (sets) std::printf("%s\n", zelkor::json::serialize(*sets).c_str());
   return 0;
 }
