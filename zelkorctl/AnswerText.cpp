@@ -6,6 +6,8 @@
 #include <array>
 #include <utility>
 
+#include "corezelkor/client/Results.h"
+#include "zelkorctl/BagFetch.h"
 #include "zelkorctl/Printable.h"
 #include "zelkorctl/ResponseSets.h"
 
@@ -119,12 +121,11 @@ void appendHeaders(const HeaderFields& headers, std::vector<std::string>& lines)
 
 }  // namespace
 
-std::vector<std::string> resultLines(std::string_view data, const Shown& shown) {
-  const auto parsed = parseJson(data);
-  const auto* sets = parsed ? parsed->if_array() : nullptr;
-  if (!sets) return {notAList(data, "result sets")};
+std::vector<std::string> resultLines(const ClientAnswer& answer, const Shown& shown) {
+  const auto sets = resultsFor(shown.typed, answer);
+  if (!sets) return {notAList(answer.reply ? answer.reply->data.view() : "", "result sets")};
   std::vector<Row> rows;
-  for (const auto* set : fittingSets(*sets, shown.typed)) appendRows(*set, shown.limit, rows);
+  for (const auto* set : objectsOf(*sets)) appendRows(*set, shown.limit, rows);
   return rowLines(rows, shown.width);
 }
 
@@ -138,14 +139,16 @@ std::vector<std::string> cardLines(std::string_view data, std::size_t width) {
   return lines;
 }
 
-std::string outcomeLine(const Outcome& outcome, std::size_t width) {
+std::vector<std::string> outcomeLines(const Outcome& outcome, std::size_t width) {
   constexpr std::size_t kTextColumn = 24;
   auto line = padded("\"" + printable(outcome.text) + "\"", std::min(kTextColumn, width / 3)) +
               "  " + padded(nameOf(outcome.kind), 8) + " " + padded(sourceOf(outcome), 7) +
               fmt::format(" {:9.1f} ms", outcome.milliseconds);
   if (outcome.answer.reply) line += fmt::format(" {:8} bytes", outcome.answer.reply->data.size());
   if (outcome.answer.error) line += "  " + errorText(*outcome.answer.error);
-  return fitted(line, width);
+  std::vector<std::string> lines = {fitted(line, width)};
+  if (outcome.bag) lines.push_back(fitted("  no bag: " + bagFetchText(*outcome.bag), width));
+  return lines;
 }
 
 std::vector<std::string> exchangeLines(const ZLKReply& reply) {
@@ -162,15 +165,20 @@ std::vector<std::string> exchangeLines(const ZLKReply& reply) {
 }
 
 json::object outcomeJson(const Outcome& outcome, Exchange exchange) {
-  json::object object{{"queryId", outcome.answer.queryId},
+  const auto& answer = outcome.answer;
+  json::object object{{"queryId", answer.queryId},
                       {"query", outcome.text},
                       {"outcome", nameOf(outcome.kind)},
                       {"milliseconds", outcome.milliseconds}};
-  if (outcome.answer.reply) {
+  if (answer.reply) {
     object["source"] = sourceOf(outcome);
-    object["reply"] = replyJson(*outcome.answer.reply, exchange);
+    object["reply"] = replyJson(*answer.reply, exchange);
   }
-  if (outcome.answer.error) object["error"] = errorJson(*outcome.answer.error);
+  if (outcome.asked == QueryKind::Search) {
+    if (auto sets = resultsFor(outcome.text, answer)) object["sets"] = *std::move(sets);
+  }
+  if (answer.error) object["error"] = errorJson(*answer.error);
+  if (outcome.bag) object["bag"] = *outcome.bag;
   return object;
 }
 

@@ -1,6 +1,7 @@
 #include <gtest/gtest.h>
 
 #include "zelkorctl/AnswerText.h"
+#include "zelkorctl/BagFetch.h"
 #include "zelkorctl/FollowUps.h"
 #include "zelkorctl/LineEditor.h"
 #include "zelkorctl/Printable.h"
@@ -9,6 +10,12 @@ namespace zelkorctl {
 namespace {
 
 using Lines = std::vector<std::string>;
+
+ClientAnswer answerWithData(std::string_view data) {
+  ClientAnswer answer;
+  answer.reply.emplace().data = Data(std::string(data));
+  return answer;
+}
 
 TEST(PrintableTest, LetsNothingSteerTheTerminal) {
   const std::pair<std::string, std::string> cases[] = {
@@ -56,10 +63,10 @@ TEST(ResultLinesTest, AlignsTheBestResultsAndSurvivesAnything) {
   };
   for (const auto& [data, lines] : cases) {
     SCOPED_TRACE(data);
-    EXPECT_EQ(resultLines(data, {3, 80, "Fra"}), lines);
+    EXPECT_EQ(resultLines(answerWithData(data), {3, 80, "Fra"}), lines);
   }
   const std::string wide = R"([{"results":[{"title":")" + std::string(300, 'w') + R"("}]}])";
-  EXPECT_EQ(displayWidth(resultLines(wide, {3, 80}).front()), 42u);
+  EXPECT_EQ(displayWidth(resultLines(answerWithData(wide), {3, 80}).front()), 42u);
 }
 
 TEST(CardLinesTest, AlignsTheFactsAndSurvivesAnything) {
@@ -98,8 +105,8 @@ TEST(FollowUpsTest, FindWhereAResponseLeads) {
   };
   for (const auto& [data, more, second] : cases) {
     SCOPED_TRACE(data);
-    EXPECT_EQ(moreResultsURL(data, "Fra"), more);
-    EXPECT_EQ(cardURL(data, "Fra", 2), second);
+    EXPECT_EQ(moreResultsURL(answerWithData(data), "Fra"), more);
+    EXPECT_EQ(cardURL(answerWithData(data), "Fra", 2), second);
   }
 }
 
@@ -117,12 +124,43 @@ TEST(OutcomeJsonTest, TellsTheSourceAndTheExchangeOnlyWhenAsked) {
 }
 
 TEST(OutcomeJsonTest, EmbedsTheResponseWhenItIsJson) {
-  Outcome outcome{"a", Outcome::Kind::Answered, 1.5, {}};
+  Outcome outcome{"a", Outcome::Kind::Answered, 1.5, {}, {}, QueryKind::Search};
   outcome.answer.queryId = 4;
   outcome.answer.reply.emplace().data = Data("[1]");
   EXPECT_EQ(outcomeJson(outcome, Exchange::LeftOut).at("reply").at("data"), parseJson("[1]"));
   outcome.answer.reply->data = Data("\xff");
   EXPECT_EQ(outcomeJson(outcome, Exchange::LeftOut).at("reply").at("text"), "\\xff");
+}
+
+TEST(OutcomeJsonTest, HasTheSetsForTheTextBesideTheWholeResponse) {
+  Outcome outcome{"Fra", Outcome::Kind::Answered, 1, {}, {}, QueryKind::Search};
+  outcome.answer.reply.emplace().data = Data(R"([{"query":"friend"},{"query":"france"}])");
+  const auto object = outcomeJson(outcome, Exchange::LeftOut);
+  EXPECT_EQ(object.at("sets"), parseJson(R"([{"query":"france"}])"));
+  EXPECT_EQ(object.at("reply").at("data").as_array().size(), 2u);
+}
+
+TEST(BagFetchTest, SaysWhyThereIsNoBag) {
+  constexpr double kNow = 1'000'000;
+  const struct {
+    const char* bag;
+    const char* text;
+  } cases[] = {
+      {R"({"url":"https://a/bag","last_failure":{"time":999998,"reason":"connection\nrefused"},
+           "next_attempt":1000030.4})",
+       "fetching https://a/bag failed 2 s ago: connection\\nrefused; next attempt in 30 s"},
+      {R"({"url":null,"last_failure":{"time":992000,"reason":"r"},"next_attempt":null})",
+       "fetching it failed 2 h 13 min ago: r"},
+      {R"({"url":"u","last_failure":{"reason":7},"next_attempt":999999})",
+       "fetching u failed; next attempt in 0 s"},
+      {R"({"url":"u","last_failure":null,"next_attempt":1000300})",
+       "fetching u has not come to an end; next attempt in 5 min"},
+      {R"({"version":"4"})", "fetching it has not come to an end"},
+  };
+  for (const auto& [bag, text] : cases) {
+    SCOPED_TRACE(bag);
+    EXPECT_EQ(bagFetchText(parseJson(bag)->as_object(), kNow), text);
+  }
 }
 
 TEST(LineEditorTest, FollowsTheKeys) {

@@ -45,8 +45,7 @@ class Following {
 };
 
 std::optional<std::string> nextPage(const Outcome& outcome) {
-  if (!outcome.answer.reply) return std::nullopt;
-  return moreResultsURL(outcome.answer.reply->data.view(), outcome.text);
+  return moreResultsURL(outcome.answer, outcome.text);
 }
 
 }  // namespace
@@ -75,8 +74,7 @@ int runCard(const Invocation& invocation) {
   if (url->empty()) {
     const auto searched = following.search();
     const auto number = static_cast<std::size_t>(invocation.options.result);
-    url = searched.answer.reply ? cardURL(searched.answer.reply->data.view(), searched.text, number)
-                                : std::nullopt;
+    url = cardURL(searched.answer, searched.text, number);
     if (!url) {
       return following.endOfTheWay(searched, fmt::format("result {} has no card", number));
     }

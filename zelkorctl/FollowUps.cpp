@@ -1,28 +1,25 @@
 #include "zelkorctl/FollowUps.h"
 
+#include "corezelkor/client/Results.h"
 #include "zelkorctl/ResponseSets.h"
 
 namespace zelkorctl {
 
 using namespace zelkor;
 
-std::optional<std::string> moreResultsURL(std::string_view data, std::string_view typed) {
-  const auto parsed = parseJson(data);
-  const auto* sets = parsed ? parsed->if_array() : nullptr;
-  if (!sets) return std::nullopt;
-  for (const auto* set : fittingSets(*sets, typed)) {
+std::optional<std::string> moreResultsURL(const ClientAnswer& answer, std::string_view typed) {
+  const auto sets = resultsFor(typed, answer).value_or(json::array());
+  for (const auto* set : objectsOf(sets)) {
     if (auto url = stringIn(*set, "more_results_url")) return url;
   }
   return std::nullopt;
 }
 
-std::optional<std::string> cardURL(std::string_view data, std::string_view typed,
+std::optional<std::string> cardURL(const ClientAnswer& answer, std::string_view typed,
                                    std::size_t result) {
-  const auto parsed = parseJson(data);
-  const auto* sets = parsed ? parsed->if_array() : nullptr;
-  if (!sets) return std::nullopt;
+  const auto sets = resultsFor(typed, answer).value_or(json::array());
   std::size_t number = 0;
-  for (const auto* set : fittingSets(*sets, typed)) {
+  for (const auto* set : objectsOf(sets)) {
     for (const auto* each : objectsIn(*set, "results")) {
       if (++number == result) return stringIn(*each, "card_url");
     }

@@ -3,6 +3,7 @@
 #include "corezelkor/client/ClientError.h"
 #include "corezelkor/client/DiagnosticsClient.h"
 #include "zelkorctl/AnswerText.h"
+#include "zelkorctl/BagFetch.h"
 #include "zelkorctl/Commands.h"
 #include "zelkorctl/Printable.h"
 
@@ -41,6 +42,19 @@ int reportMissing(const Invocation& invocation, const ClientResult<T>& result) {
                                                                    "the daemon gave nothing")));
 }
 
+// With why, as far as the daemon tells.
+int reportNoBag(const Invocation& invocation, Client& client, const Error& error) {
+  const auto future = DiagnosticsClient(client).status();
+  const auto bag = bagInStatus(future.get().value.value_or(""));
+  if (!bag) return reportError(invocation, error);
+  if (invocation.options.json) {
+    printJson(invocation, json::object{{"error", errorJson(error)}, {"bag", *bag}});
+  } else {
+    invocation.surroundings.err << "zelkorctl: no bag: " << bagFetchText(*bag) << '\n';
+  }
+  return kErrorReply;
+}
+
 void printBag(const Invocation& invocation, const ClientBag& bag) {
   const auto document = parseJson(bag.rawBag);
   if (invocation.options.json) {
@@ -64,6 +78,7 @@ int runBag(const Invocation& invocation) {
   Client client(clientOptions(invocation.options));
   const auto future = client.bag();
   const auto& result = future.get();
+  if (saysNoBag(result.error)) return reportNoBag(invocation, client, *result.error);
   if (!result.value) return reportMissing(invocation, result);
   printBag(invocation, *result.value);
   return kAnswered;
@@ -118,6 +133,10 @@ int runStatus(const Invocation& invocation) {
     printJson(invocation, *status);
   } else {
     printObject(invocation, status->get_object());
+    const auto* bag = objectIn(status->get_object(), "bag");
+    if (bag && objectIn(*bag, "last_failure")) {
+      invocation.surroundings.out << '\n' << bagFetchText(*bag) << '\n';
+    }
   }
   return kAnswered;
 }

@@ -15,7 +15,7 @@ void showOutcome(const Invocation& invocation, const Outcome& outcome) {
     out << json::serialize(outcomeJson(outcome, exchange)) << std::endl;
     return;
   }
-  out << outcomeLine(outcome, surroundings.columns) << '\n';
+  for (const auto& line : outcomeLines(outcome, surroundings.columns)) out << line << '\n';
   if (!outcome.answer.reply || !options.verbose) return;
   for (const auto& line : exchangeLines(*outcome.answer.reply)) surroundings.err << line << '\n';
 }
@@ -24,7 +24,7 @@ void showResults(const Invocation& invocation, const Outcome& outcome) {
   const auto& [options, surroundings] = invocation;
   if (options.json || !outcome.answer.reply) return;
   const Shown shown{static_cast<std::size_t>(options.limit), surroundings.columns, outcome.text};
-  const auto lines = resultLines(outcome.answer.reply->data.view(), shown);
+  const auto lines = resultLines(outcome.answer, shown);
   for (const auto& line : lines) surroundings.out << line << '\n';
 }
 

@@ -10,7 +10,9 @@
 #include "base/Check.h"
 #include "base/Mutex.h"
 #include "corezelkor/client/ClientError.h"
+#include "corezelkor/client/DiagnosticsClient.h"
 #include "corezelkor/client/EndpointClient.h"
+#include "zelkorctl/BagFetch.h"
 
 namespace zelkorctl {
 namespace {
@@ -132,10 +134,20 @@ void QueryRun::send(const Query& query) {
   shared_->newest = queryId;
   const auto start = std::chrono::steady_clock::now();
   _ask(_request(query))
-      .then([shared = shared_, queryId, start, name = query.name()](const ClientAnswer& answer) {
+      .then([shared = shared_, client = &client_, queryId, start, name = query.name(),
+             asked = query.kind](const ClientAnswer& answer) {
         const std::chrono::duration<double, std::milli> time =
             std::chrono::steady_clock::now() - start;
-        shared->add({name, kindOf(answer, shared->newest == queryId), time.count(), answer});
+        Outcome outcome{name, kindOf(answer, shared->newest == queryId), time.count(), answer, {},
+                        asked};
+        if (!saysNoBag(answer.error)) return shared->add(std::move(outcome));
+        // Runs on the client's own thread, so the client is there.
+        DiagnosticsClient(*client).status().then(
+            [shared, outcome](const ClientResult<std::string>& status) {
+              auto explained = outcome;
+              explained.bag = bagInStatus(status.value.value_or(""));
+              shared->add(std::move(explained));
+            });
       });
 }
 

@@ -3,10 +3,12 @@
 #include <chrono>
 #include <cstdint>
 #include <memory>
+#include <optional>
 #include <string>
 #include <string_view>
 #include <vector>
 
+#include "base/Json.h"
 #include "corezelkor/client/Client.h"
 #include "zelkorctl/Options.h"
 
@@ -36,6 +38,8 @@ struct Outcome {
   Kind kind = Kind::Nothing;
   double milliseconds = 0;
   ClientAnswer answer;
+  std::optional<json::object> bag;  // what the daemon says of it, when it failed for want of one
+  QueryKind asked = QueryKind::Search;
 };
 
 std::string_view nameOf(Outcome::Kind kind);

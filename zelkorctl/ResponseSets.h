@@ -14,11 +14,4 @@ std::vector<const zelkor::json::object*> objectsOf(const zelkor::json::array& li
 std::vector<const zelkor::json::object*> objectsIn(const zelkor::json::object& object,
                                                    std::string_view key);
 
-// The result sets of a response that are for what is typed.
-//
-// A response out of the daemon's cache was fetched for an earlier text: only the sets whose
-// completed query begins with this one count, unless none does.
-std::vector<const zelkor::json::object*> fittingSets(const zelkor::json::array& sets,
-                                                     std::string_view typed);
-
 }  // namespace zelkorctl

@@ -28,7 +28,7 @@ int searchOneByOne(const Invocation& invocation, QueryRun& run, const Query& que
       outcome.answer.reply.reset();
       all.push_back(std::move(outcome));
     }
-    if (statusOf(all) == kNotReachable) break;
+    if (statusOf(all) == kNotReachable || !invocation.surroundings.out.good()) break;
   }
   return statusOf(all);
 }

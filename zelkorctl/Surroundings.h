@@ -9,7 +9,8 @@ namespace zelkorctl {
 struct Surroundings {
   std::ostream& out;
   std::ostream& err;
-  int input = 0;  // file descriptor
+  int input = 0;    // file descriptor
+  int output = -1;  // likewise, of `out`; asked only while it is a terminal
   bool inputIsTerminal = false;
   bool outputIsTerminal = false;
   bool showsImages = false;   // the output is a terminal that can

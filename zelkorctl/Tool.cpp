@@ -1,5 +1,9 @@
 #include "zelkorctl/Tool.h"
 
+#include <algorithm>
+#include <cerrno>
+#include <cstring>
+
 #include "zelkorctl/Commands.h"
 #include "zelkorctl/Help.h"
 #include "zelkorctl/Printable.h"
@@ -72,6 +76,18 @@ int runCommand(const Invocation& invocation) {
   return kWrongUsage;
 }
 
+// The status, unless what was to be said could not be.
+int withOutput(const Surroundings& surroundings, int status) {
+  errno = 0;
+  surroundings.out.flush();
+  const int problem = errno;
+  if (surroundings.out.good()) return status;
+  surroundings.err << "zelkorctl: the output could not be written";
+  if (problem != 0) surroundings.err << ": " << std::strerror(problem);
+  surroundings.err << std::endl;
+  return std::max<int>(status, kErrorReply);
+}
+
 }  // namespace
 
 int runTool(const std::vector<std::string>& arguments, const Surroundings& surroundings) {
@@ -81,8 +97,7 @@ int runTool(const std::vector<std::string>& arguments, const Surroundings& surro
     return kWrongUsage;
   }
   const auto status = runCommand({std::get<Options>(parsed), surroundings});
-  surroundings.out.flush();
-  return status;
+  return withOutput(surroundings, status);
 }
 
 }  // namespace zelkorctl

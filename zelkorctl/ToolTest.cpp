@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <filesystem>
+#include <fstream>
 #include <map>
 #include <sstream>
 
@@ -13,6 +14,7 @@
 namespace zelkorctl {
 namespace {
 
+using testing::AllOf;
 using testing::HasSubstr;
 using testing::Not;
 using zelkor::TinyDaemon;
@@ -212,6 +214,55 @@ TEST_F(ToolTest, LoadsTheImagesOfAnAnswer) {
   EXPECT_THAT(out_.str(), HasSubstr("8 bytes, image/png\n"));
   EXPECT_EQ(run({"images", "bad"}), kErrorReply);
   EXPECT_EQ(runRaw({"images", "--id", "a", "--socket", "/nowhere"}), kNotReachable);
+}
+
+TEST_F(ToolTest, SaysThatTheOutputCouldNotBeWritten) {
+  for (const auto& words : {std::vector<std::string>{"search", "hello"}, {"help"}, {"--version"}}) {
+    std::ofstream full("/dev/full");
+    err_.str("");
+    auto all = words;
+    all.insert(all.end(), {"--socket", daemon_.path()});
+    EXPECT_EQ(runTool(all, {.out = full, .err = err_, .input = -1}), kErrorReply);
+    EXPECT_THAT(err_.str(), HasSubstr("the output could not be written"));
+  }
+}
+
+TEST_F(ToolTest, SaysWhyThereIsNoBag) {
+  const auto noBag = [](sd_bus_message* call) {
+    const auto asked = readCall(call);
+    sd_bus_reply_method_return(call, "xa{sv}a{sv}", asked.queryId, 0, 3, "domain", "s",
+                               "ZLKErrorDomain", "code", "x", std::int64_t{1}, "userInfo", "a{sv}",
+                               1, "reason", "s", "timeout");
+  };
+  daemon_.on("Request", noBag);
+  daemon_.reply("Bag", "a{sv}a{sv}", 0, 3, "domain", "s", "ZLKErrorDomain", "code", "x",
+                std::int64_t{1}, "userInfo", "a{sv}", 1, "reason", "s", "timeout");
+  daemon_.reply("Status", "s",
+                R"({"pid":7,"bag":{"url":"https://a/bag","last_failure":{"time":1000,)"
+                R"("reason":"connection refused"},"next_attempt":2000}})");
+  const auto* kWhy = "fetching https://a/bag failed";
+  for (const auto& words : {std::vector<std::string>{"search", "a"},
+                            {"search", "a", "--as-typed"},
+                            {"more", "a"},
+                            {"zkw"},
+                            {"status"}}) {
+    SCOPED_TRACE(testing::PrintToString(words));
+    run(words);
+    EXPECT_THAT(out_.str(), AllOf(HasSubstr(kWhy), HasSubstr("ago: connection refused")));
+  }
+  EXPECT_EQ(run({"bag"}), kErrorReply);
+  EXPECT_THAT(err_.str(), HasSubstr(kWhy));
+  for (const auto* command : {"search", "bag"}) {
+    auto words = std::vector<std::string>{"--json", command};
+    if (words.back() == "search") words.emplace_back("a");
+    EXPECT_EQ(run(words), kErrorReply);
+    EXPECT_THAT(out_.str(), AllOf(HasSubstr(R"("reason":"timeout"})"),
+                                  HasSubstr(R"("bag":{"url":"https://a/bag")")));
+  }
+  // A daemon that does not tell.
+  daemon_.reply("Status", "s", "{}");
+  EXPECT_EQ(run({"search", "a"}), kErrorReply);
+  EXPECT_THAT(out_.str(), AllOf(HasSubstr("timeout"), Not(HasSubstr("no bag"))));
 }
 
 TEST_F(ToolTest, TypesEveryPrefixInOrder) {

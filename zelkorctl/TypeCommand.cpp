@@ -1,17 +1,21 @@
-#include <fmt/format.h>
 #include <poll.h>
 #include <unistd.h>
 
+#include <cerrno>
+#include <csignal>
+#include <memory>
 #include <optional>
 #include <thread>
 
-#include "corezelkor/client/ClientError.h"
 #include "zelkorctl/AnswerText.h"
 #include "zelkorctl/Commands.h"
 #include "zelkorctl/LineEditor.h"
 #include "zelkorctl/Printable.h"
+#include "zelkorctl/QueryOutput.h"
 #include "zelkorctl/QueryRun.h"
 #include "zelkorctl/RawTerminal.h"
+#include "zelkorctl/TerminalScreen.h"
+#include "zelkorctl/TerminalSignals.h"
 
 namespace zelkorctl {
 namespace {
@@ -19,44 +23,66 @@ namespace {
 // The interactive search: keystrokes in, queries out, answers shown as they come.
 //
 // On a terminal the newest answer stands under the line that is typed; elsewhere every answer is
-// one line of output.
+// one line of output. A signal that ends it at a terminal waits until the terminal is put back.
 class TypingSession {
  public:
   explicit TypingSession(const Invocation& invocation)
       : invocation_(invocation),
-        screen_(invocation.surroundings.outputIsTerminal &&
-                invocation.surroundings.inputIsTerminal && !invocation.options.json),
+        atTerminal_(invocation.surroundings.inputIsTerminal),
         client_(clientOptions(invocation.options)),
         run_(client_, invocation.options) {}
 
   int run() {
-    const RawTerminal raw(invocation_.surroundings.input);
-    draw();
-    bool typing = true;
-    while (status_ != kNotReachable && (typing || run_.hasOutstanding())) {
-      waitForEvents(typing);
-      for (const auto& outcome : run_.take()) show(outcome);
-      if (typing) typing = takeKey();
+    {
+      const RawTerminal raw(invocation_.surroundings.input);
+      if (atTerminal_ && invocation_.surroundings.outputIsTerminal && !invocation_.options.json) {
+        screen_.emplace(out(), invocation_.surroundings.output);
+      }
+      draw();
+      bool typing = true;
+      while (mayGoOn(typing)) typing = turn(typing);
+      screen_.reset();
     }
-    if (screen_) out() << "\r\033[J" << std::flush;
+    if (unreachable_) reportError(invocation_, *unreachable_);
     return status_;
   }
+
+  // The signal that ended it; 0 for none.
+  int endingSignal() const { return endingSignal_; }
 
  private:
   std::ostream& out() const { return invocation_.surroundings.out; }
 
-  void waitForEvents(bool typing) {
+  // Who ends typing at a terminal does not wait for answers.
+  bool mayGoOn(bool typing) const {
+    if (unreachable_ || endingSignal_ != 0 || !out().good()) return false;
+    return typing || (!atTerminal_ && run_.hasOutstanding());
+  }
+
+  // Waits for something and deals with it; whether there may be more keys.
+  bool turn(bool typing) {
     pollfd waiting[] = {{run_.descriptor(), POLLIN, 0},
+                        {signals_ ? signals_->descriptor() : -1, POLLIN, 0},
                         {typing ? invocation_.surroundings.input : -1, POLLIN, 0}};
-    ::poll(waiting, 2, -1);
-    keyIsThere_ = waiting[1].revents != 0;
+    ::poll(waiting, 3, -1);
+    if (waiting[1].revents != 0) takeSignals();
+    for (const auto& outcome : run_.take()) show(outcome);
+    return typing && (waiting[2].revents == 0 || takeKey());
+  }
+
+  void takeSignals() {
+    while (const auto signal = signals_->take()) {
+      if (*signal != SIGWINCH) endingSignal_ = *signal;
+    }
+    draw();
   }
 
   // False at the end of what is typed.
   bool takeKey() {
-    if (!keyIsThere_) return true;
     char byte = 0;
-    if (::read(invocation_.surroundings.input, &byte, 1) <= 0) return false;
+    const auto count = ::read(invocation_.surroundings.input, &byte, 1);
+    if (count < 0 && (errno == EINTR || errno == EAGAIN)) return true;
+    if (count <= 0) return false;
     switch (editor_.take(byte)) {
       case LineEditor::Event::None:
         return true;
@@ -79,16 +105,13 @@ class TypingSession {
       return;
     }
     run_.send({QueryKind::Search, editor_.text(), {}});
-    if (!invocation_.surroundings.inputIsTerminal) {
-      std::this_thread::sleep_for(invocation_.options.delayPerKey);
-    }
+    if (!atTerminal_) std::this_thread::sleep_for(invocation_.options.delayPerKey);
   }
 
   void show(const Outcome& outcome) {
-    if (outcome.answer.error) {
-      const bool gone = isClientError(*outcome.answer.error, ClientErrorCode::NotReachable);
-      status_ = gone ? kNotReachable : kErrorReply;
-      if (gone) reportError(invocation_, *outcome.answer.error);
+    if (const auto& error = outcome.answer.error) {
+      status_ = statusOf(outcome);
+      if (status_ == kNotReachable) unreachable_ = error;
     }
     if (!screen_) {
       print(outcome);
@@ -99,48 +122,52 @@ class TypingSession {
   }
 
   void print(const Outcome& outcome) const {
-    if (invocation_.options.json) {
-      const auto exchange = invocation_.options.verbose ? Exchange::Told : Exchange::LeftOut;
-      out() << json::serialize(outcomeJson(outcome, exchange)) << std::endl;
-    } else {
-      out() << outcomeLine(outcome, invocation_.surroundings.columns) << std::endl;
-    }
+    showOutcome(invocation_, outcome);
+    out() << std::flush;
   }
 
-  // The results under the line, then the cursor back at the line's end.
-  void draw() const {
+  void draw() {
     if (!screen_) return;
-    const auto columns = invocation_.surroundings.columns;
-    const auto prompt = fitted("> " + printable(editor_.text()), columns - 1);
-    out() << "\r\033[J" << prompt;
-    const auto lines = linesBelow(columns - 1);
-    for (const auto& line : lines) out() << "\r\n" << line;
-    if (!lines.empty()) out() << fmt::format("\033[{}A", lines.size());
-    out() << fmt::format("\r\033[{}C", displayWidth(prompt)) << std::flush;
-  }
-
-  std::vector<std::string> linesBelow(std::size_t columns) const {
-    if (!latest_) return {};
-    auto lines = std::vector<std::string>{outcomeLine(*latest_, columns)};
-    if (!latest_->answer.reply) return lines;
-    const Shown shown{static_cast<std::size_t>(invocation_.options.limit), columns, latest_->text};
-    const auto results = resultLines(latest_->answer.reply->data.view(), shown);
-    lines.insert(lines.end(), results.begin(), results.end());
-    return lines;
+    std::vector<std::string> lines = {"> " + printable(editor_.text())};
+    const auto width = screen_->size().columns - 1;
+    if (latest_) {
+      for (auto& line : outcomeLines(*latest_, width)) lines.push_back(std::move(line));
+    }
+    if (latest_ && latest_->answer.reply) {
+      const Shown shown{static_cast<std::size_t>(invocation_.options.limit), width, latest_->text};
+      for (auto& line : resultLines(latest_->answer, shown)) lines.push_back(std::move(line));
+    }
+    screen_->show(lines);
   }
 
   const Invocation& invocation_;
-  const bool screen_;
+  const bool atTerminal_;
+  // Before the client, whose thread leaves the signals to this one.
+  const std::unique_ptr<TerminalSignals> signals_ =
+      atTerminal_ ? std::make_unique<TerminalSignals>() : nullptr;
   Client client_;
   QueryRun run_;
+  std::optional<TerminalScreen> screen_;
   LineEditor editor_;
   std::optional<Outcome> latest_;
-  bool keyIsThere_ = false;
+  std::optional<Error> unreachable_;
+  int endingSignal_ = 0;
   int status_ = kAnswered;
 };
 
 }  // namespace
 
-int runType(const Invocation& invocation) { return TypingSession(invocation).run(); }
+int runType(const Invocation& invocation) {
+  int status = kAnswered;
+  int signal = 0;
+  {
+    TypingSession session(invocation);
+    status = session.run();
+    signal = session.endingSignal();
+  }
+  // The terminal is as it was: now it may happen.
+  if (signal != 0) ::raise(signal);
+  return status;
+}
 
 }  // namespace zelkorctl
