@@ -152,7 +152,7 @@ TEST(BagFetchTest, SaysWhyThereIsNoBag) {
       {R"({"url":null,"last_failure":{"time":992000,"reason":"r"},"next_attempt":null})",
        "fetching it failed 2 h 13 min ago: r"},
       {R"({"url":"u","last_failure":{"reason":7},"next_attempt":999999})",
-       "fetching u failed; next attempt in 0 s"},
+       "fetching u failed; the next query tries again"},
       {R"({"url":"u","last_failure":null,"next_attempt":1000300})",
        "fetching u has not come to an end; next attempt in 5 min"},
       {R"({"version":"4"})", "fetching it has not come to an end"},

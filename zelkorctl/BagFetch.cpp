@@ -33,16 +33,18 @@ std::string failureText(const json::object& failure, double now) {
 
 }  // namespace
 
-bool saysNoBag(const std::optional<Error>& error) {
-  return error && error->domain == kZLKErrorDomain && error->code == 1 &&
-         error->reason() == "timeout";
+bool mayMeanNoBag(const std::optional<Error>& error) {
+  if (!error || error->domain != kZLKErrorDomain || error->code != 1) return false;
+  // Further results and cards wait for no bag; without one they may have no address.
+  return error->reason() == "timeout" || error->reason() == "no URL";
 }
 
-std::optional<json::object> bagInStatus(std::string_view status) {
+std::optional<json::object> missingBagIn(std::string_view status) {
   const auto parsed = parseJson(status);
   const auto* object = parsed ? parsed->if_object() : nullptr;
   const auto* bag = object ? objectIn(*object, "bag") : nullptr;
-  return bag ? std::optional(*bag) : std::nullopt;
+  if (!bag || boolIn(*bag, "enabled")) return std::nullopt;
+  return *bag;
 }
 
 std::string bagFetchText(const json::object& bag, double now) {
@@ -50,7 +52,8 @@ std::string bagFetchText(const json::object& bag, double now) {
   const auto next = numberIn(bag, "next_attempt");
   auto text = "fetching " + printable(stringIn(bag, "url").value_or("it"));
   text += failure ? failureText(*failure, now) : " has not come to an end";
-  if (next) text += "; next attempt in " + spanText(*next - now);
+  if (next && *next > now) text += "; next attempt in " + spanText(*next - now);
+  if (next && *next <= now) text += "; the next query tries again";
   return text;
 }
 

@@ -12,11 +12,12 @@ namespace zelkorctl {
 
 // How the daemon's attempts to fetch the bag went, for when something fails for want of it.
 
-// Whether that is what the error means.
-bool saysNoBag(const std::optional<zelkor::Error>& error);
+// Whether the error may mean that.
+bool mayMeanNoBag(const std::optional<zelkor::Error>& error);
 
-// What the daemon's status says of the bag; nothing when it says nothing.
-std::optional<zelkor::json::object> bagInStatus(std::string_view status);
+// What the daemon's status says of a bag that is missing; nothing when there is one, or when it
+// says nothing.
+std::optional<zelkor::json::object> missingBagIn(std::string_view status);
 
 inline double secondsSince1970() {
   return std::chrono::duration<double>(std::chrono::system_clock::now().time_since_epoch()).count();

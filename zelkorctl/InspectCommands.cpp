@@ -45,7 +45,7 @@ int reportMissing(const Invocation& invocation, const ClientResult<T>& result) {
 // With why, as far as the daemon tells.
 int reportNoBag(const Invocation& invocation, Client& client, const Error& error) {
   const auto future = DiagnosticsClient(client).status();
-  const auto bag = bagInStatus(future.get().value.value_or(""));
+  const auto bag = missingBagIn(future.get().value.value_or(""));
   if (!bag) return reportError(invocation, error);
   if (invocation.options.json) {
     printJson(invocation, json::object{{"error", errorJson(error)}, {"bag", *bag}});
@@ -78,7 +78,7 @@ int runBag(const Invocation& invocation) {
   Client client(clientOptions(invocation.options));
   const auto future = client.bag();
   const auto& result = future.get();
-  if (saysNoBag(result.error)) return reportNoBag(invocation, client, *result.error);
+  if (mayMeanNoBag(result.error)) return reportNoBag(invocation, client, *result.error);
   if (!result.value) return reportMissing(invocation, result);
   printBag(invocation, *result.value);
   return kAnswered;

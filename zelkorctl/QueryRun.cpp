@@ -140,12 +140,12 @@ void QueryRun::send(const Query& query) {
             std::chrono::steady_clock::now() - start;
         Outcome outcome{name, kindOf(answer, shared->newest == queryId), time.count(), answer, {},
                         asked};
-        if (!saysNoBag(answer.error)) return shared->add(std::move(outcome));
+        if (!mayMeanNoBag(answer.error)) return shared->add(std::move(outcome));
         // Runs on the client's own thread, so the client is there.
         DiagnosticsClient(*client).status().then(
             [shared, outcome](const ClientResult<std::string>& status) {
               auto explained = outcome;
-              explained.bag = bagInStatus(status.value.value_or(""));
+              explained.bag = missingBagIn(status.value.value_or(""));
               shared->add(std::move(explained));
             });
       });

@@ -230,9 +230,10 @@ TEST_F(ToolTest, SaysThatTheOutputCouldNotBeWritten) {
 TEST_F(ToolTest, SaysWhyThereIsNoBag) {
   const auto noBag = [](sd_bus_message* call) {
     const auto asked = readCall(call);
+    const auto* reason = asked.kind == "card" ? "no URL" : "timeout";
     sd_bus_reply_method_return(call, "xa{sv}a{sv}", asked.queryId, 0, 3, "domain", "s",
                                "ZLKErrorDomain", "code", "x", std::int64_t{1}, "userInfo", "a{sv}",
-                               1, "reason", "s", "timeout");
+                               1, "reason", "s", reason);
   };
   daemon_.on("Request", noBag);
   daemon_.reply("Bag", "a{sv}a{sv}", 0, 3, "domain", "s", "ZLKErrorDomain", "code", "x",
@@ -244,6 +245,7 @@ TEST_F(ToolTest, SaysWhyThereIsNoBag) {
   for (const auto& words : {std::vector<std::string>{"search", "a"},
                             {"search", "a", "--as-typed"},
                             {"more", "a"},
+                            {"search", "a", "--kind=card"},
                             {"zkw"},
                             {"status"}}) {
     SCOPED_TRACE(testing::PrintToString(words));
@@ -259,10 +261,12 @@ TEST_F(ToolTest, SaysWhyThereIsNoBag) {
     EXPECT_THAT(out_.str(), AllOf(HasSubstr(R"("reason":"timeout"})"),
                                   HasSubstr(R"("bag":{"url":"https://a/bag")")));
   }
-  // A daemon that does not tell.
-  daemon_.reply("Status", "s", "{}");
-  EXPECT_EQ(run({"search", "a"}), kErrorReply);
-  EXPECT_THAT(out_.str(), AllOf(HasSubstr("timeout"), Not(HasSubstr("no bag"))));
+  // A daemon that does not tell, and one that has a bag by now.
+  for (const auto* status : {"{}", R"({"bag":{"url":"u","enabled":false,"last_failure":{}}})"}) {
+    daemon_.reply("Status", "s", status);
+    EXPECT_EQ(run({"search", "a"}), kErrorReply);
+    EXPECT_THAT(out_.str(), AllOf(HasSubstr("timeout"), Not(HasSubstr("no bag"))));
+  }
 }
 
 TEST_F(ToolTest, TypesEveryPrefixInOrder) {
