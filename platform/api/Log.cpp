@@ -8,7 +8,7 @@ void Logger::writeFormatted(LogLevel level, fmt::string_view format,
                             fmt::format_args arguments) const {
   fmt::memory_buffer buffer;
   fmt::vformat_to(std::back_inserter(buffer), format, arguments);
-  sink_->write(level, category_, {buffer.data(), buffer.size()});
+  sink_->writeFrom(format.data(), level, category_, {buffer.data(), buffer.size()});
 }
 
 std::string orNull(const std::optional<std::string>& text) { return text ? *text : "(null)"; }

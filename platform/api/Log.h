@@ -24,6 +24,13 @@ class LogSink {
   virtual bool showsPrivateData() const = 0;
   // `text` may hold line breaks; the sink makes one entry of it.
   virtual void write(LogLevel level, std::string_view category, std::string_view text) = 0;
+  // The same, for a sink that tells the places in the code apart: `place` is the address of the
+  // format string.
+  virtual void writeFrom(const void* place, LogLevel level, std::string_view category,
+                         std::string_view text) {
+    static_cast<void>(place);
+    write(level, category, text);
+  }
 };
 
 // A text that a person typed, a header dictionary, an identifier of a person: printed as <private>

@@ -5,6 +5,7 @@
 #include <sys/stat.h>
 
 #include <atomic>
+#include <cerrno>
 #include <cstdio>
 
 #include "platform/linux/files/Descriptor.h"
@@ -16,12 +17,19 @@ namespace {
 constexpr std::size_t kLogFileSize = 8 << 20;
 constexpr std::size_t kOldLogFiles = 4;
 
+// Makes the file when it is missing, closed to others from its first moment on. Throws when the
+// path has anything but a regular file, at which opening could also wait.
+void makeLogFile(const std::string& path) {
+  constexpr int kFlags = O_CREAT | O_WRONLY | O_APPEND | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK;
+  const Descriptor file(::open(path.c_str(), kFlags, 0600));
+  const int number = errno;
+  if (const auto error = FileLog::refusal(path)) throw spdlog::spdlog_ex(*error->reason());
+  if (!file) throw spdlog::spdlog_ex(path, number);
+}
+
 spdlog::file_event_handlers privateFileHandlers() {
   spdlog::file_event_handlers handlers;
-  // Closed to others from its first moment on, whatever the umask is.
-  handlers.before_open = [](const std::string& path) {
-    const Descriptor made(::open(path.c_str(), O_CREAT | O_EXCL | O_WRONLY | O_CLOEXEC, 0600));
-  };
+  handlers.before_open = makeLogFile;
   handlers.after_open = [](const std::string&, std::FILE* file) { ::fchmod(::fileno(file), 0600); };
   return handlers;
 }
@@ -31,6 +39,16 @@ spdlog::file_event_handlers privateFileHandlers() {
 struct FileLog::Complaint {
   std::atomic_flag made;
 };
+
+std::optional<Error> FileLog::refusal(const std::string& path) {
+  struct stat status {};
+  if (path.empty() || ::lstat(path.c_str(), &status) != 0 || S_ISREG(status.st_mode)) {
+    return std::nullopt;
+  }
+  auto error = posixError(EINVAL);
+  error.userInfo["reason"] = path + " is no regular file";
+  return error;
+}
 
 FileLog::FileLog(const std::string& path) : complaint_(std::make_unique<Complaint>()) {
   try {

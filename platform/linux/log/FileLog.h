@@ -1,8 +1,10 @@
 #pragma once
 
 #include <memory>
+#include <optional>
 #include <string>
 
+#include "base/Error.h"
 #include "platform/linux/log/LogOutput.h"
 
 namespace spdlog::sinks {
@@ -16,9 +18,13 @@ namespace zelkord {
 // `write` returns.
 //
 // Threading: any thread.
-// Errors: when the file cannot be opened or written, standard error says so once.
+// Errors: when the file cannot be opened or written, or is no regular file but a link, a pipe, a
+// device, standard error says so once. Opening waits for nobody.
 class FileLog final : public LogOutput {
  public:
+  // Why that path can never be a log file; none when it can, or is empty. Makes nothing.
+  static std::optional<Error> refusal(const std::string& path);
+
   explicit FileLog(const std::string& path);
   ~FileLog() override;
 

@@ -4,13 +4,16 @@
 #include <memory>
 #include <string>
 
+#include "base/Mutex.h"
 #include "platform/api/Clock.h"
 #include "platform/api/Log.h"
+#include "platform/linux/log/LogFolding.h"
 #include "platform/linux/log/LogOutput.h"
 
 namespace zelkord {
 
-// The log of the daemon: a level, a rule about private data, and one output.
+// The log of the daemon: a level, a rule about private data, and one output. What a single place in
+// the code repeats, or writes too much of, is folded; no entry is longer than kLongestLogLine.
 //
 // Threading: any thread; `showPrivateDataWhen` before other threads write.
 // Ownership: the clock, and what the rule refers to, outlive it.
@@ -29,14 +32,23 @@ class LinuxLog final : public LogSink {
     return level >= level_ || level == LogLevel::Fault;
   }
   bool showsPrivateData() const override { return rule_ && rule_(); }
-  void write(LogLevel level, std::string_view category, std::string_view text) override;
-  void flush() { output_->flush(); }
+  void write(LogLevel level, std::string_view category, std::string_view text) override {
+    writeFrom(nullptr, level, category, text);
+  }
+  void writeFrom(const void* place, LogLevel level, std::string_view category,
+                 std::string_view text) override;
+  // Tells what is folded, too.
+  void flush();
 
  private:
+  void _output(LogLevel level, std::string_view category, std::string_view text);
+
   const std::unique_ptr<LogOutput> output_;
   const Clock& clock_;
   const LogLevel level_;
   std::function<bool()> rule_;
+  Mutex mutex_;
+  LogFolding folding_ ZK_GUARDED_BY(mutex_);
 };
 
 }  // namespace zelkord

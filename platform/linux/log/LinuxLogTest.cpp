@@ -1,10 +1,14 @@
 #include <gmock/gmock.h>
+#include <signal.h>
+#include <sys/resource.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include "platform/linux/log/FileLog.h"
 #include "platform/linux/log/JournalLog.h"
 #include "platform/linux/log/LinuxLog.h"
 #include "platform/linux/log/LogLine.h"
+#include "platform/testing/ForkedProcess.h"
 #include "platform/testing/ManualTimeline.h"
 #include "platform/testing/TemporaryDirectory.h"
 
@@ -78,10 +82,120 @@ TEST(FileLogTest, AppendsAndRotates) {
 }
 
 TEST(FileLogTest, SurvivesAFullDiskAndAMissingDirectory) {
-  for (const char* path : {"/dev/full", "/dev/null/zelkord.log"}) {
+  const TemporaryDirectory root;
+  EXPECT_TRUE(succeedsInChild([&] {
+    ::signal(SIGXFSZ, SIG_IGN);
+    const rlimit limit{1000, 1000};
+    ::setrlimit(RLIMIT_FSIZE, &limit);
+    for (const auto& path : {root / "zelkord.log", root / "missing/zelkord.log"}) {
+      FileLog log(path);
+      log.write({}, LogLevel::Error, "C", std::string(5000, 'x'));
+      log.flush();
+    }
+    return true;
+  }));
+}
+
+// None of these may be opened: opening a pipe waits, and writing to the rest reaches others.
+TEST(FileLogTest, WritesToARegularFileOnly) {
+  const TemporaryDirectory root;
+  root.write("victim", "");
+  ASSERT_EQ(::symlink((root / "victim").c_str(), (root / "link").c_str()), 0);
+  ASSERT_EQ(::symlink((root / "nowhere").c_str(), (root / "dangling").c_str()), 0);
+  ASSERT_EQ(::mkfifo((root / "pipe").c_str(), 0600), 0);
+  for (const auto& path :
+       {root / "link", root / "dangling", root / "pipe", root.path(), std::string("/dev/full")}) {
+    SCOPED_TRACE(path);
+    testing::internal::CaptureStderr();
     FileLog log(path);
-    log.write({}, LogLevel::Error, "C", "lost");
-    log.flush();
+    log.write({}, LogLevel::Error, "C", "text");
+    log.write({}, LogLevel::Error, "C", "text");
+    EXPECT_EQ(testing::internal::GetCapturedStderr(),
+              "zelkord: no log: " + path + " is no regular file\n");
+    EXPECT_TRUE(FileLog::refusal(path));
+  }
+  EXPECT_EQ(root.read("victim"), "");
+  EXPECT_FALSE(root.has("nowhere"));
+  EXPECT_FALSE(FileLog::refusal(root / "victim") || FileLog::refusal(root / "new"));
+}
+
+// The lines of a log on a timeline.
+struct FoldingBed {
+  class Lines final : public LogOutput {
+   public:
+    explicit Lines(std::vector<std::string>& to) : to_(to) {}
+    void write(WallTime time, LogLevel level, std::string_view category,
+               std::string_view text) override {
+      EXPECT_LE(logLine(time, level, category, text).size(), kLongestLogLine);
+      to_.emplace_back(text);
+    }
+    void flush() override {}
+
+   private:
+    std::vector<std::string>& to_;
+  };
+
+  ManualTimeline timeline;
+  std::vector<std::string> lines;
+  LinuxLog log{std::make_unique<Lines>(lines), timeline, LogLevel::Default};
+  Logger logger{log, "Zelkor_Feedback_Storage"};
+};
+
+TEST(LogFoldingTest, EqualLinesOfAPlaceAreToldOnceASecond) {
+  FoldingBed bed;
+  for (int i = 0; i < 1000; ++i) bed.logger.error("no room for {}", "records");
+  EXPECT_THAT(bed.lines, testing::AllOf(testing::SizeIs(10), testing::Each("no room for records")));
+  for (int i = 0; i < 10; ++i) bed.logger.error("no {} for records", "room");  // another place
+  EXPECT_EQ(bed.lines.size(), 20u);
+  bed.lines.clear();
+  bed.timeline.advance(1s);
+  EXPECT_THAT(bed.lines, testing::IsEmpty());  // nothing wakes up for it
+  bed.logger.notice("another line");
+  EXPECT_THAT(bed.lines, ElementsAre("repeated 990 times: no room for records", "another line"));
+  for (int i = 0; i < 12; ++i) bed.logger.error("at the end");
+  bed.log.flush();
+  bed.log.flush();
+  EXPECT_EQ(bed.lines.size(), 2u + 10 + 1);
+  EXPECT_EQ(bed.lines.back(), "repeated 2 times: at the end");
+}
+
+TEST(LogFoldingTest, APlaceWhoseLinesDifferIsBoundedToo) {
+  FoldingBed bed;
+  for (int i = 0; i < 550'000; ++i) bed.logger.error("image {} refused", i);
+  EXPECT_EQ(bed.lines.size(), LogFolding::kLines);
+  bed.timeline.advance(1s);
+  bed.logger.error("image {} refused", 7);
+  ASSERT_EQ(bed.lines.size(), LogFolding::kLines + 2);
+  EXPECT_EQ(bed.lines[LogFolding::kLines],
+            "548000 more lines like this one left out: image 549999 refused");
+}
+
+TEST(LogFoldingTest, LeavesAloneWhatManyTypingClientsCause) {
+  FoldingBed bed;
+  for (int key = 0; key < 3'000; ++key) {
+    bed.logger.notice("search {} begins", key);
+    bed.logger.notice("search {} ends", key);
+    if (key % 1000 == 999) bed.timeline.advance(1s);
+  }
+  EXPECT_EQ(bed.lines.size(), 6'000u);
+}
+
+TEST(LogFoldingTest, LongTextsAreCutAtACharacter) {
+  FoldingBed bed;
+  std::string text(64 * 1024, 'x');
+  for (int shift = 0; shift < 4; ++shift) {
+    for (std::size_t i = static_cast<std::size_t>(shift); i + 1 < text.size(); i += 2) {
+      text.replace(i, 2, "\u00E9");
+    }
+    bed.logger.error("{}", text);
+  }
+  bed.logger.error("{}", std::string(64 * 1024, '\n'));
+  bed.logger.error("{}", std::string(3'500, 'y'));
+  for (const auto& line : bed.lines) {
+    const auto mark = line.find("... (");
+    EXPECT_NE(mark == std::string::npos, line.size() != 3'500) << line.size();
+    const auto last = mark == std::string::npos ? line.size() : mark;
+    EXPECT_NE(line[last - 1], '\xC3') << "half a character";
   }
 }
 

@@ -19,6 +19,24 @@ void appendEscaped(std::string& line, std::string_view text) {
   }
 }
 
+// What a line has besides its text: stamp, level, category, and how much is missing.
+constexpr std::size_t kBesideTheText = 160;
+
+bool isEscaped(char c) { return c == '\n' || c == '\r' || c == '\t' || c == '\\'; }
+
+bool isContinuation(char c) { return (static_cast<unsigned char>(c) & 0xC0) == 0x80; }
+
+// Of the text, as many bytes as a line takes.
+std::size_t lengthThatFits(std::string_view text) {
+  std::size_t room = kLongestLogLine - kBesideTheText;
+  for (std::size_t length = 0; length < text.size(); ++length) {
+    const std::size_t size = isEscaped(text[length]) ? 2 : 1;
+    if (size > room) return length;
+    room -= size;
+  }
+  return text.size();
+}
+
 std::string utcStamp(WallTime time) {
   const auto seconds = std::chrono::floor<std::chrono::seconds>(time);
   const auto micros = std::chrono::floor<std::chrono::microseconds>(time - seconds).count();
@@ -56,6 +74,13 @@ std::optional<LogLevel> logLevelFromName(std::string_view name) {
 
 std::string_view logCategoryName(std::string_view category) {
   return category.empty() ? "default" : category;
+}
+
+std::string shortenedLogText(std::string_view text) {
+  auto length = lengthThatFits(text);
+  if (length == text.size()) return std::string(text);
+  while (length > 0 && isContinuation(text[length])) --length;
+  return fmt::format("{}... ({} more bytes)", text.substr(0, length), text.size() - length);
 }
 
 std::string logLine(WallTime time, LogLevel level, std::string_view category,

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstddef>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -16,6 +17,13 @@ std::optional<LogLevel> logLevelFromName(std::string_view name);
 
 // The default log has no category of its own.
 std::string_view logCategoryName(std::string_view category);
+
+// No line of a file is longer, nor is what goes into the journal.
+inline constexpr std::size_t kLongestLogLine = 4096;
+
+// The text, or, when it would make too long a line, its beginning up to a whole character and how
+// much is missing.
+std::string shortenedLogText(std::string_view text);
 
 // "2026-11-22T19:32:01.123456Z error Zelkor_Connection text", UTC, without a line break at the end.
 // Line feed, carriage return, tab and backslash in the text are written as in C, so that an entry
