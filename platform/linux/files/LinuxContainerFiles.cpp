@@ -8,6 +8,7 @@
 #include <cerrno>
 
 #include "platform/linux/files/Descriptor.h"
+#include "platform/linux/queues/BlockingScope.h"
 
 namespace zelkord {
 namespace {
@@ -21,6 +22,7 @@ class LinuxAppendFile final : public AppendFile {
 
   std::optional<Error> append(std::string_view bytes) override {
     if (broken_) return posixError(EIO);
+    const BlockingScope blocking;
     if (writeFully(file_.get(), bytes)) {
       length_ += bytes.size();
       return std::nullopt;

@@ -10,6 +10,7 @@
 
 #include "platform/linux/files/Descriptor.h"
 #include "platform/linux/files/LinuxFileHandle.h"
+#include "platform/linux/queues/BlockingScope.h"
 
 namespace zelkord {
 namespace {
@@ -108,6 +109,7 @@ std::unique_ptr<FileHandle> LinuxFileManager::openForReading(const std::string& 
 
 std::optional<Error> LinuxFileManager::writeAtomically(const std::string& path,
                                                        std::string_view bytes, unsigned mode) {
+  const BlockingScope blocking;
   const auto directory = parentOf(path);
   auto unfinished = directory + "/" + std::string(kUnfinishedPrefix) + "XXXXXX";
   Descriptor file(::mkostemp(unfinished.data(), O_CLOEXEC));

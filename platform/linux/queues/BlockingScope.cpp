@@ -4,7 +4,9 @@
 
 namespace zelkord {
 
-BlockingScope::BlockingScope() : worker_(WorkerPool::beginBlocking()) {}
+BlockingScope::BlockingScope() : worker_(WorkerPool::beginBlocking(nullptr)) {}
+
+BlockingScope::BlockingScope(Refusable) : worker_(WorkerPool::beginBlocking(&isRefused_)) {}
 
 BlockingScope::~BlockingScope() {
   if (worker_) WorkerPool::endBlocking(*worker_);

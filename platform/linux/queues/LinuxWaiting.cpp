@@ -31,7 +31,8 @@ bool LinuxSemaphore::wait(Duration timeout) {
     if (take()) return true;
   }
   if (timeout <= Duration::zero()) return false;
-  const BlockingScope blocking;
+  const BlockingScope blocking(BlockingScope::Refusable::Yes);
+  if (blocking.isRefused()) return false;
   const auto deadline = waitDeadline(timeout);
   const MutexLock lock(state.mutex);
   bool inTime = true;
@@ -65,7 +66,8 @@ bool LinuxGroup::wait(Duration timeout) {
     if (state.count == 0) return true;
   }
   if (timeout <= Duration::zero()) return false;
-  const BlockingScope blocking;
+  const BlockingScope blocking(BlockingScope::Refusable::Yes);
+  if (blocking.isRefused()) return false;
   const auto deadline = waitDeadline(timeout);
   const MutexLock lock(state.mutex);
   bool inTime = true;

@@ -13,7 +13,7 @@ namespace zelkord {
 // its owner at once.
 //
 // Time-outs are real time without suspend: a device that sleeps meanwhile wakes with the rest of
-// the time-out ahead.
+// the time-out ahead. A worker that is one too many to wait does not: its time-out passes at once.
 struct WaitState {
   Mutex mutex;
   CondVar changed;

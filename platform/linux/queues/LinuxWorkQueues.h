@@ -1,6 +1,7 @@
 #pragma once
 
 #include <array>
+#include <functional>
 #include <memory>
 #include <string>
 
@@ -41,6 +42,8 @@ class LinuxWorkQueues final : public WorkQueues {
   void stopMainLoop();
 
   WorkerPool::Counts workers() const { return pool_->counts(); }
+  // See WorkerPool.
+  void onRefusedWait(std::function<void()> report) { pool_->onRefusedWait(std::move(report)); }
 
  private:
   const double rate_;

@@ -48,6 +48,57 @@ TEST_F(LinuxWorkQueuesTest, WaitersOfOneSecondAreAllAnsweredAboutThen) {
   EXPECT_LT(clock_.realNow() - start, 10s);  // two at a time would take 16 s
 }
 
+TEST_F(LinuxWorkQueuesTest, NineHundredWaitersAreAnsweredInTimeAndDelayNobody) {
+  constexpr int kWaiters = 900;
+  const auto never = queues_.makeSemaphore(0);
+  std::vector<std::unique_ptr<SerialQueue>> waiters;
+  std::atomic<int> answered = 0;
+  const auto start = clock_.realNow();
+  for (int i = 0; i < kWaiters; ++i) {
+    waiters.push_back(queues_.makeSerialQueue("waiter"));
+    waiters.back()->async([&] {
+      EXPECT_FALSE(never->wait(3s));
+      ++answered;
+    });
+  }
+  EXPECT_TRUE(eventually([&] { return queues_.workers().blocked == kWaiters; }));
+  std::atomic<bool> served = false;
+  const auto other = queues_.makeSerialQueue("other");
+  other->async([&] { served = true; });
+  EXPECT_TRUE(eventually([&] { return served.load(); }));
+  EXPECT_EQ(answered, 0);
+  EXPECT_TRUE(eventually([&] { return answered == kWaiters; }));
+  EXPECT_LT(clock_.realNow() - start, 5900ms);  // those that find no worker begin after 3 s
+}
+
+TEST_F(LinuxWorkQueuesTest, AWaitTooManyEndsAtOnceAndIsReported) {
+  constexpr int kWaiters = WorkerPool::kMaximumWaiting;
+  constexpr int kTooMany = 200;
+  std::atomic<int> refused = 0, reported = 0;
+  queues_.onRefusedWait([&] { ++reported; });
+  const auto gate = queues_.makeSemaphore(0);
+  const auto group = queues_.makeGroup();
+  group->enter();
+  std::vector<std::unique_ptr<SerialQueue>> waiters;
+  for (int i = 0; i < kWaiters + kTooMany; ++i) {
+    waiters.push_back(queues_.makeSerialQueue("waiter"));
+    waiters.back()->async([&, i] {
+      if (!(i % 2 == 0 ? gate->wait(20s) : group->wait(20s))) ++refused;
+    });
+  }
+  EXPECT_TRUE(eventually([&] { return refused == kTooMany; }));
+  EXPECT_EQ(reported, kTooMany);
+  EXPECT_EQ(queues_.workers().blocked, WorkerPool::kMaximumWaiting);
+  EXPECT_FALSE(gate->wait(1ms));  // whoever is no worker may wait as before
+  bool ran = false;
+  const auto other = queues_.makeSerialQueue("other");
+  other->async([&] { ran = true; });
+  other->sync([&] { EXPECT_TRUE(ran); });
+  group->leave();
+  gate->signal(kWaiters);
+  EXPECT_TRUE(eventually([&] { return queues_.workers().blocked == 0; }));
+}
+
 TEST_F(LinuxWorkQueuesTest, WaitersLeaveWorkersToOthers) {
   constexpr int kWaiters = 64;
   const auto gate = queues_.makeSemaphore(0);

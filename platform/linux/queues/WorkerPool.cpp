@@ -148,20 +148,42 @@ void WorkerPool::_count(const PoolWorker& worker, int change) {
   }
 }
 
-PoolWorker* WorkerPool::beginBlocking() {
+PoolWorker* WorkerPool::beginBlocking(bool* isRefused) {
   PoolWorker* const worker = tlsPoolWorker;
   if (!worker || worker->blocking_) return nullptr;
-  worker->blocking_ = true;
   WorkerPool& pool = worker->pool_;
+  if (pool._tryBlock(*worker, isRefused != nullptr)) return worker;
+  *isRefused = true;
+  pool._reportRefusedWait();
+  return nullptr;
+}
+
+void WorkerPool::_reportRefusedWait() {
+  std::function<void()> report;
+  {
+    const MutexLock lock(mutex_);
+    report = reportRefusedWait_;
+  }
+  if (report) report();
+}
+
+void WorkerPool::onRefusedWait(std::function<void()> report) {
+  const MutexLock lock(mutex_);
+  reportRefusedWait_.swap(report);
+}
+
+bool WorkerPool::_tryBlock(PoolWorker& worker, bool mayRefuse) {
   Start start;
   {
-    const MutexLock lock(pool.mutex_);
-    pool._count(*worker, -1);
-    ++pool.counts_.blocked;
-    start = pool._startOne();
+    const MutexLock lock(mutex_);
+    if (mayRefuse && counts_.blocked >= kMaximumWaiting) return false;
+    _count(worker, -1);
+    ++counts_.blocked;
+    start = _startOne();
   }
-  pool._perform(start);
-  return worker;
+  worker.blocking_ = true;
+  _perform(start);
+  return true;
 }
 
 void WorkerPool::endBlocking(PoolWorker& worker) {

@@ -3,6 +3,7 @@
 #include <array>
 #include <cstdint>
 #include <deque>
+#include <functional>
 #include <memory>
 #include <optional>
 #include <vector>
@@ -40,6 +41,9 @@ class PoolWorker {
 // demand, at most kMaximumWorkers, and leave after kIdleLife without work, except for the last one,
 // which sleeps for good: an idle pool wakes nobody.
 //
+// While kMaximumWaiting are blocked, waits that can do without are refused, so that the workers
+// beyond them are left to what never waits: authentication, diagnostics, leaving.
+//
 // The highest quality that waits goes first, but every 16th turn goes to the lowest. Utility and
 // Background together get at most `limit` - 1 workers, so that one is always free for the rest.
 //
@@ -47,7 +51,8 @@ class PoolWorker {
 // Errors: when no thread can be made, the work waits for a worker that becomes free.
 class WorkerPool final : public Executor {
  public:
-  static constexpr unsigned kMaximumWorkers = 512;
+  static constexpr unsigned kMaximumWorkers = 2048;
+  static constexpr unsigned kMaximumWaiting = 1024;
   static constexpr Duration kIdleLife = 5s;
 
   struct Counts {
@@ -65,9 +70,12 @@ class WorkerPool final : public Executor {
 
   unsigned limit() const { return limit_; }
   Counts counts() const;
+  // Called at each refused wait, on its thread; null: nobody is told.
+  void onRefusedWait(std::function<void()> report);
 
-  // Null when the calling thread is no worker or is blocked already.
-  static PoolWorker* beginBlocking();
+  // Null when the calling thread is no worker or is blocked already, and when its wait is refused,
+  // which only one that asks `isRefused` can be.
+  static PoolWorker* beginBlocking(bool* isRefused);
   static void endBlocking(PoolWorker& worker);
 
  private:
@@ -86,6 +94,8 @@ class WorkerPool final : public Executor {
   std::optional<QualityOfService> _pick() const ZK_REQUIRES(mutex_);
   bool _mayStart(QualityOfService quality) const ZK_REQUIRES(mutex_);
   Start _startOne() ZK_REQUIRES(mutex_);
+  bool _tryBlock(PoolWorker& worker, bool mayRefuse);
+  void _reportRefusedWait();
   void _perform(Start start);
   void _count(const PoolWorker& worker, int change) ZK_REQUIRES(mutex_);
 
@@ -101,6 +111,7 @@ class WorkerPool final : public Executor {
   unsigned runningLow_ ZK_GUARDED_BY(mutex_) = 0;  // of those, with Utility or Background
   std::uint64_t turn_ ZK_GUARDED_BY(mutex_) = 0;
   bool stopped_ ZK_GUARDED_BY(mutex_) = false;
+  std::function<void()> reportRefusedWait_ ZK_GUARDED_BY(mutex_);
 };
 
 }  // namespace zelkord

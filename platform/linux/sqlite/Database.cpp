@@ -4,8 +4,15 @@
 #include <sqlite3.h>
 #include <unistd.h>
 
+#include <algorithm>
+#include <thread>
+
+#include "platform/linux/queues/BlockingScope.h"
+
 namespace zelkord::sqlite {
 namespace {
+
+constexpr auto kLongestBusySleep = 25ms;
 
 Failure failureOf(sqlite3* database, int code) {
   return {code, database ? sqlite3_errmsg(database) : sqlite3_errstr(code)};
@@ -46,25 +53,36 @@ bool Failure::isBusy() const {
   return primary == SQLITE_BUSY || primary == SQLITE_LOCKED;
 }
 
+int BusyWait::sleep(void* self, int attempt) {
+  auto& wait = *static_cast<BusyWait*>(self);
+  const auto now = std::chrono::steady_clock::now();
+  if (attempt == 0) wait.began_ = now;
+  const Duration left = wait.limit_ - (now - wait.began_);
+  if (left <= Duration::zero()) return 0;
+  const BlockingScope blocking;
+  std::this_thread::sleep_for(
+      std::min<Duration>({left, kLongestBusySleep, std::chrono::milliseconds(attempt + 1)}));
+  return 1;
+}
+
 void Database::Closer::operator()(sqlite3* database) const { sqlite3_close_v2(database); }
 
 std::optional<Database> Database::open(const std::string& path, Failure* failure,
                                        const DatabaseOptions& options) {
+  const BlockingScope blocking;
   makePrivateFile(path);
   sqlite3* raw = nullptr;
   constexpr int kFlags =
       SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE | SQLITE_OPEN_FULLMUTEX | SQLITE_OPEN_NOFOLLOW;
   const int code = sqlite3_open_v2(path.c_str(), &raw, kFlags, nullptr);
-  Database database(raw);
+  Database database(raw, std::make_unique<BusyWait>(options.busyTimeout));
   if (code != SQLITE_OK) {
     if (failure) *failure = failureOf(raw, code);
     return std::nullopt;
   }
   sqlite3_extended_result_codes(raw, 1);
   trustOnlyTables(raw, options.isShared);
-  sqlite3_busy_timeout(
-      raw, static_cast<int>(
-               std::chrono::duration_cast<std::chrono::milliseconds>(options.busyTimeout).count()));
+  sqlite3_busy_handler(raw, &BusyWait::sleep, database.busyWait_.get());
   auto problem = database.execute(journalOf(options));
   if (!problem) return database;
   if (failure) *failure = std::move(*problem);
@@ -77,6 +95,7 @@ std::optional<Failure> Database::execute(const char* sql) {
 }
 
 std::optional<Failure> Database::transaction(FunctionRef<std::optional<Failure>()> work) {
+  const BlockingScope blocking;
   if (auto failure = execute("BEGIN IMMEDIATE")) return failure;
   auto failure = work();
   if (!failure) failure = execute("COMMIT");

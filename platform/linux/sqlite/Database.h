@@ -1,5 +1,6 @@
 #pragma once
 
+#include <chrono>
 #include <cstdint>
 #include <memory>
 #include <optional>
@@ -74,7 +75,21 @@ struct DatabaseOptions {
   bool isShared = false;       // with other programs: the journal stays as they want it
 };
 
-// A SQLite database in a file of mode 0600, made when missing.
+// How a database waits for a lock that somebody else holds: in short sleeps, as a worker that is
+// blocked. Threading: the database's thread.
+class BusyWait final {
+ public:
+  explicit BusyWait(Duration limit) : limit_(limit) {}
+  // SQLite's busy handler. `attempt` counts from 0; zero when the time is over.
+  static int sleep(void* self, int attempt);
+
+ private:
+  const Duration limit_;  // real time
+  std::chrono::steady_clock::time_point began_;
+};
+
+// A SQLite database in a file of mode 0600, made when missing. Opening it and its transactions
+// count as blocking, and so does every wait for somebody else's lock.
 //
 // Threading: one thread at a time.
 // Errors: as values; nothing throws.
@@ -98,8 +113,10 @@ class Database final {
     void operator()(sqlite3* database) const;
   };
 
-  explicit Database(sqlite3* database) : database_(database) {}
+  Database(sqlite3* database, std::unique_ptr<BusyWait> busyWait)
+      : busyWait_(std::move(busyWait)), database_(database) {}
 
+  std::unique_ptr<BusyWait> busyWait_;  // SQLite refers to it
   std::unique_ptr<sqlite3, Closer> database_;
 };
 
