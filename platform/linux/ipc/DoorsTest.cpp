@@ -158,19 +158,45 @@ TEST(BusDoorTest, OnlyTheConnectionInterfaceBeginsAConnection) {
   EXPECT_EQ(client.replyText(), "connected");
 }
 
-TEST(BusDoorTest, ANameThatIsTakenFailsAndLeavesTheSocketAlone) {
+TEST(BusDoorTest, ANameOrSocketThatIsTakenFailsAndLeavesTheOtherOnesAlone) {
   IpcTestServer server(true);
   ASSERT_FALSE(server.listen());
-  SdBusOptions options;
-  options.runtimeDirectory = server.directory.path() + "/run";
-  options.usesHandedOverSocket = false;
-  options.sessionBusAddress = server.bus->address();
-  SdBusInterprocess second(server.queues, server.log, options);
-  const auto error = second.listen(kTestService, ipcTestConfiguration(), server.delegate);
-  ASSERT_TRUE(error);
-  EXPECT_EQ(error->code, EEXIST);
+  for (const auto& [folder, code] : {std::pair{"/other", EEXIST}, {"/run", EADDRINUSE}}) {
+    SdBusOptions options;
+    options.runtimeDirectory = server.directory.path() + folder;
+    options.usesHandedOverSocket = false;
+    options.sessionBusAddress = server.bus->address();
+    SdBusInterprocess second(server.queues, server.log, options);
+    const auto error = second.listen(kTestService, ipcTestConfiguration(), server.delegate);
+    ASSERT_TRUE(error);
+    EXPECT_EQ(error->code, code);
+  }
+  EXPECT_FALSE(std::filesystem::exists(server.directory.path() + "/other/socket"));
   auto client = server.socketClient();
   EXPECT_EQ(client.call(kTestInterface, "Echo", "s", ""), "");
+}
+
+// Whoever waits for the name and then takes the socket must find it there.
+TEST(BusDoorTest, TheNameIsNotSeenBeforeTheSocketListens) {
+  IpcTestServer server(true, [](SdBusOptions& options) {
+    options.socketName = std::string(200, 'x');  // none can be made
+  });
+  auto watcher = server.busClient();
+  int changes = 0;
+  const auto count = [](sd_bus_message*, void* to, sd_bus_error*) {
+    ++*static_cast<int*>(to);
+    return 0;
+  };
+  const char* rule = "type='signal',member='NameOwnerChanged',arg0='com.quenta.zelkord'";
+  ASSERT_GE(sd_bus_add_match(watcher.bus(), nullptr, rule, count, &changes), 0);
+  EXPECT_TRUE(server.listen());
+  // Whatever came before the answer is here with it.
+  EXPECT_GE(sd_bus_call_method(watcher.bus(), "org.freedesktop.DBus", "/org/freedesktop/DBus",
+                               "org.freedesktop.DBus", "GetId", nullptr, nullptr, ""),
+            0);
+  while (sd_bus_process(watcher.bus(), nullptr) > 0) {
+  }
+  EXPECT_EQ(changes, 0);
 }
 
 TEST(BusDoorTest, WithoutABusTheSocketIsServed) {

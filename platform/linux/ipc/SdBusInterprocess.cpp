@@ -109,18 +109,9 @@ std::optional<Error> SdBusInterprocess::listen(const std::string& name,
                                                ListenerConfiguration configuration,
                                                std::shared_ptr<ListenerDelegate> delegate) {
   configuration = withNotifications(std::move(configuration), name);
-  BusName onBus;
   const auto& options = context_.options;
-  if (options.usesSessionBus) {
-    onBus = acquireBusName(options.sessionBusAddress, name);
-    if (onBus.outcome == BusName::Outcome::Taken) {
-      return transportError(EEXIST, "the name " + name + " is taken on the session bus");
-    }
-    if (onBus.outcome == BusName::Outcome::NoBus) {
-      context_.log.error("no session bus, the private socket alone is served: {}",
-                         std::strerror(onBus.error));
-    }
-  }
+  // Whoever sees the name finds the socket, and whom the socket answers finds the name: it listens
+  // before the name is asked for, and is served after it is ours.
   auto socket = options.usesHandedOverSocket ? ListeningSocket::handedOver() : std::nullopt;
   if (!socket) {
     const auto path = options.runtimeDirectory + "/" + options.socketName;
@@ -130,6 +121,17 @@ std::optional<Error> SdBusInterprocess::listen(const std::string& name,
                             path + ": " + std::strerror(static_cast<int>(error->code)));
     }
     socket.emplace(std::get<ListeningSocket>(std::move(made)));
+  }
+  BusName onBus;
+  if (options.usesSessionBus) {
+    onBus = acquireBusName(options.sessionBusAddress, name);
+    if (onBus.outcome == BusName::Outcome::Taken) {
+      return transportError(EEXIST, "the name " + name + " is taken on the session bus");
+    }
+    if (onBus.outcome == BusName::Outcome::NoBus) {
+      context_.log.error("no session bus, the private socket alone is served: {}",
+                         std::strerror(onBus.error));
+    }
   }
   loop_.sync([&] {
     const auto service = name + ".Service1";
