@@ -8,6 +8,7 @@
 
 #include "corezelkor/Constants.h"
 #include "platform/linux/LinuxPlatform.h"
+#include "platform/linux/process/ProcessStart.h"
 #include "platform/linux/process/StartMemory.h"
 #include "zelkord/core/CommandLine.h"
 #include "zelkord/core/Daemon.h"
@@ -42,6 +43,7 @@ int serve(const zelkord::CommandLine& line) {
   const auto refused = daemon.start();
   // Nothing is torn down: work under way refers to the graph, and the process's end is its end.
   if (refused) host->platform().process.exit(fail(*refused));
+  zelkord::admitSignalsOfLeaving();
   const auto started = host->platform().queues.main().after(
       kStartTime, [] { zelkord::releaseStartMemory(); }, zelkord::TimeBase::Real);
   host->platform().process.runMainLoop();
@@ -51,6 +53,7 @@ int serve(const zelkord::CommandLine& line) {
 }  // namespace
 
 int main(int count, char** arguments) {
+  zelkord::prepareProcess();
   zelkord::keepHeapSmall();
   const auto parsed = zelkord::parseCommandLine({arguments + 1, arguments + count});
   if (const auto* problem = std::get_if<std::string>(&parsed)) {

@@ -1,4 +1,8 @@
 #include <gtest/gtest.h>
+#include <signal.h>
+#include <sys/prctl.h>
+#include <sys/resource.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <cstdio>
@@ -7,9 +11,11 @@
 #include <iterator>
 
 #include "platform/linux/process/LinuxProcess.h"
+#include "platform/linux/process/ProcessStart.h"
 #include "platform/linux/process/SystemRandom.h"
 #include "platform/linux/process/TraceMarker.h"
 #include "platform/linux/queues/LinuxWorkQueues.h"
+#include "platform/testing/ForkedProcess.h"
 #include "platform/testing/RecordingLog.h"
 
 namespace zelkord {
@@ -33,6 +39,39 @@ TEST(LinuxProcessTest, ExitRunsItsHooksInOrderAndNothingElse) {
   };
   EXPECT_EXIT(run(false), testing::ExitedWithCode(3), "^counters log end$");
   EXPECT_EXIT(run(true), testing::ExitedWithCode(4), "^counters log$");
+}
+
+TEST(ProcessStartTest, RaisesTheDescriptorLimitAsFarAsItGoes) {
+  struct Case {
+    rlimit before;
+    rlim_t most;
+    rlim_t after;
+  };
+  for (const auto& test : {Case{{256, 4096}, 65'536, 4096}, Case{{256, 4096}, 1024, 1024},
+                           Case{{2048, 4096}, 1024, 2048}}) {
+    SCOPED_TRACE(test.after);
+    EXPECT_TRUE(succeedsInChild([&] {
+      rlimit now{};
+      return ::setrlimit(RLIMIT_NOFILE, &test.before) == 0 &&
+             raiseDescriptorLimit(test.most) == test.after &&
+             ::getrlimit(RLIMIT_NOFILE, &now) == 0 && now.rlim_cur == test.after &&
+             now.rlim_max == test.before.rlim_max;
+    }));
+  }
+}
+
+TEST(ProcessStartTest, SignalsOfLeavingWaitAndNobodyLooksIntoTheProcess) {
+  EXPECT_TRUE(succeedsInChild([] {
+    prepareProcess();
+    ::raise(SIGTERM);
+    ::raise(SIGINT);
+    const bool isClosed = ::umask(0) == 0077 && ::prctl(PR_GET_DUMPABLE, 0, 0, 0, 0) == 0;
+    const auto leave = [](int) { ::_exit(0); };
+    if (!isClosed || ::signal(SIGTERM, leave) == SIG_ERR || ::signal(SIGINT, leave) == SIG_ERR)
+      return false;
+    admitSignalsOfLeaving();
+    return false;
+  }));
 }
 
 TEST(TraceMarkerTest, WritesOneLineACode) {

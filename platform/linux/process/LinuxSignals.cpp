@@ -1,13 +1,17 @@
 #include "platform/linux/process/LinuxSignals.h"
 
+#include <poll.h>
 #include <signal.h>
 #include <sys/eventfd.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <atomic>
 #include <cerrno>
+#include <chrono>
 #include <cstdint>
 #include <map>
+#include <optional>
 #include <thread>
 #include <utility>
 #include <vector>
@@ -74,12 +78,31 @@ struct LinuxSignals::State {
   void run() {
     beginServiceThread("zk-signals");
     for (;;) {
-      std::uint64_t count = 0;
-      if (::read(wakeUp, &count, sizeof count) < 0 && errno != EINTR) return;
+      waitForWakeUp();
       const MutexLock lock(mutex);
       if (stopped) return;
-      post(signalsSeen.exchange(0));
+      const auto signals = signalsSeen.exchange(0);
+      if ((signals & leaving) != 0 && !end) end = std::chrono::steady_clock::now() + longestLeaving;
+      post(signals);
     }
+  }
+
+  // Does not return once the process has to end.
+  void waitForWakeUp() {
+    pollfd waiting{.fd = wakeUp, .events = POLLIN, .revents = 0};
+    for (;;) {
+      if (::poll(&waiting, 1, millisecondsToEnd()) > 0) break;
+      if (end && std::chrono::steady_clock::now() >= *end) ::_exit(0);
+    }
+    std::uint64_t count = 0;
+    [[maybe_unused]] const auto size = ::read(wakeUp, &count, sizeof count);
+  }
+
+  int millisecondsToEnd() const {
+    if (!end) return -1;
+    const auto left =
+        std::chrono::ceil<std::chrono::milliseconds>(*end - std::chrono::steady_clock::now());
+    return static_cast<int>(std::max<std::int64_t>(0, left.count()));
   }
 
   void post(std::uint64_t signals) ZK_REQUIRES(mutex) {
@@ -102,7 +125,14 @@ struct LinuxSignals::State {
     if (running.joinable()) running.join();
   }
 
+  // Fixed before the thread begins.
   const int wakeUp = ::eventfd(0, EFD_CLOEXEC);
+  std::uint64_t leaving = 0;  // the signals after which the process ends
+  Duration longestLeaving{0};
+
+  // The thread's own.
+  std::optional<std::chrono::steady_clock::time_point> end;
+
   Mutex mutex;
   std::map<std::uint64_t, Registration> registrations ZK_GUARDED_BY(mutex);
   std::map<int, struct sigaction> dispositions ZK_GUARDED_BY(mutex);  // of before
@@ -123,6 +153,11 @@ LinuxSignals::~LinuxSignals() {
   state_->stop();
   signalWakeUp = -1;
   ::close(state_->wakeUp);
+}
+
+void LinuxSignals::endProcessAfter(Duration limit, std::initializer_list<int> signals) {
+  state_->longestLeaving = limit;
+  for (const int signal : signals) state_->leaving |= std::uint64_t{1} << signal;
 }
 
 Subscription LinuxSignals::on(int signal, WorkQueue& queue, Task task) {

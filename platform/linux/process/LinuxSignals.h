@@ -1,5 +1,6 @@
 #pragma once
 
+#include <initializer_list>
 #include <memory>
 
 #include "platform/api/Signals.h"
@@ -24,6 +25,11 @@ class LinuxSignals final : public Signals {
 
   // Requires a signal from 1 to 63.
   Subscription on(int signal, WorkQueue& queue, Task task) override;
+
+  // Once one of these signals has come while it was subscribed to, the process ends with status 0
+  // at the latest after `limit` of real time: its tasks may wait for workers, disks and locks, and
+  // nobody waits for them any longer. Before the first subscription.
+  void endProcessAfter(Duration limit, std::initializer_list<int> signals);
 
  private:
   struct State;

@@ -1,5 +1,9 @@
 #include <gtest/gtest.h>
 #include <signal.h>
+#include <unistd.h>
+
+#include <atomic>
+#include <thread>
 
 #include "platform/linux/process/LinuxSignals.h"
 #include "platform/linux/queues/LinuxWorkQueues.h"
@@ -49,6 +53,32 @@ TEST_F(LinuxSignalsTest, TheFormerDispositionReturnsWithTheEndOfTheLastSubscript
   ::sigaction(SIGUSR1, nullptr, &now);
   EXPECT_EQ(now.sa_handler, SIG_IGN);
   ::sigaction(SIGUSR1, &original, nullptr);
+}
+
+// Every worker is busy for good, so that the task never runs.
+TEST(LinuxSignalsDeathTest, TheProcessEndsInTimeWhateverItsTasksWaitFor) {
+  GTEST_FLAG_SET(death_test_style, "threadsafe");
+  const auto leave = [](int signal) {
+    LinuxClock clock;
+    LinuxWorkQueues queues(clock, 2);
+    LinuxSignals signals;
+    signals.endProcessAfter(300ms, {SIGTERM});
+    const auto task = [] { ::_exit(4); };
+    const auto first = signals.on(SIGTERM, queues.global(QualityOfService::Default), task);
+    const auto second = signals.on(SIGUSR1, queues.global(QualityOfService::Default), task);
+    std::atomic<int> busy = 0;
+    for (int i = 0; i < 2; ++i) {
+      queues.global(QualityOfService::Default).async([&busy] {
+        for (++busy;;) std::this_thread::sleep_for(1s);
+      });
+    }
+    while (busy < 2) std::this_thread::yield();
+    ::raise(signal);
+    std::this_thread::sleep_for(2s);
+    ::_exit(3);
+  };
+  EXPECT_EXIT(leave(SIGTERM), testing::ExitedWithCode(0), "");
+  EXPECT_EXIT(leave(SIGUSR1), testing::ExitedWithCode(3), "");
 }
 
 }  // namespace
