@@ -1,8 +1,11 @@
 #include "platform/linux/LinuxPlatform.h"
 
+#include <signal.h>
+
 #include <atomic>
 
 #include "base/SettingsLayout.h"
+#include "platform/api/Budget.h"
 #include "platform/api/CountedTransactions.h"
 #include "platform/api/LaunchEventStreams.h"
 #include "platform/linux/account/LinuxAccounts.h"
@@ -12,6 +15,7 @@
 #include "platform/linux/device_profile/LinuxDevice.h"
 #include "platform/linux/files/LinuxContainerFiles.h"
 #include "platform/linux/files/LinuxFileManager.h"
+#include "platform/linux/files/OwnDirectory.h"
 #include "platform/linux/files/StateLock.h"
 #include "platform/linux/ipc/SdBusInterprocess.h"
 #include "platform/linux/knowledge/LinuxKnowledgeStore.h"
@@ -19,6 +23,7 @@
 #include "platform/linux/locale/LinuxLocale.h"
 #include "platform/linux/location/GeoClueSource.h"
 #include "platform/linux/location/LinuxLocation.h"
+#include "platform/linux/log/FileLog.h"
 #include "platform/linux/log/LinuxLog.h"
 #include "platform/linux/management/LinuxManagement.h"
 #include "platform/linux/maps/LinuxMaps.h"
@@ -42,6 +47,8 @@ namespace zelkord {
 namespace {
 
 constexpr Duration kGeoClueRetry = 300s;
+// From SIGINT or SIGTERM to the process's end, whatever is still to be written then.
+constexpr Duration kLongestLeaving = 1700ms;
 
 LinuxSettings::Options settingsOptions(const LinuxFileManager& files,
                                        const ConfigurationDirectories& configuration) {
@@ -113,18 +120,33 @@ LocationSourceFactory geoClueFactory(const Clock& clock, LogSink& log) {
   };
 }
 
-std::optional<Error> makeDirectories(LinuxFileManager& files) {
-  const auto& directories = files.directories();
-  for (const auto& path : {directories.runtime, directories.caches, directories.state}) {
-    auto error = files.createDirectory(path);
-    LinuxFileManager::removeLeftovers(path);
-    // Without the others there is still something to serve.
-    if (error && path == directories.state) {
-      error->userInfo["reason"] = path + ": " + error->reason().value_or("");
-      return error;
-    }
+std::optional<Error> makeStateDirectory(LinuxFileManager& files) {
+  const auto& path = files.directories().state;
+  auto error = files.createDirectory(path);
+  if (!error) return foreignDirectory(path);
+  error->userInfo["reason"] = path + ": " + error->reason().value_or("");
+  return error;
+}
+
+// Those beside the state directory. Without them there is still something to serve, but nothing of
+// ours goes into what belongs to somebody else.
+std::optional<Error> makeOtherDirectories(LinuxFileManager& files) {
+  for (const auto& path : {files.directories().runtime, files.directories().caches}) {
+    files.createDirectory(path);
+    if (auto error = foreignDirectory(path)) return error;
   }
   return std::nullopt;
+}
+
+// For the holder of the lock: closes the directories and removes what a crash left. Gives what is
+// worth a line.
+std::vector<std::string> tidyDirectories(const Directories& directories) {
+  std::vector<std::string> remarks;
+  for (const auto& path : {directories.runtime, directories.caches, directories.state}) {
+    if (auto remark = closeToOthers(path)) remarks.push_back(std::move(*remark));
+    LinuxFileManager::removeLeftovers(path);
+  }
+  return remarks;
 }
 
 }  // namespace
@@ -149,9 +171,12 @@ struct LinuxPlatform::Services {
       const auto alive = weak.lock();
       return alive && boolSetting(*alive, "ZLKLogPrivateData");
     });
-    process.atExit([this] { knowledge.flush(); });
+    queues.onRefusedWait([this] { limits.refused("waits", "workers"); });
+    signals.endProcessAfter(kLongestLeaving, {SIGINT, SIGTERM});
+    // What is ours first: others may hold the knowledge store for as long as they like.
     process.atExit([this] { counters.save(); });
     process.atExit([this] { settings->flush(); });
+    process.atExit([this] { knowledge.flush(); });
     process.atExit([this] { log.flush(); });
     if (options.exitWhenIdle) {
       exitWhenIdle.emplace(queues, clock, transactions, *options.exitWhenIdle,
@@ -161,6 +186,7 @@ struct LinuxPlatform::Services {
 
   // No change is announced any more while the services that hear of it go.
   ~Services() {
+    queues.onRefusedWait(nullptr);
     localeWatcher.reset();
     profileLoader.reset();
   }
@@ -176,6 +202,7 @@ struct LinuxPlatform::Services {
   NotificationCenter notificationCenter;
   CountedTransactions transactions{clock};
   LinuxCounters counters{files, queues, log};
+  LimitReports limits{clock, counters, Logger(log, "")};
   TraceMarker trace{Logger(log, "")};
   LinuxSignals signals;
   LinuxProcess process{queues};
@@ -253,14 +280,20 @@ struct LinuxPlatform::Services {
 std::unique_ptr<LinuxPlatform> LinuxPlatform::make(const LinuxPlatformOptions& options,
                                                    Error* error) {
   LinuxFileManager files(hostDirectories(options.environment));
-  Error problem;
-  auto made = makeDirectories(files);
-  auto lock = made ? std::nullopt : StateLock::acquire(files.directories().state, &problem);
-  if (!lock) {
-    if (error) *error = made ? *made : problem;
+  const auto refused = [error](Error problem) {
+    if (error) *error = std::move(problem);
     return nullptr;
-  }
+  };
+  // What exists may be in use, so it stays as it is until the lock is ours.
+  if (auto problem = makeStateDirectory(files)) return refused(std::move(*problem));
+  Error problem;
+  auto lock = StateLock::acquire(files.directories().state, &problem);
+  if (!lock) return refused(std::move(problem));
+  if (auto foreign = makeOtherDirectories(files)) return refused(std::move(*foreign));
+  if (auto unfit = FileLog::refusal(options.logFile)) return refused(std::move(*unfit));
+  const auto remarks = tidyDirectories(files.directories());
   auto services = std::make_unique<Services>(options, std::move(*lock), std::move(files));
+  for (const auto& remark : remarks) Logger(services->log, "").notice("{}", remark);
   return std::unique_ptr<LinuxPlatform>(new LinuxPlatform(std::move(services)));
 }
 

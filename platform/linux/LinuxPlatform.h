@@ -28,7 +28,8 @@ struct LinuxPlatformOptions {
 
 // The host services on Linux, built once by `main`.
 //
-// The process's end runs: donations written, counters saved, settings flushed, log flushed.
+// The process's end runs: counters saved, settings flushed, donations written, log flushed. After
+// SIGINT or SIGTERM it comes within two seconds, then without what is not done.
 //
 // Threading: made and destroyed on the main thread; the services on any.
 // Ownership: outlives the daemon's objects.
@@ -36,7 +37,9 @@ struct LinuxPlatformOptions {
 class LinuxPlatform final {
  public:
   // Null when the state directory cannot be had; `error` then says why, for people: another daemon
-  // uses it ("already running: ..."), or it cannot be made.
+  // uses it ("already running: ..."), or it cannot be made. Null too when a directory belongs to
+  // somebody else, and for a log file that is none. Until the state directory is ours, what exists
+  // is left alone.
   static std::unique_ptr<LinuxPlatform> make(const LinuxPlatformOptions& options, Error* error);
   ~LinuxPlatform();
   LinuxPlatform(const LinuxPlatform&) = delete;

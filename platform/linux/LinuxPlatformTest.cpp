@@ -1,14 +1,21 @@
 #include <gmock/gmock.h>
+#include <sys/stat.h>
+#include <unistd.h>
 
 #include <cerrno>
 
 #include "platform/linux/LinuxPlatform.h"
+#include "platform/linux/log/JournalLog.h"
 #include "platform/testing/TemporaryDirectory.h"
 
 namespace zelkord {
 namespace {
 
 using testing::HasSubstr;
+
+const std::string kDirectories[] = {"XDG_STATE_HOME/com.quenta.zelkord",
+                                    "XDG_CACHE_HOME/com.quenta.zelkord",
+                                    "XDG_RUNTIME_DIR/com.quenta.zelkord"};
 
 class LinuxPlatformTest : public testing::Test {
  protected:
@@ -21,6 +28,12 @@ class LinuxPlatformTest : public testing::Test {
       if (name.starts_with("XDG_")) return root_ / name;
       return std::nullopt;
     };
+  }
+
+  unsigned modeOf(const std::string& directory) const {
+    struct stat status {};
+    ::stat((root_ / directory).c_str(), &status);
+    return status.st_mode & 07777;
   }
 
   const TemporaryDirectory root_;
@@ -49,12 +62,60 @@ TEST_F(LinuxPlatformTest, ServicesKeepWhatTheyAreToldOverARestart) {
   EXPECT_EQ(host->platform().counters.all().at("counter"), 3);
 }
 
-TEST_F(LinuxPlatformTest, TwoDoNotShareAStateDirectory) {
+TEST_F(LinuxPlatformTest, TwoDoNotShareAStateDirectoryAndTheSecondTouchesNothing) {
   const auto first = LinuxPlatform::make(options_, &error_);
   ASSERT_TRUE(first);
+  for (const auto& directory : kDirectories) {
+    root_.write(directory + "/.unfinished.a1b2c3", "the first one is writing this");
+    ::chmod((root_ / directory).c_str(), 0750);
+  }
   EXPECT_EQ(LinuxPlatform::make(options_, &error_), nullptr);
   EXPECT_EQ(error_.code, EWOULDBLOCK);
   EXPECT_THAT(*error_.reason(), HasSubstr("already running"));
+  for (const auto& directory : kDirectories) {
+    EXPECT_TRUE(root_.has(directory + "/.unfinished.a1b2c3")) << directory;
+    EXPECT_EQ(modeOf(directory), 0750u) << directory;
+  }
+}
+
+TEST_F(LinuxPlatformTest, ClosesItsDirectoriesToOthersAndRemovesWhatACrashLeft) {
+  for (const auto& directory : kDirectories) {
+    root_.write(directory + "/.unfinished.a1b2c3", "half");
+    ::chmod((root_ / directory).c_str(), 0755);
+  }
+  ASSERT_TRUE(LinuxPlatform::make(options_, &error_)) << error_.description();
+  for (const auto& directory : kDirectories) {
+    EXPECT_EQ(modeOf(directory), 0700u) << directory;
+    EXPECT_FALSE(root_.has(directory + "/.unfinished.a1b2c3")) << directory;
+    EXPECT_THAT(root_.read("log"),
+                HasSubstr(root_ / directory + " was open to others (0755) and is closed to them"));
+  }
+}
+
+TEST_F(LinuxPlatformTest, UsesNoDirectoryOfSomebodyElse) {
+  if (::geteuid() != 0) GTEST_SKIP() << "only the superuser gives directories away";
+  for (const auto& directory : kDirectories) {
+    root_.write(directory + "/file", "somebody else's");
+    ASSERT_EQ(::chown((root_ / directory).c_str(), 12345, 12345), 0);
+    EXPECT_EQ(LinuxPlatform::make(options_, &error_), nullptr);
+    EXPECT_EQ(error_.reason(), root_ / directory + " belongs to user 12345");
+    ASSERT_EQ(::chown((root_ / directory).c_str(), 0, 0), 0);
+  }
+}
+
+TEST_F(LinuxPlatformTest, OnlyALogFileThatWasAskedForMustBeOne) {
+  ASSERT_EQ(::mkfifo((root_ / "pipe").c_str(), 0600), 0);
+  options_.logFile = root_ / "pipe";
+  EXPECT_EQ(LinuxPlatform::make(options_, &error_), nullptr);
+  EXPECT_EQ(error_.reason(), root_ / "pipe is no regular file");
+
+  options_.logFile.clear();
+  root_.write(kDirectories[0] + "/zelkord.log/file", "");
+  testing::internal::CaptureStderr();
+  EXPECT_TRUE(LinuxPlatform::make(options_, &error_)) << error_.description();
+  const auto said = testing::internal::GetCapturedStderr();
+  const auto expected = "zelkord: no log: " + root_ / kDirectories[0] + "/zelkord.log";
+  if (!JournalLog::isThere()) EXPECT_THAT(said, HasSubstr(expected));
 }
 
 TEST_F(LinuxPlatformTest, SaysWhyWhenThereIsNoPlaceForItsState) {
