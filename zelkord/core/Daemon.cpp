@@ -21,6 +21,11 @@
 #include "zelkord/storage/ZelkorPersistentStorage.h"
 
 namespace zelkord {
+namespace {
+
+constexpr Duration kLongestFinish = 700ms;
+
+}  // namespace
 
 Daemon::Daemon(Platform& platform) : platform_(platform) {}
 Daemon::~Daemon() = default;
@@ -39,14 +44,14 @@ std::optional<Error> Daemon::start() {
 // The order is required: a service finds earlier ones in the assembly.
 void Daemon::_makeServices() {
   auto& assembly = *assembly_;
+  const auto factory = std::make_shared<ZLKNetworkRequestFactory>(assembly);
+  assembly.setRequestFactory(factory);
+  factory->start();
   const auto storage = std::make_shared<ZelkorPersistentStorage>(assembly);
   assembly.setPersistentStorage(storage);
   storage->start();
   assembly.setFeedbackGate(std::make_shared<BagFeedbackGate>(assembly));
   assembly.setFeedbackSessions(std::make_shared<StoredSessions>(assembly));
-  const auto factory = std::make_shared<ZLKNetworkRequestFactory>(assembly);
-  assembly.setRequestFactory(factory);
-  factory->start();
   assembly.reporter().addValue(1, "com.quenta.zelkord.launch");
   assembly.setImageFetcher(std::make_shared<ImageFetcher>(assembly));
   const auto bagController = std::make_shared<ZelkorBagController>(assembly, *factory);
@@ -90,6 +95,17 @@ void Daemon::_warm() {
   });
 }
 
+// What is recorded is finished as far as that takes no time worth naming: a disk or a queue that
+// hangs must not keep the process.
+void Daemon::_leave(const char* name) {
+  assembly_->defaultLog().debug("{}", name);
+  if (leaving_.exchange(true)) return;
+  longestFinish_ = platform_.queues.main().after(
+      kLongestFinish, [this] { platform_.process.exit(0); }, TimeBase::Real);
+  _finishRecording();
+  platform_.process.exit(0);
+}
+
 // Every record is in its file; the sessions stay as they are, for the next start to find.
 void Daemon::_finishRecording() {
   if (auto* shared = assembly_->clientSessionManager()) shared->waitForPendingFeedback();
@@ -102,11 +118,7 @@ void Daemon::_finishRecording() {
 void Daemon::_handleSignals() {
   auto& queue = platform_.queues.global(QualityOfService::Default);
   const auto leaveOn = [&](int number, const char* name) {
-    return platform_.signals.on(number, queue, [this, name] {
-      assembly_->defaultLog().debug("{}", name);
-      _finishRecording();
-      platform_.process.exit(0);
-    });
+    return platform_.signals.on(number, queue, [this, name] { _leave(name); });
   };
   interrupt_ = leaveOn(SIGINT, "SIGINT");
   terminate_ = leaveOn(SIGTERM, "SIGTERM");

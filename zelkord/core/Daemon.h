@@ -1,5 +1,6 @@
 #pragma once
 
+#include <atomic>
 #include <memory>
 #include <optional>
 
@@ -33,6 +34,7 @@ class Daemon final {
   std::optional<Error> _listen();
   void _handleLaunchEvents();
   void _warm();
+  void _leave(const char* name);
   void _finishRecording();
   void _handleSignals();
 
@@ -45,6 +47,8 @@ class Daemon final {
   Subscription notifyEvents_;
   Subscription interrupt_;
   Subscription terminate_;
+  std::atomic<bool> leaving_ = false;
+  Subscription longestFinish_;  // set by whoever set `leaving_`
 };
 
 }  // namespace zelkord

@@ -1,14 +1,17 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <csignal>
 
 #include "corezelkor/Constants.h"
+#include "platform/testing/PlatformOnQueues.h"
 #include "zelkord/assembly/NotificationNames.h"
 #include "zelkord/core/ClientStateManager.h"
 #include "zelkord/core/CommandLine.h"
 #include "zelkord/core/DaemonTestSupport.h"
 #include "zelkord/core/ZelkorService.h"
+#include "zelkord/feedback/RecordingSessions.h"
 
 namespace zelkord {
 namespace {
@@ -206,6 +209,77 @@ TEST(DaemonTest, BuildsTheGraphAnnouncesItselfAndLeavesOnSignals) {
     EXPECT_EQ(fakes.process.exitStatus(), 0);
     EXPECT_TRUE(fakes.log.contains(text));
   }
+}
+
+// The timeline's queues, which note the order in which components make theirs.
+class LabelledQueues final : public WorkQueues {
+ public:
+  explicit LabelledQueues(WorkQueues& queues) : queues_(queues) {}
+
+  std::unique_ptr<SerialQueue> makeSerialQueue(std::string label) override {
+    labels.push_back(label);
+    return queues_.makeSerialQueue(std::move(label));
+  }
+  std::unique_ptr<ConcurrentQueue> makeConcurrentQueue(std::string label) override {
+    labels.push_back(label);
+    return queues_.makeConcurrentQueue(std::move(label));
+  }
+  WorkQueue& global(QualityOfService quality) override { return queues_.global(quality); }
+  SerialQueue& main() override { return queues_.main(); }
+  std::unique_ptr<Semaphore> makeSemaphore(unsigned permits) override {
+    return queues_.makeSemaphore(permits);
+  }
+  std::unique_ptr<Group> makeGroup() override { return queues_.makeGroup(); }
+  std::unique_ptr<Timer> makeTimer(WorkQueue& queue, Task task) override {
+    return queues_.makeTimer(queue, std::move(task));
+  }
+
+  std::vector<std::string> labels;
+
+ private:
+  WorkQueues& queues_;
+};
+
+TEST(DaemonTest, MakesItsServicesInTheRequiredOrder) {
+  FakePlatform fakes;
+  LabelledQueues queues(fakes.timeline);
+  Platform platform =
+      onQueues(fakes.platform(), fakes.timeline, queues, fakes.urlSessions, fakes.transactions);
+  Daemon daemon(platform);
+  EXPECT_FALSE(daemon.start());
+  std::size_t last = 0;
+  for (const char* label :
+       {"com.quenta.zelkord.contextaccess", "com.quenta.zelkord.persistentStorageQueue",
+        "com.quenta.zelkord.bagcontroller.cacheaccess", "com.quenta.zelkord.stateCache",
+        "com.quenta.zelkor.serviceQueue", "com.quenta.zelkord.clientSessionManagerQueue",
+        "com.quenta.zelkord.xpc_event"}) {
+    const auto found = std::find(queues.labels.begin(), queues.labels.end(), label);
+    ASSERT_NE(found, queues.labels.end()) << label;
+    const auto place = static_cast<std::size_t>(found - queues.labels.begin());
+    EXPECT_GE(place, last) << label;
+    last = place;
+  }
+}
+
+TEST(DaemonTest, LeavesAlthoughWhatIsRecordedIsNotFinished) {
+  FakePlatform fakes;
+  Daemon daemon(fakes.platform());
+  ASSERT_FALSE(daemon.start());
+  fakes.timeline.runUntilIdle();
+  const auto hanging = std::make_shared<RecordingSessionManager>("zelkor", true);
+  std::optional<int> before, after;
+  hanging->whileWaiting = [&] {
+    fakes.timeline.advance(600ms);
+    before = fakes.process.exitStatus();
+    fakes.timeline.advance(200ms);
+    after = fakes.process.exitStatus();
+  };
+  daemon.assembly().setClientSessionManager(hanging);
+  fakes.signals.raise(SIGTERM);
+  fakes.signals.raise(SIGINT);  // somebody is impatient
+  fakes.timeline.runUntilIdle();
+  EXPECT_EQ(before, std::nullopt);
+  EXPECT_EQ(after, 0);
 }
 
 TEST(DaemonTest, DoesNotServeWithoutItsName) {

@@ -54,11 +54,14 @@ class RecordingSessionManager final : public SessionManager {
     callback(false);
   }
   std::vector<std::string> feedbacksWithRelativeTimestamp() override { return texts.get(); }
-  void waitForPendingFeedback() override {}
+  void waitForPendingFeedback() override {
+    if (whileWaiting) whileWaiting();
+  }
   const std::string& identifier() const override { return identifier_; }
   const RecordedFeedback& records() const { return records_; }
 
   Guarded<std::vector<std::string>> texts;  // the answer of feedbacksWithRelativeTimestamp
+  std::function<void()> whileWaiting;       // set before it is used
 
  private:
   const std::string identifier_;
