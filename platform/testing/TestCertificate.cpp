@@ -28,7 +28,8 @@ void addCertificateExtension(X509* certificate, int nid, const std::string& valu
   X509_EXTENSION_free(extension);
 }
 
-X509Pointer makeX509(EVP_PKEY* key, const std::string& host, bool expired) {
+X509Pointer makeX509(EVP_PKEY* key, const std::string& host, TestCertificate::Validity validity) {
+  const bool expired = validity == TestCertificate::Validity::Expired;
   X509Pointer certificate(X509_new(), &X509_free);
   X509_set_version(certificate.get(), X509_VERSION_3);
   ASN1_INTEGER_set(X509_get_serialNumber(certificate.get()), 1);
@@ -41,8 +42,10 @@ X509Pointer makeX509(EVP_PKEY* key, const std::string& host, bool expired) {
   X509_set_pubkey(certificate.get(), key);
   const bool isAddress = std::isdigit(static_cast<unsigned char>(host.front())) != 0;
   addCertificateExtension(certificate.get(), NID_basic_constraints, "critical,CA:TRUE");
-  addCertificateExtension(certificate.get(), NID_subject_alt_name,
-                          (isAddress ? "IP:" : "DNS:") + host);
+  if (validity != TestCertificate::Validity::NamedBySubject) {
+    addCertificateExtension(certificate.get(), NID_subject_alt_name,
+                            (isAddress ? "IP:" : "DNS:") + host);
+  }
   ZK_CHECK(X509_sign(certificate.get(), key, EVP_sha256()) > 0, "a certificate is signed");
   return certificate;
 }
@@ -57,7 +60,7 @@ std::string textOfBIO(BIO* bio) {
 
 TestCertificate TestCertificate::make(const std::string& host, Validity validity) {
   const KeyPointer key(EVP_EC_gen("P-256"), &EVP_PKEY_free);
-  const auto x509 = makeX509(key.get(), host, validity == Validity::Expired);
+  const auto x509 = makeX509(key.get(), host, validity);
   const BIOPointer certificate(BIO_new(BIO_s_mem()), &BIO_free_all);
   const BIOPointer privateKey(BIO_new(BIO_s_mem()), &BIO_free_all);
   PEM_write_bio_X509(certificate.get(), x509.get());

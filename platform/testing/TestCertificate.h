@@ -12,7 +12,8 @@ struct TestCertificate {
   std::string certificate;  // PEM
   std::string privateKey;   // PEM
 
-  enum class Validity { Current, Expired };
+  // NamedBySubject: without alternative names, as certificates were of old.
+  enum class Validity { Current, Expired, NamedBySubject };
   // For a host name or an IP address.
   static TestCertificate make(const std::string& host, Validity validity = Validity::Current);
 };

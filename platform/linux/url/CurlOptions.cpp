@@ -1,14 +1,44 @@
 #include "platform/linux/url/CurlOptions.h"
 
 #include <openssl/ssl.h>
+#include <openssl/x509v3.h>
+
+#include <memory>
 
 namespace zelkord {
 namespace {
 
-// libcurl switches tickets off in every new context.
-CURLcode allowSessionTickets(CURL*, void* context, void*) {
-  SSL_CTX_clear_options(static_cast<SSL_CTX*>(context), SSL_OP_NO_TICKET);
+// Whether a certificate names a host or an address among its alternative names. libcurl would take
+// the subject's common name in their place.
+bool hasAlternativeName(X509* certificate) {
+  const std::unique_ptr<GENERAL_NAMES, void (*)(GENERAL_NAMES*)> names(
+      static_cast<GENERAL_NAMES*>(
+          X509_get_ext_d2i(certificate, NID_subject_alt_name, nullptr, nullptr)),
+      [](GENERAL_NAMES* all) { GENERAL_NAMES_free(all); });
+  for (int i = 0; i < sk_GENERAL_NAME_num(names.get()); ++i) {
+    const int type = sk_GENERAL_NAME_value(names.get(), i)->type;
+    if (type == GEN_DNS || type == GEN_IPADD) return true;
+  }
+  return false;
+}
+
+int refuseUnnamed(int isGood, X509_STORE_CTX* chain) {
+  if (isGood == 0 || X509_STORE_CTX_get_error_depth(chain) > 0) return isGood;
+  if (hasAlternativeName(X509_STORE_CTX_get_current_cert(chain))) return 1;
+  X509_STORE_CTX_set_error(chain, X509_V_ERR_HOSTNAME_MISMATCH);
+  return 0;
+}
+
+CURLcode prepareContext(CURL*, void* context, void*) {
+  auto* tls = static_cast<SSL_CTX*>(context);
+  SSL_CTX_set_verify(tls, SSL_CTX_get_verify_mode(tls), &refuseUnnamed);
   return CURLE_OK;
+}
+
+// libcurl switches tickets off in every new context.
+CURLcode prepareContextWithTickets(CURL* handle, void* context, void* data) {
+  SSL_CTX_clear_options(static_cast<SSL_CTX*>(context), SSL_OP_NO_TICKET);
+  return prepareContext(handle, context, data);
 }
 
 void setTLSOptions(CURL* handle, const CurlSettings& settings, CURLSH* share) {
@@ -22,12 +52,12 @@ void setTLSOptions(CURL* handle, const CurlSettings& settings, CURLSH* share) {
     curl_easy_setopt(handle, CURLOPT_CAPATH, nullptr);
     curl_easy_setopt(handle, CURLOPT_PROXY_CAPATH, nullptr);
   }
+  const bool tickets = settings.tlsSessionTickets.value_or(false);
   if (settings.tlsSessionTickets) {
-    curl_easy_setopt(handle, CURLOPT_SSL_SESSIONID_CACHE, *settings.tlsSessionTickets ? 1L : 0L);
-    if (*settings.tlsSessionTickets) {
-      curl_easy_setopt(handle, CURLOPT_SSL_CTX_FUNCTION, &allowSessionTickets);
-    }
+    curl_easy_setopt(handle, CURLOPT_SSL_SESSIONID_CACHE, tickets ? 1L : 0L);
   }
+  curl_easy_setopt(handle, CURLOPT_SSL_CTX_FUNCTION,
+                   tickets ? &prepareContextWithTickets : &prepareContext);
   curl_easy_setopt(handle, CURLOPT_SHARE, share);
 }
 

@@ -22,6 +22,7 @@ TEST(CurlURLSessionTLSTest, LoadsOnlyFromTrustedServers) {
       {"unknown issuer", TestCertificate::make("127.0.0.1"), false, -1200},
       {"expired", TestCertificate::make("127.0.0.1", Validity::Expired), true, -1200},
       {"other host", TestCertificate::make("other.example"), true, -1200},
+      {"subject only", TestCertificate::make("127.0.0.1", Validity::NamedBySubject), true, -1200},
   };
   for (const auto& test : cases) {
     SCOPED_TRACE(test.name);
