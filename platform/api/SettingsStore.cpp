@@ -14,6 +14,12 @@ std::optional<json::value> ownSetting(const SettingsStore& settings, std::string
 
 }  // namespace
 
+std::string settingName(std::string_view key, std::string_view domain) {
+  std::string name(domain.empty() ? kSettingsDomain : domain);
+  // No domain has a line break in its name.
+  return name.append("\n").append(key);
+}
+
 bool boolSetting(const SettingsStore& settings, std::string_view key, bool fallback) {
   const auto value = ownSetting(settings, key);
   if (!value) return fallback;

@@ -1,11 +1,13 @@
 #pragma once
 
+#include <functional>
 #include <optional>
 #include <string>
 #include <string_view>
 #include <vector>
 
 #include "base/Json.h"
+#include "base/Subscription.h"
 
 namespace zelkord {
 
@@ -30,7 +32,13 @@ class SettingsStore {
   virtual json::object all(std::string_view domain = {}) const = 0;
   // Returns when everything set so far is on disk.
   virtual void flush() = 0;
+  // `changed` runs after each `set` and `remove` of that key, on the thread of whoever wrote.
+  virtual Subscription observe(std::string_view key, std::function<void()> changed,
+                               std::string_view domain = {}) = 0;
 };
+
+// The name of a setting among those of all domains: what stores announce a change under.
+std::string settingName(std::string_view key, std::string_view domain);
 
 // The value when it has the type (numbers: non-zero is true for boolSetting; negative or fractional
 // values are clamped and truncated for unsignedSetting), else the fallback.

@@ -21,14 +21,26 @@ std::optional<json::value> FakeSettings::value(std::string_view key,
 }
 
 void FakeSettings::set(std::string_view key, json::value value, std::string_view domain) {
-  const MutexLock lock(mutex_);
-  domains_[std::string(settingsDomainOrOwn(domain))].insert_or_assign(key, std::move(value));
+  {
+    const MutexLock lock(mutex_);
+    domains_[std::string(settingsDomainOrOwn(domain))].insert_or_assign(key, std::move(value));
+  }
+  changes_.post(settingName(key, domain));
 }
 
 void FakeSettings::remove(std::string_view key, std::string_view domain) {
-  const MutexLock lock(mutex_);
-  const auto found = domains_.find(settingsDomainOrOwn(domain));
-  if (found != domains_.end()) found->second.erase(key);
+  {
+    const MutexLock lock(mutex_);
+    const auto found = domains_.find(settingsDomainOrOwn(domain));
+    if (found != domains_.end()) found->second.erase(key);
+  }
+  changes_.post(settingName(key, domain));
+}
+
+Subscription FakeSettings::observe(std::string_view key, std::function<void()> changed,
+                                   std::string_view domain) {
+  return changes_.observe(settingName(key, domain),
+                          [changed = std::move(changed)](const Notification&) { changed(); });
 }
 
 void FakeSettings::registerDefaults(const json::object& values) {

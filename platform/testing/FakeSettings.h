@@ -4,6 +4,7 @@
 #include <string>
 
 #include "base/Mutex.h"
+#include "platform/api/NotificationCenter.h"
 #include "platform/api/SettingsStore.h"
 
 namespace zelkord {
@@ -20,11 +21,14 @@ class FakeSettings final : public SettingsStore {
   void registerDefaults(const json::object& values) override;
   json::object all(std::string_view domain = {}) const override;
   void flush() override;
+  Subscription observe(std::string_view key, std::function<void()> changed,
+                       std::string_view domain = {}) override;
 
   // How often `flush` was called.
   int flushes() const;
 
  private:
+  NotificationCenter changes_;
   mutable Mutex mutex_;
   json::object registered_ ZK_GUARDED_BY(mutex_);
   std::map<std::string, json::object, std::less<>> domains_ ZK_GUARDED_BY(mutex_);

@@ -62,6 +62,13 @@ void LinuxSettings::change(std::string_view key, std::string_view domain,
     layers_.user = std::move(user);
   }
   queue_->async([this] { persist(); });
+  changes_.post(settingName(key, domain));
+}
+
+Subscription LinuxSettings::observe(std::string_view key, std::function<void()> changed,
+                                    std::string_view domain) {
+  return changes_.observe(settingName(key, domain),
+                          [changed = std::move(changed)](const Notification&) { changed(); });
 }
 
 void LinuxSettings::registerDefaults(const json::object& values) {

@@ -10,6 +10,7 @@
 #include "base/Mutex.h"
 #include "platform/api/FileManager.h"
 #include "platform/api/Log.h"
+#include "platform/api/NotificationCenter.h"
 #include "platform/api/SettingsStore.h"
 #include "platform/api/WorkQueues.h"
 #include "platform/linux/settings/SettingsDatabase.h"
@@ -44,6 +45,8 @@ class LinuxSettings final : public SettingsStore {
   void registerDefaults(const json::object& values) override;
   json::object all(std::string_view domain = {}) const override;
   void flush() override;
+  Subscription observe(std::string_view key, std::function<void()> changed,
+                       std::string_view domain = {}) override;
 
  private:
   using Place = std::pair<std::string, std::string>;  // domain, key
@@ -59,6 +62,7 @@ class LinuxSettings final : public SettingsStore {
   SettingsDatabase database_ ZK_ON(queue_);
 
   // Own synchronisation.
+  NotificationCenter changes_;
   mutable Mutex mutex_;
   SettingsLayers layers_ ZK_GUARDED_BY(mutex_);
   std::map<Place, std::optional<std::string>> pending_ ZK_GUARDED_BY(mutex_);

@@ -210,6 +210,25 @@ TEST_F(LinuxSettingsTest, ManyThreadsReadAndWrite) {
             (json::object{{"a", kWrites}, {"b", kWrites}, {"c", kWrites}}));
 }
 
+TEST_F(LinuxSettingsTest, TellsEachWriteOfAKeyToItsObserversOnceTheValueCounts) {
+  FakeSettings fake;
+  const auto real = make();
+  for (SettingsStore* settings :
+       {static_cast<SettingsStore*>(&fake), static_cast<SettingsStore*>(real.get())}) {
+    std::vector<json::value> seen;
+    auto observer = settings->observe(
+        "a", [&] { seen.push_back(settings->value("a").value_or(nullptr)); }, kSettingsDomain);
+    settings->set("a", 1);
+    settings->set("b", 2);
+    settings->set("a", 3, "other");
+    settings->set("a", 4, kSettingsDomain);
+    settings->remove("a");
+    observer.reset();
+    settings->set("a", 5);
+    EXPECT_EQ(seen, (std::vector<json::value>{1, 4, nullptr}));
+  }
+}
+
 TEST(FakeSettingsTest, LayersLikeTheRealOne) {
   FakeSettings settings;
   settings.registerDefaults({{"a", 1}});
