@@ -67,19 +67,26 @@ void BusThread::stop() {
 }
 
 void BusThread::start(std::function<void()> lost) {
-  if (stop_) thread_ = std::thread([this, lost = std::move(lost)] { run(lost); });
+  if (!stop_) return;
+  thread_ = std::thread([this, lost = std::move(lost)] {
+    if (dispatchBus(bus_.get(), stop_.get(), [] {}) == BusEnd::Lost) lost();
+  });
 }
 
-void BusThread::run(const std::function<void()>& lost) {
+BusEnd dispatchBus(sd_bus* bus, int stop, const std::function<void()>& ready) {
+  bool isReady = false;
   while (true) {
     int result = 1;
-    while (result > 0) result = ::sd_bus_process(bus_.get(), nullptr);
-    const int events = result < 0 ? result : ::sd_bus_get_events(bus_.get());
-    if (events < 0) return lost();
-    pollfd polled[] = {{::sd_bus_get_fd(bus_.get()), static_cast<short>(events), 0},
-                       {stop_.get(), POLLIN, 0}};
-    ::poll(polled, 2, busSleep(bus_.get()));
-    if (polled[1].revents) return;
+    while (result > 0) result = ::sd_bus_process(bus, nullptr);
+    if (!isReady && ::sd_bus_is_ready(bus) > 0) {
+      isReady = true;
+      ready();
+    }
+    const int events = result < 0 ? result : ::sd_bus_get_events(bus);
+    if (events < 0) return BusEnd::Lost;
+    pollfd polled[] = {{::sd_bus_get_fd(bus), static_cast<short>(events), 0}, {stop, POLLIN, 0}};
+    ::poll(polled, 2, busSleep(bus));
+    if (polled[1].revents) return BusEnd::Stopped;
   }
 }
 

@@ -26,6 +26,12 @@ BusConnection openSystemBus(std::string* problem);
 std::string readBusProperty(sd_bus* bus, const char* service, const char* path,
                             const char* interface, const char* property);
 
+enum class BusEnd { Stopped, Lost };
+
+// Dispatches the connection on this thread until `stop`, an eventfd, can be read or the bus is
+// gone. `ready` runs once the bus has taken the connection.
+BusEnd dispatchBus(sd_bus* bus, int stop, const std::function<void()>& ready);
+
 // A thread that dispatches one bus connection until it is destroyed or the bus is gone.
 //
 // Threading: the connection belongs to the thread once `start` was called; every call-back
@@ -46,8 +52,6 @@ class BusThread final {
   void stop();
 
  private:
-  void run(const std::function<void()>& lost);
-
   const BusConnection bus_;
   const Descriptor stop_;
   std::thread thread_;

@@ -3,6 +3,7 @@
 #include <systemd/sd-bus.h>
 
 #include <set>
+#include <utility>
 
 namespace zelkord {
 namespace {
@@ -30,8 +31,8 @@ struct HostLocaleWatcher::BusCallbacks {
     static_cast<HostLocaleWatcher*>(self)->noteChange();
     return 0;
   }
-  static int localeChanged(sd_bus_message*, void* self, sd_bus_error*) {
-    static_cast<HostLocaleWatcher*>(self)->localeSignalled();
+  static int localeChanged(sd_bus_message* signal, void* self, sd_bus_error*) {
+    static_cast<HostLocaleWatcher*>(self)->readLocale(::sd_bus_message_get_bus(signal));
     return 0;
   }
   static int localeRead(sd_bus_message* reply, void* self, sd_bus_error*) {
@@ -59,48 +60,48 @@ HostLocaleWatcher::HostLocaleWatcher(HostLocaleSources sources,
     : sources_(std::move(sources)),
       changed_(std::move(changed)),
       log_(log, ""),
-      queue_(queues.makeSerialQueue("com.quenta.zelkord.hostlocale")) {
+      queue_(queues.makeSerialQueue("com.quenta.zelkord.hostlocale")),
+      bus_({[this](sd_bus* bus) { connected(bus); },
+            [this](const std::string& problem) { away(problem); }}) {
   for (const auto& path : {sources_.localtimePath, sources_.timezonePath}) {
     watches_.push_back(watcher.watch(path, [this] { noteChange(); }));
   }
-  listen();
+  bus_.start();
 }
 
 HostLocaleWatcher::~HostLocaleWatcher() {
   watches_.clear();
-  if (bus_) bus_->stop();
+  bus_.stop();
   queue_->sync([this] {
     queue_->assertCurrent();
     timer_.reset();
   });
 }
 
-void HostLocaleWatcher::listen() {
-  std::string problem;
-  auto connection = openSystemBus(&problem);
-  if (!connection) {
-    log_.notice("no system bus: changes of the system's locale are not seen ({})", problem);
-    return;
-  }
-  bus_ = std::make_unique<BusThread>(std::move(connection));
-  const auto match = [this](const char* path, sd_bus_message_handler_t handler) {
-    ::sd_bus_match_signal_async(bus_->bus(), nullptr, nullptr, path,
-                                "org.freedesktop.DBus.Properties", "PropertiesChanged", handler,
-                                nullptr, this);
+void HostLocaleWatcher::connected(sd_bus* bus) {
+  const auto match = [this, bus](const char* path, sd_bus_message_handler_t handler) {
+    ::sd_bus_match_signal_async(bus, nullptr, nullptr, path, "org.freedesktop.DBus.Properties",
+                                "PropertiesChanged", handler, nullptr, this);
   };
   match("/org/freedesktop/locale1", BusCallbacks::localeChanged);
   match("/org/freedesktop/timedate1", BusCallbacks::timeZoneChanged);
-  bus_->start([] {});
+  // Before its first word the environment counts, whatever locale1 would say.
+  if (localeIsKnown_) readLocale(bus);
 }
 
-void HostLocaleWatcher::localeSignalled() {
-  ::sd_bus_call_method_async(bus_->bus(), nullptr, "org.freedesktop.locale1",
-                             "/org/freedesktop/locale1", "org.freedesktop.DBus.Properties", "Get",
-                             BusCallbacks::localeRead, this, "ss", "org.freedesktop.locale1",
-                             "Locale");
+void HostLocaleWatcher::away(const std::string& problem) {
+  if (std::exchange(complained_, true)) return;
+  log_.notice("no system bus: changes of the system's locale are not seen ({})", problem);
+}
+
+void HostLocaleWatcher::readLocale(sd_bus* bus) {
+  ::sd_bus_call_method_async(bus, nullptr, "org.freedesktop.locale1", "/org/freedesktop/locale1",
+                             "org.freedesktop.DBus.Properties", "Get", BusCallbacks::localeRead,
+                             this, "ss", "org.freedesktop.locale1", "Locale");
 }
 
 void HostLocaleWatcher::localeArrived(std::map<std::string, std::string> variables) {
+  localeIsKnown_ = true;
   queue_->async([this, variables = std::move(variables)] {
     queue_->assertCurrent();
     variables_ = variables;

@@ -9,7 +9,7 @@
 #include "base/Mutex.h"
 #include "platform/api/Log.h"
 #include "platform/api/WorkQueues.h"
-#include "platform/linux/bus/SystemBus.h"
+#include "platform/linux/bus/SystemBusListener.h"
 #include "platform/linux/locale/HostLocale.h"
 #include "platform/linux/watch/PathWatcher.h"
 
@@ -21,7 +21,7 @@ namespace zelkord {
 //
 // Threading: `changed` runs on the watcher's queue.
 // Ownership: everything given outlives it.
-// Errors: without a system bus only the files are watched; logged once.
+// Errors: without a system bus only the files are watched, until there is one; logged once.
 class HostLocaleWatcher final {
  public:
   HostLocaleWatcher(HostLocaleSources sources, std::function<void(HostLocale)> changed,
@@ -29,8 +29,9 @@ class HostLocaleWatcher final {
   ~HostLocaleWatcher();
 
  private:
-  void listen();
-  void localeSignalled();
+  void connected(sd_bus* bus);
+  void away(const std::string& problem);
+  void readLocale(sd_bus* bus);
   void localeArrived(std::map<std::string, std::string> variables);
   void noteChange();
   void reread();
@@ -46,9 +47,13 @@ class HostLocaleWatcher final {
   // What locale1 said last; empty until it says something.
   std::map<std::string, std::string> variables_ ZK_ON(queue_);
 
+  // State of the bus listener's thread.
+  bool complained_ = false;
+  bool localeIsKnown_ = false;  // locale1 has said something
+
   struct BusCallbacks;
   std::vector<Subscription> watches_;
-  std::unique_ptr<BusThread> bus_;
+  SystemBusListener bus_;
 };
 
 // The variables of locale1's property, "LANG=de_DE.UTF-8" and the like.

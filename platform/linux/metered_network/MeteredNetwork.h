@@ -1,9 +1,8 @@
 #pragma once
 
 #include <atomic>
-#include <memory>
 
-#include "platform/linux/bus/SystemBus.h"
+#include "platform/linux/bus/SystemBusListener.h"
 
 namespace zelkord {
 
@@ -11,7 +10,8 @@ namespace zelkord {
 // there is none.
 //
 // Threading: any thread. Follows changes on a thread of its own, which sleeps in between.
-// Errors: none; what cannot be read counts as not metered.
+// Errors: none; what cannot be read counts as not metered, and is read again when NetworkManager or
+// the bus come back.
 class MeteredNetwork final {
  public:
   MeteredNetwork();
@@ -20,10 +20,11 @@ class MeteredNetwork final {
 
  private:
   struct BusCallbacks;
-  void _read();
+  void _connected(sd_bus* bus);
+  void _read(sd_bus* bus);
 
   std::atomic<bool> metered_ = false;
-  std::unique_ptr<BusThread> bus_;  // last: its thread ends first
+  SystemBusListener bus_;  // last: its thread ends first
 };
 
 }  // namespace zelkord

@@ -2,6 +2,7 @@
 #include <systemd/sd-bus.h>
 
 #include <chrono>
+#include <optional>
 #include <thread>
 
 #include "platform/linux/ipc/IpcTestSupport.h"
@@ -38,6 +39,24 @@ bool becomesMetered(const MeteredNetwork& network, Duration limit) {
     std::this_thread::sleep_for(std::chrono::milliseconds(5));
   }
   return network.isMetered();
+}
+
+// Its name comes back with a new bus, as its service does.
+TEST(MeteredNetworkTest, FollowsABusThatRestarts) {
+  const ipc::IpcTestDirectory directory;
+  std::optional<ipc::IpcTestBus> bus(directory.path());
+  ::setenv("DBUS_SYSTEM_BUS_ADDRESS", bus->address().c_str(), 1);
+  std::optional<NetworkManagerDouble> manager(1);
+  const MeteredNetwork network;
+  EXPECT_TRUE(becomesMetered(network, ipc::kTestPatience));
+  bus->stop();
+  EXPECT_TRUE(ipc::eventually([&] { return !network.isMetered(); }));
+  bus.emplace(directory.path());
+  manager.emplace(3);
+  EXPECT_TRUE(becomesMetered(network, ipc::kTestPatience));
+  manager.reset();
+  EXPECT_TRUE(ipc::eventually([&] { return !network.isMetered(); }));
+  ::unsetenv("DBUS_SYSTEM_BUS_ADDRESS");
 }
 
 TEST(MeteredNetworkTest, BelievesNetworkManager) {
