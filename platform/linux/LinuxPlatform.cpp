@@ -46,7 +46,6 @@
 namespace zelkord {
 namespace {
 
-constexpr Duration kGeoClueRetry = 300s;
 // From SIGINT or SIGTERM to the process's end, whatever is still to be written then.
 constexpr Duration kLongestLeaving = 1700ms;
 
@@ -98,23 +97,13 @@ LinuxDevice::Host hostDevice() {
   return host;
 }
 
-// GeoClue, whose absence is logged once. After a failure it is not asked again for a while:
-// location is wanted with every search, and each attempt costs a connection.
+// GeoClue, whose absence is logged once.
 LocationSourceFactory geoClueFactory(const Clock& clock, LogSink& log) {
-  struct Attempts {
-    std::atomic_flag complained;
-    std::atomic<Duration::rep> nextAt = 0;
-  };
-  auto attempts = std::make_shared<Attempts>();
-  return [&clock, &log, attempts](const LocationOptions& options,
-                                  LocationSourceEvents events) -> std::unique_ptr<LocationSource> {
-    const auto now = clock.realNow().time_since_epoch();
-    if (now.count() < attempts->nextAt) return nullptr;
+  auto complained = std::make_shared<std::atomic_flag>();
+  return [&clock, &log, complained](const LocationOptions& options, LocationSourceEvents events) {
     return GeoClueSource::make(options, std::move(events), clock,
-                               [&log, &clock, attempts](const std::string& problem) {
-                                 const auto failedAt = clock.realNow().time_since_epoch();
-                                 attempts->nextAt = (failedAt + kGeoClueRetry).count();
-                                 if (attempts->complained.test_and_set()) return;
+                               [&log, complained](const std::string& problem) {
+                                 if (complained->test_and_set()) return;
                                  Logger(log, "").notice("no location service: {}", problem);
                                });
   };
@@ -230,7 +219,7 @@ struct LinuxPlatform::Services {
   LinuxAccounts accounts{profile};
   LinuxManagement management{profile, files, log};
   LinuxTextInput textInput{profile, locale};
-  LinuxLocation location{profile, *settings, clock, geoClueFactory(clock, log)};
+  LinuxLocation location{profile, *settings, clock, queues, geoClueFactory(clock, log)};
   const std::shared_ptr<LinuxNetworkProxy> networkProxy =
       std::make_shared<LinuxNetworkProxy>(profile, log);
 

@@ -71,8 +71,7 @@ LocationAuthorization FakeLocation::authorization(const std::string& bundlePath)
 }
 
 void FakeLocation::setAuthorization(const std::string& bundlePath, LocationAuthorization status) {
-  const MutexLock lock(state_->mutex);
-  state_->authorizations[bundlePath] = status;
+  if (authorization(bundlePath) != status) changeAuthorization(bundlePath, status);
 }
 
 std::unique_ptr<LocationManager> FakeLocation::makeManager(const std::string&,
@@ -116,7 +115,10 @@ void FakeLocation::fail(Error error) {
 
 void FakeLocation::changeAuthorization(const std::string& bundlePath,
                                        LocationAuthorization status) {
-  setAuthorization(bundlePath, status);
+  {
+    const MutexLock lock(state_->mutex);
+    state_->authorizations[bundlePath] = status;
+  }
   tell(false, [status](LocationDelegate& to) { to.didChangeAuthorizationStatus(status); });
 }
 

@@ -30,7 +30,7 @@ class FakeLocation final : public LocationService {
   void setEnabledSystemWide(bool enabled);
   void deliver(std::vector<LocationFix> fixes);
   void fail(Error error);
-  // Sets the authorisation of a bundle and tells every manager.
+  // Sets the authorisation of a bundle and tells every manager, changed or not.
   void changeAuthorization(const std::string& bundlePath, LocationAuthorization status);
 
   int managers() const;                          // that exist

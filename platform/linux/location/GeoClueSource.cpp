@@ -14,6 +14,9 @@ namespace {
 constexpr const char* kGeoClue = "org.freedesktop.GeoClue2";
 constexpr const char* kGeoClueClient = "org.freedesktop.GeoClue2.Client";
 constexpr const char* kGeoClueLocation = "org.freedesktop.GeoClue2.Location";
+constexpr const char* kGeoClueOwnerChanged =
+    "type='signal',sender='org.freedesktop.DBus',path='/org/freedesktop/DBus',"
+    "interface='org.freedesktop.DBus',member='NameOwnerChanged',arg0='org.freedesktop.GeoClue2'";
 constexpr const char* kBusProperties = "org.freedesktop.DBus.Properties";
 
 // The doubles of a dictionary of properties; other members are passed over.
@@ -72,6 +75,10 @@ struct GeoClueSource::Callbacks {
     static_cast<GeoClueSource*>(self)->gotLocation(reply);
     return 0;
   }
+  static int owner(sd_bus_message* signal, void* self, sd_bus_error*) {
+    static_cast<GeoClueSource*>(self)->ownerChanged(signal);
+    return 0;
+  }
 };
 
 int locationTypeOfAccuracy(double metres) { return metres <= 100 ? 1 : metres <= 1000 ? 4 : 6; }
@@ -108,10 +115,12 @@ GeoClueSource::GeoClueSource(BusConnection bus, const LocationOptions& options,
 GeoClueSource::~GeoClueSource() = default;
 
 void GeoClueSource::begin() {
+  ::sd_bus_add_match_async(thread_.bus(), nullptr, kGeoClueOwnerChanged, Callbacks::owner, nullptr,
+                           this);
   ::sd_bus_call_method_async(thread_.bus(), nullptr, kGeoClue, "/org/freedesktop/GeoClue2/Manager",
                              "org.freedesktop.GeoClue2.Manager", "GetClient", Callbacks::client,
                              this, "");
-  thread_.start([] {});
+  thread_.start([this] { endMissing("the system bus has gone"); });
 }
 
 bool GeoClueSource::failed(sd_bus_message* reply) {
@@ -121,10 +130,25 @@ bool GeoClueSource::failed(sd_bus_message* reply) {
   const std::string text = error->message ? error->message : name;
   if (name == "org.freedesktop.DBus.Error.AccessDenied") {
     events_.failure(posixError(EACCES));
+    events_.ended();
   } else {
-    missing_(text);
+    endMissing(text);
   }
   return true;
+}
+
+void GeoClueSource::endMissing(const std::string& problem) {
+  missing_(problem);
+  events_.ended();
+}
+
+// Our client went with its owner.
+void GeoClueSource::ownerChanged(sd_bus_message* signal) {
+  const char* name = nullptr;
+  const char* before = nullptr;
+  if (::sd_bus_message_read(signal, "ss", &name, &before) >= 0 && *before) {
+    endMissing("GeoClue has left the bus");
+  }
 }
 
 void GeoClueSource::gotClient(sd_bus_message* reply) {

@@ -11,15 +11,15 @@ namespace zelkord {
 
 // Fixes from GeoClue2 over the system bus.
 //
-// States: asking for a client; configuring it; started. Each signal that the location changed is
-// followed by a read of the new location.
+// States: asking for a client; configuring it; started; ended, when GeoClue refuses, is not there
+// or leaves, or the bus does: a new source has to be made then. Each signal that the location
+// changed is followed by a read of the new location.
 //
 // Threading: call-backs run on the bus thread. Destroying waits for the one that runs, so not from
-// within one. Errors: no bus or no GeoClue gives nothing and is logged once a process; a refusal is
-// told as a failure.
+// within one. Errors: a refusal is told as a failure.
 class GeoClueSource final : public LocationSource {
  public:
-  // Null without a system bus. `missing` runs when GeoClue turns out not to be there.
+  // Null without a system bus. `missing` runs when GeoClue turns out not to be there, or leaves.
   static std::unique_ptr<LocationSource> make(const LocationOptions& options,
                                               LocationSourceEvents events, const Clock& clock,
                                               std::function<void(const std::string&)> missing);
@@ -34,8 +34,10 @@ class GeoClueSource final : public LocationSource {
   void gotClient(sd_bus_message* reply);
   void locationUpdated(sd_bus_message* signal);
   void gotLocation(sd_bus_message* reply);
-  // True when the reply is an error; tells what it means.
+  void ownerChanged(sd_bus_message* signal);
+  // True when the reply is an error, which ends this; tells what it means.
   bool failed(sd_bus_message* reply);
+  void endMissing(const std::string& problem);
 
   const LocationOptions options_;
   const LocationSourceEvents events_;

@@ -1,12 +1,16 @@
 #include <gmock/gmock.h>
 #include <systemd/sd-bus.h>
 
+#include <atomic>
 #include <condition_variable>
 #include <mutex>
+#include <optional>
 
 #include "platform/linux/ipc/IpcTestSupport.h"
 #include "platform/linux/locale/HostLocaleWatcher.h"
 #include "platform/linux/location/GeoClueSource.h"
+#include "platform/linux/location/LinuxLocation.h"
+#include "platform/testing/FakeSettings.h"
 
 namespace zelkord {
 namespace {
@@ -16,18 +20,25 @@ using testing::HasSubstr;
 // A system bus of the test's own for as long as it lives.
 class PrivateSystemBus final {
  public:
-  PrivateSystemBus() { ::setenv("DBUS_SYSTEM_BUS_ADDRESS", bus_.address().c_str(), 1); }
+  PrivateSystemBus() { ::setenv("DBUS_SYSTEM_BUS_ADDRESS", bus_->address().c_str(), 1); }
   ~PrivateSystemBus() { ::unsetenv("DBUS_SYSTEM_BUS_ADDRESS"); }
+
+  // Everybody is thrown off.
+  void restart() {
+    bus_->stop();
+    bus_.emplace(directory_.path());
+  }
 
  private:
   const ipc::IpcTestDirectory directory_;
-  const ipc::IpcTestBus bus_{directory_.path()};
+  std::optional<ipc::IpcTestBus> bus_{directory_.path()};
 };
 
 // What the doubles say and were told; the bus reads and writes it in place.
 struct HostServicesState {
   sd_bus* bus = nullptr;
   bool denies = false;
+  const char* language = "LANG=fr_FR.UTF-8";
   char* desktopId = nullptr;
   unsigned accuracyLevel = 0;
   double latitude = 52.5;
@@ -53,7 +64,8 @@ class HostServicesDouble final {
     ::sd_bus_request_name(bus, name, 0);
   }
   ~HostServicesDouble() { ::free(state_.desktopId); }
-  void start() {
+  void start(const char* language = "LANG=fr_FR.UTF-8") {
+    state_.language = language;
     thread_.start([] {});
   }
 
@@ -70,9 +82,10 @@ class HostServicesDouble final {
     return ::sd_bus_emit_signal(state.bus, "/client", "org.freedesktop.GeoClue2.Client",
                                 "LocationUpdated", "oo", "/", "/location");
   }
-  static int getLocale(sd_bus*, const char*, const char*, const char*, sd_bus_message* reply, void*,
-                       sd_bus_error*) {
-    return ::sd_bus_message_append(reply, "as", 2, "LANG=fr_FR.UTF-8", "LC_TIME=C");
+  static int getLocale(sd_bus*, const char*, const char*, const char*, sd_bus_message* reply,
+                       void* self, sd_bus_error*) {
+    const auto& state = *static_cast<HostServicesState*>(self);
+    return ::sd_bus_message_append(reply, "as", 2, state.language, "LC_TIME=C");
   }
 
   static const sd_bus_vtable kManager[];
@@ -114,13 +127,16 @@ class HeardEvents final {
               note(fmt::format("{} {} {} type {}", fix.latitude, fix.longitude,
                                fix.horizontalAccuracy, fix.type));
             },
-            [this](const Error& error) { note(fmt::format("failure {}", error.code)); }};
+            [this](const Error& error) { note(fmt::format("failure {}", error.code)); },
+            [this] { ++ends_; }};
   }
+  int ends() const { return ends_; }
   void note(std::string text) {
     const std::lock_guard lock(mutex_);
     text_ = std::move(text);
     arrived_.notify_all();
   }
+  // The last one that came.
   std::string wait() {
     std::unique_lock lock(mutex_);
     arrived_.wait_for(lock, ipc::kTestPatience, [this] { return !text_.empty(); });
@@ -135,6 +151,7 @@ class HeardEvents final {
   std::mutex mutex_;
   std::condition_variable arrived_;
   std::string text_;
+  std::atomic<int> ends_ = 0;
 };
 
 class GeoClueSourceTest : public testing::Test {
@@ -170,6 +187,75 @@ TEST_F(GeoClueSourceTest, ARefusalIsAFailureAndAMissingServiceIsNot) {
   EXPECT_EQ(heard_.wait(), "failure 13");
 }
 
+TEST_F(GeoClueSourceTest, EndsWithTheServiceAndWithTheBus) {
+  PrivateSystemBus bus;
+  std::optional<HostServicesDouble> services("org.freedesktop.GeoClue2");
+  services->start();
+  auto source = make();
+  EXPECT_EQ(heard_.wait(), "52.5 13.4 400 type 4");
+  EXPECT_EQ(heard_.ends(), 0);
+  services.reset();
+  EXPECT_TRUE(ipc::eventually([this] { return heard_.ends() == 1; }));
+
+  services.emplace("org.freedesktop.GeoClue2");
+  services->start();
+  heard_.note("");
+  source = make();
+  EXPECT_EQ(heard_.wait(), "52.5 13.4 400 type 4");
+  bus.restart();
+  EXPECT_TRUE(ipc::eventually([this] { return heard_.ends() >= 2; }));
+}
+
+// Takes down the last thing that it heard.
+class NotingDelegate final : public LocationDelegate {
+ public:
+  HeardEvents heard;
+  void didUpdateLocations(const std::vector<LocationFix>& fixes) override {
+    heard.events().fix(fixes.back());
+  }
+  void didChangeAuthorizationStatus(LocationAuthorization) override {}
+  void didFailWithError(const Error& error) override { heard.events().failure(error); }
+};
+
+TEST_F(GeoClueSourceTest, IsAskedAgainAfterAnAbsenceARefusalAndARestart) {
+  PrivateSystemBus bus;
+  const LinuxClock clock(1000);  // the wait between attempts is 0.3 s
+  LinuxWorkQueues queues(clock, 2);
+  NotificationCenter center;
+  DeviceProfileStore store(center, "en_US");
+  FakeSettings settings;
+  settings.set("ZLKLocationAuthorization", 4);
+  std::atomic<int> absences = 0;
+  LinuxLocation location(store, settings, clock, queues,
+                         [&](const LocationOptions& options, LocationSourceEvents events) {
+                           return GeoClueSource::make(options, std::move(events), clock,
+                                                      [&](const std::string&) { ++absences; });
+                         });
+  const auto queue = queues.makeSerialQueue("delegate");
+  const auto delegate = std::make_shared<NotingDelegate>();
+  const auto manager = location.makeManager("bundle", {}, delegate, *queue);
+  // As searches do.
+  const auto askUntil = [&](const std::function<bool()>& done) {
+    return ipc::eventually([&] {
+      manager->startUpdating();
+      return done();
+    });
+  };
+  EXPECT_TRUE(askUntil([&] { return absences > 0; }));
+  {
+    HostServicesDouble refusing("org.freedesktop.GeoClue2", true);
+    refusing.start();
+    EXPECT_TRUE(askUntil([&] { return delegate->heard.hasHeard(); }));
+    EXPECT_EQ(delegate->heard.wait(), "failure 13");
+  }
+  bus.restart();
+  delegate->heard.note("");
+  HostServicesDouble granting("org.freedesktop.GeoClue2");
+  granting.start();
+  EXPECT_TRUE(askUntil([&] { return delegate->heard.hasHeard(); }));
+  EXPECT_EQ(delegate->heard.wait(), "52.5 13.4 400 type 4");
+}
+
 TEST_F(GeoClueSourceTest, WithoutASystemBusThereIsNoSource) {
   ::setenv("DBUS_SYSTEM_BUS_ADDRESS", "unix:path=/nowhere", 1);
   EXPECT_EQ(make(), nullptr);
@@ -177,8 +263,8 @@ TEST_F(GeoClueSourceTest, WithoutASystemBusThereIsNoSource) {
   EXPECT_THAT(heard_.wait(), HasSubstr("missing: "));
 }
 
-TEST(HostLocaleWatcherTest, HearsOfTheSystemsLocale) {
-  const PrivateSystemBus bus;
+TEST(HostLocaleWatcherTest, HearsOfTheSystemsLocaleAlsoAfterTheBusHasRestarted) {
+  PrivateSystemBus bus;
   const LinuxClock clock;
   LinuxWorkQueues queues(clock, 2);
   RecordingLog log;
@@ -187,19 +273,24 @@ TEST(HostLocaleWatcherTest, HearsOfTheSystemsLocale) {
   HostLocaleSources sources;
   sources.environment = [](const std::string&) { return "de_DE"; };
   HostLocaleWatcher watcher(
-      sources, [&](HostLocale host) { heard.note(host.locale); }, queues, files, log);
-  HostServicesDouble services("org.freedesktop.locale1");
-  services.start();
-  // The watcher listens from a moment on that only the bus knows.
-  const auto announcer = openSystemBus(nullptr);
-  EXPECT_TRUE(ipc::eventually([&] {
-    ::sd_bus_emit_signal(announcer.get(), "/org/freedesktop/locale1",
-                         "org.freedesktop.DBus.Properties", "PropertiesChanged", "sa{sv}as",
-                         "org.freedesktop.locale1", 0, 1, "Locale");
-    ::sd_bus_process(announcer.get(), nullptr);
-    return heard.hasHeard();
-  }));
-  EXPECT_EQ(heard.wait(), "fr_FR");
+      sources, [&](const HostLocale& host) { heard.note(host.locale); }, queues, files, log);
+  for (const auto& [language, locale] :
+       {std::pair{"LANG=fr_FR.UTF-8", "fr_FR"}, {"LANG=it_IT.UTF-8", "it_IT"}}) {
+    SCOPED_TRACE(locale);
+    HostServicesDouble services("org.freedesktop.locale1");
+    services.start(language);
+    // The watcher listens from a moment on that only the bus knows.
+    const auto announcer = openSystemBus(nullptr);
+    const std::string expected = locale;
+    EXPECT_TRUE(ipc::eventually([&] {
+      ::sd_bus_emit_signal(announcer.get(), "/org/freedesktop/locale1",
+                           "org.freedesktop.DBus.Properties", "PropertiesChanged", "sa{sv}as",
+                           "org.freedesktop.locale1", 0, 1, "Locale");
+      ::sd_bus_process(announcer.get(), nullptr);
+      return heard.hasHeard() && heard.wait() == expected;
+    }));
+    bus.restart();
+  }
 }
 
 }  // namespace

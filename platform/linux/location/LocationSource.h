@@ -17,6 +17,8 @@ class LocationSource {
 struct LocationSourceEvents {
   std::function<void(const LocationFix&)> fix;
   std::function<void(const Error&)> failure;
+  // No fix will come any more: the provider has refused, gone or never been there.
+  std::function<void()> ended;
 };
 
 // Null when the host has no such provider.
