@@ -59,11 +59,12 @@ struct DeviceProfile {
 // that are not known are passed over.
 DeviceProfile parseDeviceProfile(std::string_view text, std::vector<std::string>& problems);
 
-// The platform notifications that a change of the profile stands for, each once. `fallbackLocale`
-// is the locale of a profile without one: the country is that of the locale when the profile names
-// none.
+// The country that the profile names, else that of its locale, else that of the host's.
+std::string countryOf(const DeviceProfile& profile, const std::string& hostLocale);
+
+// The platform notifications that a change of the profile stands for, each once.
 std::vector<std::string_view> notificationsForChange(const DeviceProfile& before,
                                                      const DeviceProfile& after,
-                                                     const std::string& fallbackLocale);
+                                                     const std::string& hostLocale);
 
 }  // namespace zelkord

@@ -1,5 +1,7 @@
 #include "platform/linux/device_profile/DeviceProfileStore.h"
 
+#include <utility>
+
 namespace zelkord {
 
 DeviceProfileStore::Snapshot DeviceProfileStore::current() const {
@@ -11,9 +13,11 @@ void DeviceProfileStore::replace(DeviceProfile profile) {
   const auto after = std::make_shared<const DeviceProfile>(std::move(profile));
   const auto before = current();
   if (*before == *after) return;
+  std::string hostLocale;
   {
     const MutexLock lock(mutex_);
     current_ = after;
+    hostLocale = hostLocale_;
   }
   std::map<int, std::shared_ptr<const Observer>> observers;
   {
@@ -21,9 +25,16 @@ void DeviceProfileStore::replace(DeviceProfile profile) {
     observers = observers_->byId;
   }
   for (const auto& entry : observers) (*entry.second)(*before, *after);
-  for (const auto name : notificationsForChange(*before, *after, fallbackLocale_)) {
+  for (const auto name : notificationsForChange(*before, *after, hostLocale)) {
     center_.post(std::string(name));
   }
+}
+
+// Both kinds of change look at the other's value under one lock: no pair of them hides a country.
+bool DeviceProfileStore::replaceHostLocale(const std::string& locale) {
+  const MutexLock lock(mutex_);
+  const auto before = std::exchange(hostLocale_, locale);
+  return countryOf(*current_, before) != countryOf(*current_, locale);
 }
 
 Subscription DeviceProfileStore::observe(Observer observer) {

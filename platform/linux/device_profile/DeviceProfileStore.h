@@ -12,21 +12,24 @@
 
 namespace zelkord {
 
-// The device profile that counts now. Replacing it announces what changed.
+// The device profile that counts now, and the host's locale, which stands for the one that the
+// profile may not name. Replacing either announces what changed by it.
 //
-// Threading: any thread; `replace` one at a time. Observers and notifications come from the thread
-// that replaces, after the new profile counts. Ownership: the notification centre outlives it.
+// Threading: any thread; `replace` one at a time, `replaceHostLocale` likewise. Observers and
+// notifications come from the thread that replaces, after the new value counts.
+// Ownership: the notification centre outlives it.
 class DeviceProfileStore final {
  public:
   using Snapshot = std::shared_ptr<const DeviceProfile>;
   using Observer = std::function<void(const DeviceProfile& before, const DeviceProfile& after)>;
 
-  // `fallbackLocale`: the locale of a profile that names none.
-  DeviceProfileStore(NotificationCenter& center, std::string fallbackLocale)
-      : center_(center), fallbackLocale_(std::move(fallbackLocale)) {}
+  DeviceProfileStore(NotificationCenter& center, std::string hostLocale)
+      : center_(center), hostLocale_(std::move(hostLocale)) {}
 
   Snapshot current() const;
   void replace(DeviceProfile profile);
+  // True when the country changed by it, which is the caller's to announce.
+  bool replaceHostLocale(const std::string& locale);
   // For changes that have no notification of their own.
   Subscription observe(Observer observer);
 
@@ -38,9 +41,9 @@ class DeviceProfileStore final {
   };
 
   NotificationCenter& center_;
-  const std::string fallbackLocale_;
   const std::shared_ptr<Observers> observers_ = std::make_shared<Observers>();
   mutable Mutex mutex_;
+  std::string hostLocale_ ZK_GUARDED_BY(mutex_);
   Snapshot current_ ZK_GUARDED_BY(mutex_) = std::make_shared<DeviceProfile>();
 };
 

@@ -21,21 +21,20 @@ auto mapsParts(const DeviceProfile& profile) {
   return std::tie(profile.mapsMetadata, profile.mapsEnvironment);
 }
 
-std::string countryOf(const DeviceProfile& profile, const std::string& fallbackLocale) {
-  return profile.country ? *profile.country
-                         : regionOfLocale(profile.locale.value_or(fallbackLocale));
-}
-
 }  // namespace
+
+std::string countryOf(const DeviceProfile& profile, const std::string& hostLocale) {
+  return profile.country ? *profile.country : regionOfLocale(profile.locale.value_or(hostLocale));
+}
 
 std::vector<std::string_view> notificationsForChange(const DeviceProfile& before,
                                                      const DeviceProfile& after,
-                                                     const std::string& fallbackLocale) {
+                                                     const std::string& hostLocale) {
   std::vector<std::string_view> names;
   const auto addIf = [&](bool changed, std::string_view name) {
     if (changed) names.push_back(name);
   };
-  addIf(countryOf(before, fallbackLocale) != countryOf(after, fallbackLocale), kCountryCodeChanged);
+  addIf(countryOf(before, hostLocale) != countryOf(after, hostLocale), kCountryCodeChanged);
   addIf(mapsParts(before) != mapsParts(after), kMapsClientMetadataInvalidated);
   addIf(localeParts(before) != localeParts(after), kCurrentLocaleChanged);
   addIf(before.timeZone != after.timeZone, kTimeZoneChanged);

@@ -22,8 +22,8 @@ LinuxLocale::LinuxLocale(DeviceProfileStore& store, HostLocale host, Notificatio
     state_.host = std::move(host);
   }
   profileChanges_ =
-      store.observe([this](const DeviceProfile&, const DeviceProfile& after) { refresh(after); });
-  refresh(*store.current());
+      store.observe([this](const DeviceProfile&, const DeviceProfile&) { refresh(); });
+  refresh();
 }
 
 LocaleSnapshot LinuxLocale::current() const {
@@ -41,33 +41,36 @@ HostLocale LinuxLocale::host() const {
   return state_.host;
 }
 
-void LinuxLocale::refresh(const DeviceProfile& profile) {
+void LinuxLocale::refresh() {
+  const MutexLock refreshing(refreshMutex_);
+  const auto profile = store_.current();
   const auto now = host();
-  auto snapshot = localeFacts(profile, now);
-  auto zone = profile.timeZone.value_or(now.timeZone);
+  auto snapshot = localeFacts(*profile, now);
+  auto zone = profile->timeZone.value_or(now.timeZone);
   const MutexLock lock(mutex_);
   state_.snapshot = std::move(snapshot);
   state_.timeZone = std::move(zone);
 }
 
+// What changed is told by comparing what the host says with what it said before, under the same
+// profile: a profile that changes meanwhile announces its own part.
 void LinuxLocale::hostChanged(HostLocale host) {
-  const auto snapshotBefore = current();
-  const auto zoneBefore = timeZoneName();
-  const auto regionBefore = regionOfLocale(snapshotBefore.identifier);
+  const auto before = this->host();
   {
     const MutexLock lock(mutex_);
-    state_.host = std::move(host);
+    state_.host = host;
   }
+  refresh();
+  const bool countryChanged = store_.replaceHostLocale(host.locale);
   const auto profile = store_.current();
-  refresh(*profile);
-  const auto snapshot = current();
-  if (!profile->country && regionOfLocale(snapshot.identifier) != regionBefore) {
-    center_.post(std::string(kCountryCodeChanged));
-  }
-  if (snapshotParts(snapshot) != snapshotParts(snapshotBefore)) {
+  // All of it counts before the first of these is posted.
+  if (countryChanged) center_.post(std::string(kCountryCodeChanged));
+  if (snapshotParts(localeFacts(*profile, host)) != snapshotParts(localeFacts(*profile, before))) {
     center_.post(std::string(kCurrentLocaleChanged));
   }
-  if (timeZoneName() != zoneBefore) center_.post(std::string(kTimeZoneChanged));
+  if (!profile->timeZone && host.timeZone != before.timeZone) {
+    center_.post(std::string(kTimeZoneChanged));
+  }
 }
 
 }  // namespace zelkord

@@ -15,7 +15,7 @@ namespace zelkord {
 // Locale and time zone: the profile's over the host's. A change of the profile is announced by the
 // profile store, one of the host by `hostChanged`.
 //
-// Threading: any thread; reads come from memory.
+// Threading: any thread; reads come from memory. `hostChanged` one at a time.
 // Ownership: the store and the notification centre outlive it.
 class LinuxLocale final : public LocaleService {
  public:
@@ -35,10 +35,11 @@ class LinuxLocale final : public LocaleService {
     std::string timeZone;
   };
 
-  void refresh(const DeviceProfile& profile);
+  void refresh();
 
   NotificationCenter& center_;
   DeviceProfileStore& store_;
+  Mutex refreshMutex_;  // of two refreshes the later one sees all that came before
   mutable Mutex mutex_;
   State state_ ZK_GUARDED_BY(mutex_);
   Subscription profileChanges_;

@@ -184,5 +184,35 @@ TEST(LinuxLocaleTest, AnnouncesWhatTheHostChanges) {
   EXPECT_THAT(posted, ElementsAre(kCurrentLocaleChanged));
 }
 
+TEST(LinuxLocaleTest, TheCountryIsThatOfTheHostsLocaleOfTheMoment) {
+  struct Case {
+    const char* host;
+    std::optional<std::string> locale, country;  // of the profile
+    int changes;
+  };
+  const Case cases[] = {
+      {"de_DE", {}, {}, 1},      {"de_DE", {}, "DE", 0}, {"de_DE", "en_US", {}, 1},
+      {"fr_FR", "en_US", {}, 0}, {"fr_FR", {}, {}, 1},   {"it_FR", {}, {}, 0},
+      {"it_IT", {}, "IT", 1},    {"de_DE", {}, "IT", 0}, {"de_DE", {}, {}, 1},
+      {"de_DE", {}, "DE", 0},
+  };
+  NotificationCenter center;
+  DeviceProfileStore store(center, "en_US");
+  LinuxLocale locale(store, {"en_US", {}, "UTC"}, center);
+  int changes = 0;
+  const auto observer =
+      center.observe(std::string(kCountryCodeChanged), [&](const Notification&) { ++changes; });
+  for (const auto& test : cases) {
+    SCOPED_TRACE(std::string(test.host) + test.locale.value_or("-") + test.country.value_or("-"));
+    changes = 0;
+    locale.hostChanged({test.host, {}, "UTC"});
+    DeviceProfile profile;
+    profile.locale = test.locale;
+    profile.country = test.country;
+    store.replace(profile);
+    EXPECT_EQ(changes, test.changes);
+  }
+}
+
 }  // namespace
 }  // namespace zelkord
