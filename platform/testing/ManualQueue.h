@@ -33,9 +33,10 @@ class ManualQueue : public Interface {
   bool isCurrent() const final { return core_->isCurrent(*queue_, TimelineCore::Access::Shared); }
   const std::string& label() const final { return queue_->label; }
 
+  const TimelineCore::QueuePointer& queue() const { return queue_; }
+
  protected:
   const std::shared_ptr<TimelineCore>& core() const { return core_; }
-  const TimelineCore::QueuePointer& queue() const { return queue_; }
 
  private:
   const std::shared_ptr<TimelineCore> core_;

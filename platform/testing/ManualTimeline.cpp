@@ -50,6 +50,10 @@ std::optional<Duration> ManualTimeline::nextDelay() const {
 
 std::size_t ManualTimeline::pendingCount() const { return core_->count(); }
 
+void ManualTimeline::letMainRunAtOnce() {
+  static_cast<ManualSerialQueue&>(*main_).queue()->runsAtOnce = true;
+}
+
 void ManualTimeline::setWall(WallTime time) {
   wallOffset_ = time.time_since_epoch() - now().time_since_epoch();
 }

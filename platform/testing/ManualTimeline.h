@@ -44,6 +44,9 @@ class ManualTimeline final : public Clock, public WorkQueues {
   std::optional<Duration> nextDelay() const;
   // How many tasks wait, delayed ones included.
   std::size_t pendingCount() const;
+  // From now on the main queue is as quick as a thread of its own can be: what is posted to it runs
+  // before its poster goes on, unless the main queue is busy.
+  void letMainRunAtOnce();
   // Makes the wall clock jump; the steady one does not notice.
   void setWall(WallTime time);
 

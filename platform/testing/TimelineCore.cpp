@@ -15,7 +15,16 @@ TimelineCore::Key TimelineCore::post(const QueuePointer& queue, Duration delay, 
   checkThread();
   const Key key{deadlineAfter(now_, delay), nextSequence_++};
   agenda_.emplace(key, Entry{queue, access, std::move(task)});
+  if (queue->runsAtOnce) runAllDue(*queue);
   return key;
+}
+
+void TimelineCore::runAllDue(const Queue& queue) {
+  const Key end{now_, nextSequence_};
+  for (auto i = firstOf(queue, end); i != agenda_.end() && isFree(queue, i->second.access);
+       i = firstOf(queue, end)) {
+    run(i, true);
+  }
 }
 
 void TimelineCore::cancel(Key key) {

@@ -29,6 +29,7 @@ class TimelineCore final {
   struct Queue {
     std::string label;
     bool global = false;
+    bool runsAtOnce = false;  // what is posted runs before its poster goes on, if it may
     int sharedRunning = 0;
     bool exclusiveRunning = false;
   };
@@ -82,6 +83,7 @@ class TimelineCore final {
   static bool isFree(const Queue& queue, Access access);
   Agenda::iterator runnable(SteadyTime limit);
   Agenda::iterator firstOf(const Queue& queue, Key before);
+  void runAllDue(const Queue& queue);
   void run(Agenda::iterator place, bool startsChain);
   void enter(Frame frame);
   void leave();

@@ -34,9 +34,7 @@ void ContextUpdater::_setup(std::initializer_list<std::string_view> notification
 }
 
 void ContextUpdater::_updateDeviceCountryCode(Cause cause) {
-  context_->update([code = assembly_.platform().maps.countryCode()](
-                       RequestContext& context) { context.deviceCountryCode = code; },
-                   ContextReach::BagURL);
+  _takeOverPlaceAndLocale();
   if (cause == Cause::Notification) _notifyBagRefreshRequired();
 }
 
@@ -47,20 +45,28 @@ void ContextUpdater::_updateMapsClientMetadata(Cause) {
 }
 
 void ContextUpdater::_updateLocaleContexts(Cause cause) {
-  const auto locale = assembly_.platform().locale.current();
-  if (!languagesHeader(locale.preferredLanguages)) {
+  if (!_takeOverPlaceAndLocale()) {
     assembly_.log(Category::Request)
         .error("Error encoding preferred languages {}.", "a language is not valid UTF-8");
   }
-  context_->update([fields = localeContextOf(locale)](RequestContext& c) { c.locale = fields; },
-                   ContextReach::BagURL);
   if (cause == Cause::Notification) _notifyBagRefreshRequired();
 }
 
-void ContextUpdater::_updateTimeZoneName(Cause) {
-  context_->update([name = assembly_.platform().locale.timeZoneName()](RequestContext& c) {
-    c.localTimeZoneName = name;
-  });
+void ContextUpdater::_updateTimeZoneName(Cause) { _takeOverPlaceAndLocale(); }
+
+bool ContextUpdater::_takeOverPlaceAndLocale() {
+  const auto& platform = assembly_.platform();
+  const MutexLock lock(takingOver_);
+  const auto locale = platform.locale.current();
+  context_->update(
+      [code = platform.maps.countryCode(), fields = localeContextOf(locale),
+       zone = platform.locale.timeZoneName()](RequestContext& context) {
+        context.deviceCountryCode = code;
+        context.locale = fields;
+        context.localTimeZoneName = zone;
+      },
+      ContextReach::BagURL);
+  return languagesHeader(locale.preferredLanguages).has_value();
 }
 
 // The two below ask the service inside the update: of changes that come together the last one asks

@@ -5,6 +5,7 @@
 #include <string_view>
 #include <vector>
 
+#include "base/Mutex.h"
 #include "base/Subscription.h"
 #include "zelkord/network/RequestContextStore.h"
 
@@ -15,6 +16,10 @@ class DeviceManagement;
 
 // Fills the request context from the host's services, and again when the host announces a change.
 // A change of country or locale asks for a look at the bag.
+//
+// Country, locale and time zone often change together and are announced one after the other: the
+// first announcement takes over all three in one update, so that no request, and no look at the
+// bag, falls in between.
 //
 // Threading: `start` once, on any thread; observers run on the thread of whoever posts.
 // Ownership: the assembly outlives it. `poster` is only an identity: the object of what it posts.
@@ -35,6 +40,8 @@ class ContextUpdater final : public std::enable_shared_from_this<ContextUpdater>
   void _updateMapsClientMetadata(Cause cause);
   void _updateLocaleContexts(Cause cause);
   void _updateTimeZoneName(Cause cause);
+  // False when the languages cannot be encoded and were left out.
+  bool _takeOverPlaceAndLocale();
   void _updateIsManagedAccount(Cause cause);
   void _updateDeviceRestrictions(Cause cause);
   void _setupDebuggingQueryItems();
@@ -48,6 +55,7 @@ class ContextUpdater final : public std::enable_shared_from_this<ContextUpdater>
   std::vector<Subscription> observers_;
 
   // Own synchronisation.
+  Mutex takingOver_;  // what is read last is what the context is given last
   std::atomic<bool> refreshIsOnItsWay_ = false;
 };
 
