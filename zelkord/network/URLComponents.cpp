@@ -51,6 +51,25 @@ bool consistsOf(const CharacterSet& set, std::string_view text) {
 
 bool isAsciiLetter(char c) { return (c >= 'A' && c <= 'Z') || (c >= 'a' && c <= 'z'); }
 
+// What follows the host: nothing, or a colon and, perhaps, a number.
+bool isPort(std::string_view text) {
+  constexpr std::size_t kLongestPort = 5;
+  if (text.empty()) return true;
+  return text.front() == ':' && text.size() <= 1 + kLongestPort &&
+         text.find_first_not_of("0123456789", 1) == std::string_view::npos;
+}
+
+// "host[:port]", the host a name, or an address in brackets.
+bool isHostAndPort(std::string_view text) {
+  if (!text.starts_with('[')) {
+    const auto end = std::min(text.find(':'), text.size());
+    return end > 0 && text.find_first_of("[]") == std::string_view::npos &&
+           isPort(text.substr(end));
+  }
+  const auto close = text.find(']');
+  return close != std::string_view::npos && close > 1 && isPort(text.substr(close + 1));
+}
+
 // "scheme://[user@]host[:port][/path]"
 bool isURLBase(std::string_view base) {
   const auto scheme = base.find("://");
@@ -62,7 +81,7 @@ bool isURLBase(std::string_view base) {
   if (const auto user = authority.rfind('@'); user != std::string_view::npos) {
     authority.remove_prefix(user + 1);
   }
-  return !authority.empty() && authority.front() != ':';
+  return isHostAndPort(authority);
 }
 
 std::string decoded(std::string_view text) {

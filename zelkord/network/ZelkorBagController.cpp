@@ -7,6 +7,7 @@
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/assembly/NotificationNames.h"
 #include "zelkord/assembly/UserAgent.h"
+#include "zelkord/network/BagFailureReason.h"
 #include "zelkord/network/BagFetchFeedback.h"
 #include "zelkord/network/BagRefreshRule.h"
 #include "zelkord/network/BagRequests.h"
@@ -43,6 +44,7 @@ std::optional<std::string> reportedVersion(const json::object& response) {
 // What a fetch keeps until it has ended.
 struct ZelkorBagController::Fetch {
   Transaction transaction;
+  std::shared_ptr<const std::string> cacheURL;  // that it began with
   BagFetchFeedback feedback;
   FetchCallback callback;
 };
@@ -89,7 +91,7 @@ BagPointer ZelkorBagController::currentBag() {
 
 BagPointer ZelkorBagController::cachedBagState() {
   auto bag = inMemoryBag();
-  if (bag && _isRefreshRequiredForCachedBag(bag->rawBag().get())) {
+  if (bag && (urlChangedMeanwhile_ || _isRefreshRequiredForCachedBag(bag->rawBag().get()))) {
     auto& queue = assembly_.platform().queues.global(QualityOfService::Default);
     queue.async([weak = weak_from_this()] {
       if (const auto self = weak.lock()) self->_fetchBagStateWithVersion(std::nullopt);
@@ -110,6 +112,23 @@ BagPointer ZelkorBagController::inMemoryBag() const {
 std::optional<std::string> ZelkorBagController::warmURL() {
   const auto bag = currentBag();
   return bag ? bag->warmURL() : std::nullopt;
+}
+
+BagFetchStatus ZelkorBagController::fetchStatus() {
+  return {urlForPeople(*cacheURL_.get(*this, userAgent_)), lastFailure_.get(), _nextAttempt()};
+}
+
+std::optional<WallTime> ZelkorBagController::_nextAttempt() {
+  const auto now = assembly_.platform().clock.wallNow();
+  const auto bag = inMemoryBag();
+  if (!bag || urlChangedMeanwhile_) return now;
+  const auto url = cacheURL_.get(*this, userAgent_);
+  const auto decision =
+      decideBagRefresh(bag->rawBag().get(), now, [&] { return std::string_view(*url); });
+  if (decision.reason == BagRefreshDecision::Reason::Disabled) return std::nullopt;
+  if (decision.isRequired()) return now;
+  return wallTimeOfSeconds(numberIn(*bag->rawBag(), kBagExpirationKey).value_or(0)) -
+         kBagRefreshMargin;
 }
 
 void ZelkorBagController::forceFetchBag(const json::object& response) {
@@ -149,6 +168,11 @@ std::shared_ptr<const json::object> ZelkorBagController::cacheBagDictionary(
 }
 
 json::object ZelkorBagController::_dictionaryToCacheBag(json::object dictionary) {
+  // The service cannot switch its own replacement off for ever.
+  if (const auto* disabled = dictionary.find(kBagRefreshDisabledKey);
+      disabled != dictionary.end()) {
+    dictionary.stable_erase(disabled);
+  }
   const auto now = assembly_.platform().clock.wallNow();
   dictionary[kBagExpirationKey] = secondsSince1970(now) + secondsOf(kBagLifetime);
   dictionary[kBagURLKey] = *cacheURL_.get(*this, userAgent_);
@@ -212,9 +236,11 @@ void ZelkorBagController::_fetchBagStateWithVersion(const std::optional<std::str
 void ZelkorBagController::_fetchBagStateWithVersion(const std::optional<std::string>& version,
                                                     FetchCallback callback) {
   auto transaction = assembly_.platform().transactions.open("bagFetch");
+  // Before the request is made: a change in between counts as one during the fetch.
+  auto cacheURL = cacheURL_.get(*this, userAgent_);
   auto request = requests_.bagFetchRequest(*this, userAgent_, version);
   _logRequest(request);
-  auto fetch = std::make_shared<Fetch>(Fetch{std::move(transaction),
+  auto fetch = std::make_shared<Fetch>(Fetch{std::move(transaction), std::move(cacheURL),
                                              BagFetchFeedback(assembly_, request, userAgent_),
                                              std::move(callback)});
   _taskOf(std::move(request), std::move(fetch))->resume();
@@ -257,11 +283,20 @@ void ZelkorBagController::_finishFetch(Fetch& fetch, const URLTask& task, const 
   }
   fetch.feedback.sessionComplete();
   if (fetch.callback) fetch.callback(bag, response.error);
+  _endFetch(fetch, bag != nullptr);
+}
+
+void ZelkorBagController::_endFetch(const Fetch& fetch, bool succeeded) {
+  // First let others begin one, then look: a change after this look has its own look at the bag.
   fetchInProgress_ = false;
+  const bool changed = *cacheURL_.get(*this, userAgent_) != *fetch.cacheURL;
+  if (changed || succeeded) urlChangedMeanwhile_ = changed;
+  if (changed) _fetchBagStateWithVersion(std::nullopt);
 }
 
 void ZelkorBagController::_failFetch(Fetch& fetch, const Error& error) {
   fetch.feedback.recordError(error);
+  lastFailure_.set({{assembly_.platform().clock.wallNow(), bagFailureReason(error)}});
   assembly_.notificationCenter().post(
       {std::string(kZLKBagChangeNotification), nullptr, {{"bagError", error}}});
   assembly_.reporter().addValue(1, "com.quenta.zelkord.bag.fetchesfailed");

@@ -8,12 +8,14 @@
 #include <string_view>
 
 #include "base/Error.h"
+#include "base/Guarded.h"
 #include "base/Json.h"
 #include "corezelkor/ZLKBag.h"
 #include "platform/api/URLSession.h"
 #include "platform/api/WorkQueue.h"
 #include "zelkord/network/BagCacheURL.h"
 #include "zelkord/network/BagDiskCache.h"
+#include "zelkord/network/BagFetchStatus.h"
 
 namespace zelkord {
 
@@ -30,7 +32,9 @@ enum class BagOrigin { Network, Disk };
 //
 // No bag, a bag, or a bag that is due (the next read begins a fetch). At most one fetch is under
 // way; further ones asked for meanwhile are dropped. The installed bag serves until another
-// replaces it: a failed fetch changes nothing, and nothing but the next read repeats it.
+// replaces it: a failed fetch changes nothing, and nothing but the next read repeats it. A fetch
+// that ends when the bag's URL is no longer the one that it began with is followed by another one:
+// whoever asked for it meanwhile was dropped, and its bag may be that of another country.
 //
 // Each install posts "ZLKBagChangeNotification" with "bag", each failed fetch one with "bagError".
 // A bag from the network that changes whether news is available posts that system-wide.
@@ -58,6 +62,9 @@ class ZelkorBagController final : public std::enable_shared_from_this<ZelkorBagC
   BagPointer inMemoryBag() const;
   std::optional<std::string> warmURL();
 
+  // Where bags come from, what went wrong last, when the next one is fetched.
+  BagFetchStatus fetchStatus();
+
   // What the service says it serves: {"bag": version}. Fetches when that is newer.
   void forceFetchBag(const json::object& response);
 
@@ -73,6 +80,7 @@ class ZelkorBagController final : public std::enable_shared_from_this<ZelkorBagC
   struct Fetch;
 
   bool _isRefreshRequiredForCachedBag(const json::object* dictionary);
+  std::optional<WallTime> _nextAttempt();
   json::object _dictionaryToCacheBag(json::object dictionary);
   void _handleRefreshNotification();
   void _fetchBagStateWithVersion(const std::optional<std::string>& version);
@@ -80,6 +88,7 @@ class ZelkorBagController final : public std::enable_shared_from_this<ZelkorBagC
   std::shared_ptr<URLTask> _taskOf(URLRequest request, std::shared_ptr<Fetch> fetch);
   void _finishFetch(Fetch& fetch, const URLTask& task, const URLResult& result);
   void _failFetch(Fetch& fetch, const Error& error);
+  void _endFetch(const Fetch& fetch, bool succeeded);
   void _install(const BagPointer& bag, BagOrigin origin);
   void _logRequest(const URLRequest& request) const;
   void _logResponse(const URLResult& result) const;
@@ -94,7 +103,10 @@ class ZelkorBagController final : public std::enable_shared_from_this<ZelkorBagC
 
   // Own synchronisation.
   std::atomic<bool> fetchInProgress_ = false;
+  // The last fetch ended with another URL than it began with, and none has succeeded since.
+  std::atomic<bool> urlChangedMeanwhile_ = false;
   BagCacheURL cacheURL_;
+  Guarded<std::optional<BagFetchStatus::Failure>> lastFailure_;
 
   // Queue state: replaced in exclusive tasks only.
   BagPointer inMemoryBag_ ZK_ON(inMemoryBagCacheAccessQueue_);

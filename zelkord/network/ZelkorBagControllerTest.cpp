@@ -179,9 +179,79 @@ TEST_F(ZelkorBagControllerTest, ReadsFetchAnewTenMinutesBeforeTheEnd) {
   EXPECT_EQ(counted("expired"), 2);
   EXPECT_TRUE(platform_.log.contains("bag expired: 599.000000"));
   install(R"({"version": 2, "__refresh_disabled": 0})");
+  EXPECT_FALSE(controller_->inMemoryBag()->rawBag()->contains("__refresh_disabled"));
   platform_.timeline.advance(24h);
   EXPECT_EQ(readVersion(), "2");
+  EXPECT_EQ(fetchesUnderWay(), 1u) << "the service has no say in that";
+}
+
+TEST_F(ZelkorBagControllerTest, AFetchWhoseURLChangesMeanwhileIsFollowedByAnother) {
+  const auto move = [this](std::string country) {
+    requests_.country = std::move(country);
+    ++requests_.generation;
+    platform_.notificationCenter.post({std::string(kZLKBagRefreshRequired), &requests_, {}});
+    platform_.timeline.runUntilIdle();
+  };
+  make();
+  readVersion();
+  move("CN");
+  EXPECT_EQ(session().tasks().size(), 1u) << "one at a time";
+  reply(200, R"({"version": "global"})");
+  ASSERT_EQ(fetchesUnderWay(), 1u);
+  EXPECT_EQ(session().pending()[0]->request().url, "https://api-cn.zelkor.example/bag?v=none");
+  reply(200, R"({"version": "chinese"})");
+  EXPECT_EQ(readVersion(), "chinese");
   EXPECT_EQ(fetchesUnderWay(), 0u);
+
+  // When that one fails, the bag of the other country does not pass for this one's.
+  move("DE");
+  move("CN");
+  reply(200, R"({"version": "global"})");
+  reply(500, "");
+  EXPECT_EQ(fetchesUnderWay(), 0u);
+  EXPECT_EQ(readVersion(), "global");
+  reply(200, R"({"version": "chinese"})");
+  EXPECT_EQ(readVersion(), "chinese");
+  EXPECT_EQ(fetchesUnderWay(), 0u);
+
+  move("DE");
+  move("CN");
+  move("DE");
+  reply(500, "");
+  EXPECT_EQ(fetchesUnderWay(), 0u) << "there and back";
+}
+
+TEST_F(ZelkorBagControllerTest, TellsPeopleHowFetchingGoes) {
+  const auto& timeline = platform_.timeline;
+  platform_.settings.set("ZLKBagURL", "https://me:secret@h:8443/bag?token=1#x");
+  make();
+  EXPECT_EQ(controller_->fetchStatus().url, "https://h:8443/bag");
+  EXPECT_FALSE(controller_->fetchStatus().lastFailure);
+  EXPECT_EQ(controller_->fetchStatus().nextAttempt, timeline.wallNow());
+
+  readVersion();
+  session().pending().at(0)->fail(urlError(URLErrorCode::HostNotFound));
+  platform_.timeline.runUntilIdle();
+  const auto failedAt = timeline.wallNow();
+  platform_.timeline.advance(5s);
+  const auto status = controller_->fetchStatus();
+  ASSERT_TRUE(status.lastFailure);
+  EXPECT_EQ(status.lastFailure->reason, "name does not resolve");
+  EXPECT_EQ(status.lastFailure->time, failedAt);
+  EXPECT_EQ(status.nextAttempt, timeline.wallNow()) << "the next read";
+
+  readVersion();
+  reply(200, "{}");
+  EXPECT_EQ(controller_->fetchStatus().nextAttempt, timeline.wallNow() + 13800s);
+  platform_.timeline.advance(14000s);
+  EXPECT_EQ(controller_->fetchStatus().nextAttempt, timeline.wallNow());
+  EXPECT_EQ(counted("expired"), 0) << "asking is no read";
+  controller_->cacheBagState(
+      std::make_shared<const ZLKBag>(
+          std::make_shared<const json::object>(json::object{{"__refresh_disabled", 0}}),
+          std::nullopt),
+      BagOrigin::Network);
+  EXPECT_EQ(controller_->fetchStatus().nextAttempt, std::nullopt);
 }
 
 TEST_F(ZelkorBagControllerTest, ReadsFetchAnewWhenTheURLChanges) {
@@ -446,6 +516,12 @@ TEST_F(ZelkorBagControllerTest, ChoosesWhereToFetchFrom) {
       {"", "CN", "https://api-cn.zelkor.example/bag", 0},
       {"http://[::1]:8080/bag?x", "CN", "http://[::1]:8080/bag?x", 0},
       {"not a url", "CN", "https://api-cn.zelkor.example/bag", 1},
+      {"https://[", "US", "https://api.zelkor.example/bag", 1},
+      {"https://[]/bag", "US", "https://api.zelkor.example/bag", 1},
+      {"https://[::1/bag", "US", "https://api.zelkor.example/bag", 1},
+      {"https://h]/bag", "US", "https://api.zelkor.example/bag", 1},
+      {"https://h:port/bag", "US", "https://api.zelkor.example/bag", 1},
+      {"https://u:p@[::1]/bag", "US", "https://u:p@[::1]/bag", 0},
       {7, "US", "https://api.zelkor.example/bag", 0},
   };
   for (const auto& test : cases) {
