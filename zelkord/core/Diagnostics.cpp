@@ -46,13 +46,27 @@ json::array statesOf(ClientStateManager& manager) {
   return list;
 }
 
-json::value bagOf(const ZelkorBagController& controller) {
-  const auto bag = controller.inMemoryBag();
-  if (!bag) return nullptr;
-  const auto expiration = numberIn(*bag->rawBag(), kBagExpirationKey);
-  return {{"version", textOrNull(bag->version())},
-          {"enabled", bag->isEnabled()},
-          {"expiration", expiration ? json::value(*expiration) : nullptr}};
+json::value timeOrNull(const std::optional<WallTime>& time) {
+  if (!time) return nullptr;
+  return secondsSince1970(*time);
+}
+
+json::object bagOf(ZelkorBagController& controller) {
+  json::object object;
+  if (const auto bag = controller.inMemoryBag()) {
+    const auto expiration = numberIn(*bag->rawBag(), kBagExpirationKey);
+    object["version"] = textOrNull(bag->version());
+    object["enabled"] = bag->isEnabled();
+    object["expiration"] = expiration ? json::value(*expiration) : nullptr;
+  }
+  const auto fetches = controller.fetchStatus();
+  object["url"] = fetches.url;
+  object["last_failure"] = nullptr;
+  if (const auto& failure = fetches.lastFailure) {
+    object["last_failure"] = {{"time", timeOrNull(failure->time)}, {"reason", failure->reason}};
+  }
+  object["next_attempt"] = timeOrNull(fetches.nextAttempt);
+  return object;
 }
 
 json::object transportOf(const ipc::Statistics& statistics) {

@@ -22,6 +22,7 @@ class Diagnostics final : public ipc::CallHandler {
   void handle(ipc::Call call) override;
 
   // JSON: {"pid", "version", "transactions", "connections", "states", "bag", "interprocess"}.
+  // Without a bag "bag" has only how fetching it goes.
   std::string status() const;
 
  private:

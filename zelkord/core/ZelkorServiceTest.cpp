@@ -390,7 +390,28 @@ TEST(DiagnosticsTest, ReadsAndWritesSettingsAndTellsTheStatus) {
   const auto status = parseJson(*ask("Status", {})->values[0].get<std::string>())->as_object();
   EXPECT_EQ(status.at("connections").as_array().size(), 1u);
   EXPECT_EQ(status.at("bag").at("version"), "4");
+  EXPECT_EQ(status.at("bag").at("url"), "https://api.zelkor.example/bag");
+  EXPECT_TRUE(status.at("bag").at("last_failure").is_null());
   EXPECT_EQ(status.at("transactions").as_array(), (json::array{"bagFetch", "clientConnection"}));
+}
+
+TEST(DiagnosticsTest, SayWhyThereIsNoBagAndWhenTheNextIsFetched) {
+  DaemonBed bed;
+  const auto client = bed.connectAndConfigure();
+  const auto failedAt = secondsSince1970(bed.fakes.timeline.wallNow());
+  bed.fakes.urlSessions.find("bagSession")
+      ->pending()
+      .at(0)
+      ->fail(urlError(URLErrorCode::CannotConnect, "Connection refused"));
+  bed.run();
+  bed.fakes.timeline.advance(5s);
+  const auto answer = client->call(std::string(kDiagnosticsInterface), "Status", {});
+  bed.run();
+  const auto bag = parseJson(*answer->values[0].get<std::string>())->at("bag").as_object();
+  EXPECT_EQ(bag,
+            (json::object{{"url", "https://api.zelkor.example/bag"},
+                          {"last_failure", {{"time", failedAt}, {"reason", "connection refused"}}},
+                          {"next_attempt", failedAt + 5}}));
 }
 
 }  // namespace

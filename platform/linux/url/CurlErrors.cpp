@@ -1,5 +1,6 @@
 #include "platform/linux/url/CurlErrors.h"
 
+#include <system_error>
 #include <utility>
 
 namespace zelkord {
@@ -53,8 +54,12 @@ URLErrorCode urlErrorCodeOf(CURLcode code) {
 
 }  // namespace
 
-Error errorOfTransfer(CURLcode code, std::string text) {
+Error errorOfTransfer(CURLcode code, std::string text, long systemError) {
   if (text.empty()) text = curl_easy_strerror(code);
+  // Its text says that there is no connection, never why.
+  if (code == CURLE_COULDNT_CONNECT && systemError != 0) {
+    text += ": " + std::generic_category().message(static_cast<int>(systemError));
+  }
   return urlError(urlErrorCodeOf(code), std::move(text));
 }
 

@@ -209,7 +209,9 @@ URLResult CurlTransfer::takeResult(CURLcode code) {
   } else if (code == CURLE_UNSUPPORTED_PROTOCOL && requestsSent_ > 0) {  // the answer's, not ours
     result.error = errorOfTransfer(CURLE_WEIRD_SERVER_REPLY, errorText_.data());
   } else if (code != CURLE_OK) {
-    result.error = errorOfTransfer(code, errorText_.data());
+    long systemError = 0;
+    curl_easy_getinfo(handle_, CURLINFO_OS_ERRNO, &systemError);
+    result.error = errorOfTransfer(code, errorText_.data(), systemError);
   } else if (!result.response) {
     result.error = urlError(URLErrorCode::Other, "no response");
   }

@@ -153,6 +153,8 @@ TEST(CurlErrorsTest, MapsFailuresToTheCallersActions) {
     EXPECT_EQ(error.reason(), curl_easy_strerror(from));
   }
   EXPECT_EQ(errorOfTransfer(CURLE_COULDNT_CONNECT, "why").reason(), "why");
+  EXPECT_EQ(errorOfTransfer(CURLE_COULDNT_CONNECT, "why", ECONNREFUSED).reason(),
+            "why: Connection refused");
 }
 
 }  // namespace
