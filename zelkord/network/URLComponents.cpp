@@ -52,7 +52,7 @@ bool consistsOf(const CharacterSet& set, std::string_view text) {
 bool isAsciiLetter(char c) { return (c >= 'A' && c <= 'Z') || (c >= 'a' && c <= 'z'); }
 
 // What follows the host: nothing, or a colon and, perhaps, a number.
-bool isPort(std::string_view text) {
+bool isColonAndPort(std::string_view text) {
   constexpr std::size_t kLongestPort = 5;
   if (text.empty()) return true;
   return text.front() == ':' && text.size() <= 1 + kLongestPort &&
@@ -64,10 +64,10 @@ bool isHostAndPort(std::string_view text) {
   if (!text.starts_with('[')) {
     const auto end = std::min(text.find(':'), text.size());
     return end > 0 && text.find_first_of("[]") == std::string_view::npos &&
-           isPort(text.substr(end));
+           isColonAndPort(text.substr(end));
   }
   const auto close = text.find(']');
-  return close != std::string_view::npos && close > 1 && isPort(text.substr(close + 1));
+  return close != std::string_view::npos && close > 1 && isColonAndPort(text.substr(close + 1));
 }
 
 // "scheme://[user@]host[:port][/path]"
