@@ -1,4 +1,4 @@
-#!/usr/bin/env python3
+#!/usr/bin/python3
 """Holds what is written of the D-Bus interfaces against one another.
 
 usage: interfaces.py page             docs/ipc.md names the members of com.quenta.zelkord.xml, with their signatures
