@@ -25,12 +25,11 @@ void makePrivateFile(const std::string& path) {
   if (file >= 0) ::close(file);
 }
 
-// A file's tables are all that is wanted of it: its views and triggers could run for ever. In a
-// file that belongs to others too their triggers keep their tables in order.
-void trustOnlyTables(sqlite3* database, bool isShared) {
+// A file's tables are all that is wanted of it: its views and triggers could run for ever.
+void trustOnlyTables(sqlite3* database) {
   sqlite3_db_config(database, SQLITE_DBCONFIG_ENABLE_VIEW, 0, nullptr);
+  sqlite3_db_config(database, SQLITE_DBCONFIG_ENABLE_TRIGGER, 0, nullptr);
   sqlite3_db_config(database, SQLITE_DBCONFIG_TRUSTED_SCHEMA, 0, nullptr);
-  if (!isShared) sqlite3_db_config(database, SQLITE_DBCONFIG_ENABLE_TRIGGER, 0, nullptr);
 }
 
 const char* journalOf(const DatabaseOptions& options) {
@@ -81,7 +80,8 @@ std::optional<Database> Database::open(const std::string& path, Failure* failure
     return std::nullopt;
   }
   sqlite3_extended_result_codes(raw, 1);
-  trustOnlyTables(raw, options.isShared);
+  // In a file that belongs to others too their triggers keep their tables in order.
+  if (!options.isShared) trustOnlyTables(raw);
   sqlite3_busy_handler(raw, &BusyWait::sleep, database.busyWait_.get());
   auto problem = database.execute(journalOf(options));
   if (!problem) return database;
