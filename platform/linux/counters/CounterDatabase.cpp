@@ -15,17 +15,36 @@ std::optional<sqlite::Failure> CounterDatabase::open() {
   return std::nullopt;
 }
 
-std::optional<sqlite::Failure> CounterDatabase::readInto(Values& values) {
-  auto rows = database_->prepare("SELECT key, value FROM counters");
-  while (rows.step()) values[std::string(rows.text(0))] = rows.integer(1);
+// Keys that are too long stay in the file: their text may be of any size.
+std::optional<sqlite::Failure> CounterDatabase::readInto(BoundedCounters& counters) {
+  auto rows = database_->prepare(
+      "SELECT iif(length(CAST(key AS BLOB)) <= ?1, key, ?2), value FROM counters");
+  rows.bind(1, static_cast<std::int64_t>(BoundedCounters::kMaximumKeySize))
+      .bind(2, BoundedCounters::kOthers);
+  for (rows_ = 0; rows.step(); ++rows_) counters.add(rows.text(0), rows.integer(1));
   return rows.failure();
 }
 
-CounterDatabase::Values CounterDatabase::load() {
-  Values values;
+std::optional<sqlite::Failure> CounterDatabase::cutDownTo(const BoundedCounters& counters) {
+  if (rows_ == static_cast<std::int64_t>(counters.values().size())) return std::nullopt;
+  log_.error("{} has {} counters; it is cut down to {}", path_, rows_, counters.values().size());
+  auto failure = database_->transaction([&] {
+    auto problem = database_->execute("DELETE FROM counters");
+    return problem ? problem : put(counters.values());
+  });
+  return failure ? failure : database_->execute("VACUUM");
+}
+
+BoundedCounters CounterDatabase::load() {
+  BoundedCounters counters;
   auto failure = open();
-  if (!failure) failure = readInto(values);
-  if (!failure) return values;
+  if (!failure) failure = readInto(counters);
+  if (!failure) {
+    if (const auto problem = cutDownTo(counters)) {
+      log_.error("cannot cut {} down: {}", path_, problem->text);
+    }
+    return counters;
+  }
   if (!replaceDamaged(*failure)) log_.error("cannot read {}: {}", path_, failure->text);
   return {};
 }
@@ -39,15 +58,18 @@ bool CounterDatabase::replaceDamaged(const sqlite::Failure& failure) {
   return aside.has_value();
 }
 
+template <typename AnyValues>
+std::optional<sqlite::Failure> CounterDatabase::put(const AnyValues& values) {
+  auto put = database_->prepare("INSERT OR REPLACE INTO counters VALUES(?1, ?2)");
+  for (const auto& [key, value] : values) {
+    if (auto failure = put.bind(1, std::string_view(key)).bind(2, value).run()) return failure;
+  }
+  return std::nullopt;
+}
+
 std::optional<sqlite::Failure> CounterDatabase::write(const Values& values) {
   if (auto failure = open()) return failure;
-  return database_->transaction([&]() -> std::optional<sqlite::Failure> {
-    auto put = database_->prepare("INSERT OR REPLACE INTO counters VALUES(?1, ?2)");
-    for (const auto& [key, value] : values) {
-      if (auto failure = put.bind(1, std::string_view(key)).bind(2, value).run()) return failure;
-    }
-    return std::nullopt;
-  });
+  return database_->transaction([&] { return put(values); });
 }
 
 std::optional<sqlite::Failure> CounterDatabase::store(const Values& values) {

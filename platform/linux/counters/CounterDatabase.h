@@ -5,13 +5,15 @@
 #include <optional>
 #include <string>
 
+#include "platform/api/BoundedCounters.h"
 #include "platform/api/Log.h"
 #include "platform/linux/sqlite/Database.h"
 
 namespace zelkord {
 
 // The counters on disk: table counters(key, value). A damaged file is renamed and a new one takes
-// its place.
+// its place. A file with more or longer keys than counters have, which an earlier version may have
+// left, is cut down when it is read.
 //
 // Threading: one thread at a time. Errors: logged by `load`, given back by `store`.
 class CounterDatabase final {
@@ -20,19 +22,23 @@ class CounterDatabase final {
 
   CounterDatabase(std::string path, Logger log) : path_(std::move(path)), log_(std::move(log)) {}
 
-  Values load();
+  BoundedCounters load();
   // Stores these values, all or none; others stay.
   std::optional<sqlite::Failure> store(const Values& values);
 
  private:
   std::optional<sqlite::Failure> open();
-  std::optional<sqlite::Failure> readInto(Values& values);
+  std::optional<sqlite::Failure> readInto(BoundedCounters& counters);
+  std::optional<sqlite::Failure> cutDownTo(const BoundedCounters& counters);
   std::optional<sqlite::Failure> write(const Values& values);
+  template <typename AnyValues>
+  std::optional<sqlite::Failure> put(const AnyValues& values);
   bool replaceDamaged(const sqlite::Failure& failure);
 
   const std::string path_;
   const Logger log_;
   std::optional<sqlite::Database> database_;
+  std::int64_t rows_ = 0;  // that were read
 };
 
 }  // namespace zelkord

@@ -7,12 +7,6 @@ namespace {
 
 constexpr Duration kCounterWriteDelay = 15s;
 
-std::int64_t saturatedSum(std::int64_t a, std::int64_t b) {
-  std::int64_t sum = 0;
-  if (!__builtin_add_overflow(a, b, &sum)) return sum;
-  return b > 0 ? INT64_MAX : INT64_MIN;
-}
-
 }  // namespace
 
 LinuxCounters::LinuxCounters(FileManager& files, WorkQueues& queues, LogSink& log)
@@ -20,34 +14,32 @@ LinuxCounters::LinuxCounters(FileManager& files, WorkQueues& queues, LogSink& lo
       log_(log, ""),
       queue_(queues.makeSerialQueue("com.quenta.zelkord.counters")),
       database_(files.directories().state + "/counters.db", log_) {
-  CounterDatabase::Values loaded;
+  BoundedCounters loaded;
   queue_->sync([&] {
     queue_->assertCurrent();
     loaded = database_.load();
   });
   const MutexLock lock(mutex_);
-  values_.insert(loaded.begin(), loaded.end());
+  values_ = std::move(loaded);
 }
 
 LinuxCounters::~LinuxCounters() { save(); }
 
 void LinuxCounters::add(std::string_view key, std::int64_t amount) {
   const MutexLock lock(mutex_);
-  auto found = values_.find(key);
-  if (found == values_.end()) found = values_.emplace(key, 0).first;
-  found->second = saturatedSum(found->second, amount);
+  values_.add(key, amount);
   markChanged();
 }
 
 void LinuxCounters::set(std::string_view key, std::int64_t value) {
   const MutexLock lock(mutex_);
-  values_.insert_or_assign(std::string(key), value);
+  values_.set(key, value);
   markChanged();
 }
 
 std::map<std::string, std::int64_t> LinuxCounters::all() const {
   const MutexLock lock(mutex_);
-  return {values_.begin(), values_.end()};
+  return {values_.values().begin(), values_.values().end()};
 }
 
 void LinuxCounters::markChanged() {

@@ -5,6 +5,7 @@
 #include <string>
 
 #include "base/Mutex.h"
+#include "platform/api/BoundedCounters.h"
 #include "platform/api/Counters.h"
 #include "platform/api/FileManager.h"
 #include "platform/api/Log.h"
@@ -13,8 +14,8 @@
 
 namespace zelkord {
 
-// Counters in memory, kept over restarts in "counters.db" of the state directory and shown as
-// OpenMetrics text in "metrics.prom" of the runtime directory.
+// Counters in memory, bounded, kept over restarts in "counters.db" of the state directory and shown
+// as OpenMetrics text in "metrics.prom" of the runtime directory.
 //
 // States: clean; changed, from the first change after a write: 15 s later both files are written.
 //
@@ -27,7 +28,6 @@ class LinuxCounters final : public Counters {
   LinuxCounters(FileManager& files, WorkQueues& queues, LogSink& log);
   ~LinuxCounters() override;
 
-  // A sum that would not fit stays at the largest value.
   void add(std::string_view key, std::int64_t amount) override;
   void set(std::string_view key, std::int64_t value) override;
   std::map<std::string, std::int64_t> all() const override;
@@ -52,7 +52,7 @@ class LinuxCounters final : public Counters {
 
   // Own synchronisation.
   mutable Mutex mutex_;
-  std::map<std::string, std::int64_t, std::less<>> values_ ZK_GUARDED_BY(mutex_);
+  BoundedCounters values_ ZK_GUARDED_BY(mutex_);
   bool changed_ ZK_GUARDED_BY(mutex_) = false;
   Subscription timer_ ZK_GUARDED_BY(mutex_);
 };

@@ -46,8 +46,8 @@ TEST_F(LinuxCountersTest, AreWrittenTogether15SecondsAfterTheFirstChange) {
   EXPECT_FALSE(root_.has("run/metrics.prom"));
   timeline_.advance(1s);
   EXPECT_THAT(root_.read("run/metrics.prom"), HasSubstr("{key=\"a\"} 3\n"));
-  EXPECT_EQ(CounterDatabase(root_ / "counters.db", Logger(log_, "")).load(),
-            (CounterDatabase::Values{{"a", 3}}));
+  EXPECT_EQ(CounterDatabase(root_ / "counters.db", Logger(log_, "")).load().values(),
+            (BoundedCounters::Values{{"a", 3}}));
   EXPECT_EQ(timeline_.nextDelay(), std::nullopt);
 }
 
@@ -62,6 +62,43 @@ TEST_F(LinuxCountersTest, GoOnAfterARestart) {
   counters->add("added", INT64_MAX);
   EXPECT_EQ(counters->all(), (std::map<std::string, std::int64_t>{
                                  {"added", INT64_MAX}, {"set", INT64_MIN}, {"zero", 0}}));
+}
+
+TEST_F(LinuxCountersTest, AFloodOfKeysCountsUnderOneForAllOthers) {
+  const auto key = [](int i) { return "com.quenta.zelkord.agent " + std::to_string(i); };
+  const auto counters = make();
+  counters->add("mine", 1);
+  for (int i = 0; i < 10'000; ++i) counters->add(key(i), 2);
+  for (int i = 0; i < 1000; ++i) counters->add(key(i) + std::string(64 * 1024, 'x'), 3);
+  counters->add(std::string(256, 'y'), 5);
+  counters->set("late", 7);
+  counters->set("mine", 9);
+  const auto all = counters->all();
+  EXPECT_EQ(all.size(), 4096u);
+  EXPECT_EQ(all.at("mine"), 9);
+  EXPECT_EQ(all.at(key(4093)), 2);
+  EXPECT_EQ(all.at("com.quenta.zelkord.other"), (10'000 - 4094) * 2 + 1000 * 3 + 5 + 7);
+  counters->save();
+  EXPECT_EQ(make()->all(), all);
+}
+
+TEST_F(LinuxCountersTest, AStoreOfAnEarlierVersionIsCutDown) {
+  const auto path = root_ / "counters.db";
+  make()->add("com.quenta.zelkord.other", 1);
+  auto database = sqlite::Database::open(path, nullptr);
+  ASSERT_TRUE(database);
+  ASSERT_FALSE(database->execute(
+      "WITH RECURSIVE n(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM n WHERE i < 6000)"
+      "INSERT INTO counters SELECT i || iif(i % 2, printf('%500c', 'x'), ''), 1 FROM n"));
+  EXPECT_GT(root_.read("counters.db").size(), 1'500'000u);
+  database.reset();
+  const auto all = make()->all();
+  EXPECT_EQ(all.size(), 4096u);
+  EXPECT_EQ(all.at("com.quenta.zelkord.other"), 6000 + 1 - 4095);
+  EXPECT_LT(root_.read("counters.db").size(), 500'000u);
+  EXPECT_EQ(log_.count("cut down to 4096"), 1);
+  EXPECT_EQ(make()->all(), all);
+  EXPECT_EQ(log_.count("cut down"), 1);
 }
 
 TEST_F(LinuxCountersTest, BeginAnewAfterDamage) {
