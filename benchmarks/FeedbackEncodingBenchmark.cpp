@@ -85,12 +85,13 @@ Records keystroke() {
       }),
       filled<HVRankingFeedback>([](auto& f) {
         f.blendingDuration = 1.375;
-        f.sections.resize(3);
-        for (auto& section : f.sections) section.results.resize(4);
-        f.sections[0].results[0].hiddenResults = benchedResults(2);
+        HVResultRanking hiding;
+        hiding.hiddenResults = benchedResults(2);
+        f.sections = {
+            {0, {hiding, {}, {}, {}}, {}}, {0, {{}, {}, {}, {}}, {}}, {0, {{}, {}, {}, {}}, {}}};
       }),
       filled<HVVisibleSuggestionsFeedback>([](auto& f) {
-        f.suggestions.assign(4, {"s1", "snow white", 0.875, 1, {}});
+        f.suggestions = std::vector<HVSuggestion>(4, {"s1", "snow white", 0.875, 1, {}});
         f.suggestionQuery = "snow";
       }),
       filled<HVResultEngagementFeedback>([](auto& f) {

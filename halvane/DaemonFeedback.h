@@ -125,10 +125,10 @@ struct ZelkorSessionMissingResults final : FeedbackRecord<ZelkorSessionMissingRe
   static constexpr std::string_view kMessageName = "CZSessionMissingResultsFeedback";
 
   ZelkorSessionMissingResults() = default;
-  explicit ZelkorSessionMissingResults(std::vector<HVSearchResult> missing)
+  explicit ZelkorSessionMissingResults(PackedList<HVSearchResult> missing)
       : results(std::move(missing)) {}
 
-  std::vector<HVSearchResult> results;
+  PackedList<HVSearchResult> results;
 
   static constexpr auto fields() {
     return std::tuple{sent(2, "results", &ZelkorSessionMissingResults::results)};
@@ -142,10 +142,10 @@ struct ZelkorSessionMissingSuggestions final : FeedbackRecord<ZelkorSessionMissi
   static constexpr std::string_view kMessageName = "CZSessionMissingSuggestionsFeedback";
 
   ZelkorSessionMissingSuggestions() = default;
-  explicit ZelkorSessionMissingSuggestions(std::vector<HVSuggestion> missing)
+  explicit ZelkorSessionMissingSuggestions(PackedList<HVSuggestion> missing)
       : suggestions(std::move(missing)) {}
 
-  std::vector<HVSuggestion> suggestions;
+  PackedList<HVSuggestion> suggestions;
 
   static constexpr auto fields() {
     return std::tuple{sent(2, "suggestions", &ZelkorSessionMissingSuggestions::suggestions)};

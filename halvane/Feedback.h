@@ -71,6 +71,8 @@ struct HVFeedback {
   virtual std::unique_ptr<HVFeedback> clone() const = 0;
   // Appends the record's message (protocol buffers, proto3).
   virtual void appendTo(std::string& bytes) const = 0;
+  // Bytes of that message.
+  virtual std::size_t messageSize() const = 0;
   // Takes over what a message says. False when it does not parse; the reader knows why.
   virtual bool read(RecordReader& reader) = 0;
 

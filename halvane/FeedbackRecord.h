@@ -24,6 +24,9 @@ struct FeedbackRecord : HVFeedback {
   void appendTo(std::string& bytes) const final {
     appendRecord(static_cast<const T&>(*this), kTimestamp, bytes);
   }
+  std::size_t messageSize() const final {
+    return recordSize(static_cast<const T&>(*this), kTimestamp);
+  }
   bool read(RecordReader& reader) final { return reader.read(static_cast<T&>(*this), kTimestamp); }
 
  private:

@@ -22,7 +22,7 @@ struct HVVisibleResultsFeedback final : FeedbackRecord<HVVisibleResultsFeedback>
   static constexpr std::string_view kMessageName = "CZVisibleResultsFeedback";
 
   Term<vocabulary::kVisibleResultsEvents> triggerEvent;
-  std::vector<HVSearchResult> results;
+  PackedList<HVSearchResult> results;
 
   static constexpr auto fields() {
     using T = HVVisibleResultsFeedback;
@@ -151,7 +151,7 @@ struct HVSearchViewDisappearFeedback final : FeedbackRecord<HVSearchViewDisappea
 // How the client ordered what it shows.
 struct SectionsRanking {
   std::optional<double> blendingDuration;
-  std::vector<HVSectionRanking> sections;
+  PackedList<HVSectionRanking> sections;
 };
 
 struct HVRankingFeedback final : FeedbackRecord<HVRankingFeedback>, SectionsRanking {
@@ -173,7 +173,7 @@ struct CZZLKRankerFeedback final : FeedbackRecord<CZZLKRankerFeedback>, Sections
 
   bool rankerDidRank = false;
   bool rankerTimeout = false;
-  std::vector<HVSearchResult> rankerResults;
+  PackedList<HVSearchResult> rankerResults;
   std::optional<double> rankerDuration;
 
   static constexpr auto fields() {
@@ -196,7 +196,7 @@ struct HVResultEngagementFeedback final : FeedbackRecord<HVResultEngagementFeedb
 
   Term<vocabulary::kEventTypes> triggerEvent;
   Term<vocabulary::kDestinationTypes> destination;
-  std::optional<HVSearchResult> result;
+  Packed<HVSearchResult> result;
   bool actionEngaged = false;
   Term<vocabulary::kActionTargetTypes> actionTarget;
   std::optional<std::string> completedQuery;
@@ -264,7 +264,7 @@ struct HVSuggestionEngagementFeedback final : FeedbackRecord<HVSuggestionEngagem
   static constexpr std::string_view kName = "HVSuggestionEngagementFeedback";
   static constexpr std::string_view kMessageName = "CZSuggestionEngagementFeedback";
 
-  std::optional<HVSuggestion> suggestion;
+  Packed<HVSuggestion> suggestion;
 
   static constexpr auto fields() {
     return std::tuple{stored(2, "suggestion", &HVSuggestionEngagementFeedback::suggestion)};
@@ -314,7 +314,7 @@ struct HVVisibleSuggestionsFeedback final : FeedbackRecord<HVVisibleSuggestionsF
   static constexpr std::string_view kName = "HVVisibleSuggestionsFeedback";
   static constexpr std::string_view kMessageName = "CZVisibleSuggestionsFeedback";
 
-  std::vector<HVSuggestion> suggestions;
+  PackedList<HVSuggestion> suggestions;
   std::optional<std::string> suggestionQuery;
 
   static constexpr auto fields() {
@@ -346,7 +346,7 @@ struct HVResultsReceivedAfterTimeoutFeedback final
   static constexpr std::string_view kName = "HVResultsReceivedAfterTimeoutFeedback";
   static constexpr std::string_view kMessageName = "CZResultsReceivedAfterTimeoutFeedback";
 
-  std::vector<HVSearchResult> results;
+  PackedList<HVSearchResult> results;
 
   static constexpr auto fields() {
     return std::tuple{sent(2, "results", &HVResultsReceivedAfterTimeoutFeedback::results)};
@@ -358,7 +358,7 @@ struct HVLateSectionsAppendedFeedback final : FeedbackRecord<HVLateSectionsAppen
   static constexpr std::string_view kName = "HVLateSectionsAppendedFeedback";
   static constexpr std::string_view kMessageName = "CZLateSectionsAppendedFeedback";
 
-  std::vector<HVResultSection> sections;
+  PackedList<HVResultSection> sections;
 
   static constexpr auto fields() {
     return std::tuple{sent(2, "sections", &HVLateSectionsAppendedFeedback::sections)};
@@ -384,7 +384,7 @@ struct HVSectionEngagementFeedback final : FeedbackRecord<HVSectionEngagementFee
 
   std::optional<std::string> identifier;
   Term<vocabulary::kSectionEngagementEvents> triggerEvent;
-  std::optional<HVResultSection> section;
+  Packed<HVResultSection> section;
 
   static constexpr auto fields() {
     using T = HVSectionEngagementFeedback;
@@ -400,7 +400,7 @@ struct HVVisibleSectionHeaderFeedback final : FeedbackRecord<HVVisibleSectionHea
 
   std::optional<std::string> sectionIdentifier;
   Term<vocabulary::kHeaderTypes> headerType;
-  std::optional<HVResultSection> section;
+  Packed<HVResultSection> section;
 
   static constexpr auto fields() {
     using T = HVVisibleSectionHeaderFeedback;
@@ -442,7 +442,7 @@ struct HVResultGradingFeedback final : FeedbackRecord<HVResultGradingFeedback> {
   static constexpr std::string_view kMessageName = "CZResultGradingFeedback";
 
   Term<vocabulary::kResultGrades> grade;
-  std::optional<HVSearchResult> result;
+  Packed<HVSearchResult> result;
   std::optional<std::string> textFeedback;  // sent by the message family only
 
   static constexpr auto fields() {

@@ -32,6 +32,7 @@ int lengthOf(std::string_view message) {
 
 RecordReader::RecordReader(std::string_view message, RecordReader* outer)
     : input_(bytesOf(message), lengthOf(message)),
+      kind_(outer ? outer->kind_ : Message::FromOutside),
       fault_(outer ? outer->fault_ : &ownFault_),
       items_(outer ? outer->items_ : &ownItems_) {
   input_.SetTotalBytesLimit(std::numeric_limits<int>::max());
@@ -42,8 +43,10 @@ bool RecordReader::_fail(RecordFault fault) {
   return false;
 }
 
-bool RecordReader::_takeItem() {
-  return ++*items_ <= kMaximumItems || _fail(RecordFault::TooManyItems);
+bool RecordReader::_takeItems(std::size_t count) {
+  if (count > kMaximumItems - *items_) return _fail(RecordFault::TooManyItems);
+  *items_ += static_cast<std::uint32_t>(count);
+  return true;
 }
 
 bool RecordReader::_skip(std::uint32_t tag) {
@@ -69,7 +72,7 @@ bool RecordReader::_readBytes(std::string_view& bytes) {
 
 bool RecordReader::_readText(std::string_view& text) {
   if (!_readBytes(text)) return false;
-  return isValidUtf8(text) || _fail(RecordFault::Malformed);
+  return kind_ == Message::Checked || isValidUtf8(text) || _fail(RecordFault::Malformed);
 }
 
 bool RecordReader::_readInto(std::map<std::string, std::string>& map) {

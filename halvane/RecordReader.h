@@ -34,10 +34,16 @@ enum class RecordFault : std::uint8_t {
 // Threading: one thread. Ownership: the bytes outlive the reader, and the views that it fills.
 class RecordReader final {
  public:
-  // Of a whole message; a megabyte of empty ones would take hundreds in memory.
+  // Of a whole message: what reading one, or using what was read, may take.
   static constexpr std::uint32_t kMaximumItems = 65'536;
 
-  explicit RecordReader(std::string_view message) : RecordReader(message, nullptr) {}
+  // Checked: it was read before, or is our own; its values are taken as they are.
+  enum class Message : std::uint8_t { FromOutside, Checked };
+
+  explicit RecordReader(std::string_view message, Message kind = Message::FromOutside)
+      : RecordReader(message, nullptr) {
+    kind_ = kind;
+  }
   RecordReader(const RecordReader&) = delete;
   RecordReader& operator=(const RecordReader&) = delete;
 
@@ -53,7 +59,7 @@ class RecordReader final {
   using Input = google::protobuf::io::CodedInputStream;
 
   bool _fail(RecordFault fault);
-  bool _takeItem();
+  bool _takeItems(std::size_t count);
   // Passes over a field that nobody asked for.
   bool _skip(std::uint32_t tag);
   bool _readVarint(std::uint64_t& value);
@@ -70,6 +76,10 @@ class RecordReader final {
   bool _readInto(std::optional<Value>& value);
   template <typename Value>
   bool _readInto(std::vector<Value>& values);
+  template <typename Record>
+  bool _readInto(Packed<Record>& record);
+  template <typename Item>
+  bool _readInto(PackedList<Item>& items);
   bool _readInto(std::map<std::string, std::string>& map);
 
   template <typename Record, typename OneField>
@@ -78,6 +88,7 @@ class RecordReader final {
   bool _readField(std::uint32_t tag, Record& record, const Fields& fields, bool& good);
 
   Input input_;
+  Message kind_;
   RecordFault ownFault_ = RecordFault::None;
   std::uint32_t ownItems_ = 0;
   // The outermost message's.
@@ -96,6 +107,10 @@ template <typename Value>
 struct Element<std::optional<Value>> : Element<Value> {};
 template <typename Value>
 struct Element<std::vector<Value>> : Element<Value> {};
+template <typename Value>
+struct Element<Packed<Value>> : Element<Value> {};
+template <typename Value>
+struct Element<PackedList<Value>> : Element<Value> {};
 template <>
 struct Element<StringMap> {
   static constexpr Type kType = Type::Bytes;
@@ -113,7 +128,7 @@ template <typename Value>
 bool RecordReader::_readOne(Value& value) {
   if constexpr (wire::isTerm(static_cast<const Value*>(nullptr))) {
     if (!_readOne(value.value)) return false;
-    return value.isKnown() || _fail(RecordFault::UnknownValue);
+    return kind_ == Message::Checked || value.isKnown() || _fail(RecordFault::UnknownValue);
   } else if constexpr (std::is_integral_v<Value>) {
     std::uint64_t varint = 0;
     if (!_readVarint(varint)) return false;
@@ -136,7 +151,7 @@ bool RecordReader::_readOne(Value& value) {
       if (!_readText(bytes)) return false;
       value.text.assign(bytes);
     } else {
-      if (!_takeItem() || !_readBytes(bytes)) return false;
+      if (!_takeItems(1) || !_readBytes(bytes)) return false;
       return RecordReader(bytes, this).read(value);
     }
     return true;
@@ -156,10 +171,33 @@ bool RecordReader::_readInto(std::optional<Value>& value) {
 
 template <typename Value>
 bool RecordReader::_readInto(std::vector<Value>& values) {
-  if constexpr (std::is_same_v<Value, std::string>) {
-    if (!_takeItem()) return false;
-  }
   return _readOne(values.emplace_back());
+}
+
+// A record that comes again merges with what is there, which is unpacked and packed for that: it
+// counts for as many items as take as long.
+template <typename Record>
+bool RecordReader::_readInto(Packed<Record>& record) {
+  constexpr std::size_t kBytesOfAnItem = 64;
+  Record merged;
+  if (record) {
+    if (!_takeItems(record.packed().size() / kBytesOfAnItem)) return false;
+    merged = *record;
+  }
+  if (!_readOne(merged)) return false;
+  record = merged;
+  return true;
+}
+
+template <typename Item>
+bool RecordReader::_readInto(PackedList<Item>& items) {
+  if constexpr (std::is_same_v<Item, std::string>) {
+    if (!_takeItems(1)) return false;
+  }
+  Item item;
+  if (!_readOne(item)) return false;
+  items.push_back(item);
+  return true;
 }
 
 template <typename Record, typename OneField>

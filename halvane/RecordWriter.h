@@ -19,6 +19,11 @@
 
 namespace zelkor {
 
+template <typename Item>
+class PackedList;
+template <typename Record>
+class Packed;
+
 // Writes records as protocol-buffers messages (proto3), after their descriptions: what is zero,
 // empty or not set is left out, a set optional is written whatever it holds. Written is exactly
 // what `recordSize` says, so that a message's length can go before it.
@@ -181,6 +186,37 @@ template <typename Value>
 std::uint8_t* writeField(std::uint32_t number, const std::vector<Value>& values,
                          std::uint8_t* out) {
   for (const auto& value : values) out = writeTagged(number, value, out);
+  return out;
+}
+
+// What is packed is as it will be written.
+inline std::size_t packedFieldSize(std::uint32_t number, std::size_t items, std::size_t bytes) {
+  return items * Coded::VarintSize32(tagOf(number, Type::Bytes)) + bytes;
+}
+inline std::uint8_t* writePackedItem(std::uint32_t number, std::string_view item,
+                                     std::uint8_t* out) {
+  out = Coded::WriteVarint32ToArray(tagOf(number, Type::Bytes), out);
+  return Codec<std::string_view>::write(item, out);
+}
+
+template <typename Record>
+std::size_t fieldSize(std::uint32_t number, const Packed<Record>& record) {
+  return record ? packedFieldSize(number, 1, Codec<std::string_view>::size(record.packed())) : 0;
+}
+template <typename Record>
+std::uint8_t* writeField(std::uint32_t number, const Packed<Record>& record, std::uint8_t* out) {
+  return record ? writePackedItem(number, record.packed(), out) : out;
+}
+
+template <typename Item>
+std::size_t fieldSize(std::uint32_t number, const PackedList<Item>& items) {
+  return packedFieldSize(number, items.size(), items.packedSize());
+}
+template <typename Item>
+std::uint8_t* writeField(std::uint32_t number, const PackedList<Item>& items, std::uint8_t* out) {
+  for (auto item = items.begin(); item != items.end(); ++item) {
+    out = writePackedItem(number, item.packed(), out);
+  }
   return out;
 }
 

@@ -8,6 +8,8 @@
 
 #include "halvane/Field.h"
 #include "halvane/JsonText.h"
+#include "halvane/Packed.h"
+#include "halvane/PackedList.h"
 #include "halvane/Vocabulary.h"
 
 namespace zelkor {
@@ -32,7 +34,7 @@ struct HVError {
 struct HVPunchout {
   std::optional<std::string> name;
   std::optional<std::string> bundleIdentifier;
-  std::vector<std::string> urls;  // best first
+  PackedList<std::string> urls;  // best first
 
   // The first that is absolute; none when none is.
   std::optional<std::string> preferredOpenableURL() const;
@@ -98,7 +100,7 @@ struct HVResultSection {
   std::optional<std::string> identifier;
   std::optional<double> score;
   std::optional<std::string> bundleIdentifier;
-  std::vector<HVSearchResult> results;
+  PackedList<HVSearchResult> results;
 
   static constexpr auto fields() {
     using T = HVResultSection;
@@ -125,9 +127,9 @@ struct HVSuggestion {
 // Where a ranking put a result, and what stood behind it.
 struct HVResultRanking {
   std::int32_t localResultPosition = 0;
-  std::vector<HVSearchResult> hiddenResults;
-  std::vector<HVSearchResult> duplicateResults;
-  std::optional<HVSearchResult> result;
+  PackedList<HVSearchResult> hiddenResults;
+  PackedList<HVSearchResult> duplicateResults;
+  Packed<HVSearchResult> result;
 
   static constexpr auto fields() {
     using T = HVResultRanking;
@@ -140,8 +142,8 @@ struct HVResultRanking {
 
 struct HVSectionRanking {
   std::int32_t localSectionPosition = 0;
-  std::vector<HVResultRanking> results;
-  std::optional<HVResultSection> section;
+  PackedList<HVResultRanking> results;
+  Packed<HVResultSection> section;
 
   static constexpr auto fields() {
     using T = HVSectionRanking;

@@ -5,36 +5,36 @@
 namespace zelkord {
 namespace {
 
-using MaybeResult = const HVSearchResult*;
+using MaybeResult = std::optional<HVSearchResult>;
 
-MaybeResult firstIn(const std::vector<HVSearchResult>& results) {
-  return results.empty() ? nullptr : &results.front();
+MaybeResult firstIn(const PackedList<HVSearchResult>& results) {
+  return results.empty() ? std::nullopt : MaybeResult(results.front());
 }
 
-MaybeResult firstIn(const std::optional<HVSearchResult>& result) {
-  return result ? &*result : nullptr;
+MaybeResult firstIn(const Packed<HVSearchResult>& result) {
+  return result ? MaybeResult(*result) : std::nullopt;
 }
 
-MaybeResult firstIn(const std::optional<HVResultSection>& section) {
-  return section ? firstIn(section->results) : nullptr;
+MaybeResult firstIn(const Packed<HVResultSection>& section) {
+  return section ? firstIn(section->results) : std::nullopt;
 }
 
-MaybeResult firstIn(const std::vector<HVResultSection>& sections) {
-  for (const auto& section : sections) {
-    if (!section.results.empty()) return &section.results.front();
+MaybeResult firstIn(const PackedList<HVResultSection>& sections) {
+  for (const auto section : sections) {
+    if (!section.results.empty()) return section.results.front();
   }
-  return nullptr;
+  return std::nullopt;
 }
 
 // What was ranked goes before what the section holds otherwise.
-MaybeResult firstIn(const std::vector<HVSectionRanking>& rankings) {
-  for (const auto& ranking : rankings) {
-    for (const auto& place : ranking.results) {
-      if (place.result) return &*place.result;
+MaybeResult firstIn(const PackedList<HVSectionRanking>& rankings) {
+  for (const auto ranking : rankings) {
+    for (const auto place : ranking.results) {
+      if (place.result) return *place.result;
     }
-    if (const auto* result = firstIn(ranking.section)) return result;
+    if (auto result = firstIn(ranking.section)) return result;
   }
-  return nullptr;
+  return std::nullopt;
 }
 
 template <typename T>
@@ -61,14 +61,14 @@ MaybeResult firstResultOf(const HVFeedback& feedback) {
     case FeedbackKind::VisibleSectionHeader:
       return firstIn(as<HVVisibleSectionHeaderFeedback>(feedback).section);
     default:
-      return nullptr;
+      return std::nullopt;
   }
 }
 
 }  // namespace
 
 std::uint64_t clientQueryIdOf(const HVFeedback& feedback) {
-  const auto* result = firstResultOf(feedback);
+  const auto result = firstResultOf(feedback);
   return result ? result->queryId : 0;
 }
 

@@ -98,8 +98,10 @@ TEST_F(FeedbackReportsTest, RefusesWhatIsNoFeedbackOfAClient) {
   };
   const auto results = [](std::size_t count, std::int32_t type) {
     return messageOf(*feedbackWith<HVVisibleResultsFeedback>([=](auto& feedback) {
-      feedback.results.resize(count);
-      feedback.results.back().resultType = type;
+      for (std::size_t i = 1; i < count; ++i) feedback.results.push_back({});
+      HVSearchResult last;
+      last.resultType = type;
+      feedback.results.push_back(last);
     }));
   };
   const std::string error = "HVErrorFeedback";
@@ -330,12 +332,11 @@ TEST_F(FeedbackReportsTest, CustomFeedbackGoesItsOwnWays) {
 
 TEST(ClientQueryIdTest, IsThatOfTheFirstResult) {
   const auto rank = [](auto& ranking) {
-    ranking.sections.resize(2);
-    ranking.sections[0].results.resize(1);
-    ranking.sections[0].results[0].hiddenResults = {resultOfQuery(1)};
-    ranking.sections[1].results.resize(2);
-    ranking.sections[1].results[1].result = resultOfQuery(7);
-    ranking.sections[1].section = sectionOfQueries({2});
+    HVResultRanking hiding;
+    hiding.hiddenResults = {resultOfQuery(1)};
+    HVResultRanking showing;
+    showing.result = resultOfQuery(7);
+    ranking.sections = {{1, {hiding}, {}}, {2, {{}, showing}, sectionOfQueries({2})}};
   };
   const auto full = sectionOfQueries({7, 8});
   const std::vector<std::shared_ptr<HVFeedback>> sevens = {
@@ -350,7 +351,9 @@ TEST(ClientQueryIdTest, IsThatOfTheFirstResult) {
       }),
       feedbackWith<HVRankingFeedback>(rank),
       feedbackWith<CZZLKRankerFeedback>(rank),
-      feedbackWith<HVRankingFeedback>([&](auto& f) { f.sections.emplace_back().section = full; }),
+      feedbackWith<HVRankingFeedback>([&](auto& f) {
+        f.sections = {{0, {}, full}};
+      }),
   };
   for (const auto& feedback : sevens) {
     SCOPED_TRACE(feedback->className());

@@ -24,7 +24,7 @@ bool isOfOutsideEngine(const HVSearchResult& result) {
 
 // The result of an engagement, as an object.
 bool appendEngagedResult(const HVResultEngagementFeedback& feedback, std::string& text) {
-  const auto& result = *feedback.result;
+  const auto result = *feedback.result;
   text += '{';
   const auto begin = text.size();
   bool good = appendMember("id", result.identifier, begin, text);

@@ -71,6 +71,13 @@ std::vector<HVSectionRanking> sectionRankings() {
   return {{1, {row}, section()}};
 }
 
+void changeResult(HVResultEngagementFeedback& engagement,
+                  const std::function<void(HVSearchResult&)>& change) {
+  auto result = *engagement.result;
+  change(result);
+  engagement.result = result;
+}
+
 template <typename T>
 void fillStartRecord(T& start) {
   start.triggerEvent = 1;
@@ -313,12 +320,13 @@ TEST_F(FeedbackEncodingTest, AnEngagementTellsWhereItLed) {
               f.actionTarget = 6;
             }),
        R"("result":{"id":"r","action_destination":"tel:1"},"action_target":"open")"},
-      {"no address", with(1, [](auto& f) { f.result->punchout->urls = {"x"}; }),
+      {"no address",
+       with(1, [](auto& f) { changeResult(f, [](auto& r) { r.punchout->urls = {"x"}; }); }),
        R"("result":{"id":"r","action_destination":null})"},
       {"no action, though engaged",
        with(1,
             [](auto& f) {
-              f.result->action.reset();
+              changeResult(f, [](auto& r) { r.action.reset(); });
               f.actionEngaged = true;
             }),
        R"("result":{"id":"r","action_destination":null},"action_target":"unknown")"},
@@ -327,14 +335,17 @@ TEST_F(FeedbackEncodingTest, AnEngagementTellsWhereItLed) {
       {"another engine's", with(11, nothing),
        R"("result":{"id":"r","third_party_suggestion":"Title",)"
        R"("action_destination":"non_zelkor_result"})"},
-      {"a title without a text", with(14, [](auto& f) { f.result->title.reset(); }),
+      {"a title without a text",
+       with(14, [](auto& f) { changeResult(f, [](auto& r) { r.title.reset(); }); }),
        R"("result":{"id":"r","third_party_suggestion":null,)"
        R"("action_destination":"non_zelkor_result"})"},
       {"no title",
        with(9,
             [](auto& f) {
-              f.result->title.reset();
-              f.result->hasTitle = false;
+              changeResult(f, [](auto& r) {
+                r.title.reset();
+                r.hasTitle = false;
+              });
             }),
        R"("result":{"id":"r","action_destination":"non_zelkor_result"})"},
   };
@@ -386,8 +397,9 @@ TEST_F(FeedbackEncodingTest, WhatJsonCannotExpressLeavesTheTextAsItWas) {
   };
   for (const double odd : {std::nan(""), std::numeric_limits<double>::infinity()}) {
     HVVisibleResultsFeedback visible;
-    visible.results.resize(3);
-    visible.results[1].score = odd;
+    HVSearchResult result;
+    result.score = odd;
+    visible.results = {{}, result, {}};
     refused(visible);
   }
   const std::string broken = "eight bytes and \xC3";
@@ -398,10 +410,10 @@ TEST_F(FeedbackEncodingTest, WhatJsonCannotExpressLeavesTheTextAsItWas) {
   refused(start);
   HVResultEngagementFeedback engagement;
   engagement.result = fullResult();
-  engagement.result->punchout->urls = {"tel:" + broken};
+  changeResult(engagement, [&](auto& r) { r.punchout->urls = {"tel:" + broken}; });
   refused(engagement);
   engagement.result = fullResult();
-  engagement.result->identifier = broken;
+  changeResult(engagement, [&](auto& r) { r.identifier = broken; });
   refused(engagement);
   for (const auto* json : {"", "[]", "7", "{", "{}{}", "\"x\"", "{\"a\":\"\xFF\"}"}) {
     HVCustomFeedback feedback;
@@ -430,6 +442,7 @@ struct UnencodedFeedback final : HVFeedback {
   std::string_view className() const override { return "HVStrangeFeedback"; }
   std::unique_ptr<HVFeedback> clone() const override { return nullptr; }
   void appendTo(std::string&) const override {}
+  std::size_t messageSize() const override { return 0; }
   bool read(RecordReader&) override { return false; }
 };
 
@@ -520,7 +533,7 @@ TEST_F(FeedbackEncodingTest, IdentifiersAreReplacedInACopyAndReported) {
   const std::shared_ptr<HVFeedback> withoutIdentifiers[] = {
       made<HVClearInputFeedback>(), made<HVVisibleResultsFeedback>(),
       made<HVSuggestionEngagementFeedback>(),
-      made<HVResultGradingFeedback>([](auto& f) { f.result.emplace().identifier = ""; })};
+      made<HVResultGradingFeedback>([](auto& f) { f.result = HVSearchResult{.identifier = ""}; })};
   for (const auto& plain : withoutIdentifiers) EXPECT_EQ(processed(plain, processor), plain);
   EXPECT_EQ(processor.seen.size(), 1u);
 }

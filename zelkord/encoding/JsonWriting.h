@@ -6,10 +6,11 @@
 #include <string>
 #include <string_view>
 #include <type_traits>
-#include <vector>
 
 #include "halvane/Field.h"
 #include "halvane/JsonText.h"
+#include "halvane/Packed.h"
+#include "halvane/PackedList.h"
 #include "halvane/Vocabulary.h"
 
 namespace zelkord {
@@ -74,11 +75,18 @@ bool appendJson(const std::optional<Value>& value, std::string& text) {
   return true;
 }
 
+template <typename Record>
+bool appendJson(const Packed<Record>& record, std::string& text) {
+  if (record) return appendJson(*record, text);
+  text += "null";
+  return true;
+}
+
 template <typename Value>
-bool appendJson(const std::vector<Value>& values, std::string& text) {
+bool appendJson(const PackedList<Value>& values, std::string& text) {
   text += '[';
   bool good = true;
-  for (const auto& value : values) {
+  for (const auto value : values) {
     good = good && appendJson(value, text);
     text += ',';
   }

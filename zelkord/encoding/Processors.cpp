@@ -31,16 +31,22 @@ bool processExpanded(HVSuggestion& suggestion, IdentifierProcessor& processor) {
 
 bool processItemsOf(HVResultEngagementFeedback& feedback, IdentifierProcessor& processor) {
   if (!feedback.result) return false;
-  const auto identifier = replaceIdentifier(*feedback.result, processor);
-  if (identifier) processor.identifierReferencedForResult(*identifier, *feedback.result);
-  return identifier.has_value();
+  auto result = *feedback.result;
+  const auto identifier = replaceIdentifier(result, processor);
+  if (!identifier) return false;
+  feedback.result = result;
+  processor.identifierReferencedForResult(*identifier, result);
+  return true;
 }
 
 bool processItemsOf(HVSuggestionEngagementFeedback& feedback, IdentifierProcessor& processor) {
   if (!feedback.suggestion) return false;
-  const auto identifier = replaceIdentifier(*feedback.suggestion, processor);
-  if (identifier) processor.identifierReferencedForSuggestion(*identifier, *feedback.suggestion);
-  return identifier.has_value();
+  auto suggestion = *feedback.suggestion;
+  const auto identifier = replaceIdentifier(suggestion, processor);
+  if (!identifier) return false;
+  feedback.suggestion = suggestion;
+  processor.identifierReferencedForSuggestion(*identifier, suggestion);
+  return true;
 }
 
 }  // namespace zelkord

@@ -3,7 +3,7 @@
 #include <optional>
 #include <tuple>
 #include <type_traits>
-#include <vector>
+#include <utility>
 
 #include "halvane/DaemonFeedback.h"
 #include "halvane/ModelFeedback.h"
@@ -22,10 +22,23 @@ template <typename Value>
 bool processExpanded(std::optional<Value>& value, IdentifierProcessor& processor) {
   return value && processExpanded(*value, processor);
 }
-template <typename Value>
-bool processExpanded(std::vector<Value>& values, IdentifierProcessor& processor) {
+template <typename Record>
+bool processExpanded(Packed<Record>& packed, IdentifierProcessor& processor) {
+  if (!packed) return false;
+  auto record = *packed;
+  const bool replaced = processExpanded(record, processor);
+  if (replaced) packed = record;
+  return replaced;
+}
+template <typename Item>
+bool processExpanded(PackedList<Item>& items, IdentifierProcessor& processor) {
   bool replaced = false;
-  for (auto& value : values) replaced |= processExpanded(value, processor);
+  PackedList<Item> processed;
+  for (auto item : items) {
+    replaced |= processExpanded(item, processor);
+    processed.push_back(item);
+  }
+  if (replaced) items = std::move(processed);
   return replaced;
 }
 

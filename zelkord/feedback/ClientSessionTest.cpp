@@ -152,7 +152,7 @@ TEST_F(ClientSessionTest, ReplacesIdentifiersAndAddsWhatIsMissing) {
   auto second = std::make_shared<HVResultEngagementFeedback>();
   second->result = resultNamed("secret b");
   auto suggested = std::make_shared<HVSuggestionEngagementFeedback>();
-  suggested->suggestion.emplace().identifier = "secret s";
+  suggested->suggestion = HVSuggestion{.identifier = "secret s"};
   auto visible = std::make_shared<HVVisibleResultsFeedback>();
   visible->results = {resultNamed("secret b")};
   const auto session =
@@ -173,7 +173,7 @@ TEST_F(ClientSessionTest, ReplacesIdentifiersAndAddsWhatIsMissing) {
   const std::vector<int> times = {0, 0, 0, 1, 5, 500};
   for (std::size_t i = 0; i < times.size(); ++i) EXPECT_EQ(records[i].at("timestamp"), times[i]);
   EXPECT_EQ(session->getFeedbacksToSend(), text);  // again the same
-  EXPECT_EQ(*visible->results[0].identifier, "secret b");
+  EXPECT_EQ(*visible->results.front().identifier, "secret b");
 }
 
 TEST_F(ClientSessionTest, LeavesOutWhatJsonCannotExpress) {
@@ -239,7 +239,7 @@ TEST(SessionProcessingHelperTest, RemembersWhatIsNamedUntilItIsDescribed) {
   helper.identifierReferencedForSuggestion("b", suggestion);
   helper.identifierReferencedForSuggestion("s", suggestion);
   ASSERT_EQ(helper.missingResults().size(), 1u);
-  EXPECT_EQ(helper.missingResults()[0].fbr, "first");
+  EXPECT_EQ(helper.missingResults().front().fbr, "first");
   EXPECT_EQ(helper.missingSuggestions().size(), 1u);
   helper.identifierExpanded("s");
   EXPECT_TRUE(helper.missingSuggestions().empty());

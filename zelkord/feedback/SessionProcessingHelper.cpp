@@ -1,6 +1,7 @@
 #include "zelkord/feedback/SessionProcessingHelper.h"
 
 #include <algorithm>
+#include <vector>
 
 namespace zelkord {
 
@@ -14,7 +15,10 @@ template <typename Item>
 void SessionProcessingHelper::_reference(Map<Item>& map, const std::string& identifier,
                                          const Item& item) {
   if (expandedIdSet_.contains(identifier)) return;
-  if (map.try_emplace(identifier, Referenced<Item>{references_, item}).second) ++references_;
+  const auto [place, isNew] = map.try_emplace(identifier, Referenced<Item>{references_, {}});
+  if (!isNew) return;
+  place->second.item = item;
+  ++references_;
 }
 
 void SessionProcessingHelper::identifierReferencedForResult(const std::string& identifier,
@@ -33,21 +37,21 @@ void SessionProcessingHelper::identifierExpanded(const std::string& identifier) 
 }
 
 template <typename Item>
-std::vector<Item> SessionProcessingHelper::_inOrder(const Map<Item>& map) {
+PackedList<Item> SessionProcessingHelper::_inOrder(const Map<Item>& map) {
   std::vector<const Referenced<Item>*> referenced;
   for (const auto& entry : map) referenced.push_back(&entry.second);
   std::sort(referenced.begin(), referenced.end(),
             [](const auto* a, const auto* b) { return a->order < b->order; });
-  std::vector<Item> items;
-  for (const auto* entry : referenced) items.push_back(entry->item);
+  PackedList<Item> items;
+  for (const auto* entry : referenced) items.push_back(*entry->item);
   return items;
 }
 
-std::vector<HVSearchResult> SessionProcessingHelper::missingResults() const {
+PackedList<HVSearchResult> SessionProcessingHelper::missingResults() const {
   return _inOrder(idResultMap_);
 }
 
-std::vector<HVSuggestion> SessionProcessingHelper::missingSuggestions() const {
+PackedList<HVSuggestion> SessionProcessingHelper::missingSuggestions() const {
   return _inOrder(idSuggestionMap_);
 }
 

@@ -4,8 +4,8 @@
 #include <set>
 #include <string>
 #include <unordered_map>
-#include <vector>
 
+#include "halvane/Results.h"
 #include "zelkord/encoding/IdentifierProcessor.h"
 
 namespace zelkord {
@@ -26,14 +26,14 @@ class SessionProcessingHelper final : public IdentifierProcessor {
   void identifierExpanded(const std::string& identifier) override;
 
   // What was referenced and never expanded, in the order of the first references.
-  std::vector<HVSearchResult> missingResults() const;
-  std::vector<HVSuggestion> missingSuggestions() const;
+  PackedList<HVSearchResult> missingResults() const;
+  PackedList<HVSuggestion> missingSuggestions() const;
 
  private:
   template <typename Item>
   struct Referenced {
     std::size_t order = 0;
-    Item item;
+    Packed<Item> item;
   };
   template <typename Item>
   using Map = std::unordered_map<std::string, Referenced<Item>>;
@@ -41,7 +41,7 @@ class SessionProcessingHelper final : public IdentifierProcessor {
   template <typename Item>
   void _reference(Map<Item>& map, const std::string& identifier, const Item& item);
   template <typename Item>
-  static std::vector<Item> _inOrder(const Map<Item>& map);
+  static PackedList<Item> _inOrder(const Map<Item>& map);
 
   std::unordered_map<std::string, std::string> privateIdMapping_;
   std::int32_t nextMappedId_ = 1;
