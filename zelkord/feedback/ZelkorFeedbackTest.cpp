@@ -19,6 +19,22 @@ class ZelkorFeedbackTest : public testing::Test {
   SessionsBed bed_;
 };
 
+TEST_F(ZelkorFeedbackTest, TypesHaveTheNamesThatTheServiceKnows) {
+  const char* const names =
+      "visible_results,network_search_start,network_search_end,local_search_start,"
+      "local_search_end,search_view_appear,search_view_disappear,rank_sections,"
+      "result_engagement,visible_card,card_engagement,error,suggestion_engagement,"
+      "card_view_disappear,search_start,search_end,visible_suggestions,custom_unknown,"
+      "custom_crowdsourcing,custom_brelin_autofill,custom_lanthe_result_features,unknown,"
+      "results_received_after_timeout,late_sections_appended,clear_input,session_end,"
+      "skip_zelkor_search,section_engagement,visible_section_header,session_missing_results,"
+      "session_missing_suggestions,did_go_to_site,connection_invalidated,result_grade,"
+      "did_go_to_search,";
+  std::string all;
+  for (std::uint32_t type = 0; type < 35; ++type) all.append(eventTypeToString(type)).append(",");
+  EXPECT_EQ(all, names);
+}
+
 TEST_F(ZelkorFeedbackTest, CarriesQueryIdentifiersOnlyWhereTheyBelong) {
   struct Case {
     std::shared_ptr<HVFeedback> feedback;
