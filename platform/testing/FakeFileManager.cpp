@@ -151,6 +151,10 @@ class FakeFileManager::Appending final : public AppendFile {
  public:
   Appending(std::shared_ptr<State> state, std::string path, std::uint64_t length)
       : state_(std::move(state)), path_(std::move(path)), length_(length) {}
+  ~Appending() override {
+    const MutexLock lock(state_->mutex);
+    --state_->openForAppend;
+  }
 
   std::uint64_t length() const override { return length_; }
 
@@ -180,7 +184,10 @@ std::unique_ptr<AppendFile> FakeFileManager::openForAppending(const std::string&
   auto failure = state_->injected(Operation::OpenForAppending);
   if (!failure && state_->folders.contains(path)) failure = posixError(EISDIR);
   if (!failure && found == state_->files.end()) failure = posixError(ENOENT);
-  if (!failure) return std::make_unique<Appending>(state_, path, found->second.bytes.size());
+  if (!failure) {
+    ++state_->openForAppend;
+    return std::make_unique<Appending>(state_, path, found->second.bytes.size());
+  }
   if (error) *error = std::move(*failure);
   return nullptr;
 }
@@ -250,6 +257,11 @@ std::vector<std::string> FakeFileManager::paths() const {
   std::vector<std::string> paths;
   for (const auto& entry : state_->files) paths.push_back(entry.first);
   return paths;
+}
+
+int FakeFileManager::openForAppend() const {
+  const MutexLock lock(state_->mutex);
+  return state_->openForAppend;
 }
 
 int FakeFileManager::writes() const {

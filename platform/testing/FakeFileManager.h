@@ -75,6 +75,8 @@ class FakeFileManager final : public FileManager, public ContainerFiles {
   std::vector<std::string> paths() const;
   // How many writes succeeded.
   int writes() const;
+  // How many files are open for appending.
+  int openForAppend() const;
 
  private:
   class Appending;
@@ -91,6 +93,7 @@ class FakeFileManager final : public FileManager, public ContainerFiles {
     std::map<Operation, int> failures ZK_GUARDED_BY(mutex);
     std::optional<std::uint64_t> roomToAppend ZK_GUARDED_BY(mutex);
     int writes ZK_GUARDED_BY(mutex) = 0;
+    int openForAppend ZK_GUARDED_BY(mutex) = 0;
 
     std::optional<Error> injected(Operation operation) const ZK_REQUIRES(mutex);
     void addDirectories(const std::string& path) ZK_REQUIRES(mutex);

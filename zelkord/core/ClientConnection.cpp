@@ -122,6 +122,7 @@ void ClientConnection::_ensureState() {
   }
   if (const auto state = clientStateManager_.stateForClientIdentifier(configuration->identifier)) {
     state->setConfiguration(*configuration);
+    state->setProcess(peer().pid);
     state_.set(state);
   }
 }
@@ -263,11 +264,14 @@ bool ClientConnection::_accepts(std::int64_t queryId) {
   return queryId > current && currentQueryId_.compare_exchange_strong(current, queryId);
 }
 
-// The event's name, the first argument, says nothing that the feedback does not.
+// The event's name, the first argument, says nothing that the feedback does not. A caller that
+// waits is answered when the feedback is written.
 void ClientConnection::reportEvent(const ipc::Call& call, Decoded<MutableFeedback> feedback) {
   if (const auto* fault = std::get_if<WireFault>(&feedback)) return _refuse(call, *fault);
-  reports_.reportPayload(std::get<MutableFeedback>(std::move(feedback)),
-                         *call.arguments.at(1).get<std::int64_t>(), state_.get());
+  const bool fits = reports_.reportPayload(std::get<MutableFeedback>(std::move(feedback)),
+                                           *call.arguments.at(1).get<std::int64_t>(), state_.get(),
+                                           {peer().pid, call.reply});
+  if (!fits) call.reply->fail(ipc::kLimitsExceeded, "too much feedback waits to be written");
 }
 
 void ClientConnection::feedback(const std::shared_ptr<ipc::Reply>& reply) {
@@ -283,7 +287,8 @@ void ClientConnection::listSessions(const std::shared_ptr<ipc::Reply>& reply) {
 void ClientConnection::flushSessionInvalidation(std::function<void(bool flushed)> callback) {
   const auto state = state_.get();
   if (!state) return callback(false);
-  state->sessionManager().flushSessionInvalidation(userAgent_.get(), std::move(callback));
+  state->sessionManager().flushSessionInvalidation(userAgent_.get(), peer().pid,
+                                                   std::move(callback));
 }
 
 }  // namespace zelkord

@@ -46,44 +46,53 @@ std::uint64_t nanosecondsSinceBoot(const Clock& clock) {
 
 }  // namespace
 
-void FeedbackReports::reportPayload(std::shared_ptr<HVFeedback> feedback, std::int64_t queryId,
-                                    const std::shared_ptr<ClientState>& state) const {
+bool FeedbackReports::reportPayload(std::shared_ptr<HVFeedback> feedback, std::int64_t queryId,
+                                    const std::shared_ptr<ClientState>& state,
+                                    const Reporter& reporter) const {
   assembly_.tracing().emit(TraceCode::FeedbackStart);
   if (feedback->timestamp == 0) {
     feedback->timestamp = nanosecondsSinceBoot(assembly_.platform().clock);
   }
+  bool fits = false;
   if (!state) {
-    _recordError("client state nil");
+    fits = _recordError("client state nil", reporter);
     assembly_.log(Category::Feedback).error("state must not be nil");
   } else if (feedback->kind() == FeedbackKind::Custom) {
     const auto& log = assembly_.log(Category::Flusher);
-    handleCustomFeedback(std::static_pointer_cast<const HVCustomFeedback>(std::move(feedback)),
-                         queryId, *state, [&log] { log.notice("flushed custom feedback"); });
+    fits = handleCustomFeedback(
+        std::static_pointer_cast<const HVCustomFeedback>(std::move(feedback)), queryId, *state,
+        reporter, [&log] { log.notice("flushed custom feedback"); });
   } else {
-    _report(std::move(feedback), queryId, *state);
+    fits = _report(std::move(feedback), queryId, *state, reporter);
   }
   assembly_.tracing().emit(TraceCode::FeedbackEnd);
+  return fits;
 }
 
-void FeedbackReports::_recordError(const char* reason) const {
+bool FeedbackReports::_recordError(const char* reason, const Reporter& reporter) const {
   const auto error = errorRecordOf(zelkorError(kConnectionFault, reason));
   const auto guid = assembly_.guidController()->currentUserGUID();
-  const auto session =
-      assembly_.feedbackSessions()->makeSession({std::make_shared<HVErrorFeedback>(error), 0, guid,
-                                                 zelkordUserAgent(assembly_.platform().device), 0});
-  session->sessionComplete();
+  return _makeSession({std::make_shared<HVErrorFeedback>(error), 0, guid,
+                       zelkordUserAgent(assembly_.platform().device), 0, 0, reporter.pid,
+                       reporter.call});
 }
 
-void FeedbackReports::_report(std::shared_ptr<const HVFeedback> feedback, std::int64_t queryId,
-                              ClientState& state) const {
+bool FeedbackReports::_makeSession(ZelkorFeedback record) const {
+  const auto session = assembly_.feedbackSessions()->makeSession(std::move(record));
+  if (session) session->sessionComplete();
+  return session != nullptr;
+}
+
+bool FeedbackReports::_report(std::shared_ptr<const HVFeedback> feedback, std::int64_t queryId,
+                              ClientState& state, const Reporter& reporter) const {
   if (isWarming(*feedback)) state.warm();
   const auto clientQueryId = clientQueryIdOf(*feedback);
   if (feedback->kind() == FeedbackKind::ResultEngagement) {
     _noteEngagement(static_cast<const HVResultEngagementFeedback&>(*feedback), state);
   }
-  state.sessionManager().addZelkorFeedback({std::move(feedback), queryId,
-                                            state.guidController().currentUserGUID(),
-                                            state.userAgent(), clientQueryId});
+  return state.sessionManager().addZelkorFeedback(
+      {std::move(feedback), queryId, state.guidController().currentUserGUID(), state.userAgent(),
+       clientQueryId, 0, reporter.pid, reporter.call});
 }
 
 void FeedbackReports::_noteEngagement(const HVResultEngagementFeedback& engagement,
@@ -107,25 +116,26 @@ void FeedbackReports::_donate(const HVResultEngagementFeedback& engagement,
   }
 }
 
-void FeedbackReports::handleCustomFeedback(std::shared_ptr<const HVCustomFeedback> feedback,
+bool FeedbackReports::handleCustomFeedback(std::shared_ptr<const HVCustomFeedback> feedback,
                                            std::int64_t queryId, const ClientState& state,
+                                           const Reporter& reporter,
                                            std::function<void()> callback) const {
   switch (feedback->feedbackType.value) {
     case kBrelinAutofill:
-    case kLantheResultFeatures:
-      assembly_.feedbackSessions()
-          ->makeSession({std::move(feedback), queryId, std::nullopt, state.userAgent(), 0})
-          ->sessionComplete();
+    case kLantheResultFeatures: {
+      const bool fits = _makeSession({std::move(feedback), queryId, std::nullopt, state.userAgent(),
+                                      0, 0, reporter.pid, reporter.call});
       if (callback) callback();
-      return;
+      return fits;
+    }
     case kCrowdsourcing:
       assembly_.reporter().addValue(1, "com.quenta.zelkord.dp.submit");
       if (auto* flusher = assembly_.crowdsourcingFeedbackFlusher()) {
         flusher->flush(std::move(feedback), std::move(callback));
       }
-      return;
+      return true;
     default:
-      return;
+      return true;
   }
 }
 

@@ -15,6 +15,7 @@ namespace zelkord {
 
 class Assembly;
 class ClientState;
+struct ZelkorFeedback;
 
 // What becomes of feedback that a client reports: a record of its session. Besides, a search view
 // that appears warms the connection to the service, and engagements are counted and donated to the
@@ -26,18 +27,28 @@ class FeedbackReports final {
  public:
   explicit FeedbackReports(Assembly& assembly) : assembly_(assembly) {}
 
+  // Whoever reports: a process, and what is let go of once the feedback is written, or dropped.
+  struct Reporter {
+    std::int64_t pid = 0;
+    std::shared_ptr<const void> call;
+  };
+
   // `state` is null for a client that is not configured. Feedback without a timestamp gets one.
-  void reportPayload(std::shared_ptr<HVFeedback> feedback, std::int64_t queryId,
-                     const std::shared_ptr<ClientState>& state) const;
+  // False when there is no room for the record.
+  bool reportPayload(std::shared_ptr<HVFeedback> feedback, std::int64_t queryId,
+                     const std::shared_ptr<ClientState>& state, const Reporter& reporter) const;
   // Autofill and result features become sessions of their own, crowdsourcing goes to its flusher;
   // then `callback`, if there is one, runs. Anything else is ignored.
-  void handleCustomFeedback(std::shared_ptr<const HVCustomFeedback> feedback, std::int64_t queryId,
-                            const ClientState& state, std::function<void()> callback) const;
+  bool handleCustomFeedback(std::shared_ptr<const HVCustomFeedback> feedback, std::int64_t queryId,
+                            const ClientState& state, const Reporter& reporter,
+                            std::function<void()> callback) const;
 
  private:
-  void _recordError(const char* reason) const;
-  void _report(std::shared_ptr<const HVFeedback> feedback, std::int64_t queryId,
-               ClientState& state) const;
+  bool _recordError(const char* reason, const Reporter& reporter) const;
+  // A session of that record alone.
+  bool _makeSession(ZelkorFeedback record) const;
+  bool _report(std::shared_ptr<const HVFeedback> feedback, std::int64_t queryId, ClientState& state,
+               const Reporter& reporter) const;
   void _noteEngagement(const HVResultEngagementFeedback& engagement,
                        const ClientState& state) const;
   void _donate(const HVResultEngagementFeedback& engagement, const ClientState& state) const;

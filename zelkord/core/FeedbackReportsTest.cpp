@@ -150,6 +150,20 @@ TEST_F(FeedbackReportsTest, RefusesWhatIsNoFeedbackOfAClient) {
   EXPECT_EQ(client->state(), ipc::FakeClient::State::Open);
 }
 
+TEST_F(FeedbackReportsTest, ACallerThatWaitsHearsThatThereIsNoRoom) {
+  const auto client = bed_.connectAndConfigure();
+  HVCustomFeedback autofill;
+  autofill.feedbackType = 1;
+  EXPECT_EQ(report(client, HVClearInputFeedback())->errorName, "");
+  EXPECT_EQ(report(client, autofill)->errorName, "");
+  manager_->isFull.set(true);
+  sessions_->isFull.set(true);
+  EXPECT_EQ(report(client, HVClearInputFeedback())->errorName, ipc::kLimitsExceeded);
+  EXPECT_EQ(report(client, autofill)->errorName, ipc::kLimitsExceeded);
+  EXPECT_EQ(report(bed_.connect(), HVClearInputFeedback())->errorName, ipc::kLimitsExceeded);
+  EXPECT_EQ(client->state(), ipc::FakeClient::State::Open);
+}
+
 TEST_F(FeedbackReportsTest, BecomesARecordOfTheClientsSession) {
   const auto client = bed_.connectAndConfigure();
   const auto guid = bed_.daemon.assembly().guidController()->currentUserGUID();

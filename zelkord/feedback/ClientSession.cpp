@@ -58,10 +58,11 @@ ClientSession::ClientSession(Assembly& assembly, Opening opening)
 
 std::shared_ptr<ClientSession> ClientSession::make(Assembly& assembly,
                                                    std::optional<ZelkorFeedback> feedback,
-                                                   SessionEndReason previousSessionEndReason) {
+                                                   SessionEndReason previousSessionEndReason,
+                                                   SessionKind kind) {
   auto opening = _opening(assembly, feedback, previousSessionEndReason);
   std::shared_ptr<ClientSession> session(new ClientSession(assembly, std::move(opening)));
-  session->_open(std::move(feedback));
+  session->_open(std::move(feedback), kind);
   return session;
 }
 
@@ -80,13 +81,14 @@ std::shared_ptr<ClientSession> ClientSession::createFeedbackSessionFromError(con
   auto* guids = assembly.guidController();
   return make(assembly,
               errorRecord(error, guids ? std::optional(guids->currentUserGUID()) : std::nullopt,
-                          zelkordUserAgent(assembly.platform().device)));
+                          zelkordUserAgent(assembly.platform().device)),
+              SessionEndReason::None, SessionKind::OneOff);
 }
 
 ClientSession::Opening ClientSession::_opening(Assembly& assembly,
                                                const std::optional<ZelkorFeedback>& feedback,
                                                SessionEndReason previousSessionEndReason) {
-  const auto agent = feedback ? feedback->userAgent : std::nullopt;
+  const std::optional<std::string> agent = feedback ? feedback->userAgent : SharedText();
   CZClientSession header;
   header.agent = agent.value_or("");
   if (feedback && feedback->userGuid) header.userGuidString = feedback->userGuid->string();
@@ -102,9 +104,9 @@ ClientSession::Opening ClientSession::_opening(Assembly& assembly,
   return {std::move(header), firstUse.firstUseDate()};
 }
 
-void ClientSession::_open(std::optional<ZelkorFeedback> feedback) {
+void ClientSession::_open(std::optional<ZelkorFeedback> feedback, SessionKind kind) {
   auto* storage = assembly_.persistentStorage();
-  const auto container = storage ? storage->createFileContainerForWriting() : nullptr;
+  const auto container = storage ? storage->createFileContainerForWriting(kind) : nullptr;
   storageHandle_.set(container);
   if (container) container->writeSessionHeader(header());
   if (feedback) addFeedback(*std::move(feedback));
@@ -185,6 +187,7 @@ std::function<void()> ClientSession::_keepForTests(const ZelkorFeedback& feedbac
     self->sessionQueue_->assertCurrent();
     written->wait(kLongestWaitOfTests);
     self->sessionFeedbacks_.push_back(feedback);
+    self->sessionFeedbacks_.back().held = nullptr;
   });
   return [written] { written->signal(); };
 }

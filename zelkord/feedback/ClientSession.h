@@ -37,7 +37,8 @@ class ClientSession final : public FeedbackSession,
   // Opens a session with its first record, if there is one.
   static std::shared_ptr<ClientSession> make(
       Assembly& assembly, std::optional<ZelkorFeedback> feedback,
-      SessionEndReason previousSessionEndReason = SessionEndReason::None);
+      SessionEndReason previousSessionEndReason = SessionEndReason::None,
+      SessionKind kind = SessionKind::Managed);
   // A session that was read back.
   static std::shared_ptr<ClientSession> make(Assembly& assembly, StoredSession stored);
   // A session of the daemon's own that begins with an error.
@@ -74,7 +75,7 @@ class ClientSession final : public FeedbackSession,
 
   ClientSession(Assembly& assembly, Opening opening);
 
-  void _open(std::optional<ZelkorFeedback> feedback);
+  void _open(std::optional<ZelkorFeedback> feedback, SessionKind kind);
   void _addFeedback(ZelkorFeedback feedback);
   // Keeps the record in memory once it is on disk.
   std::function<void()> _keepForTests(const ZelkorFeedback& feedback);

@@ -21,10 +21,12 @@ constexpr Duration kIdleTime = 180s;   // after a record
 
 ClientSessionManager::ClientSessionManager(Assembly& assembly,
                                            std::shared_ptr<UserGUIDSource> guidController,
-                                           std::string identifier)
+                                           std::string identifier,
+                                           std::shared_ptr<FeedbackRoom> room)
     : assembly_(assembly),
       guidController_(std::move(guidController)),
       identifier_(std::move(identifier)),
+      room_(std::move(room)),
       sessionQueue_(assembly.platform().queues.makeSerialQueue(
           "com.quenta.zelkord.clientSessionManagerQueue")) {
   const auto& log = assembly.log(Category::Session);
@@ -35,9 +37,11 @@ ClientSessionManager::ClientSessionManager(Assembly& assembly,
   }
 }
 
-void ClientSessionManager::addZelkorFeedback(ZelkorFeedback feedback) {
+bool ClientSessionManager::addZelkorFeedback(ZelkorFeedback feedback) {
   stamp(feedback, assembly_.platform().clock);
+  if (!room_->take(feedback)) return false;
   _put({std::move(feedback)});
+  return true;
 }
 
 // Whoever puts something into the empty inbox has it taken out.
@@ -134,6 +138,7 @@ void ClientSessionManager::flushSession(std::function<void()> callback) {
 }
 
 void ClientSessionManager::flushSessionInvalidation(std::optional<std::string> agent,
+                                                    std::int64_t process,
                                                     std::function<void(bool flushed)> callback) {
   if (!assembly_.sharedSession()) {
     flushSession([callback = std::move(callback)] { callback(true); });
@@ -142,6 +147,7 @@ void ClientSessionManager::flushSessionInvalidation(std::optional<std::string> a
   ZelkorFeedback record;
   record.feedback = std::make_shared<ZelkorConnectionInvalidated>();
   record.userAgent = std::move(agent);
+  record.pid = process;
   addZelkorFeedback(std::move(record));
   callback(false);
 }

@@ -10,6 +10,7 @@
 #include "base/Mutex.h"
 #include "platform/api/ProcessTransactions.h"
 #include "platform/api/WorkQueue.h"
+#include "zelkord/feedback/FeedbackRoom.h"
 #include "zelkord/feedback/SessionManager.h"
 #include "zelkord/feedback/SessionRecords.h"
 #include "zelkord/feedback/SessionTransitions.h"
@@ -28,19 +29,20 @@ class UserGUIDSource;
 //
 // Threading: any thread. What is added and asked goes through one inbox, which the queue takes out
 // in that order, many at a time. Ownership: the assembly outlives it; timers hold it weakly.
-// Errors: feedback that the service does not want is dropped silently.
+// Errors: feedback that the service does not want is dropped silently; where too much waits to be
+// written, further feedback is dropped too, counted and named.
 class ClientSessionManager final : public SessionManager,
                                    public std::enable_shared_from_this<ClientSessionManager> {
  public:
   ClientSessionManager(Assembly& assembly, std::shared_ptr<UserGUIDSource> guidController,
-                       std::string identifier);
+                       std::string identifier, std::shared_ptr<FeedbackRoom> room);
 
-  void addZelkorFeedback(ZelkorFeedback feedback) override;
+  bool addZelkorFeedback(ZelkorFeedback feedback) override;
   // The open session; null when there is none.
   std::shared_ptr<SessionRecords> session();
   void flushSession(std::function<void()> callback) override;
   // Of a session shared by all clients only the end of the connection is recorded.
-  void flushSessionInvalidation(std::optional<std::string> agent,
+  void flushSessionInvalidation(std::optional<std::string> agent, std::int64_t process,
                                 std::function<void(bool flushed)> callback) override;
   std::vector<std::string> feedbacksWithRelativeTimestamp() override;
   void waitForPendingFeedback() override;
@@ -85,6 +87,7 @@ class ClientSessionManager final : public SessionManager,
   Assembly& assembly_;
   const std::shared_ptr<UserGUIDSource> guidController_;
   const std::string identifier_;
+  const std::shared_ptr<FeedbackRoom> room_;
   const std::unique_ptr<SerialQueue> sessionQueue_;
 
   // Own synchronisation.

@@ -1,3 +1,4 @@
+#include <fmt/format.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
@@ -15,7 +16,8 @@ class ClientSessionManagerTest : public testing::Test {
  protected:
   void use(bool shared) {
     bed_ = std::make_unique<SessionsBed>(shared);
-    manager_ = std::make_shared<ClientSessionManager>(bed_->assembly, bed_->guids, "zelkor");
+    manager_ =
+        std::make_shared<ClientSessionManager>(bed_->assembly, bed_->guids, "zelkor", bed_->room);
     soft_ = max_ = 0;
     const auto count = [&](std::string_view name, int& number) {
       return bed_->fakes.notificationCenter.observe(std::string(name),
@@ -104,6 +106,101 @@ TEST_F(ClientSessionManagerTest, AnotherUserIdentifierEndsTheSessionInWhicheverS
     EXPECT_EQ(manager_->currentState(), SessionState::Active);
     EXPECT_TRUE(logged("session flushed because guid changed zelkor"));
   }
+}
+
+TEST_F(ClientSessionManagerTest, WhatWaitsIsBoundedInAllAndOfAProcess) {
+  const auto put = [&](std::int64_t pid, std::size_t bytes) {
+    auto custom = std::make_shared<HVCustomFeedback>();
+    custom->jsonFeedback = std::string(bytes, 'x');
+    auto record = SessionsBed::record(std::move(custom));
+    record.pid = pid;
+    return manager_->addZelkorFeedback(std::move(record));
+  };
+  constexpr std::size_t kMiB = 1024 * 1024;
+  // A record counts for four times its message and a little more.
+  for (int i = 0; i < 7; ++i) EXPECT_TRUE(put(7, kMiB / 4));
+  EXPECT_FALSE(put(7, kMiB / 4));
+  int small = 0;
+  while (put(7, 0)) ++small;
+  EXPECT_LT(small, 1024);
+  for (const std::int64_t pid : {8, 0, 9}) {
+    for (int i = 0; i < 7; ++i) EXPECT_TRUE(put(pid, kMiB / 4)) << pid;
+  }
+  EXPECT_TRUE(put(10, kMiB / 8));
+  EXPECT_FALSE(put(11, kMiB)) << "all of it is held";
+  EXPECT_LE(bed_->room->waiting().held(), 32 * kMiB);
+  EXPECT_EQ(bed_->counter("com.quenta.zelkord.limit.feedback_waiting"), 3);
+  EXPECT_EQ(bed_->fakes.log.count("limit feedback_waiting reached by pid 7"), 1);
+
+  bed_->fakes.timeline.runUntilIdle();
+  EXPECT_EQ(bed_->room->waiting().held(), 0u);
+  EXPECT_TRUE(put(7, kMiB / 2));
+  bed_->fakes.timeline.runUntilIdle();
+}
+
+// A client with its own session, used from morning to evening.
+TEST_F(ClientSessionManagerTest, IndividualSessionsFollowADayOfUse) {
+  use(false);
+  const auto startOfDay = bed_->fakes.timeline.now();
+  const auto until = [&](Duration timeOfDay) {
+    advance(startOfDay + timeOfDay - bed_->fakes.timeline.now());
+  };
+  const auto goOn = [&](Duration time) {
+    advance(time);
+    add();
+  };
+  // A look in the morning, until the client goes.
+  add();
+  add<HVResultEngagementFeedback>();
+  bool flushed = false;
+  manager_->flushSessionInvalidation("Lanthe/9", 7, [&](bool did) { flushed = did; });
+  bed_->fakes.timeline.runUntilIdle();
+  EXPECT_TRUE(flushed);
+  // A quarter of an hour of typing and no engagement.
+  until(1h);
+  use(900s);
+  add();
+  // A pause after the soft limit.
+  until(2h);
+  add();
+  goOn(590s);
+  goOn(210s);
+  // What has passed its soft limit ends with an engagement.
+  until(3h);
+  use(660s);
+  add<HVCardSectionEngagementFeedback>();
+  // Another user identifier, in the middle of a session.
+  until(5h);
+  add();
+  bed_->guids->reset();
+  add();
+  // In the evening the daemon is asked to end it.
+  until(10h);
+  add();
+  manager_->flushSession(nullptr);
+  bed_->fakes.timeline.runUntilIdle();
+
+  std::string day;
+  for (const auto& each : bed_->storage->containers) {
+    EXPECT_TRUE(each->isClosed);
+    EXPECT_EQ(each->headers, 1);
+    EXPECT_EQ(each->header.agent, "Lanthe/9");
+    day += fmt::format("{} after {}: {}\n", each->endReason().value_or("none"),
+                       each->previousEndReason(), each->records.size());
+  }
+  EXPECT_EQ(day,
+            "external request after no previous session: 3\n"
+            "max session time passed after external request: 17\n"
+            "session idle after max session time passed: 3\n"
+            "max session time passed after session idle: 2\n"
+            "engagement received after max session time passed: 13\n"
+            "guid changed after engagement received: 2\n"
+            "max session time passed after guid changed: 2\n"
+            "external request after max session time passed: 2\n");
+  EXPECT_EQ(soft_, 5);
+  EXPECT_EQ(max_, 4);
+  EXPECT_EQ(bed_->guids->resets, 3);
+  EXPECT_EQ(manager_->currentState(), SessionState::NoSession);
 }
 
 TEST_F(ClientSessionManagerTest, AClosingEngagementBelongsToTheSessionThatItEnds) {
@@ -233,7 +330,7 @@ TEST_F(ClientSessionManagerTest, TheEndOfAConnectionFlushesOnlyASessionOfItsOwn)
     use(shared);
     add();
     std::optional<bool> flushed;
-    manager_->flushSessionInvalidation("Lanthe/9", [&](bool did) { flushed = did; });
+    manager_->flushSessionInvalidation("Lanthe/9", 7, [&](bool did) { flushed = did; });
     EXPECT_EQ(flushed.has_value(), shared);  // told at once
     bed_->fakes.timeline.runUntilIdle();
     EXPECT_EQ(flushed, !shared);

@@ -1,6 +1,7 @@
 #include "zelkord/feedback/ClientSessionShared.h"
 
 #include "zelkord/assembly/Assembly.h"
+#include "zelkord/assembly/UserAgent.h"
 
 namespace zelkord {
 
@@ -14,6 +15,7 @@ ClientSessionShared::ClientSessionShared(Assembly& assembly, ZelkorFeedback feed
   sessionQueue_->sync([&] {
     sessionQueue_->assertCurrent();
     const auto agent = feedback.userAgent.value_or("");
+    ++membersOfProcess_[feedback.pid];
     sessionMap_[agent] =
         ClientSession::make(assembly_, std::move(feedback), previousSessionEndReason_);
   });
@@ -27,14 +29,34 @@ void ClientSessionShared::addFeedback(ZelkorFeedback feedback) {
 void ClientSessionShared::_add(ZelkorFeedback feedback) {
   sessionQueue_->assertCurrent();
   if (!feedback.userAgent) return;
+  if (!sessionMap_.contains(*feedback.userAgent)) _adopt(feedback);
   auto& member = sessionMap_[*feedback.userAgent];
   if (!member) {
+    ++membersOfProcess_[feedback.pid];
     member = ClientSession::make(assembly_, std::move(feedback), previousSessionEndReason_);
     return;
   }
   if (!member->agent()) member->setAgent(feedback.userAgent);
   if (!member->userGuid() && feedback.userGuid) member->setUserGuid(feedback.userGuid);
   member->addFeedback(std::move(feedback));
+}
+
+void ClientSessionShared::_adopt(ZelkorFeedback& feedback) {
+  sessionQueue_->assertCurrent();
+  auto own = zelkordUserAgent(assembly_.platform().device).value_or("");
+  if (feedback.userAgent == own || _mayOpenMember(feedback, own)) return;
+  assembly_.limits().refused("session_members", feedbackHolder(feedback));
+  feedback.userAgent = std::move(own);
+}
+
+// The daemon's own member always has a place.
+bool ClientSessionShared::_mayOpenMember(const ZelkorFeedback& feedback,
+                                         const std::string& own) const {
+  sessionQueue_->assertCurrent();
+  if (sessionMap_.size() - sessionMap_.count(own) + 1 >= kMaximumMembers) return false;
+  const auto found = membersOfProcess_.find(feedback.pid);
+  return feedback.pid == 0 || found == membersOfProcess_.end() ||
+         found->second < kMembersOfAProcess;
 }
 
 void ClientSessionShared::enumerateSessions(const Visitor& visitor) {

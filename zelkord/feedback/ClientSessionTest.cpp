@@ -3,6 +3,7 @@
 
 #include <limits>
 
+#include "zelkord/assembly/UserAgent.h"
 #include "zelkord/feedback/ClientSession.h"
 #include "zelkord/feedback/ClientSessionShared.h"
 #include "zelkord/feedback/FeedbackSeams.h"
@@ -221,6 +222,31 @@ TEST_F(ClientSessionTest, AMemberWithoutUserTakesTheFirstThatARecordNames) {
   EXPECT_EQ(container().records.size(), 3u);  // no complaint of another user
   session.enumerateSessions(
       [&](ClientSession& member, bool) { EXPECT_EQ(member.userGuid(), UUID{{5}}); });
+}
+
+TEST_F(ClientSessionTest, FurtherUserAgentsShareTheDaemonsOwnMember) {
+  const auto own = zelkordUserAgent(bed_.fakes.device);
+  ClientSessionShared session(bed_.assembly, at(0, std::make_shared<HVEndSearchFeedback>()),
+                              SessionEndReason::None);
+  const auto add = [&](const std::string& agent, std::int64_t pid) {
+    auto record = SessionsBed::record<HVEndSearchFeedback>(agent);
+    record.pid = pid;
+    session.addFeedback(std::move(record));
+  };
+  for (int i = 0; i < 1000; ++i) add("Flood/" + std::to_string(i), 7);
+  // One process has a quarter of the members, and they hold what it records under them.
+  EXPECT_EQ(bed_.storage->containers.size(), 1u + 16 + 1);
+  EXPECT_EQ(bed_.storage->containers.back()->header.agent, own);
+  EXPECT_EQ(bed_.storage->containers.back()->records.size(), 1000u - 16);
+  EXPECT_EQ(bed_.storage->containers.back()->records.back().userAgent, own);
+  add("Honest/1", 8);
+  EXPECT_EQ(bed_.storage->containers.back()->header.agent, "Honest/1");
+  for (int pid = 100; pid < 200; ++pid) add("Other/" + std::to_string(pid), pid);
+  EXPECT_EQ(bed_.storage->containers.size(), 64u);
+  EXPECT_EQ(bed_.counter("com.quenta.zelkord.limit.session_members"), 1000 - 16 + 100 - 45);
+  std::size_t members = 0;
+  session.enumerateSessions(
+      [&](ClientSession&, bool isLast) { EXPECT_EQ(isLast, ++members == 64); });
 }
 
 TEST(SessionProcessingHelperTest, RemembersWhatIsNamedUntilItIsDescribed) {

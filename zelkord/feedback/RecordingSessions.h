@@ -18,6 +18,7 @@ class RecordedFeedback final {
  public:
   void add(ZelkorFeedback feedback) {
     const MutexLock lock(mutex_);
+    feedback.held = nullptr;  // it is written
     records_.push_back(std::move(feedback));
   }
   void clear() {
@@ -39,17 +40,21 @@ class RecordingSessionManager final : public SessionManager {
   RecordingSessionManager(std::string identifier, bool sharedByAllClients)
       : identifier_(std::move(identifier)), shared_(sharedByAllClients) {}
 
-  void addZelkorFeedback(ZelkorFeedback feedback) override { records_.add(std::move(feedback)); }
+  bool addZelkorFeedback(ZelkorFeedback feedback) override {
+    if (!isFull.get()) records_.add(std::move(feedback));
+    return !isFull.get();
+  }
   void flushSession(std::function<void()> callback) override {
     records_.clear();
     if (callback) callback();
   }
-  void flushSessionInvalidation(std::optional<std::string> agent,
+  void flushSessionInvalidation(std::optional<std::string> agent, std::int64_t process,
                                 std::function<void(bool flushed)> callback) override {
     if (!shared_) return flushSession([callback = std::move(callback)] { callback(true); });
     ZelkorFeedback record;
     record.feedback = std::make_shared<ZelkorConnectionInvalidated>();
     record.userAgent = std::move(agent);
+    record.pid = process;
     addZelkorFeedback(std::move(record));
     callback(false);
   }
@@ -60,6 +65,7 @@ class RecordingSessionManager final : public SessionManager {
   const std::string& identifier() const override { return identifier_; }
   const RecordedFeedback& records() const { return records_; }
 
+  Guarded<bool> isFull{false};              // then nothing is added
   Guarded<std::vector<std::string>> texts;  // the answer of feedbacksWithRelativeTimestamp
   std::function<void()> whileWaiting;       // set before it is used
 
@@ -80,11 +86,14 @@ class RecordingSessions final : public FeedbackSessions {
     return std::make_shared<RecordingSessionManager>(std::move(identifier), shared_);
   }
   std::shared_ptr<FeedbackSession> makeSession(ZelkorFeedback first) override {
+    if (isFull.get()) return nullptr;
     auto session = std::make_shared<Session>(completed_);
     session->addFeedback(std::move(first));
     return session;
   }
   const RecordedFeedback& completed() const { return *completed_; }
+
+  Guarded<bool> isFull{false};  // then no session is made
 
  private:
   class Session final : public FeedbackSession {

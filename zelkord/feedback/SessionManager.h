@@ -18,11 +18,13 @@ class UserGUIDSource;
 class SessionManager {
  public:
   virtual ~SessionManager() = default;
-  virtual void addZelkorFeedback(ZelkorFeedback feedback) = 0;
+  // False when too much waits to be written: the record is dropped.
+  virtual bool addZelkorFeedback(ZelkorFeedback feedback) = 0;
   // Ends the current session; the call-back, when given, runs once that is done, on any thread.
   virtual void flushSession(std::function<void()> callback) = 0;
-  // A client's connection went away; the flag says whether a session was ended for it.
-  virtual void flushSessionInvalidation(std::optional<std::string> agent,
+  // The connection of a client in that process went away; the flag says whether a session was ended
+  // for it.
+  virtual void flushSessionInvalidation(std::optional<std::string> agent, std::int64_t process,
                                         std::function<void(bool flushed)> callback) = 0;
   // The current session's records in memory as JSON texts, oldest first: none in normal operation.
   virtual std::vector<std::string> feedbacksWithRelativeTimestamp() = 0;
@@ -48,6 +50,7 @@ class FeedbackSessions {
   // Records get the user identifier that `guidController` has at the moment.
   virtual std::shared_ptr<SessionManager> makeManager(
       std::string identifier, std::shared_ptr<UserGUIDSource> guidController) = 0;
+  // Null when there are too many, or too much waits to be written: the record is dropped.
   virtual std::shared_ptr<FeedbackSession> makeSession(ZelkorFeedback first) = 0;
 };
 

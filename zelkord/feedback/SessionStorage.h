@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstdint>
 #include <functional>
 #include <memory>
 
@@ -22,12 +23,15 @@ class SessionContainer {
   virtual void writeFeedback(const ZelkorFeedback& feedback, std::function<void()> done) = 0;
 };
 
+// Of a session manager, or made for one occasion.
+enum class SessionKind : std::uint8_t { Managed, OneOff };
+
 // Hands out containers and collects those of sessions that ended. Threading: any thread.
 class SessionStorage {
  public:
   virtual ~SessionStorage() = default;
   // Open for writing; null when there can be none.
-  virtual std::shared_ptr<SessionContainer> createFileContainerForWriting() = 0;
+  virtual std::shared_ptr<SessionContainer> createFileContainerForWriting(SessionKind kind) = 0;
   // No record follows; the container may be read and uploaded.
   virtual void closeSession(std::shared_ptr<SessionContainer> container) = 0;
   // Returns when everything handed over so far has been written, or could not be.

@@ -7,6 +7,7 @@
 #include "halvane/DaemonFeedback.h"
 #include "platform/testing/FakePlatform.h"
 #include "zelkord/assembly/Assembly.h"
+#include "zelkord/feedback/FeedbackRoom.h"
 #include "zelkord/feedback/SessionStorage.h"
 #include "zelkord/feedback/UserGUIDSource.h"
 
@@ -26,6 +27,7 @@ struct RecordingContainer final : SessionContainer {
   void writeFeedback(const ZelkorFeedback& feedback, std::function<void()> done) override {
     if (isClosed) return;
     records.push_back(feedback);
+    records.back().held = nullptr;
     if (done) done();
   }
   // What the session says of its end; none while it is open, and for the ends that are not
@@ -49,7 +51,7 @@ struct RecordingStorage final : SessionStorage {
   std::vector<std::shared_ptr<RecordingContainer>> containers;  // every one ever made
   bool isFull = false;
 
-  std::shared_ptr<SessionContainer> createFileContainerForWriting() override {
+  std::shared_ptr<SessionContainer> createFileContainerForWriting(SessionKind) override {
     if (isFull) return nullptr;
     containers.push_back(std::make_shared<RecordingContainer>());
     return containers.back();
@@ -97,6 +99,7 @@ struct SessionsBed {
   Assembly assembly;
   const std::shared_ptr<RecordingStorage> storage = std::make_shared<RecordingStorage>();
   const std::shared_ptr<CountedGUIDs> guids = std::make_shared<CountedGUIDs>();
+  const std::shared_ptr<FeedbackRoom> room = std::make_shared<FeedbackRoom>(assembly);
 };
 
 }  // namespace zelkord

@@ -8,11 +8,13 @@ namespace zelkord {
 std::shared_ptr<SessionManager> StoredSessions::makeManager(
     std::string identifier, std::shared_ptr<UserGUIDSource> guidController) {
   return std::make_shared<ClientSessionManager>(assembly_, std::move(guidController),
-                                                std::move(identifier));
+                                                std::move(identifier), room_);
 }
 
 std::shared_ptr<FeedbackSession> StoredSessions::makeSession(ZelkorFeedback first) {
-  return ClientSession::make(assembly_, std::move(first));
+  if (!room_->takeSession(first) || !room_->take(first)) return nullptr;
+  return ClientSession::make(assembly_, std::move(first), SessionEndReason::None,
+                             SessionKind::OneOff);
 }
 
 }  // namespace zelkord

@@ -3,6 +3,7 @@
 #include <memory>
 #include <string>
 
+#include "zelkord/feedback/FeedbackRoom.h"
 #include "zelkord/feedback/SessionManager.h"
 
 namespace zelkord {
@@ -13,7 +14,8 @@ class Assembly;
 // Threading: any thread. Ownership: the assembly outlives what it made.
 class StoredSessions final : public FeedbackSessions {
  public:
-  explicit StoredSessions(Assembly& assembly) : assembly_(assembly) {}
+  explicit StoredSessions(Assembly& assembly)
+      : assembly_(assembly), room_(std::make_shared<FeedbackRoom>(assembly)) {}
 
   std::shared_ptr<SessionManager> makeManager(
       std::string identifier, std::shared_ptr<UserGUIDSource> guidController) override;
@@ -21,6 +23,7 @@ class StoredSessions final : public FeedbackSessions {
 
  private:
   Assembly& assembly_;
+  const std::shared_ptr<FeedbackRoom> room_;
 };
 
 }  // namespace zelkord

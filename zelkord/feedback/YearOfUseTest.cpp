@@ -156,7 +156,8 @@ TEST(YearOfUseTest, SessionsAreThoseOfAnIndependentModel) {
   bed.fakes.locale.zone = "UTC";
   auto& timeline = bed.fakes.timeline;
   const auto guids = std::make_shared<AgingGUIDs>(timeline);
-  const auto manager = std::make_shared<ClientSessionManager>(bed.assembly, guids, "zelkor");
+  const auto manager =
+      std::make_shared<ClientSessionManager>(bed.assembly, guids, "zelkor", bed.room);
   const auto beginning = timeline.now();
   std::mt19937 random(20261123);
   Model model;

@@ -2,6 +2,7 @@
 
 #include "base/Check.h"
 #include "halvane/Vocabulary.h"
+#include "platform/api/Budget.h"
 #include "zelkord/encoding/FeedbackEncoding.h"
 #include "zelkord/encoding/JsonWriting.h"
 
@@ -113,6 +114,10 @@ void stamp(ZelkorFeedback& record, const Clock& clock) {
   const std::shared_ptr<HVFeedback> stamped = record.feedback->clone();
   stamped->timestamp = static_cast<std::uint64_t>(clock.now().time_since_epoch().count());
   record.feedback = stamped;
+}
+
+std::string feedbackHolder(const ZelkorFeedback& record) {
+  return record.pid == 0 ? "zelkord" : processHolder(record.pid);
 }
 
 std::uint64_t millisecondsOf(std::uint64_t nanoseconds) { return nanoseconds / 1'000'000; }

@@ -14,6 +14,7 @@
 #include "zelkord/ZelkorLogging/ZelkorLogging.h"
 #include "zelkord/assembly/ZelkorDiagnosticDataReporter.h"
 #include "zelkord/encoding/IdentifierProcessor.h"
+#include "zelkord/feedback/SharedText.h"
 
 namespace zelkord {
 
@@ -26,9 +27,12 @@ struct ZelkorFeedback {
   std::shared_ptr<const HVFeedback> feedback;
   std::int64_t queryId = 0;
   std::optional<UUID> userGuid;
-  std::optional<std::string> userAgent;
+  SharedText userAgent;
   std::uint64_t clientQueryId = 0;
   std::uint64_t relTimestamp = 0;  // milliseconds since the session's first record
+  std::int64_t pid = 0;            // of the client that caused it; 0 for the daemon's own
+  // What it holds on to until it is written, or dropped: of a budget, of the call that brought it.
+  std::shared_ptr<const void> held = nullptr;
 
   // The feedback's: an index into eventTypes().
   std::uint32_t type() const;
@@ -45,6 +49,9 @@ struct ZelkorFeedback {
   std::optional<std::string> description(const Logger& errors,
                                          const ZelkorDiagnosticDataReporter& reporter) const;
 };
+
+// The holder of what the record takes of budgets.
+std::string feedbackHolder(const ZelkorFeedback& record);
 
 // Names of the feedback types, by type.
 const std::array<std::string_view, 35>& eventTypes();

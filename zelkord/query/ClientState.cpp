@@ -212,8 +212,8 @@ FieldMask ClientState::fieldMask() const {
 
 void ClientState::record(std::shared_ptr<const HVFeedback> feedback, const ZLKRequest& request,
                          std::optional<UUID> userGuid) const {
-  sessionManager_->addZelkorFeedback(
-      {std::move(feedback), request.queryId, userGuid, userAgent(), request.clientQueryId});
+  sessionManager_->addZelkorFeedback({std::move(feedback), request.queryId, userGuid, userAgent(),
+                                      request.clientQueryId, 0, process()});
 }
 
 }  // namespace zelkord

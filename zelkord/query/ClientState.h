@@ -48,6 +48,9 @@ class ClientState final : public std::enable_shared_from_this<ClientState> {
   void setConfiguration(ZLKSessionConfiguration configuration) {
     configuration_.set(std::move(configuration));
   }
+  // Of whoever configured it last; 0 before.
+  std::int64_t process() const { return process_.load(); }
+  void setProcess(std::int64_t process) { process_ = process; }
   std::optional<std::string> userAgent() const;
   // For a state that has no bag yet; later ones are adopted.
   void setUserAgent(std::optional<std::string> userAgent);
@@ -121,6 +124,7 @@ class ClientState final : public std::enable_shared_from_this<ClientState> {
   Guarded<std::optional<SteadyTime>> lastNetworkRequest_;
   const std::unique_ptr<Semaphore> bagFetchSemaphore_;
   std::atomic<unsigned> bagWaiters_ = 0;
+  std::atomic<std::int64_t> process_ = 0;
   Mutex observationMutex_;
   Subscription bagObservation_ ZK_GUARDED_BY(observationMutex_);
 };

@@ -63,7 +63,7 @@ void endNetworkFeedback(const std::shared_ptr<ClientState>& state, const ZLKRequ
                        queryId = request.queryId](std::shared_ptr<const HVFeedback> feedback) {
     const auto guid = state->guidController().currentUserGUID();
     state->sessionManager().addZelkorFeedback(
-        {std::move(feedback), queryId, guid, state->userAgent(), 0});
+        {std::move(feedback), queryId, guid, state->userAgent(), 0, 0, state->process()});
   };
   if (!task->currentRequest().routed) {
     record(end.feedback);

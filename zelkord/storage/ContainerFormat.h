@@ -29,6 +29,9 @@ inline std::uint64_t framedLengthAt(std::string_view bytes, std::uint64_t positi
   return length;
 }
 
+// How many whole records there are, whatever they hold.
+std::size_t countRecords(std::string_view bytes);
+
 // Where the last whole record of a container ends that a writer left in the middle of the next one.
 // None when there is nothing to cut: the container ends with a record, or it is damaged otherwise,
 // which a length of zero or of `limit` and more shows.

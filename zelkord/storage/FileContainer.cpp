@@ -32,23 +32,32 @@ class Layout final {
 }  // namespace
 
 FileContainer::FileContainer(Services services, std::string fileUrl)
-    : FileContainer(std::move(services), std::move(fileUrl), nullptr) {
-  waiting_.close();
-}
-
-FileContainer::FileContainer(Services services, std::string fileUrl,
-                             std::unique_ptr<AppendFile> fileHandle)
     : services_(std::move(services)),
       queue_(*services_->queue),
       fileUrl_(std::move(fileUrl)),
-      waiting_(fileHandle ? fileHandle->length() : 0, services_->maxFileSize),
-      fileHandle_(std::move(fileHandle)) {}
+      waiting_(0, services_->maxFileSize),
+      isOpen_(false) {
+  waiting_.close();
+}
+
+FileContainer::FileContainer(Services services, std::string fileUrl, ContainerRoom::Id place)
+    : services_(std::move(services)),
+      queue_(*services_->queue),
+      fileUrl_(std::move(fileUrl)),
+      place_(place),
+      waiting_(0, services_->maxFileSize),
+      isOpen_(true) {}
+
+// A session that nobody completed has ended too.
+FileContainer::~FileContainer() {
+  if (place_) services_->room->end(*place_, fileUrl_);
+}
 
 void FileContainer::writeSessionHeader(const CZClientSession& header) {
   std::string message;
   appendRecord(header, message);
-  _add(RecordKind::Version, services_->version, nullptr);
-  _add(RecordKind::Header, message, nullptr);
+  _add(RecordKind::Version, services_->version, nullptr, nullptr);
+  _add(RecordKind::Header, message, nullptr, nullptr);
 }
 
 void FileContainer::writeFeedback(const ZelkorFeedback& feedback, std::function<void()> done) {
@@ -59,11 +68,12 @@ void FileContainer::writeFeedback(const ZelkorFeedback& feedback, std::function<
                         .queryId = feedback.queryId,
                         .clientQueryId = feedback.clientQueryId},
                        layout.text());
-  _add(RecordKind::Feedback, layout.text(), std::move(done));
+  _add(RecordKind::Feedback, layout.text(), std::move(done), feedback.held);
 }
 
-void FileContainer::_add(RecordKind kind, std::string_view payload, std::function<void()> done) {
-  waiting_.add(kind, payload, std::move(done),
+void FileContainer::_add(RecordKind kind, std::string_view payload, std::function<void()> done,
+                         std::shared_ptr<const void> held) {
+  waiting_.add(kind, payload, std::move(done), std::move(held),
                [this] { queue_.async([self = shared_from_this()] { self->_writeWaiting(); }); });
 }
 
@@ -79,25 +89,52 @@ void FileContainer::_writeBatch() {
   queue_.assertCurrent();
   const auto transaction = services_->transactions.open("archiveObject");
   std::string_view rest = writing_.bytes;
-  const bool whole = rest.empty() || _archiveData(rest);
+  const auto file = isOpen_ && !rest.empty() ? _openFile() : nullptr;
+  const bool whole = rest.empty() || _archiveData(file.get(), rest);
   const bool single = writing_.records.size() == 1;
   for (auto& record : writing_.records) {
     const bool fits = record.fit == RecordFit::Fits;
     const bool written =
-        fits && (whole || (!single && _archiveData(rest.substr(0, record.size()))));
+        fits && (whole || (!single && _archiveData(file.get(), rest.substr(0, record.size()))));
     rest.remove_prefix(record.size());
-    if (!fileHandle_ && record.kind == RecordKind::Feedback) continue;
+    if (!isOpen_ && record.kind == RecordKind::Feedback) continue;
     if (fits && !written) waiting_.giveBack(record.size());
     _finish(record, written);
   }
 }
 
-bool FileContainer::_archiveData(std::string_view framed) {
+// What stands behind the records that were written is half a record, which could not be cut off
+// when it was.
+std::unique_ptr<AppendFile> FileContainer::_openFile() {
   queue_.assertCurrent();
-  if (!fileHandle_) return false;
-  const auto error = fileHandle_->append(framed);
-  if (error && !std::exchange(failed_, true)) {
-    services_->log.error("could not write to {}: {}", fileUrl_, error->description());
+  Error error;
+  auto& files = services_->containerFiles;
+  auto file = files.openForAppending(fileUrl_, &error);
+  if (file && file->length() > length_) {
+    file = nullptr;
+    const auto problem = files.cut(fileUrl_, length_);
+    if (problem) error = *problem;
+    if (!problem) file = files.openForAppending(fileUrl_, &error);
+  }
+  if (!file) _complain(error);
+  return file;
+}
+
+void FileContainer::_complain(const Error& error) {
+  queue_.assertCurrent();
+  if (std::exchange(failed_, true)) return;
+  services_->log.error("could not write to {}: {}", fileUrl_, error.description());
+}
+
+bool FileContainer::_archiveData(AppendFile* file, std::string_view framed) {
+  queue_.assertCurrent();
+  if (!file || !isOpen_ || !services_->room->grow(*place_, framed.size())) return false;
+  const auto error = file->append(framed);
+  if (error) {
+    services_->room->giveBack(*place_, framed.size());
+    _complain(*error);
+  } else {
+    length_ += framed.size();
   }
   return !error;
 }
@@ -125,9 +162,8 @@ void FileContainer::close() {
 void FileContainer::_closeFile() {
   queue_.assertCurrent();
   waiting_.close();
-  if (!fileHandle_) return;
+  if (!std::exchange(isOpen_, false)) return;
   services_->log.info("close file url {}", fileUrl_);
-  fileHandle_.reset();
 }
 
 std::optional<StoredSession> FileContainer::read() {
@@ -140,7 +176,7 @@ std::optional<StoredSession> FileContainer::_read() {
   queue_.assertCurrent();
   const auto& log = services_->log;
   log.info("reading file url {}", fileUrl_);
-  if (fileHandle_) {
+  if (isOpen_) {
     log.fault("file is already open closing it {}", fileUrl_);
     _closeFile();
   }

@@ -12,6 +12,7 @@
 #include "zelkord/assembly/ZelkorDiagnosticDataReporter.h"
 #include "zelkord/feedback/SessionStorage.h"
 #include "zelkord/feedback/StoredSession.h"
+#include "zelkord/storage/ContainerRoom.h"
 #include "zelkord/storage/WaitingRecords.h"
 
 namespace zelkord {
@@ -24,6 +25,7 @@ struct ContainerServices {
   ProcessTransactions& transactions;
   const Logger& log;
   const ZelkorDiagnosticDataReporter& reporter;
+  std::shared_ptr<ContainerRoom> room;
   std::string version;
   std::uint64_t maxFileSize = 0;  // no container reaches it
 };
@@ -35,10 +37,12 @@ struct ContainerServices {
 //
 // A record is laid out by whoever hands it over and waits in memory, bounded by the file's limit,
 // for the storage's queue, which writes everything that waits with one call. So a process that is
-// killed leaves at most its last records out, and one cut short.
+// killed leaves at most its last records out, and one cut short. The file itself is open only
+// during that call: there may be hundreds of containers.
 //
 // Threading: any thread. Ownership: tasks on the queue keep a container until its records are
-// written. Errors: logged; a record that is too large is counted too.
+// written. Errors: logged; a record that is too large, or for which the disk has no room, is
+// counted too.
 class FileContainer final : public SessionContainer,
                             public std::enable_shared_from_this<FileContainer> {
  public:
@@ -46,8 +50,11 @@ class FileContainer final : public SessionContainer,
 
   // Closed, for a file that exists.
   FileContainer(Services services, std::string fileUrl);
-  // Open for writing.
-  FileContainer(Services services, std::string fileUrl, std::unique_ptr<AppendFile> fileHandle);
+  // Open for writing, for an empty file that has this place.
+  FileContainer(Services services, std::string fileUrl, ContainerRoom::Id place);
+  FileContainer(const FileContainer&) = delete;
+  FileContainer& operator=(const FileContainer&) = delete;
+  ~FileContainer() override;
 
   void writeSessionHeader(const CZClientSession& header) override;
   void writeFeedback(const ZelkorFeedback& feedback, std::function<void()> done) override;
@@ -58,12 +65,17 @@ class FileContainer final : public SessionContainer,
   void close();
   // The file's path.
   const std::string& fileUrl() const { return fileUrl_; }
+  // Where it is in its room, if it was open for writing.
+  const std::optional<ContainerRoom::Id>& place() const { return place_; }
 
  private:
-  void _add(RecordKind kind, std::string_view payload, std::function<void()> done);
+  void _add(RecordKind kind, std::string_view payload, std::function<void()> done,
+            std::shared_ptr<const void> held);
   void _writeWaiting();
   void _writeBatch();
-  bool _archiveData(std::string_view framed);
+  std::unique_ptr<AppendFile> _openFile();
+  bool _archiveData(AppendFile* file, std::string_view framed);
+  void _complain(const Error& error);
   void _finish(const WaitingRecord& record, bool written);
   void _closeFile();
   std::optional<StoredSession> _read();
@@ -74,11 +86,13 @@ class FileContainer final : public SessionContainer,
   const Services services_;
   SerialQueue& queue_;
   const std::string fileUrl_;
+  const std::optional<ContainerRoom::Id> place_;
 
   WaitingRecords waiting_;
 
   // Queue state.
-  std::unique_ptr<AppendFile> fileHandle_ ZK_ON(queue_);
+  bool isOpen_ ZK_ON(queue_);
+  std::uint64_t length_ ZK_ON(queue_) = 0;  // of what was written
   RecordBatch writing_ ZK_ON(queue_);
   bool failed_ ZK_ON(queue_) = false;  // and that was logged
 };

@@ -33,20 +33,23 @@ class FileContainerTest : public testing::Test {
   }
   std::shared_ptr<FileContainer> forWriting(std::uint64_t limit = 100'000) {
     fakes_.files.put(kPath, "");
-    return std::make_shared<FileContainer>(services(limit), kPath,
-                                           fakes_.files.openForAppending(kPath, nullptr));
+    auto shared = services(limit);
+    const auto place = shared->room->open(SessionKind::Managed);
+    return std::make_shared<FileContainer>(std::move(shared), kPath, *place);
   }
   FileContainer::Services services(std::uint64_t limit) {
     auto& platform = fakes_.platform();
-    return std::make_shared<const ContainerServices>(
-        ContainerServices{.queue = fakes_.timeline.makeSerialQueue("storage"),
-                          .files = platform.files,
-                          .containerFiles = platform.containerFiles,
-                          .transactions = platform.transactions,
-                          .log = assembly_.log(Category::FeedbackStorage),
-                          .reporter = assembly_.reporter(),
-                          .version = kVersion,
-                          .maxFileSize = limit});
+    return std::make_shared<const ContainerServices>(ContainerServices{
+        .queue = fakes_.timeline.makeSerialQueue("storage"),
+        .files = platform.files,
+        .containerFiles = platform.containerFiles,
+        .transactions = platform.transactions,
+        .log = assembly_.log(Category::FeedbackStorage),
+        .reporter = assembly_.reporter(),
+        .room = std::make_shared<ContainerRoom>(platform.files, assembly_.limits(),
+                                                assembly_.log(Category::FeedbackStorage)),
+        .version = kVersion,
+        .maxFileSize = limit});
   }
   // Writes records of those numbers; answers whose attempt was told of.
   std::vector<int> write(FileContainer& container, std::initializer_list<int> numbers) {
@@ -148,6 +151,25 @@ TEST_F(FileContainerTest, KeepsWhatFitsOnAFullDisk) {
   EXPECT_THAT(write(*container, {6}), ElementsAre(6));
   EXPECT_EQ(fakes_.log.count("could not write to /caches/session.0"), 1);
   EXPECT_THAT(queryIds(container->read()), ElementsAre(1, 2, 3, 6));
+}
+
+TEST_F(FileContainerTest, TheFileIsOpenOnlyWhileItIsWritten) {
+  const auto container = forWriting();
+  container->writeSessionHeader(testHeader());
+  for (int number = 1; number <= 3; ++number) {
+    write(*container, {number});
+    EXPECT_EQ(fakes_.files.openForAppend(), 0);
+  }
+  EXPECT_THAT(queryIds(container->read()), ElementsAre(1, 2, 3));
+}
+
+TEST_F(FileContainerTest, CutsOffWhatAFailedWriteLeft) {
+  const auto container = forWriting();
+  container->writeSessionHeader(testHeader());
+  write(*container, {1});
+  fakes_.files.put(kPath, *fakes_.files.bytes(kPath) + "half a rec");
+  write(*container, {2});
+  EXPECT_THAT(queryIds(container->read()), ElementsAre(1, 2));
 }
 
 TEST_F(FileContainerTest, GivesTheRoomOfAFailedWriteToOthers) {

@@ -1,6 +1,7 @@
 #include "zelkord/storage/SessionUnarchiver.h"
 
 #include "base/Text.h"
+#include "zelkord/storage/ContainerFormat.h"
 
 namespace zelkord {
 namespace {
@@ -47,6 +48,7 @@ bool SessionUnarchiver::_readHeader() {
 }
 
 bool SessionUnarchiver::_readFeedbacks() {
+  session_.feedbacks.reserve(countRecords(records_.data().view().substr(records_.position())));
   while (records_.hasMore()) {
     const auto payload = records_.readNextObject();
     if (!payload) break;

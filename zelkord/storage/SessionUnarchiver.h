@@ -33,7 +33,7 @@ class SessionUnarchiver final {
   ArchivedDataIterator records_;
   StoredSession session_;
   std::optional<UUID> userGuid_;
-  std::optional<std::string> userAgent_;
+  SharedText userAgent_;
 };
 
 }  // namespace zelkord

@@ -20,11 +20,11 @@ void RecordBatch::clear() {
 }
 
 void WaitingRecords::add(RecordKind kind, std::string_view payload, std::function<void()> done,
-                         FunctionRef<void()> wake) {
+                         std::shared_ptr<const void> held, FunctionRef<void()> wake) {
   const MutexLock lock(mutex_);
   if (!open_ && kind == RecordKind::Feedback) return;
   const auto fit = _fit(kind, payload.size());
-  waiting_.records.push_back({kind, fit, end_, payload.size(), std::move(done)});
+  waiting_.records.push_back({kind, fit, end_, payload.size(), std::move(done), std::move(held)});
   if (fit == RecordFit::Fits) {
     appendFramed(payload, waiting_.bytes);
     end_ += kLengthSize + payload.size();

@@ -23,6 +23,7 @@ struct WaitingRecord {
   std::uint64_t offset = 0;   // in the file
   std::uint64_t payload = 0;  // bytes
   std::function<void()> done;
+  std::shared_ptr<const void> held;  // until it is written
 
   // Its bytes in the batch.
   std::uint64_t size() const;
@@ -50,7 +51,7 @@ class WaitingRecords final {
   // Calls `wake` for the first record after a `take`, before anything else can be added. Feedback
   // for a closed container is forgotten.
   void add(RecordKind kind, std::string_view payload, std::function<void()> done,
-           FunctionRef<void()> wake);
+           std::shared_ptr<const void> held, FunctionRef<void()> wake);
   // Takes all; `batch` must be clear.
   void take(RecordBatch& batch);
   // So many bytes could not be written.

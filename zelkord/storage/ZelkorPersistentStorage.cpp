@@ -3,7 +3,6 @@
 #include <algorithm>
 #include <cerrno>
 #include <limits>
-#include <set>
 #include <utility>
 
 #include "zelkord/assembly/Assembly.h"
@@ -46,6 +45,8 @@ FileContainer::Services makeServices(Assembly& assembly) {
       .transactions = platform.transactions,
       .log = assembly.log(Category::FeedbackStorage),
       .reporter = assembly.reporter(),
+      .room = std::make_shared<ContainerRoom>(platform.files, assembly.limits(),
+                                              assembly.log(Category::FeedbackStorage)),
       .version = zelkordUserAgent(platform.device).value_or(std::string()),
       .maxFileSize = unsignedSetting(platform.settings, "ZLKSessionSizeLimit", kDefaultSizeLimit)});
 }
@@ -62,22 +63,29 @@ ZelkorPersistentStorage::ZelkorPersistentStorage(Assembly& assembly)
 
 // Numbers must be known before the first new container; all the rest can wait.
 void ZelkorPersistentStorage::start() {
-  queue_.async([weak = weak_from_this(), scan = _scanCacheDirectory()] {
-    if (const auto self = weak.lock()) self->_offer(scan);
+  queue_.async([weak = weak_from_this(), scan = _scanCacheDirectory()]() mutable {
+    if (const auto self = weak.lock()) self->_offer(std::move(scan));
   });
 }
 
-std::shared_ptr<SessionContainer> ZelkorPersistentStorage::createFileContainerForWriting() {
+// That the file can be written is tried now, while its session can still be told.
+std::shared_ptr<SessionContainer> ZelkorPersistentStorage::createFileContainerForWriting(
+    SessionKind kind) {
+  const auto place = services_->room->open(kind);
+  if (!place) return nullptr;
   const auto url = _newFileUrl();
   if (!url) {
     log_.error("Could not get a file url");
+    services_->room->forget(*place);
     return nullptr;
   }
   log_.info("new file url {}", *url);
-  auto handle = services_->containerFiles.openForAppending(*url, nullptr);
-  if (handle) return std::make_shared<FileContainer>(services_, *url, std::move(handle));
+  if (services_->containerFiles.openForAppending(*url, nullptr)) {
+    return std::make_shared<FileContainer>(services_, *url, *place);
+  }
   log_.error("Could not open file for writing {}", *url);
   services_->files.remove(*url);
+  services_->room->forget(*place);
   return nullptr;
 }
 
@@ -98,21 +106,19 @@ std::optional<std::string> ZelkorPersistentStorage::_newFileUrl() {
 
 void ZelkorPersistentStorage::closeSession(std::shared_ptr<SessionContainer> container) {
   auto file = std::dynamic_pointer_cast<FileContainer>(std::move(container));
-  if (!file) return;
+  if (!file || !file->place()) return;
   file->close();
-  queue_.async([weak = weak_from_this(), file = std::move(file)] {
-    const auto self = weak.lock();
-    if (!self) return;
-    self->queue_.assertCurrent();
-    self->fileContainers_.push_back(file);
+  queue_.async([file = std::move(file), services = services_] {
+    services->room->end(*file->place(), file->fileUrl());
   });
 }
 
 std::vector<std::shared_ptr<FileContainer>> ZelkorPersistentStorage::getAvailableSessionHandles() {
-  Containers available;
+  std::vector<std::shared_ptr<FileContainer>> available;
   queue_.sync([&] {
-    queue_.assertCurrent();
-    available = fileContainers_;
+    for (auto& path : services_->room->endedPaths()) {
+      available.push_back(std::make_shared<FileContainer>(services_, std::move(path)));
+    }
   });
   for (const auto& container : available) {
     log_.info("available file url {}", container->fileUrl());
@@ -126,8 +132,8 @@ void ZelkorPersistentStorage::deleteSessionWithFileContainer(
   container->close();
   queue_.async([self = shared_from_this(), container = std::move(container)] {
     self->queue_.assertCurrent();
-    auto& all = self->fileContainers_;
-    all.erase(std::remove(all.begin(), all.end(), container), all.end());
+    if (container->place()) self->services_->room->forget(*container->place());
+    self->services_->room->forget(container->fileUrl());
     self->_deleteSessionFile(container->fileUrl());
   });
 }
@@ -173,7 +179,7 @@ void ZelkorPersistentStorage::_scanFile(const std::string& name, Scan& scan,
     return;
   }
   largest = std::max(largest, *number);
-  scan.kept.push_back(path);
+  scan.kept.push_back({path, *number, *attributes});
 }
 
 void ZelkorPersistentStorage::_continueAfter(std::int64_t largest) {
@@ -182,16 +188,16 @@ void ZelkorPersistentStorage::_continueAfter(std::int64_t largest) {
   handleId_.compare_exchange_strong(current, static_cast<std::uint32_t>(largest + 1));
 }
 
-void ZelkorPersistentStorage::_offer(const Scan& scan) {
+void ZelkorPersistentStorage::_offer(Scan scan) {
   queue_.assertCurrent();
   for (const auto& path : scan.tooOld) _deleteSessionFile(path);
-  std::set<std::string> known;
-  for (const auto& container : fileContainers_) known.insert(container->fileUrl());
-  for (const auto& path : scan.kept) {
-    if (known.contains(path)) continue;
-    _trim(path);
-    fileContainers_.push_back(std::make_shared<FileContainer>(services_, path));
-  }
+  std::sort(scan.kept.begin(), scan.kept.end(), [](const Found& a, const Found& b) {
+    return std::pair(a.attributes.created, a.number) < std::pair(b.attributes.created, b.number);
+  });
+  std::vector<std::pair<std::string, std::uint64_t>> files;
+  for (const auto& found : scan.kept) files.emplace_back(found.path, found.attributes.size);
+  services_->room->adopt(files);
+  for (const auto& path : services_->room->endedPaths()) _trim(path);
 }
 
 // Without a mapping there is nothing to cut: an empty file, or one that reading will complain of.

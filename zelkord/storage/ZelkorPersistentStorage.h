@@ -18,7 +18,8 @@ class Assembly;
 // A container is open for writing from `createFileContainerForWriting` until its session is closed;
 // then, like those that an earlier process left, it is available until it is deleted. At the start
 // those that are too old go, and one that ends within a record is cut back to its last whole one
-// before it is handed out. New ones have numbers beyond those found.
+// before it is handed out. New ones have numbers beyond those found. All of them together stay
+// within the bounds of ContainerRoom.
 //
 // Threading: any thread. Making a container makes its file; everything else that touches the disk
 // runs on the storage's queue.
@@ -32,7 +33,7 @@ class ZelkorPersistentStorage final : public SessionStorage,
   // Finds what an earlier process left. Once, before anything else.
   void start();
 
-  std::shared_ptr<SessionContainer> createFileContainerForWriting() override;
+  std::shared_ptr<SessionContainer> createFileContainerForWriting(SessionKind kind) override;
   void closeSession(std::shared_ptr<SessionContainer> container) override;
   // Waits for the queue, so not from there.
   std::vector<std::shared_ptr<FileContainer>> getAvailableSessionHandles();
@@ -41,18 +42,22 @@ class ZelkorPersistentStorage final : public SessionStorage,
   void waitForPendingWrites() override;
 
  private:
-  using Containers = std::vector<std::shared_ptr<FileContainer>>;
-  // What a look into the directory gives; paths.
+  struct Found {
+    std::string path;
+    std::int64_t number = 0;
+    FileAttributes attributes;
+  };
+  // What a look into the directory gives.
   struct Scan {
-    std::vector<std::string> kept;
-    std::vector<std::string> tooOld;
+    std::vector<Found> kept;
+    std::vector<std::string> tooOld;  // paths
   };
 
   std::optional<std::string> _newFileUrl();
   Scan _scanCacheDirectory();
   void _scanFile(const std::string& name, Scan& scan, std::int64_t& largest);
   void _continueAfter(std::int64_t largest);
-  void _offer(const Scan& scan);
+  void _offer(Scan scan);
   void _trim(const std::string& path);
   void _deleteSessionFile(const std::string& path);
 
@@ -65,9 +70,6 @@ class ZelkorPersistentStorage final : public SessionStorage,
   SerialQueue& queue_;
 
   std::atomic<std::uint32_t> handleId_ = 0;  // of the next file
-
-  // Queue state.
-  Containers fileContainers_ ZK_ON(queue_);  // closed, available
 };
 
 }  // namespace zelkord

@@ -14,6 +14,8 @@ namespace {
 using testing::ElementsAre;
 using testing::UnorderedElementsAre;
 
+constexpr const char* kGone = "com.quenta.zelkord.limit.containers";
+
 class ZelkorPersistentStorageTest : public testing::Test {
  protected:
   std::shared_ptr<ZelkorPersistentStorage> start() {
@@ -30,6 +32,20 @@ class ZelkorPersistentStorageTest : public testing::Test {
       urls.push_back(container->fileUrl());
     }
     return urls;
+  }
+  // A session of one record, from its beginning to its end.
+  void record(ZelkorPersistentStorage& storage, SessionKind kind, const std::string& text = "{}") {
+    const auto session = storage.createFileContainerForWriting(kind);
+    ASSERT_TRUE(session);
+    session->writeSessionHeader(testHeader());
+    session->writeFeedback(numberedFeedback(1, 0, text), nullptr);
+    storage.closeSession(session);
+    fakes_.timeline.runUntilIdle();
+  }
+  std::uint64_t bytesOnDisk() const {
+    std::uint64_t bytes = 0;
+    for (const auto& path : fakes_.files.paths()) bytes += fakes_.files.bytes(path)->size();
+    return bytes;
   }
   std::string whole() { return containerBytes(*zelkordUserAgent(fakes_.device), 2); }
 
@@ -57,7 +73,8 @@ TEST_F(ZelkorPersistentStorageTest, NumbersFilesBeyondThoseFound) {
     for (const auto* name : test.found) fakes.files.put("/caches/" + std::string(name), "x");
     const auto storage = std::make_shared<ZelkorPersistentStorage>(assembly);
     storage->start();
-    EXPECT_EQ(url(storage->createFileContainerForWriting()), "/caches/" + std::string(test.next));
+    EXPECT_EQ(url(storage->createFileContainerForWriting(SessionKind::Managed)),
+              "/caches/" + std::string(test.next));
     for (const auto* name : test.found) {
       EXPECT_TRUE(fakes.files.bytes("/caches/" + std::string(name)));
     }
@@ -68,7 +85,7 @@ TEST_F(ZelkorPersistentStorageTest, TakesTheNextFreeNumber) {
   const auto storage = start();
   fakes_.files.put("/caches/session.0", "somebody's");
   fakes_.files.putDirectory("/caches/session.1");
-  EXPECT_EQ(url(storage->createFileContainerForWriting()), "/caches/session.2");
+  EXPECT_EQ(url(storage->createFileContainerForWriting(SessionKind::Managed)), "/caches/session.2");
   EXPECT_EQ(fakes_.files.bytes("/caches/session.0"), "somebody's");
   EXPECT_EQ(fakes_.files.mode("/caches/session.2"), 0600u);
   EXPECT_TRUE(fakes_.log.contains("new file url /caches/session.2"));
@@ -76,7 +93,7 @@ TEST_F(ZelkorPersistentStorageTest, TakesTheNextFreeNumber) {
 
 TEST_F(ZelkorPersistentStorageTest, LeadsAContainerFromWritingToDeletion) {
   const auto storage = start();
-  const auto session = storage->createFileContainerForWriting();
+  const auto session = storage->createFileContainerForWriting(SessionKind::Managed);
   session->writeSessionHeader(testHeader());
   session->writeFeedback(numberedFeedback(1), nullptr);
   EXPECT_THAT(available(*storage), ElementsAre());
@@ -98,7 +115,7 @@ TEST_F(ZelkorPersistentStorageTest, LeadsAContainerFromWritingToDeletion) {
 
 TEST_F(ZelkorPersistentStorageTest, WritesEverythingBeforeItEnds) {
   auto storage = start();
-  auto session = storage->createFileContainerForWriting();
+  auto session = storage->createFileContainerForWriting(SessionKind::Managed);
   session->writeSessionHeader(testHeader());
   session->writeFeedback(numberedFeedback(1), nullptr);
   session->writeFeedback(numberedFeedback(2), nullptr);
@@ -143,6 +160,67 @@ TEST_F(ZelkorPersistentStorageTest, LeavesDamageAsItIs) {
   EXPECT_EQ(available(*storage).size(), 2u);
 }
 
+TEST_F(ZelkorPersistentStorageTest, WhatEndedFirstGoesWhenThereAreTooManyFiles) {
+  const auto storage = start();
+  const auto open = storage->createFileContainerForWriting(SessionKind::Managed);
+  for (int i = 1; i <= 600; ++i) record(*storage, SessionKind::Managed);
+  EXPECT_EQ(fakes_.counters.value(kGone), 0);
+  for (int i = 601; i <= 2000; ++i) record(*storage, SessionKind::OneOff);
+  const auto kept = available(*storage);
+  // One-off sessions keep to their part; beyond it the first of theirs went, not others.
+  EXPECT_EQ(kept.size(), 1023u);
+  EXPECT_EQ(kept.front(), "/caches/session.90");
+  EXPECT_EQ(kept.back(), "/caches/session.2000");
+  EXPECT_EQ(fakes_.files.paths().size(), 1024u);
+  EXPECT_TRUE(fakes_.files.bytes("/caches/session.0"));  // is still open
+  EXPECT_EQ(fakes_.counters.value(kGone), 2001 - 1024);
+  EXPECT_EQ(fakes_.log.count("limit containers reached by one-off sessions"), 1);
+  EXPECT_EQ(fakes_.counters.value("com.quenta.zelkord.limit.containers_full"), 0);
+}
+
+TEST_F(ZelkorPersistentStorageTest, WhatEndedFirstGoesWhenThereAreTooManyBytes) {
+  const auto storage = start();
+  const std::string large(1'000'000, 'x');
+  for (int i = 0; i < 5; ++i) record(*storage, SessionKind::Managed, large);
+  for (int i = 0; i < 300; ++i) record(*storage, SessionKind::OneOff, large);
+  EXPECT_EQ(available(*storage).size(), 5u + 67);
+  for (int i = 0; i < 300; ++i) record(*storage, SessionKind::Managed, large);
+  EXPECT_EQ(available(*storage).size(), 268u);
+  EXPECT_EQ(available(*storage).back(), "/caches/session.604");
+  EXPECT_LE(bytesOnDisk(), std::uint64_t{256} << 20);
+  EXPECT_EQ(fakes_.counters.value(kGone), 605 - 268);
+}
+
+TEST_F(ZelkorPersistentStorageTest, RefusesWhatOpenContainersLeaveNoPlaceFor) {
+  const auto storage = start();
+  std::vector<std::shared_ptr<SessionContainer>> open;
+  for (int i = 0; i < 1024; ++i) {
+    open.push_back(storage->createFileContainerForWriting(SessionKind::Managed));
+  }
+  EXPECT_EQ(url(storage->createFileContainerForWriting(SessionKind::Managed)), "none");
+  EXPECT_EQ(url(storage->createFileContainerForWriting(SessionKind::OneOff)), "none");
+  EXPECT_EQ(fakes_.counters.value("com.quenta.zelkord.limit.containers_full"), 2);
+  EXPECT_EQ(fakes_.files.paths().size(), 1024u);
+  open.pop_back();  // nobody completed its session
+  EXPECT_EQ(url(storage->createFileContainerForWriting(SessionKind::Managed)),
+            "/caches/session.1024");
+}
+
+TEST_F(ZelkorPersistentStorageTest, TheOldestThatAnEarlierProcessLeftGoAtTheStart) {
+  const auto now = fakes_.timeline.wallNow();
+  for (int i = 0; i < 1500; ++i) {
+    const auto path = "/caches/session." + std::to_string(i);
+    fakes_.files.put(path, "x");
+    fakes_.files.setCreated(path, now - (i < 476 ? 1h : 2h));
+  }
+  const auto kept = available(*start());
+  ASSERT_EQ(kept.size(), 1024u);
+  EXPECT_EQ(kept.front(), "/caches/session.952");
+  EXPECT_EQ(kept.back(), "/caches/session.475");
+  EXPECT_EQ(fakes_.files.paths().size(), 1024u);
+  EXPECT_EQ(fakes_.counters.value(kGone), 476);
+}
+
 TEST_F(ZelkorPersistentStorageTest, DeletesWhatIsTooOld) {
   const auto now = fakes_.timeline.wallNow();
   const auto keptAt = [&](WallTime clock) {
@@ -175,7 +253,7 @@ TEST_F(ZelkorPersistentStorageTest, LivesWithACachesDirectoryThatFails) {
     fakes_.log.clear();
     fakes_.files.fail(test.operation, EACCES);
     const auto storage = start();
-    const auto container = storage->createFileContainerForWriting();
+    const auto container = storage->createFileContainerForWriting(SessionKind::Managed);
     EXPECT_EQ(container == nullptr, test.operation != Operation::List);
     EXPECT_EQ(fakes_.files.paths().size(), container ? 1u : 0u);
     EXPECT_TRUE(fakes_.log.contains(test.text));
