@@ -88,13 +88,13 @@ TEST_F(LinuxCountersTest, AStoreOfAnEarlierVersionIsCutDown) {
   auto database = sqlite::Database::open(path, nullptr);
   ASSERT_TRUE(database);
   ASSERT_FALSE(database->execute(
-      "WITH RECURSIVE n(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM n WHERE i < 6000)"
+      "WITH RECURSIVE n(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM n WHERE i < 12000)"
       "INSERT INTO counters SELECT i || iif(i % 2, printf('%500c', 'x'), ''), 1 FROM n"));
-  EXPECT_GT(root_.read("counters.db").size(), 1'500'000u);
+  EXPECT_GT(root_.read("counters.db").size(), 3'000'000u);
   database.reset();
   const auto all = make()->all();
   EXPECT_EQ(all.size(), 4096u);
-  EXPECT_EQ(all.at("com.quenta.zelkord.other"), 6000 + 1 - 4095);
+  EXPECT_EQ(all.at("com.quenta.zelkord.other"), 12'000 + 1 - 4095);
   EXPECT_LT(root_.read("counters.db").size(), 500'000u);
   EXPECT_EQ(log_.count("cut down to 4096"), 1);
   EXPECT_EQ(make()->all(), all);
