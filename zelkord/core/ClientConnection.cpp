@@ -19,7 +19,9 @@ ClientConnection::ClientConnection(Assembly& assembly, std::shared_ptr<ipc::Conn
       otherCalls_(std::move(otherCalls)),
       reports_(assembly),
       bagTeller_(std::make_shared<BagTeller>(assembly, connection_)),
-      transaction_(assembly.platform().transactions.open("clientConnection")) {}
+      transaction_(assembly.platform().transactions.open("clientConnection")),
+      waitingQueue_(
+          assembly.platform().queues.makeSerialQueue("com.quenta.zelkord.connection.waiting")) {}
 
 ClientConnection::~ClientConnection() = default;
 
@@ -35,12 +37,38 @@ void ClientConnection::start() {
 }
 
 void ClientConnection::invalidated() {
+  ended_ = true;
   timer_->cancel();
   bagTeller_->end();
 }
 
 void ClientConnection::handle(ipc::Call call) {
   timer_->rearm();
+  if (_mayHaveToWait(call)) {
+    _handleLater(std::move(call));
+  } else {
+    _dispatchCall(std::move(call));
+  }
+}
+
+bool ClientConnection::_mayHaveToWait(const ipc::Call& call) const {
+  const bool isDaemonCall = call.interface == kDaemonInterface;
+  if (isDaemonCall && call.member == "Configure") return false;
+  if (waitingCalls_ > 0) return true;
+  if (!isDaemonCall || (call.member != "Bag" && call.member != "Request")) return false;
+  const auto state = state_.get();
+  return state && !state->currentBag();
+}
+
+void ClientConnection::_handleLater(ipc::Call call) {
+  ++waitingCalls_;
+  waitingQueue_->async([self = shared_from_this(), call = std::move(call)]() mutable {
+    if (!self->ended_) self->_dispatchCall(std::move(call));
+    --self->waitingCalls_;
+  });
+}
+
+void ClientConnection::_dispatchCall(ipc::Call call) {
   if (call.interface == kDaemonInterface) {
     _handleDaemonCall(call);
   } else if (otherCalls_) {
@@ -105,6 +133,7 @@ void ClientConnection::_refuseConfiguration() {
 }
 
 void ClientConnection::_ensureState() {
+  const MutexLock lock(bindingMutex_);
   const auto& log = assembly_.log(Category::Session);
   const auto configuration = configuration_.get();
   if (!configuration) return log.fault("configuration must not be nil");

@@ -6,9 +6,11 @@
 #include <string>
 
 #include "base/Guarded.h"
+#include "base/Mutex.h"
 #include "corezelkor/Messages.h"
 #include "platform/api/Interprocess.h"
 #include "platform/api/ProcessTransactions.h"
+#include "platform/api/WorkQueues.h"
 #include "zelkord/ZelkorLogging/Tracing.h"
 #include "zelkord/core/BagTeller.h"
 #include "zelkord/core/FeedbackReports.h"
@@ -28,8 +30,10 @@ class ClientStateManager;
 // its life. It ends when the client goes away, when it is silent for too long, or after an invalid
 // first configuration. While it lives it holds a transaction.
 //
-// Threading: calls arrive one at a time on the connection's queue; `currentQueryId`, the
-// configuration and the state are read from others too. Ownership: the transport owns it through
+// Threading: calls arrive one at a time on the connection's queue. One that may have to wait for a
+// bag does so on a queue of its own, and what comes meanwhile waits behind it there, in order; only
+// `Configure` goes ahead. `currentQueryId`, the configuration and the state are read from others
+// too. Ownership: the transport owns it through
 // the connection; calls under way hold it. Errors: wrong arguments are answered with a D-Bus error;
 // of an unbound connection queries are dropped.
 class ClientConnection final : public ipc::CallHandler,
@@ -75,6 +79,10 @@ class ClientConnection final : public ipc::CallHandler,
   void feedback(const std::shared_ptr<ipc::Reply>& reply);
   void listSessions(const std::shared_ptr<ipc::Reply>& reply);
 
+  // Whether the call stands behind one that waits for a bag, or may wait for one itself.
+  bool _mayHaveToWait(const ipc::Call& call) const;
+  void _handleLater(ipc::Call call);
+  void _dispatchCall(ipc::Call call);
   void _handleConfigure(const ipc::Call& call);
   void _handleRequest(const ipc::Call& call);
   void _handleReportEvent(const ipc::Call& call);
@@ -106,9 +114,13 @@ class ClientConnection final : public ipc::CallHandler,
   const FeedbackReports reports_;
   const std::shared_ptr<BagTeller> bagTeller_;
   const Transaction transaction_;
+  const std::unique_ptr<SerialQueue> waitingQueue_;
   std::shared_ptr<IdleTimer> timer_;
 
   // Own synchronisation.
+  std::atomic<unsigned> waitingCalls_ = 0;  // on the waiting queue
+  std::atomic<bool> ended_ = false;
+  Mutex bindingMutex_;  // held while the state is bound and the user agent made
   std::atomic<std::int64_t> currentQueryId_ = 0;
   Guarded<std::optional<ZLKSessionConfiguration>> configuration_;
   Guarded<std::shared_ptr<ClientState>> state_;

@@ -1,6 +1,8 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
+
 #include "corezelkor/Constants.h"
 #include "zelkord/core/ClientConnection.h"
 #include "zelkord/core/ClientStateManager.h"
@@ -35,6 +37,56 @@ TEST_F(ClientConnectionTest, ConfigureAnswersBeforeTheBagDoes) {
   EXPECT_EQ(client->callbacks()[0].member, "BagDidLoad");
   EXPECT_TRUE(client->callbacks()[0].values[0].get<ipc::Dictionary>()->empty());
   EXPECT_FALSE(client->callbacks()[0].values[1].get<ipc::Dictionary>()->empty());
+}
+
+TEST_F(ClientConnectionTest, ConfigureGoesAheadOfWhatWaitsForABagAndNothingElseDoes) {
+  const auto client = bed_.connectAndConfigure();
+  bed_.fakes.timeline.advance(2s);  // the bag that was to be told
+  const auto call = [&](const std::string& member, ipc::Values values) {
+    return client->call(std::string(kDaemonInterface), member, std::move(values));
+  };
+  const auto search = [&](std::int64_t queryId) {
+    return call("Request", {"search", ipc::Dictionary{{"queryId", queryId}, {"queryString", "s"}}});
+  };
+  auto& timeline = bed_.fakes.timeline;
+  const auto begin = timeline.now();
+  const auto bag = call("Bag", {});
+  const auto first = search(1);
+  const auto second = search(2);
+  const auto sessions = call("ListSessions", {});
+  const auto configure =
+      call("Configure", {ipc::Dictionary{{"identifier", "lanthe"}, {"userAgent", "Lanthe/10"}}});
+  ASSERT_TRUE(timeline.runUntil([&] { return configure->answered; }, 100ms));
+  EXPECT_EQ(timeline.now(), begin);
+  EXPECT_FALSE(bag->answered);
+  std::vector<std::string> order;
+  while (order.size() < 4 && timeline.now() - begin < 10s) {
+    timeline.advance(1ms);
+    const std::pair<const char*, DaemonBed::Answer> all[] = {
+        {"bag", bag}, {"first", first}, {"second", second}, {"sessions", sessions}};
+    for (const auto& [name, answer] : all) {
+      if (answer->answered && std::ranges::find(order, name) == order.end()) order.push_back(name);
+    }
+  }
+  EXPECT_THAT(order, testing::ElementsAre("bag", "first", "second", "sessions"));
+  // Nothing waits any more: calls are handled as they come.
+  EXPECT_TRUE(bed_.call(client, "ListSessions")->answered);
+}
+
+TEST_F(ClientConnectionTest, WhatWaitsIsDroppedWhenTheClientGoes) {
+  const auto client = bed_.connectAndConfigure();
+  bed_.fakes.timeline.advance(2s);
+  for (std::int64_t queryId = 1; queryId <= 20; ++queryId) {
+    client->call(std::string(kDaemonInterface), "Request",
+                 {"search", ipc::Dictionary{{"queryId", queryId}, {"queryString", "s"}}});
+  }
+  const auto departure = bed_.fakes.timeline.global(QualityOfService::Default).after(100ms, [&] {
+    client->disconnect();
+  });
+  bed_.fakes.timeline.advance(2s);
+  EXPECT_EQ(bed_.fakes.counters.all()["com.quenta.zelkord.lanthe.keystrokes"], 1);
+  EXPECT_THAT(bed_.fakes.transactions.openNames(),
+              testing::Not(testing::Contains("clientConnection")));
 }
 
 TEST_F(ClientConnectionTest, TellsEachBagOnceHoweverOftenItIsConfigured) {
