@@ -134,12 +134,13 @@ void ClientStateManager::processImagesFromResponse(const json::value& response, 
   if (auto* images = assembly_.responseImages()) images->processImagesFromResponse(response, bag);
 }
 
-void ClientStateManager::loadImages(const std::vector<ImageDescriptor>& descriptors,
-                                    SteadyTime deadline,
-                                    const std::function<void(LoadedImages)>& completion,
-                                    std::shared_ptr<ImageWait> wait) {
-  auto* images = assembly_.responseImages();
-  images ? images->loadImages(descriptors, deadline, completion, std::move(wait)) : completion({});
+std::shared_ptr<ImageCall> ClientStateManager::loadImages(ImageOrder order,
+                                                          ImageCall::Completion completion) {
+  if (auto* images = assembly_.responseImages()) {
+    return images->loadImages(std::move(order), std::move(completion));
+  }
+  completion({});
+  return nullptr;
 }
 
 void ClientStateManager::request(const std::shared_ptr<ZLKRequest>& request,

@@ -55,9 +55,7 @@ class ClientStateManager final : public std::enable_shared_from_this<ClientState
 
   // As ResponseImages.
   void processImagesFromResponse(const json::value& response, const ZLKBag* bag);
-  void loadImages(const std::vector<ImageDescriptor>& descriptors, SteadyTime deadline,
-                  const std::function<void(LoadedImages)>& completion,
-                  std::shared_ptr<ImageWait> wait = nullptr);
+  std::shared_ptr<ImageCall> loadImages(ImageOrder order, ImageCall::Completion completion);
 
  private:
   using States = std::map<std::string, std::shared_ptr<ClientState>>;

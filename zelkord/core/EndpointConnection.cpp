@@ -19,23 +19,32 @@ Duration durationOfMilliseconds(std::uint64_t count) {
 }  // namespace
 
 EndpointConnection::EndpointConnection(Assembly& assembly,
-                                       std::weak_ptr<ClientStateManager> manager)
+                                       std::weak_ptr<ClientStateManager> manager,
+                                       std::shared_ptr<Budget> imageCalls)
     : assembly_(assembly),
       manager_(std::move(manager)),
+      imageCalls_(std::move(imageCalls)),
       imagesQueue_(
           assembly.platform().queues.makeSerialQueue("com.quenta.zelkord.endpoint.images")) {}
 
-void EndpointConnection::start(const std::weak_ptr<ipc::Connection>& connection) {
-  timer_ = IdleTimer::make(assembly_.platform().queues, [connection] {
-    if (const auto open = connection.lock()) open->invalidate();
+void EndpointConnection::start(const std::shared_ptr<ipc::Connection>& connection) {
+  holder_ = processHolder(connection->peer().pid);
+  timer_ = IdleTimer::make(assembly_.platform().queues, [weak = std::weak_ptr(connection)] {
+    if (const auto open = weak.lock()) open->invalidate();
   });
 }
 
 void EndpointConnection::invalidated() {
   timer_->cancel();
-  const MutexLock lock(mutex_);
-  ended_ = true;
-  if (wait_) wait_->giveUp();
+  std::vector<std::weak_ptr<ImageCall>> calls;
+  {
+    const MutexLock lock(mutex_);
+    ended_ = true;
+    calls = std::move(calls_);
+  }
+  for (const auto& call : calls) {
+    if (const auto underWay = call.lock()) underWay->giveUp();
+  }
 }
 
 void EndpointConnection::handle(ipc::Call call) {
@@ -72,30 +81,45 @@ void EndpointConnection::_loadImages(const ipc::Call& call) {
     assembly_.log(Category::Connection).error("endpoint {} refused: {}", call.member, fault->text);
     return call.reply->fail(fault->errorName, fault->text);
   }
+  auto share = imageCalls_->take(holder_);
+  if (!share) return call.reply->fail(ipc::kLimitsExceeded, "too many calls for images");
   const auto timeout = durationOfMilliseconds(*call.arguments.at(1).get<std::uint64_t>());
-  imagesQueue_->async([self = shared_from_this(), reply = call.reply, mark = timer_->callBegan(),
-                       images = std::get<std::vector<ImageDescriptor>>(std::move(descriptors)),
-                       deadline = deadlineAfter(received, timeout)] {
-    self->_answerImages(images, deadline, *reply);
+  imagesQueue_->async([self = shared_from_this(), answer = _imageAnswer(call, *std::move(share)),
+                       order = ImageOrder{.descriptors = std::get<std::vector<ImageDescriptor>>(
+                                              std::move(descriptors)),
+                                          .deadline = deadlineAfter(received, timeout),
+                                          .holder = holder_}]() mutable {
+    self->_beginImages(std::move(order), std::move(answer));
   });
 }
 
-void EndpointConnection::_answerImages(const std::vector<ImageDescriptor>& descriptors,
-                                       SteadyTime deadline, ipc::Reply& reply) {
-  const auto manager = manager_.lock();
-  auto wait = _nextWait();
-  if (!manager || !wait) return;
-  manager->loadImages(
-      descriptors, deadline,
-      [&reply](LoadedImages images) { reply.send({encodeImages(std::move(images))}); },
-      std::move(wait));
+ImageCall::Completion EndpointConnection::_imageAnswer(const ipc::Call& call, Budget::Share share) {
+  return [reply = call.reply, mark = timer_->callBegan(),
+          held = std::make_shared<Budget::Share>(std::move(share))](LoadedImages images) {
+    reply->send({encodeImages(std::move(images))});
+  };
 }
 
-std::shared_ptr<ImageWait> EndpointConnection::_nextWait() {
+void EndpointConnection::_beginImages(ImageOrder order, ImageCall::Completion completion) {
+  const auto manager = manager_.lock();
+  if (!manager) return;
+  const auto call = manager->loadImages(std::move(order), std::move(completion));
+  if (!call) return;
+  if (_remember(call)) return _askForImages(call);
+  call->giveUp();
+}
+
+void EndpointConnection::_askForImages(const std::shared_ptr<ImageCall>& call) {
+  if (!call->ask()) return;
+  imagesQueue_->async([self = shared_from_this(), call] { self->_askForImages(call); });
+}
+
+bool EndpointConnection::_remember(const std::shared_ptr<ImageCall>& call) {
   const MutexLock lock(mutex_);
-  if (ended_) return nullptr;
-  wait_ = std::make_shared<ImageWait>(assembly_.platform().queues);
-  return wait_;
+  if (ended_) return false;
+  std::erase_if(calls_, [](const auto& other) { return other.expired(); });
+  calls_.push_back(call);
+  return true;
 }
 
 }  // namespace zelkord

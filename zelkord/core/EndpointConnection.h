@@ -1,14 +1,15 @@
 #pragma once
 
 #include <memory>
+#include <string>
 #include <vector>
 
 #include "base/Mutex.h"
+#include "platform/api/Budget.h"
 #include "platform/api/Interprocess.h"
 #include "platform/api/WorkQueues.h"
 #include "zelkord/core/IdleTimer.h"
-#include "zelkord/query/ImageWait.h"
-#include "zelkord/query/ImageWalk.h"
+#include "zelkord/query/ImageCall.h"
 
 namespace zelkord {
 
@@ -18,34 +19,40 @@ class ClientStateManager;
 // One connection to the endpoint: decodes calls for the client state manager. Ends after 180 to 240
 // seconds without a message or a call under way.
 //
-// Threading: on the connection's queue. Images, which may take until their deadline, are loaded on
-// a queue of their own, one call at a time. The connection's end drops the calls that wait for
-// their turn, and gives up the one that waits for its images.
+// Threading: on the connection's queue. Calls for images ask on a queue of their own, a few images
+// each in turn, so that none waits for another one. The connection's end gives all of them up.
+// Errors: wrong arguments are answered with a D-Bus error, a call for images beyond the client
+// process's share with LimitsExceeded.
 class EndpointConnection final : public ipc::CallHandler,
                                  public std::enable_shared_from_this<EndpointConnection> {
  public:
-  EndpointConnection(Assembly& assembly, std::weak_ptr<ClientStateManager> manager);
+  // `imageCalls`: how many calls for images may be under way.
+  EndpointConnection(Assembly& assembly, std::weak_ptr<ClientStateManager> manager,
+                     std::shared_ptr<Budget> imageCalls);
 
-  void start(const std::weak_ptr<ipc::Connection>& connection);
+  void start(const std::shared_ptr<ipc::Connection>& connection);
   void invalidated();
   void handle(ipc::Call call) override;
 
  private:
   void _request(const ipc::Call& call);
   void _loadImages(const ipc::Call& call);
-  void _answerImages(const std::vector<ImageDescriptor>& descriptors, SteadyTime deadline,
-                     ipc::Reply& reply);
-  // What the next call waits on; null after the end.
-  std::shared_ptr<ImageWait> _nextWait();
+  ImageCall::Completion _imageAnswer(const ipc::Call& call, Budget::Share share);
+  void _beginImages(ImageOrder order, ImageCall::Completion completion);
+  void _askForImages(const std::shared_ptr<ImageCall>& call);
+  // False after the end.
+  bool _remember(const std::shared_ptr<ImageCall>& call);
 
   Assembly& assembly_;
   const std::weak_ptr<ClientStateManager> manager_;
+  const std::shared_ptr<Budget> imageCalls_;
   const std::unique_ptr<SerialQueue> imagesQueue_;
   std::shared_ptr<IdleTimer> timer_;
+  std::string holder_;  // of budgets: the client process
 
   Mutex mutex_;
   bool ended_ ZK_GUARDED_BY(mutex_) = false;
-  std::shared_ptr<ImageWait> wait_ ZK_GUARDED_BY(mutex_);  // of the newest call
+  std::vector<std::weak_ptr<ImageCall>> calls_ ZK_GUARDED_BY(mutex_);
 };
 
 }  // namespace zelkord

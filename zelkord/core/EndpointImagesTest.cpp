@@ -72,24 +72,52 @@ TEST_F(EndpointImagesTest, RefusesWhatBreaksItsRules) {
   EXPECT_TRUE(bed_.fakes.log.contains("endpoint LoadImages refused: more than 1000 descriptors"));
 }
 
-TEST_F(EndpointImagesTest, CountsTheTimeFromReceiptAndHoldsUpNobody) {
+TEST_F(EndpointImagesTest, EachCallCountsItsOwnTimeFromReceipt) {
   const auto client = connect();
   const auto other = connect();
   auto& timeline = bed_.fakes.timeline;
-  const auto begin = timeline.now();
-  const auto first = ask(client, {image("slow")}, 300);
-  const auto second = ask(client, {image("slower")}, 400);
-  const auto elsewhere = ask(other, {}, 300);
-  const auto query = client->call(std::string(kEndpointInterface), "Request",
-                                  {"card", ipc::Dictionary{}, ipc::Dictionary{}});
-  std::vector<bool> early;
-  const auto look = timeline.global(QualityOfService::Default).after(299ms, [&] {
-    for (const auto& answer : {elsewhere, query, first}) early.push_back(answer->answered);
-  });
-  ASSERT_TRUE(timeline.runUntil([&] { return second->answered; }));
-  EXPECT_EQ(timeline.now() - begin, 400ms);
-  EXPECT_THAT(early, testing::ElementsAre(true, true, false));
-  EXPECT_TRUE(first->succeeded());
+  ask(client, {image("kept")}, 100);
+  bed_.run();
+  bed_.urlSession().pending().at(0)->succeed(200, "bytes");
+  bed_.run();
+  const std::vector<std::vector<std::uint64_t>> orders = {{300, 3000}, {3000, 300}};
+  for (const auto& order : orders) {
+    SCOPED_TRACE(order.front());
+    const auto begin = timeline.now();
+    const auto slow = ask(client, {image("slow")}, order.front());
+    const auto second = ask(client, {image("slower"), image("kept")}, order.back());
+    const auto kept = ask(client, {image("kept")}, 300);
+    const auto elsewhere = ask(other, {}, 300);
+    const auto query = client->call(std::string(kEndpointInterface), "Request",
+                                    {"card", ipc::Dictionary{}, ipc::Dictionary{}});
+    bed_.run();
+    for (const auto& answer : {kept, elsewhere, query}) EXPECT_TRUE(answer->answered);
+    EXPECT_THAT(keysIn(*kept), testing::ElementsAre("https://s.example/kept"));
+    const auto& shorter = order.front() < order.back() ? slow : second;
+    const auto& longer = order.front() < order.back() ? second : slow;
+    ASSERT_TRUE(timeline.runUntil([&] { return shorter->answered; }));
+    EXPECT_EQ(timeline.now() - begin, 300ms);
+    ASSERT_TRUE(timeline.runUntil([&] { return longer->answered; }));
+    EXPECT_EQ(timeline.now() - begin, 3s);
+    EXPECT_THAT(keysIn(*second), testing::ElementsAre("https://s.example/kept"));
+  }
+}
+
+TEST_F(EndpointImagesTest, RefusesWhatAProcessAsksBeyondItsShare) {
+  const auto client = connect();
+  std::vector<DaemonBed::Answer> waiting;
+  for (int i = 0; i < 256; ++i) waiting.push_back(ask(client, {image("slow")}, 60'000));
+  const auto refused = ask(client, {image("slow")}, 60'000);
+  bed_.run();
+  EXPECT_EQ(refused->errorName, ipc::kLimitsExceeded);
+  EXPECT_EQ(bed_.fakes.counters.all()["com.quenta.zelkord.limit.image_calls"], 1);
+  EXPECT_EQ(downloads(), 1u);
+  bed_.urlSession().pending().at(0)->succeed(200, "bytes");
+  bed_.run();
+  for (const auto& answer : waiting) ASSERT_TRUE(answer->succeeded());
+  const auto next = ask(client, {image("slow")}, 60'000);
+  bed_.run();
+  EXPECT_TRUE(next->succeeded());
 }
 
 TEST_F(EndpointImagesTest, EndsWithTheLastImageHoweverLongItMayWait) {
@@ -111,18 +139,26 @@ TEST_F(EndpointImagesTest, EndsWithTheLastImageHoweverLongItMayWait) {
   }
 }
 
-TEST_F(EndpointImagesTest, DropsWhatWaitsWhenTheClientGoes) {
+TEST_F(EndpointImagesTest, GivesTheCallsUpWhenTheClientGoes) {
   const auto client = connect();
-  auto& timeline = bed_.fakes.timeline;
-  const auto begin = timeline.now();
-  ask(client, {image("a")}, 400'000);
+  std::vector<ipc::Dictionary> many;
+  for (int i = 0; i < 1000; ++i) many.push_back(image(std::to_string(i)));
+  ask(client, many, 400'000);
   ask(client, {image("b")}, 400'000);
-  const auto departure =
-      timeline.global(QualityOfService::Default).after(100ms, [&] { client->disconnect(); });
-  timeline.advance(10s);
-  EXPECT_EQ(downloads(), 1u);
-  // The wait for the first one is over too.
-  EXPECT_EQ(timeline.now() - begin, 10s);
+  bed_.run();
+  const auto begun = downloads();
+  client->disconnect();
+  // What is under way has its time-out to end; nothing begins after it.
+  bed_.fakes.timeline.advance(30s);
+  EXPECT_TRUE(bed_.urlSession().pending().empty());
+  EXPECT_EQ(downloads(), begun);
+  EXPECT_THAT(bed_.fakes.transactions.openNames(), testing::Not(testing::Contains("imageFetch")));
+  const auto next = connect();
+  const auto answer = ask(next, {image("c")}, 1000);
+  bed_.run();
+  bed_.urlSession().pending().at(0)->succeed(200, "bytes");
+  bed_.run();
+  EXPECT_TRUE(answer->succeeded());
 }
 
 TEST(EncodedImagesTest, AreAsManyAsFitIntoOneArray) {

@@ -7,13 +7,16 @@ namespace zelkord {
 namespace {
 
 constexpr std::size_t kEndpointPlaces = 10;
+constexpr std::uint64_t kImageCalls = 1024;
 
 }  // namespace
 
 EndpointListener::EndpointListener(Assembly& assembly, std::weak_ptr<ClientStateManager> manager)
     : assembly_(assembly),
       manager_(std::move(manager)),
-      places_(std::make_shared<ConnectionPlaces>(assembly.platform().queues, kEndpointPlaces)) {}
+      places_(std::make_shared<ConnectionPlaces>(assembly.platform().queues, kEndpointPlaces)),
+      imageCalls_(std::make_shared<Budget>("image_calls", Budget::quartered(kImageCalls),
+                                           assembly.limits())) {}
 
 void EndpointListener::admit(const ipc::Peer&,
                              std::function<void(std::optional<Subscription>)> decide) {
@@ -33,7 +36,7 @@ void EndpointListener::admit(const ipc::Peer&,
 }
 
 void EndpointListener::connectionBegan(const std::shared_ptr<ipc::Connection>& connection) {
-  const auto handler = std::make_shared<EndpointConnection>(assembly_, manager_);
+  const auto handler = std::make_shared<EndpointConnection>(assembly_, manager_, imageCalls_);
   handler->start(connection);
   connection->setHandler(handler);
   connection->setInvalidationHandler([handler] { handler->invalidated(); });

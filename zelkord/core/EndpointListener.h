@@ -2,6 +2,7 @@
 
 #include <memory>
 
+#include "platform/api/Budget.h"
 #include "platform/api/Interprocess.h"
 #include "zelkord/core/ConnectionPlaces.h"
 
@@ -24,6 +25,7 @@ class EndpointListener final : public ipc::ListenerDelegate {
   Assembly& assembly_;
   const std::weak_ptr<ClientStateManager> manager_;
   const std::shared_ptr<ConnectionPlaces> places_;
+  const std::shared_ptr<Budget> imageCalls_;
 };
 
 }  // namespace zelkord

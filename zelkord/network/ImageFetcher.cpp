@@ -2,6 +2,7 @@
 
 #include <strings.h>
 
+#include "base/Guarded.h"
 #include "platform/api/RandomUUID.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/assembly/UserAgent.h"
@@ -34,10 +35,9 @@ std::string hostOf(const std::string& url) {
 
 // One download. Whatever becomes of it, its promise is fulfilled at its end.
 struct ImageFetcher::Fetch {
-  Fetch(URLRequest imageRequest, ZLKPromise<Image> imagePromise, Transaction imageTransaction,
-        std::string identifier)
+  Fetch(URLRequest imageRequest, Transaction imageTransaction, std::string identifier)
       : request(std::move(imageRequest)),
-        promise(std::move(imagePromise)),
+        host(hostOf(request.url)),
         transaction(std::move(imageTransaction)),
         uuid(std::move(identifier)) {}
   ~Fetch() { promise.fulfill(std::nullopt); }
@@ -45,29 +45,36 @@ struct ImageFetcher::Fetch {
   Fetch& operator=(const Fetch&) = delete;
 
   const URLRequest request;
+  const std::string host;
   const ZLKPromise<Image> promise;
   const Transaction transaction;
   const std::string uuid;  // of its records
+
+  // On the fetcher's queue.
+  DownloadId id = 0;
+  Budget::Share place;  // while it waits
+  Budget::Share hostPlace;
+
+  Guarded<std::weak_ptr<URLTask>> task;
 };
 
 ImageFetcher::ImageFetcher(Assembly& assembly)
-    : assembly_(assembly), queue_(assembly.platform().queues.makeSerialQueue("ImageFetcher")) {}
+    : assembly_(assembly),
+      queue_(assembly.platform().queues.makeSerialQueue("ImageFetcher")),
+      places_("image_places", Budget::quartered(kMostWaiting), assembly.limits()),
+      hostPlaces_("image_places_of_host", Budget::quartered(kMostWaiting), assembly.limits()) {}
 
-ZLKFuture<ImageFetcher::Image> ImageFetcher::fetchImageData(const std::string& url,
-                                                            Duration timeoutInterval,
-                                                            RedirectRule acceptsRedirect) {
-  if (!schemeBeginsWithHTTP(url)) return ZLKFuture<Image>(std::nullopt);
+ImageFetcher::Ticket ImageFetcher::fetchImageData(const std::string& url, Duration timeoutInterval,
+                                                  RedirectRule acceptsRedirect,
+                                                  const std::string& holder) {
+  if (!schemeBeginsWithHTTP(url)) return {ZLKFuture<Image>(std::nullopt)};
   auto transaction = assembly_.platform().transactions.open("imageFetch");
   auto request = _requestFor(url, timeoutInterval, std::move(acceptsRedirect));
-  if (auto cached = _cachedImage(request)) return ZLKFuture<Image>(std::move(cached));
-  const ZLKPromise<Image> promise;
-  if (const auto pending = _join(url, promise)) {
-    assembly_.log(Category::Images).debug("pending {}", _shown(url));
-    return pending->future();
-  }
-  _enqueue(std::make_shared<Fetch>(std::move(request), promise, std::move(transaction),
-                                   randomUUID(assembly_.platform().random).string()));
-  return promise.future();
+  if (auto cached = _cachedImage(request)) return {ZLKFuture<Image>(std::move(cached))};
+  if (auto pending = _join(url)) return *std::move(pending);
+  return _enqueue(std::make_shared<Fetch>(std::move(request), std::move(transaction),
+                                          randomUUID(assembly_.platform().random).string()),
+                  holder);
 }
 
 bool ImageFetcher::_isRouted() const {
@@ -90,34 +97,62 @@ ImageFetcher::Image ImageFetcher::_cachedImage(const URLRequest& request) {
   return std::move(cached->data);
 }
 
-std::optional<ZLKPromise<ImageFetcher::Image>> ImageFetcher::_join(
-    const std::string& url, const ZLKPromise<Image>& promise) {
-  std::optional<ZLKPromise<Image>> pending;
+std::optional<ImageFetcher::Ticket> ImageFetcher::_join(const std::string& url) {
+  std::optional<Ticket> ticket;
   queue_->sync([&] {
     queue_->assertCurrent();
-    const auto [place, isNew] = pendingRequests_.try_emplace(url, promise);
-    if (!isNew) pending = place->second;
+    const auto found = byURL_.find(url);
+    if (found == byURL_.end()) return;
+    auto& pending = pendingRequests_.at(found->second);
+    ++pending.wanted;
+    pending.end.reset();
+    line_.want(found->second);
+    ticket = Ticket{pending.fetch->promise.future(), found->second};
   });
-  return pending;
+  if (ticket) assembly_.log(Category::Images).debug("pending {}", _shown(url));
+  return ticket;
 }
 
-void ImageFetcher::_enqueue(const std::shared_ptr<Fetch>& fetch) {
-  const auto& url = fetch->request.url;
-  bool isTaken = false;
-  std::vector<DownloadLine::Begin> due;
+ImageFetcher::Ticket ImageFetcher::_enqueue(const std::shared_ptr<Fetch>& fetch,
+                                            const std::string& holder) {
+  auto place = places_.take(holder);
+  auto hostPlace = place ? hostPlaces_.take(fetch->host) : std::nullopt;
+  if (!hostPlace) return {ZLKFuture<Image>(std::nullopt)};
+  Begun due;
+  bool isNew = false;
   queue_->sync([&] {
     queue_->assertCurrent();
-    isTaken = line_.add(hostOf(url), [this, fetch] { _begin(fetch); });
-    if (!isTaken) pendingRequests_.erase(url);
-    due = line_.takeDue();
+    isNew = byURL_.try_emplace(fetch->request.url, lastDownload_ + 1).second;
+    if (!isNew) return;  // another thread was faster
+    fetch->id = ++lastDownload_;
+    fetch->place = *std::move(place);
+    fetch->hostPlace = *std::move(hostPlace);
+    pendingRequests_[fetch->id].fetch = fetch;
+    line_.add(fetch->host, fetch->id);
+    due = _takeDue();
   });
-  if (!isTaken) {
-    assembly_.log(Category::Images).error("too many images wait: {}", _shown(url));
+  if (!isNew) {
+    auto joined = _join(fetch->request.url);
+    return joined ? *std::move(joined) : _enqueue(fetch, holder);
   }
-  for (const auto& begin : due) begin();
+  for (const auto& begun : due) _begin(begun);
+  return {fetch->promise.future(), fetch->id};
 }
 
-void ImageFetcher::_begin(std::shared_ptr<Fetch> fetch) {
+ImageFetcher::Begun ImageFetcher::_takeDue() {
+  queue_->assertCurrent();
+  Begun due;
+  for (const auto id : line_.takeDue()) {
+    auto& pending = pendingRequests_.at(id);
+    const auto& fetch = due.emplace_back(pending.fetch);
+    fetch->place.reset();
+    fetch->hostPlace.reset();
+    if (pending.wanted == 0) _limit(pending);
+  }
+  return due;
+}
+
+void ImageFetcher::_begin(const std::shared_ptr<Fetch>& fetch) {
   _record(startNetworkSearch(
       fetch->request,
       {.triggerEvent = kImageTrigger, .endpointType = kImageEndpoint, .uuid = fetch->uuid}));
@@ -129,6 +164,7 @@ void ImageFetcher::_begin(std::shared_ptr<Fetch> fetch) {
   if (fetch->request.routed && !task->enableProxy(nullptr)) {
     assembly_.log(Category::Images).error("Enabling Morvane for #image request failed.");
   }
+  fetch->task.set(task);
   task->resume();
 }
 
@@ -139,16 +175,69 @@ void ImageFetcher::_finish(Fetch& fetch, const URLTask& task, const URLResult& r
   const auto connections = task.timingData().protocol == kSharedProtocol
                                ? DownloadLine::Connections::Shared
                                : DownloadLine::Connections::OneEach;
-  queue_->async([weak = weak_from_this(), url = fetch.request.url, connections] {
-    if (const auto self = weak.lock()) self->_leave(url, connections);
+  const bool hasFailed = result.error.has_value();
+  queue_->async([weak = weak_from_this(), download = fetch.id, connections, hasFailed] {
+    if (const auto self = weak.lock()) self->_leave(download, connections, hasFailed);
   });
 }
 
-void ImageFetcher::_leave(const std::string& url, DownloadLine::Connections connections) {
+void ImageFetcher::_leave(DownloadId download, DownloadLine::Connections connections,
+                          bool hasFailed) {
   queue_->assertCurrent();
-  pendingRequests_.erase(url);
-  line_.ended(hostOf(url), connections);
-  for (const auto& begin : line_.takeDue()) begin();
+  const auto host = pendingRequests_.at(download).fetch->host;
+  line_.ended(host, connections);
+  _forget(download);
+  if (hasFailed) {
+    for (const auto dropped : line_.dropAbandoned(host)) _drop(dropped);
+  }
+  for (const auto& begun : _takeDue()) _begin(begun);
+}
+
+void ImageFetcher::release(std::vector<DownloadId> downloads) {
+  if (downloads.empty()) return;
+  queue_->async([weak = weak_from_this(), downloads = std::move(downloads)] {
+    const auto self = weak.lock();
+    if (!self) return;
+    for (const auto download : downloads) self->_release(download);
+  });
+}
+
+void ImageFetcher::_release(DownloadId download) {
+  queue_->assertCurrent();
+  const auto found = pendingRequests_.find(download);
+  if (found == pendingRequests_.end()) return;
+  auto& pending = found->second;
+  if (pending.wanted == 0 || --pending.wanted > 0) return;
+  if (!line_.isWaiting(download)) return _limit(pending);
+  for (const auto dropped : line_.abandon(download)) _drop(dropped);
+}
+
+void ImageFetcher::_limit(Pending& pending) {
+  queue_->assertCurrent();
+  pending.end = queue_->after(
+      pending.fetch->request.timeout,
+      [weak = std::weak_ptr(pending.fetch)] {
+        const auto abandoned = weak.lock();
+        const auto task = abandoned ? abandoned->task.get().lock() : nullptr;
+        if (task) task->cancel();
+      },
+      TimeBase::Real);
+}
+
+// Who reacts to its end does so elsewhere, and may ask for the next image.
+void ImageFetcher::_drop(DownloadId download) {
+  queue_->assertCurrent();
+  assembly_.platform()
+      .queues.global(QualityOfService::Default)
+      .async([dropped = pendingRequests_.at(download).fetch] {});
+  _forget(download);
+}
+
+void ImageFetcher::_forget(DownloadId download) {
+  queue_->assertCurrent();
+  const auto found = pendingRequests_.find(download);
+  byURL_.erase(found->second.fetch->request.url);
+  pendingRequests_.erase(found);
 }
 
 ImageFetcher::Image ImageFetcher::_imageOf(const Fetch& fetch, const URLResult& result) {

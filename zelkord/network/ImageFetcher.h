@@ -5,11 +5,13 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <vector>
 
 #include "base/Data.h"
 #include "corezelkor/ZLKFuture.h"
 #include "corezelkor/ZLKPromise.h"
 #include "halvane/Feedback.h"
+#include "platform/api/Budget.h"
 #include "platform/api/URLSession.h"
 #include "platform/api/WorkQueues.h"
 #include "zelkord/network/DownloadLine.h"
@@ -23,36 +25,64 @@ class Assembly;
 // the order of a DownloadLine, so that no number of images takes all connections, or delays a
 // query.
 //
+// A download waits in the line, is under way, or has ended. Who wanted it and does so no more says
+// so (`release`). What nobody wants gives way to all others while it waits, and once under way has
+// the request's time-out to end; a host that fails it gets no more of them.
+//
 // Threading: any thread; a fetch may block for the URL cache's files, never for the network.
 // Ownership: owned by the assembly. A download holds it weakly.
 // Errors: an image that cannot be had is none; logged, transport and file errors are also recorded
-// as feedback. One for which the line is too long is none at once.
+// as feedback. One for which there is no place in the line, for its host or for who asks, is none
+// at once; the budgets tell.
 class ImageFetcher final : public std::enable_shared_from_this<ImageFetcher> {
  public:
   // The bytes, mapped; none when the fetch failed.
   using Image = std::optional<Data>;
   using RedirectRule = std::function<bool(const std::string& url)>;
+  using DownloadId = DownloadLine::Id;
+  struct Ticket {
+    ZLKFuture<Image> image;
+    DownloadId download = 0;  // 0: there is none to release
+  };
+
+  static constexpr std::uint64_t kMostWaiting = 10'000;
 
   explicit ImageFetcher(Assembly& assembly);
 
   // None at once for a URL whose scheme does not begin with "http". The future is always fulfilled;
   // the time-out is that of a URLRequest, from the download's beginning. `acceptsRedirect` is asked
-  // as there; of those who share a download the first one's counts.
-  ZLKFuture<Image> fetchImageData(const std::string& url, Duration timeoutInterval,
-                                  RedirectRule acceptsRedirect = {});
+  // as there; of those who share a download the first one's counts. `holder` has the place in the
+  // line.
+  Ticket fetchImageData(const std::string& url, Duration timeoutInterval,
+                        RedirectRule acceptsRedirect = {}, const std::string& holder = {});
+  // Of each of these one who wanted it does so no more.
+  void release(std::vector<DownloadId> downloads);
 
  private:
   struct Fetch;
+  // Of a download that has not ended.
+  struct Pending {
+    std::shared_ptr<Fetch> fetch;
+    std::size_t wanted = 1;
+    Subscription end;  // of one that is under way and that nobody wants
+  };
+  using Begun = std::vector<std::shared_ptr<Fetch>>;
 
   bool _isRouted() const;
   URLRequest _requestFor(const std::string& url, Duration timeout, RedirectRule accepts) const;
   Image _cachedImage(const URLRequest& request);
-  // The promise of the download that is on its way, else none, and `promise` is it from now on.
-  std::optional<ZLKPromise<Image>> _join(const std::string& url, const ZLKPromise<Image>& promise);
-  void _enqueue(const std::shared_ptr<Fetch>& fetch);
-  void _begin(std::shared_ptr<Fetch> fetch);
+  // The download that is on its way, if there is one, is wanted once more.
+  std::optional<Ticket> _join(const std::string& url);
+  Ticket _enqueue(const std::shared_ptr<Fetch>& fetch, const std::string& holder);
+  Begun _takeDue();
+  void _begin(const std::shared_ptr<Fetch>& fetch);
   void _finish(Fetch& fetch, const URLTask& task, const URLResult& result);
-  void _leave(const std::string& url, DownloadLine::Connections connections);
+  void _leave(DownloadId download, DownloadLine::Connections connections, bool hasFailed);
+  void _release(DownloadId download);
+  // Of one that is under way and that nobody wants.
+  void _limit(Pending& pending);
+  void _drop(DownloadId download);
+  void _forget(DownloadId download);
   Image _imageOf(const Fetch& fetch, const URLResult& result);
   Image _mappedImage(const Fetch& fetch, const URLResult& result);
   void _keep(const Fetch& fetch, const URLResult& result, const Data& bytes);
@@ -63,8 +93,14 @@ class ImageFetcher final : public std::enable_shared_from_this<ImageFetcher> {
   Assembly& assembly_;
   const std::unique_ptr<SerialQueue> queue_;
 
+  // Own synchronisation. Places in the line, by who asks and by the images' host.
+  Budget places_;
+  Budget hostPlaces_;
+
   // Queue state.
-  std::map<std::string, ZLKPromise<Image>> pendingRequests_ ZK_ON(queue_);
+  std::map<DownloadId, Pending> pendingRequests_ ZK_ON(queue_);
+  std::map<std::string, DownloadId> byURL_ ZK_ON(queue_);
+  DownloadId lastDownload_ ZK_ON(queue_) = 0;
   DownloadLine line_ ZK_ON(queue_);
 };
 

@@ -28,8 +28,20 @@ class ImageFetcherTest : public testing::Test {
     assembly_.urlSession();
   }
 
-  ZLKFuture<Image> fetch(const std::string& url = kImageURL) {
-    return assembly_.imageFetcher()->fetchImageData(url, 7s);
+  ZLKFuture<Image> fetch(const std::string& url = kImageURL) { return ask(url).image; }
+  ImageFetcher::Ticket ask(const std::string& url, const std::string& holder = "pid 1") {
+    return assembly_.imageFetcher()->fetchImageData(url, 7s, {}, holder);
+  }
+  void release(std::vector<ImageFetcher::DownloadId> downloads) {
+    assembly_.imageFetcher()->release(std::move(downloads));
+    fakes_.timeline.runUntilIdle();
+  }
+  static std::string numbered(const std::string& host, std::size_t number) {
+    return "https://" + host + "/" + std::to_string(number);
+  }
+  // How often a limit has refused something.
+  std::int64_t refusals(const std::string& limit) {
+    return fakes_.counters.all()["com.quenta.zelkord.limit." + limit];
   }
   FakeURLSession& session() { return *fakes_.urlSessions.find("urlSession"); }
   // Answers the one task that waits.
@@ -228,17 +240,62 @@ TEST_F(ImageFetcherTest, TakesFewConnectionsForManyImages) {
   EXPECT_EQ(session().tasks().size(), 41u);
 }
 
-TEST_F(ImageFetcherTest, GivesNoneAtOnceWhenTooManyWait) {
-  for (std::size_t i = 0; i < DownloadLine::kMostOfOneHost + DownloadLine::kMostWaiting; ++i) {
-    fetch("https://img.example/" + std::to_string(i));
+TEST_F(ImageFetcherTest, NeitherAHostNorWhoAsksTakesAllPlaces) {
+  constexpr auto kQuarter = ImageFetcher::kMostWaiting / 4;
+  for (std::size_t i = 0; i < DownloadLine::kMostOfOneHost + kQuarter; ++i) {
+    EXPECT_FALSE(ask(numbered("stalled.example", i)).image.isFulfilled());
   }
-  const auto refused = fetch();
-  ASSERT_TRUE(refused.isFulfilled());
-  EXPECT_EQ(refused.get(), std::nullopt);
-  EXPECT_TRUE(fakes_.log.contains("too many images wait: https://img.example/a.png?<private>"));
+  EXPECT_EQ(ask(numbered("stalled.example", 1'000'000), "pid 2").image.get(), std::nullopt);
+  EXPECT_EQ(refusals("image_places_of_host"), 1);
+  EXPECT_EQ(ask(numbered("img.example", 1)).image.get(), std::nullopt);
+  EXPECT_EQ(refusals("image_places"), 1);
+  EXPECT_TRUE(fakes_.log.contains("stalled.example"));
+  EXPECT_FALSE(ask(numbered("img.example", 1), "pid 2").image.isFulfilled());
+  EXPECT_EQ(session().pending().back()->request().url, numbered("img.example", 1));
+
   session().pending().front()->succeed(404);
   fakes_.timeline.runUntilIdle();
-  EXPECT_FALSE(fetch().isFulfilled());
+  EXPECT_FALSE(ask(numbered("stalled.example", 1'000'000)).image.isFulfilled());
+}
+
+TEST_F(ImageFetcherTest, DropsWhatNobodyWaitsForAndHasNotBegun) {
+  std::vector<ImageFetcher::DownloadId> left;
+  const auto first = ask(numbered("stalled.example", 0));
+  for (std::size_t i = 1; i < 1000; ++i)
+    left.push_back(ask(numbered("stalled.example", i)).download);
+  const auto shared = ask(numbered("stalled.example", 999), "pid 2");
+  const auto begun = session().tasks().size();
+  release(std::move(left));
+  EXPECT_EQ(fakes_.transactions.openNames().size(),
+            begun + DownloadLine::kMostAbandonedOfOneHost + 1);
+  EXPECT_FALSE(first.image.isFulfilled() || shared.image.isFulfilled());
+  // Somebody waits for it: it begins before what is left.
+  session().pending().front()->succeed(404);
+  fakes_.timeline.runUntilIdle();
+  EXPECT_EQ(session().tasks().back()->request().url, numbered("stalled.example", 999));
+  // Dropped and wanted once more it waits anew.
+  EXPECT_FALSE(ask(numbered("stalled.example", 100)).image.isFulfilled());
+  while (!session().pending().empty()) {
+    session().pending().front()->succeed(404);
+    fakes_.timeline.runUntilIdle();
+  }
+  EXPECT_EQ(session().tasks().size(), begun + DownloadLine::kMostAbandonedOfOneHost + 2);
+  EXPECT_TRUE(fakes_.transactions.openNames().empty());
+}
+
+TEST_F(ImageFetcherTest, WhatNobodyWaitsForHasTheTimeOutToEnd) {
+  const auto slow = ask(kImageURL);
+  const auto wantedAgain = ask(numbered("img.example", 1));
+  release({slow.download, wantedAgain.download, slow.download});
+  fakes_.timeline.advance(6s);
+  EXPECT_FALSE(ask(numbered("img.example", 1)).image.isFulfilled());
+  EXPECT_EQ(session().pending().size(), 2u);
+  fakes_.timeline.advance(1s);
+  EXPECT_EQ(session().pending().size(), 1u);
+  EXPECT_EQ(slow.image.get(), std::nullopt);
+  fakes_.timeline.advance(60s);
+  answer(200, "bytes");
+  EXPECT_EQ(wantedAgain.image.get(), Data("bytes"));
 }
 
 TEST_F(ImageFetcherTest, LeavesNobodyWaitingWhenItIsGone) {

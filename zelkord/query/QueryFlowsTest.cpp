@@ -66,6 +66,7 @@ TEST(QueryFlowsTest, RecordBothEndsOfTheRequest) {
     EXPECT_EQ(start.headers, StringMap(headers.begin(), headers.end()));
     const auto records = query.bed.records();
     EXPECT_EQ(records[0].clientQueryId, 70u);
+    EXPECT_EQ(records[1].clientQueryId, 0u);
     for (const auto& record : records) {
       EXPECT_EQ(record.queryId, 7);
       EXPECT_TRUE(record.userGuid);
@@ -97,6 +98,7 @@ TEST(QueryFlowsTest, WaitForABagOnlyWhereTheyNeedOne) {
     const auto begin = query.bed.fakes.timeline.now();
     query.ask();
     const auto waited = query.bed.fakes.timeline.now() - begin;
+    EXPECT_EQ(query.clientCounter("keystrokes"), kind.isSearch());
     if (!kind.gated) {
       EXPECT_EQ(waited, 0s);
       ASSERT_EQ(query.bed.urlSession().tasks().size(), 1u);
@@ -123,6 +125,7 @@ TEST(QueryFlowsTest, MindWhatTheBagForbidsOnlyWhereTheyNeedOne) {
     AskedQuery query(kind, R"({"enabled":false,"search_url":"https://s.example/s"})");
     query.ask();
     EXPECT_EQ(query.bed.urlSession().tasks().empty(), kind.gated);
+    EXPECT_EQ(query.clientCounter("keystrokes"), kind.isSearch());
     if (!kind.gated) continue;
     EXPECT_EQ(query.answer->count, 1);
     EXPECT_FALSE(query.answer->reply || query.answer->error);
@@ -141,6 +144,7 @@ TEST(QueryFlowsTest, OnlySearchesMindTheLengthOfTheText) {
     AskedQuery query(kind, R"({"search_url":"https://s.example/s","minimum_query_length":5})");
     query.ask();
     EXPECT_EQ(query.bed.urlSession().tasks().empty(), kind.isSearch());
+    EXPECT_EQ(query.clientCounter("keystrokes"), kind.isSearch());
   }
 }
 
@@ -158,6 +162,7 @@ TEST(QueryFlowsTest, ReportATransportErrorAfterTheirRetries) {
     EXPECT_EQ(query.answer->error, failure);
     EXPECT_THAT(query.bed.recordedClasses(),
                 ElementsAre(kind.startClass, "HVErrorFeedback", "HVEndNetworkSearchFeedback"));
+    for (const auto& record : query.bed.records()) EXPECT_EQ(record.clientQueryId, 70u);
     EXPECT_FALSE(query.bed.records().back().userGuid);
     EXPECT_EQ(query.clientCounter("noconnection"), 1);
     EXPECT_EQ(query.bed.fakes.log.count("resp: (null)"), kind.answered.empty() ? 0 : 1);
@@ -352,8 +357,10 @@ TEST(QueryFlowsTest, LearnTheImageHostsOfAnswersTheyTake) {
       assembly.setResponseImages(std::make_shared<ResponseImages>(assembly));
       query.state->_ensureBag();
       query.ask().succeed(200, body);
-      assembly.responseImages()->loadImages({{.url = "https://img.example/next"}},
-                                            query.bed.fakes.timeline.now(), [](const auto&) {});
+      assembly.responseImages()
+          ->loadImages({{{.url = "https://img.example/next"}}, query.bed.fakes.timeline.now(), ""},
+                       [](const auto&) {})
+          ->ask();
       query.bed.fakes.timeline.runUntilIdle();
       const bool learnt = query.task().request().url == "https://img.example/next";
       EXPECT_EQ(learnt, !kind.isStrict() || body == list);

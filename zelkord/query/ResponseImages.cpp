@@ -3,17 +3,17 @@
 #include <algorithm>
 
 #include "zelkord/assembly/Assembly.h"
-#include "zelkord/network/ImageFetcher.h"
 #include "zelkord/network/URLHost.h"
 #include "zelkord/network/ZelkorBagController.h"
-#include "zelkord/query/ArrivedImages.h"
-#include "zelkord/query/ImageWait.h"
 
 namespace zelkord {
 namespace {
 
 // More than any service has; keeps one that invents hosts from filling the memory.
 constexpr std::size_t kMaximumImageHosts = 100'000;
+
+// Of all calls; a quarter is as much as one answer holds.
+constexpr std::uint64_t kMostImageBytes = 256u << 20;
 
 // The hosts that the bag itself names: of its resources the first one's, and the search service's.
 ImageHosts hostsNamedBy(const ZLKBag& bag) {
@@ -39,6 +39,7 @@ ResponseImages::ResponseImages(Assembly& assembly)
     : assembly_(assembly),
       imageHostsQueue_(
           assembly.platform().queues.makeConcurrentQueue("com.quenta.zelkord.imageHostsQueue")),
+      imageBytes_("image_bytes", Budget::quartered(kMostImageBytes), assembly.limits()),
       validImageHosts_(std::make_shared<const ImageHosts>()) {}
 
 void ResponseImages::processImagesFromResponse(const json::value& response, const ZLKBag* bag) {
@@ -68,21 +69,31 @@ void ResponseImages::_add(const ImageHosts& hosts) {
   validImageHosts_ = std::move(all);
 }
 
-void ResponseImages::loadImages(const std::vector<ImageDescriptor>& descriptors,
-                                SteadyTime deadline,
-                                const std::function<void(LoadedImages)>& completion,
-                                std::shared_ptr<ImageWait> wait) {
-  const auto bag = assembly_.bagController()->currentBag();
-  if (!bag) return completion({});
+std::shared_ptr<ImageCall> ResponseImages::loadImages(ImageOrder order,
+                                                      ImageCall::Completion completion) {
+  auto bag = assembly_.bagController()->currentBag();
+  if (!bag) {
+    completion({});
+    return nullptr;
+  }
   OrderedImages images;
-  for (const auto& descriptor : descriptors) {
+  for (const auto& descriptor : order.descriptors) {
     collectOrderedImages(descriptor, *bag, nullptr, images);
   }
-  if (!wait) wait = std::make_shared<ImageWait>(assembly_.platform().queues);
-  const auto arrived = _fetch(images, *bag, wait);
-  const auto now = assembly_.platform().clock.realNow();
-  wait->wait(deadline > now ? deadline - now : Duration::zero());
-  completion(_loaded(descriptors, *bag, *arrived));
+  const auto hosts = images.seen.empty() ? nullptr : _validHosts(*bag);
+  std::vector<std::string> urls;
+  for (auto* list : {&images.primary, &images.secondary}) {
+    for (auto& url : *list) {
+      if (_mayFetch(url, *hosts)) urls.push_back(std::move(url));
+    }
+  }
+  auto call = ImageCall::make(assembly_, std::move(order), std::move(bag), imageBytes_,
+                              std::move(completion));
+  call->setImages(std::move(urls), [hosts](const std::string& url) {
+    const auto place = URLHost::parse(url);
+    return place && place->isHTTP() && hosts->contains(place->host);
+  });
+  return call;
 }
 
 ResponseImages::Hosts ResponseImages::_validHosts(const ZLKBag& bag) {
@@ -108,53 +119,6 @@ bool ResponseImages::_mayFetch(const std::string& url, const ImageHosts& hosts) 
     return false;
   }
   return true;
-}
-
-std::shared_ptr<ArrivedImages> ResponseImages::_fetch(const OrderedImages& images,
-                                                      const ZLKBag& bag,
-                                                      const std::shared_ptr<ImageWait>& wait) {
-  const auto arrived = std::make_shared<ArrivedImages>();
-  if (images.seen.empty()) return arrived;
-  const auto hosts = _validHosts(bag);
-  const auto acceptsRedirect = [hosts](const std::string& url) {
-    const auto place = URLHost::parse(url);
-    return place && place->isHTTP() && hosts->contains(place->host);
-  };
-  auto& queue = assembly_.platform().queues.global(QualityOfService::High);
-  for (const auto* list : {&images.primary, &images.secondary}) {
-    for (const auto& url : *list) {
-      if (!_mayFetch(url, *hosts)) continue;
-      const auto future = assembly_.imageFetcher()->fetchImageData(
-          url, bag.timeoutIntervalForRequest(), acceptsRedirect);
-      wait->enter();
-      future.then([weak = std::weak_ptr(arrived), url, wait, &queue](const auto& image) {
-        const auto wanted = weak.lock();
-        if (wanted && image) wanted->add(url, *image);
-        queue.async([wait] { wait->leave(); });
-      });
-    }
-  }
-  return arrived;
-}
-
-LoadedImages ResponseImages::_loaded(const std::vector<ImageDescriptor>& descriptors,
-                                     const ZLKBag& bag, const ArrivedImages& arrived) const {
-  const auto& log = assembly_.log(Category::Images);
-  LoadedImages images;
-  std::unordered_set<std::string_view> filed;
-  const auto bytesAt = [&arrived](const std::optional<std::string>& url) {
-    return url ? arrived.find(*url) : std::nullopt;
-  };
-  for (const auto& [url, id, data] : descriptors) {
-    if (const auto bytes = bytesAt(url)) {
-      log.debug("mapping image url {} to {} bytes of data", _shown(*url), bytes->size());
-      if (filed.insert(*url).second) images.emplace_back(*url, *bytes);
-    } else if (const auto named = id ? bytesAt(bag.urlForIdentifier(*id)) : std::nullopt) {
-      log.debug("mapping image id {} to {} bytes of data", *id, named->size());
-      if (filed.insert(*id).second) images.emplace_back(*id, *named);
-    }
-  }
-  return images;
 }
 
 std::string ResponseImages::_shown(const std::string& url) const {

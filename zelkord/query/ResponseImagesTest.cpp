@@ -41,17 +41,22 @@ class ResponseImagesTest : public testing::Test {
       if (task->request().url == url) task->succeed(200, body);
     }
   }
+  static std::vector<ImageDescriptor> descriptorsOf(const json::array& values) {
+    std::vector<ImageDescriptor> descriptors;
+    for (const auto& value : values) descriptors.push_back(ImageDescriptor::of(value));
+    return descriptors;
+  }
   // "KEY=BYTES" of what was loaded by `limit` from now.
   std::vector<std::string> load(const std::string& descriptors, Duration limit = 1s) {
-    std::vector<ImageDescriptor> wanted;
-    const auto values = parseJson(descriptors).value();
-    for (const auto& value : values.as_array()) {
-      wanted.push_back(ImageDescriptor::of(value));
-    }
+    const auto wanted = descriptorsOf(parseJson(descriptors)->as_array());
     std::optional<LoadedImages> loaded;
     const auto now = bed_.fakes.timeline.realNow();
-    images().loadImages(wanted, limit < Duration::zero() ? now + limit : deadlineAfter(now, limit),
-                        [&](LoadedImages result) { loaded = std::move(result); });
+    const auto deadline = limit < Duration::zero() ? now + limit : deadlineAfter(now, limit);
+    const auto call = images().loadImages({wanted, deadline, "pid 1"},
+                                          [&](LoadedImages result) { loaded = std::move(result); });
+    while (call && call->ask()) {
+    }
+    bed_.fakes.timeline.runUntil([&] { return loaded.has_value(); });
     std::vector<std::string> texts;
     for (const auto& [key, bytes] : loaded.value()) {
       texts.push_back(key + "=" + std::string(bytes.view()));
@@ -189,22 +194,50 @@ TEST_F(ResponseImagesTest, WaitsNoLongerThanTheSlowestFetch) {
   EXPECT_EQ(bed_.fakes.timeline.now() - begin, 2s);
 }
 
-TEST_F(ResponseImagesTest, HoldsNoMoreThanSeveralAnswersHold) {
+TEST_F(ResponseImagesTest, HoldsWhatAnAnswerHoldsFromItsBeginning) {
   bed_.installBag(kImagesBag);
   learn(R"({"icon":{"id":"pin"}})");
   const std::string large(8u << 20, 'x');
-  std::map<std::string, std::string> bodies;
   json::array wanted;
-  for (int i = 0; i < 20; ++i) {
-    const auto url = "https://img.example/" + std::to_string(i);
-    bodies.emplace(url, large);
-    wanted.push_back(json::object{{"url", url}});
+  for (int i = 0; i < 12; ++i) {
+    wanted.push_back(json::object{{"url", "https://img.example/" + std::to_string(i)}});
   }
-  bodies["https://img.example/small"] = "S";
-  wanted.push_back(json::object{{"url", "https://img.example/small"}});
-  serve(std::move(bodies));
-  EXPECT_EQ(load(json::serialize(wanted), 10s).size(), 16u);
-  EXPECT_EQ(fetched().size(), 21u);
+  std::vector<std::string> keys;
+  const auto call =
+      images().loadImages({descriptorsOf(wanted), bed_.fakes.timeline.realNow() + 10s, "pid 1"},
+                          [&](LoadedImages loaded) {
+                            for (const auto& [key, bytes] : loaded) keys.push_back(key);
+                          });
+  EXPECT_FALSE(call->ask());
+  // The last ones come first.
+  for (int i = 11; i >= 0; --i) {
+    answer("https://img.example/" + std::to_string(i), large);
+    bed_.fakes.timeline.runUntilIdle();
+  }
+  ASSERT_EQ(keys.size(), 8u);
+  EXPECT_EQ(keys.front(), "https://img.example/0");
+  EXPECT_EQ(keys.back(), "https://img.example/7");
+  EXPECT_GT(bed_.counter("com.quenta.zelkord.limit.image_bytes"), 0);
+}
+
+TEST_F(ResponseImagesTest, GivesNoAnswerAndAsksForNothingOnceItIsGivenUp) {
+  bed_.installBag(kImagesBag);
+  learn(R"({"icon":{"id":"pin"}})");
+  json::array wanted;
+  for (int i = 0; i < 100; ++i) {
+    wanted.push_back(json::object{{"url", "https://img.example/" + std::to_string(i)}});
+  }
+  int answers = 0;
+  const auto call =
+      images().loadImages({descriptorsOf(wanted), bed_.fakes.timeline.realNow() + 1s, "pid 1"},
+                          [&](const LoadedImages&) { ++answers; });
+  EXPECT_TRUE(call->ask());
+  call->giveUp();
+  EXPECT_FALSE(call->ask());
+  bed_.fakes.timeline.advance(60s);
+  EXPECT_EQ(answers, 0);
+  EXPECT_TRUE(bed_.urlSession().pending().empty());
+  EXPECT_LE(fetched().size(), 16u);
 }
 
 }  // namespace
