@@ -1,5 +1,6 @@
 #include "zelkord/core/ClientStateManager.h"
 
+#include "platform/api/RandomUUID.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/core/EndpointListener.h"
 #include "zelkord/core/ServiceInterfaces.h"
@@ -147,6 +148,7 @@ void ClientStateManager::request(const std::shared_ptr<ZLKRequest>& request,
                                  const ZLKSessionConfiguration& configuration,
                                  const ReplyCallback& reply) {
   if (!request) return;
+  if (request->uuid.empty()) request->uuid = randomUUID(assembly_.platform().random).string();
   const auto state = configuredState(configuration.identifier);
   if (!state) {
     reply(request->queryId, std::nullopt,

@@ -152,9 +152,12 @@ TEST(EndpointTest, KnowsOnlyClientsThatConfiguredThemselves) {
 TEST(EndpointTest, AnswersMoreResultsAndCardsAsTheClientThatIsNamed) {
   DaemonBed bed;
   bed.installBag(kServedBag);
+  const auto sessions = std::make_shared<RecordingSessionManager>("zelkor", true);
+  bed.daemon.assembly().setClientSessionManager(sessions);
   bed.connectAndConfigure("lanthe");
   auto& manager = *bed.daemon.assembly().clientStateManager();
   const auto client = bed.fakes.interprocess.connect(manager.endpoint());
+  std::set<std::string> uuids;
   for (const auto& [kind, isServed] :
        std::vector<std::pair<std::string, bool>>{{"moreResults", true},
                                                  {"card", true},
@@ -184,6 +187,13 @@ TEST(EndpointTest, AnswersMoreResultsAndCardsAsTheClientThatIsNamed) {
     ASSERT_TRUE(answer->answered);
     EXPECT_EQ(*answer->values[0].get<std::int64_t>(), -9);
     EXPECT_EQ(answer->values[1].get<ipc::Dictionary>()->at("data").get<Data>()->view(), "[7]");
+    const auto records = sessions->records().all();
+    const auto& end = dynamic_cast<const NetworkSearchEnd&>(*records.back().feedback);
+    const auto& start =
+        dynamic_cast<const NetworkSearchStart&>(*records.at(records.size() - 2).feedback);
+    EXPECT_EQ(end.uuid, start.uuid);
+    EXPECT_EQ(start.uuid->size(), 36u);
+    EXPECT_TRUE(uuids.insert(*start.uuid).second);
   }
   EXPECT_EQ(manager.sessions().at(0).at("agent").find("Other/1"), std::string::npos);
 }
