@@ -1,6 +1,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include "halvane/ModelFeedback.h"
 #include "zelkord/assembly/ClientShortName.h"
 #include "zelkord/assembly/NotificationNames.h"
 #include "zelkord/feedback/UserGUIDSource.h"
@@ -69,6 +70,43 @@ TEST_F(ClientStateTest, AFetchThatFailsEndsTheWait) {
   EXPECT_EQ(bed_.fakes.timeline.now() - begin, 200ms);
 }
 
+TEST_F(ClientStateTest, AChangeWakesAllWhoWaitAndNoOneLater) {
+  const auto state = bed_.makeState();
+  auto& timeline = bed_.fakes.timeline;
+  std::vector<Duration> waited;
+  const auto begin = timeline.now();
+  for (int i = 0; i < 3; ++i) {
+    timeline.global(QualityOfService::Default).async([&] {
+      EXPECT_EQ(askForBag(*state, std::nullopt).error, zelkorError(1, "timeout"));
+      waited.push_back(timeline.now() - begin);
+    });
+  }
+  const auto change = timeline.global(QualityOfService::Default).after(300ms, [&] {
+    bed_.fakes.notificationCenter.post(std::string(kZLKBagChangeNotification));
+  });
+  timeline.advance(2s);
+  EXPECT_THAT(waited, testing::ElementsAre(300ms, 300ms, 300ms));
+  const auto later = timeline.now();
+  askForBag(*state, std::nullopt);
+  EXPECT_EQ(timeline.now() - later, 1s);
+}
+
+TEST_F(ClientStateTest, ChangesThatNobodyWaitedForEndLaterWaitsAtOnce) {
+  const auto state = bed_.makeState();
+  auto& timeline = bed_.fakes.timeline;
+  askForBag(*state, std::nullopt);  // observes from now on
+  for (int i = 0; i < 2; ++i) {
+    bed_.fakes.notificationCenter.post(std::string(kZLKBagChangeNotification));
+  }
+  std::vector<Duration> waited;
+  for (int i = 0; i < 3; ++i) {
+    const auto begin = timeline.now();
+    EXPECT_EQ(askForBag(*state, std::nullopt).error, zelkorError(1, "timeout"));
+    waited.push_back(timeline.now() - begin);
+  }
+  EXPECT_THAT(waited, testing::ElementsAre(0s, 0s, 1s));
+}
+
 TEST_F(ClientStateTest, WithoutAUserAgentThereIsNoBag) {
   bed_.installBag(kTestBag);
   const auto state = std::make_shared<ClientState>("lanthe", bed_.assembly);
@@ -106,10 +144,20 @@ TEST_F(ClientStateTest, WarmsOnceInThirtySeconds) {
   EXPECT_EQ(bed_.urlSession().tasks()[0]->request().url, "https://search.example/w");
   bed_.urlSession().tasks()[0]->succeed(204);
   bed_.fakes.timeline.runUntilIdle();
-  EXPECT_EQ(bed_.recordedClasses().back(), "HVEndNetworkSearchFeedback");
   const auto records = bed_.records();
-  EXPECT_FALSE(records.back().userGuid);
-  EXPECT_THAT(*records.back().userAgent, testing::StartsWith("Zelkord/1.0 ("));
+  const auto& start = dynamic_cast<const HVStartNetworkSearchFeedback&>(*records.at(0).feedback);
+  EXPECT_EQ(start.triggerEvent.value, 19);
+  EXPECT_EQ(start.endpointType.value, 12);
+  EXPECT_EQ(start.input, "");
+  EXPECT_EQ(start.url, "https://search.example/w");
+  const auto& end = dynamic_cast<const HVEndNetworkSearchFeedback&>(*records.back().feedback);
+  EXPECT_EQ(end.uuid, start.uuid);
+  EXPECT_EQ(end.statusCode, 204);
+  for (const auto& record : records) {
+    EXPECT_EQ(record.queryId, 0);
+    EXPECT_FALSE(record.userGuid);
+    EXPECT_THAT(*record.userAgent, testing::StartsWith("Zelkord/1.0 ("));
+  }
 }
 
 TEST_F(ClientStateTest, MessagesAskForRequestsWithoutLocation) {

@@ -54,6 +54,8 @@ TEST_F(QueryCacheTest, ChoosesTheShortestCompletionThenTheBestScore) {
       {"case does not matter", {{"A", "ABC"}}, "aB", "abc"},
       {"score decides between equals", {{"a", "abc", 0.2}, {"a", "abd", 0.9}}, "ab", "abd"},
       {"length comes before score", {{"a", "abc", 0.1}, {"a", "abcd", 0.9}}, "ab", "abc"},
+      {"a score of zero or less never wins", {{"a", "abc", -0.9}, {"a", "abd", -0.1}}, "ab", "abc"},
+      {"nor does it keep a better one out", {{"a", "abc", -0.9}, {"a", "abd", 0.1}}, "ab", "abd"},
       {"the first of equal scores", {{"a", "abd", 0.5}, {"a", "abc", 0.5}}, "ab", "abc"},
       {"input longer than query is refused", {{"abcd", "abc"}}, "abc", "none"},
       {"no query", {{"", ""}}, "", "none"},
@@ -110,6 +112,17 @@ TEST_F(QueryCacheTest, KeepsWithinItsBudget) {
   store({"b", "bcd"});  // would exceed: everything else goes
   EXPECT_EQ(found("a"), "none");
   EXPECT_EQ(found("b"), "bcd");
+}
+
+TEST_F(QueryCacheTest, AChargeThatReachesTheLimitEmptiesIt) {
+  constexpr std::size_t kHalf = 2'097'152 / 2 - 1'024;
+  for (const bool reaches : {false, true}) {
+    cache_->removeAllObjects();
+    store({"a", "abc"}, std::string(kHalf, 'x'));
+    store({"b", "bcd"}, std::string(reaches ? kHalf : kHalf - 1, 'x'));
+    EXPECT_EQ(cache_->count(), reaches ? 1u : 2u);
+  }
+  EXPECT_TRUE(bed_.fakes.log.contains("!!! exceeded max cost, flushing cache !!!"));
 }
 
 TEST_F(QueryCacheTest, AReplacedEntrysChargeStays) {

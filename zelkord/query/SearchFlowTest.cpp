@@ -51,16 +51,36 @@ TEST_F(SearchFlowTest, CountsTheLengthOfAQueryInUtf16Units) {
 TEST_F(SearchFlowTest, AnswersALaterKeystrokeFromTheCache) {
   bed_.installBag(kTestBag);
   const auto state = bed_.makeState();
-  bed_.search(*state, "sno", 1);
+  ZLKSearchRequest fetched;
+  fetched.queryString = "sno";
+  fetched.scale = 2;
+  fetched.uuid = "uuid of sno";
+  bed_.search(*state, fetched);
   answer(200, kOneResultSet);
   bed_.fakes.maps.session = "maps-session";
 
-  const auto cached = bed_.search(*state, "SNOWM", 2);
+  ZLKSearchRequest later;
+  later.queryId = 2;
+  later.clientQueryId = 20;
+  later.queryString = "SNOWM";
+  later.scale = 2;
+  later.uuid = "another";
+  const auto cached = bed_.search(*state, later);
   EXPECT_EQ(cached->count, 1);
   ASSERT_TRUE(cached->reply);
+  EXPECT_EQ(cached->queryId, 2);
   EXPECT_EQ(cached->reply->data.view(), kOneResultSet);
+  EXPECT_EQ(cached->reply->scale, 2);
+  EXPECT_EQ(cached->reply->geoSessionEntityString, "maps-session");
   EXPECT_EQ(bed_.urlSession().tasks().size(), 1u);
-  EXPECT_EQ(bed_.recordedClasses().back(), "ZLKCacheHitFeedback");
+  const auto record = bed_.records().back();
+  const auto& hit = dynamic_cast<const ZLKCacheHitFeedback&>(*record.feedback);
+  EXPECT_EQ(hit.triggerEvent.value, 4);
+  EXPECT_EQ(hit.input, "SNOWM");
+  EXPECT_EQ(hit.uuid, "uuid of sno");
+  EXPECT_EQ(record.queryId, 2);
+  EXPECT_EQ(record.clientQueryId, 20u);
+  EXPECT_EQ(bed_.counter("com.quenta.zelkord.lanthe.keystrokes"), 2);
   EXPECT_EQ(bed_.counter("com.quenta.zelkord.lanthe.ondevicecachehits"), 1);
 
   ZLKSearchRequest withItems;
