@@ -117,6 +117,18 @@ TEST_F(ResponseImagesTest, LearntHostsReplaceTheBagsAndOnlyTheyAreAsked) {
   EXPECT_TRUE(bed_.fakes.log.contains("loadImage with invalid host: https://search.example/s"));
 }
 
+TEST_F(ResponseImagesTest, LearnsNoHostsWithoutEnd) {
+  bed_.installBag(kImagesBag);
+  learn(R"({"icon":{"url":"https://img.example/"}})");
+  std::string icons;
+  for (int i = 0; i < 100'000; ++i) icons += R"({"url":"http://h)" + std::to_string(i) + R"("},)";
+  learn(R"({"icon":[)" + icons + "{}]}");
+  learn(R"({"icon":{"url":"https://late.example/"}})");
+  serve({});
+  load(R"([{"url":"https://late.example/a"},{"url":"https://img.example/a"},{"url":"http://h1"}])");
+  EXPECT_THAT(fetched(), ElementsAre("https://img.example/a", "http://h1"));
+}
+
 TEST_F(ResponseImagesTest, FollowsRedirectsToKnownHostsOnly) {
   bed_.installBag(kImagesBag);
   learn(R"({"icon":[{"url":"https://img.example/"},{"id":"far"}]})");
