@@ -1,9 +1,11 @@
 #include "base/Text.h"
 
+#include <fmt/format.h>
 #include <unicode/bytestream.h>
 #include <unicode/casemap.h>
 #include <unicode/stringpiece.h>
 #include <unicode/utf.h>
+#include <unicode/utf16.h>
 #include <unicode/utf8.h>
 
 #include <algorithm>
@@ -43,6 +45,17 @@ std::size_t findNoncharacter(std::string_view text, std::size_t at, std::size_t&
 }
 
 bool isDigit(char c) { return c >= '0' && c <= '9'; }
+
+// The character at `at`, which moves behind it, as UTF-16 in JSON's form.
+void appendEscaped(std::string& json, std::string_view utf8, std::size_t& at) {
+  auto next = static_cast<int64_t>(at);
+  UChar32 point = 0;
+  U8_NEXT(utf8.data(), next, static_cast<int64_t>(utf8.size()), point);
+  at = static_cast<std::size_t>(next);
+  json += point <= 0xFFFF
+              ? fmt::format("\\u{:04x}", point)
+              : fmt::format("\\u{:04x}\\u{:04x}", int{U16_LEAD(point)}, int{U16_TRAIL(point)});
+}
 
 using AsciiMap = char (*)(char);
 using UnicodeMap = void (*)(icu::StringPiece, icu::ByteSink&, UErrorCode&);
@@ -90,6 +103,19 @@ bool isValidUtf8(std::string_view bytes) {
     if (point < 0) return false;
   }
   return true;
+}
+
+std::string withEscapedNoncharacters(std::string json) {
+  if (!hasNoncharacters(json)) return json;
+  std::string escaped;
+  std::size_t end = 0;
+  for (std::size_t at = 0; at < json.size();) {
+    const auto next = findNoncharacter(json, at, end);
+    escaped.append(json, at, next - at);
+    at = next;
+    if (at < json.size()) appendEscaped(escaped, json, at);
+  }
+  return escaped;
 }
 
 bool hasControlCharacters(std::string_view utf8) {

@@ -19,9 +19,11 @@ ZK_EXPORT bool hasControlCharacters(std::string_view utf8);
 
 // U+FFFE and U+FFFF of every plane, U+FDD0 to U+FDEF: valid in UTF-8, but refused by what carries
 // messages. Bytes that are not UTF-8 are none.
-bool hasNoncharacters(std::string_view text);
+ZK_EXPORT bool hasNoncharacters(std::string_view text);
 // Each of them as U+FFFD; everything else as it is.
-std::string replaceNoncharacters(std::string_view text);
+ZK_EXPORT std::string replaceNoncharacters(std::string_view text);
+// A JSON document with them as \u escapes.
+ZK_EXPORT std::string withEscapedNoncharacters(std::string json);
 
 // Lower-cased with the root locale.
 ZK_EXPORT std::string lowercased(std::string_view utf8);

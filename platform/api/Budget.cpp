@@ -2,6 +2,7 @@
 
 #include <fmt/format.h>
 
+#include <algorithm>
 #include <utility>
 
 namespace zelkord {
@@ -76,7 +77,9 @@ struct Budget::Share::Account {
     const MutexLock lock(mutex_);
     const auto found = holders_.find(holder);
     const auto own = found == holders_.end() ? 0 : found->second;
-    if (amount > size.inAll - held_ || amount > size.ofOneHolder - own) return false;
+    const bool isAlone = holders_.size() == (found == holders_.end() ? 0 : 1);
+    const auto most = isAlone ? std::max(size.ofOneHolder, size.ofTheOnlyHolder) : size.ofOneHolder;
+    if (own > most || amount > size.inAll - held_ || amount > most - own) return false;
     held_ += amount;
     if (amount > 0) holders_[holder] += amount;
     return true;

@@ -54,9 +54,13 @@ class Budget final {
   struct Size {
     std::uint64_t inAll = 0;
     std::uint64_t ofOneHolder = 0;
+    // Who is the only holder may have this much, when it is more.
+    std::uint64_t ofTheOnlyHolder = 0;
   };
   // A quarter for each holder, as for client processes.
-  static Size quartered(std::uint64_t inAll) { return {inAll, inAll / 4}; }
+  static Size quartered(std::uint64_t inAll) { return {inAll, inAll / 4, 0}; }
+  // The same, and half for one that is alone.
+  static Size halvedWhenAlone(std::uint64_t inAll) { return {inAll, inAll / 4, inAll / 2}; }
 
   // What a holder has of the budget; given back when destroyed. Move-only; empty after a move.
   // Threading: one thread at a time.

@@ -48,6 +48,19 @@ TEST_F(BudgetTest, AShareGrowsOnlyWhereThereIsRoomAndIsGivenBackWhole) {
   EXPECT_EQ(budget_.largestHolder(), std::nullopt);
 }
 
+TEST_F(BudgetTest, WhoIsAloneMayHaveMoreAndKeepsItWhenOthersCome) {
+  Budget rooms("rooms", Budget::halvedWhenAlone(16), reports_);
+  auto eight = rooms.take("pid 1", 8);
+  ASSERT_TRUE(eight);
+  EXPECT_FALSE(rooms.take("pid 1"));
+  const auto other = rooms.take("pid 2", 4);
+  EXPECT_TRUE(other);
+  EXPECT_FALSE(rooms.take("pid 2"));
+  EXPECT_EQ(rooms.heldBy("pid 1"), 8u);
+  EXPECT_TRUE(eight->resize(7));
+  EXPECT_FALSE(eight->resize(8));
+}
+
 TEST_F(BudgetTest, AnAmountThatWouldOverflowIsRefused) {
   const auto one = budget_.take("pid 1");
   EXPECT_FALSE(budget_.take("pid 1", UINT64_MAX));

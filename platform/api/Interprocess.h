@@ -127,6 +127,9 @@ class CallHandler {
  public:
   virtual ~CallHandler() = default;
   virtual void handle(Call call) = 0;
+  // The client sent a message that the transport deals with itself: what every D-Bus peer is asked,
+  // a call that is refused, a signal. On any thread; brief.
+  virtual void messageArrived() {}
 };
 
 // One client's connection, on whichever door. It stays usable (and mute) after its end.
@@ -169,6 +172,8 @@ struct ListenerConfiguration {
   // Gets bus callers' calls of the other interfaces while they have no connection. May be null.
   std::shared_ptr<CallHandler> sharedHandler;
   Limits limits;
+  // The delegate's admission says how many connections there are; they count in no budget.
+  bool delegateBoundsConnections = false;
 };
 
 // An anonymous listener: a private socket with an unguessable name. Closed when destroyed, its
@@ -185,6 +190,7 @@ struct Statistics {
   std::uint64_t calls = 0;
   std::uint64_t refused = 0;    // calls answered with an error by the transport itself
   std::size_t queuedBytes = 0;  // waiting for clients to read
+  std::size_t heldBytes = 0;    // these, unfinished messages, and calls that are not answered yet
 };
 
 // The doors of this process. All objects are at /com/quenta/zelkord.

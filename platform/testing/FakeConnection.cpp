@@ -112,6 +112,7 @@ std::shared_ptr<FakeAnswer> FakeConnection::call(std::string interface, std::str
   const Method* method = door_->check(interface, member, values, *answer);
   if (!method) {
     ++door_->statistics->refused;
+    if (handler_) handler_->messageArrived();
     return answer;
   }
   Call call{std::move(interface), std::move(member), std::move(values),

@@ -1,5 +1,6 @@
 #include "zelkord/core/ClientConnection.h"
 
+#include "base/Text.h"
 #include "corezelkor/Constants.h"
 #include "platform/api/RandomUUID.h"
 #include "zelkord/assembly/Assembly.h"
@@ -304,9 +305,11 @@ void ClientConnection::reportEvent(const ipc::Call& call, Decoded<MutableFeedbac
 }
 
 void ClientConnection::feedback(const std::shared_ptr<ipc::Reply>& reply) {
-  if (const auto state = state_.get()) {
-    reply->send({state->sessionManager().feedbacksWithRelativeTimestamp(), ipc::Dictionary{}});
-  }
+  const auto state = state_.get();
+  if (!state) return;
+  auto records = state->sessionManager().feedbacksWithRelativeTimestamp();
+  for (auto& record : records) record = withEscapedNoncharacters(std::move(record));
+  reply->send({std::move(records), ipc::Dictionary{}});
 }
 
 void ClientConnection::listSessions(const std::shared_ptr<ipc::Reply>& reply) {

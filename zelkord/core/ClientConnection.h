@@ -52,6 +52,7 @@ class ClientConnection final : public ipc::CallHandler,
   void invalidated();
 
   void handle(ipc::Call call) override;
+  void messageArrived() override { timer_->rearm(); }
 
   std::optional<ZLKSessionConfiguration> configuration() const { return configuration_.get(); }
   std::shared_ptr<ClientState> state() const { return state_.get(); }

@@ -258,11 +258,19 @@ TEST_F(ClientConnectionTest, EndsAfterThreeSilentMinutesButNotWhileACallWaits) {
 
 TEST_F(ClientConnectionTest, EveryMessageBeginsTheSilenceAnew) {
   const auto client = bed_.connectAndConfigure();
-  for (int i = 0; i < 5; ++i) {
+  auto& manager = *bed_.daemon.assembly().clientStateManager();
+  const auto endpoint = bed_.fakes.interprocess.connect(manager.endpoint());
+  bed_.run();
+  const std::pair<const char*, ipc::Values> cases[] = {
+      {"ListSessions", {}}, {"NoSuchMember", {}}, {"Request", {"of the wrong type"}}};
+  for (const auto& [member, arguments] : cases) {
+    SCOPED_TRACE(member);
     bed_.fakes.timeline.advance(170s);
-    bed_.call(client, "ListSessions");
+    bed_.call(client, member, arguments);
+    endpoint->call(std::string(kEndpointInterface), member, arguments);
+    EXPECT_EQ(client->state(), ipc::FakeClient::State::Open);
+    EXPECT_EQ(endpoint->state(), ipc::FakeClient::State::Open);
   }
-  EXPECT_EQ(client->state(), ipc::FakeClient::State::Open);
 }
 
 TEST_F(ClientConnectionTest, FillsInWhatTheClientLeftOut) {

@@ -25,6 +25,7 @@ void ClientStateManager::start() {
   ipc::ListenerConfiguration configuration;
   configuration.interfaces = {endpointInterface()};
   configuration.connectionInterface = configuration.interfaces.front().name;
+  configuration.delegateBoundsConnections = true;
   listener_ = assembly_.platform().interprocess.makeAnonymousListener(std::move(configuration),
                                                                       endpointListener_);
   stateCacheQueue_->sync([this] { loadState(); });

@@ -6,6 +6,7 @@
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/core/ClientConnection.h"
 #include "zelkord/core/ClientStateManager.h"
+#include "zelkord/core/Wire.h"
 #include "zelkord/network/BagRefreshRule.h"
 #include "zelkord/network/ZelkorBagController.h"
 
@@ -73,7 +74,8 @@ json::object transportOf(const ipc::Statistics& statistics) {
   return {{"connections", statistics.connections},
           {"calls", statistics.calls},
           {"refused", statistics.refused},
-          {"queued_bytes", statistics.queuedBytes}};
+          {"queued_bytes", statistics.queuedBytes},
+          {"held_bytes", statistics.heldBytes}};
 }
 
 }  // namespace
@@ -102,17 +104,17 @@ std::string Diagnostics::status() const {
   status["states"] = statesOf(*assembly_.clientStateManager());
   status["bag"] = bagOf(*assembly_.bagController());
   status["interprocess"] = transportOf(platform.interprocess.statistics());
-  return json::serialize(status);
+  return jsonText(status);
 }
 
 void Diagnostics::_readDefault(const ipc::Call& call) const {
   const auto& domain = *call.arguments.at(0).get<std::string>();
   const auto& key = *call.arguments.at(1).get<std::string>();
   if (key.empty()) {
-    return call.reply->send({json::serialize(assembly_.userDefaults().all(domain))});
+    return call.reply->send({jsonText(assembly_.userDefaults().all(domain))});
   }
   const auto value = assembly_.userDefaults().value(key, domain);
-  call.reply->send({value ? json::serialize(*value) : std::string()});
+  call.reply->send({value ? jsonText(*value) : std::string()});
 }
 
 void Diagnostics::_writeDefault(const ipc::Call& call) const {

@@ -33,6 +33,7 @@ class EndpointConnection final : public ipc::CallHandler,
   void start(const std::shared_ptr<ipc::Connection>& connection);
   void invalidated();
   void handle(ipc::Call call) override;
+  void messageArrived() override { timer_->rearm(); }
 
  private:
   void _request(const ipc::Call& call);

@@ -164,13 +164,17 @@ Decoded<std::vector<ImageDescriptor>> decodeImageDescriptors(
   return descriptors;
 }
 
+std::string jsonText(const json::value& value) {
+  return withEscapedNoncharacters(json::serialize(value));
+}
+
 ipc::Dictionary encodeBag(const ZLKBag* bag) {
   ipc::Dictionary dictionary;
   if (!bag) return dictionary;
   if (auto version = bag->version()) dictionary["version"] = *std::move(version);
   dictionary["enabled"] = bag->isEnabled();
   dictionary["feedbackEnabled"] = bag->feedbackEnabled();
-  dictionary["rawBag"] = json::serialize(*bag->rawBag());
+  dictionary["rawBag"] = jsonText(*bag->rawBag());
   return dictionary;
 }
 

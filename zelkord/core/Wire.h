@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "base/Error.h"
+#include "base/Json.h"
 #include "corezelkor/Messages.h"
 #include "corezelkor/ZLKBag.h"
 #include "platform/api/Interprocess.h"
@@ -36,6 +37,9 @@ Decoded<MutableRequest> decodeRequest(const std::string& kind, const ipc::Dictio
 // At most 1,000 of them.
 Decoded<std::vector<ImageDescriptor>> decodeImageDescriptors(
     const std::vector<ipc::Dictionary>& dictionaries);
+
+// A JSON document in a message. Not every D-Bus library takes noncharacters, so they are escaped.
+std::string jsonText(const json::value& value);
 
 // "Nothing" is an empty dictionary in each of these.
 ipc::Dictionary encodeBag(const ZLKBag* bag);

@@ -61,6 +61,25 @@ TEST(ZelkorServiceTest, TellsWhetherAClientsSessionEndedWithIt) {
   }
 }
 
+TEST(WireTest, JsonInMessagesHoldsNoNoncharacters) {
+  const std::pair<std::string, std::string> cases[] = {
+      {"\xEF\xBF\xBE", "\\ufffe"},
+      {"a\xEF\xB7\x90z", "a\\ufdd0z"},
+      {"\xF0\x9F\xBF\xBF", "\\ud83f\\udfff"},
+      {"\xF4\x8F\xBF\xBE", "\\udbff\\udffe"},
+      {"\xEF\xBF\xBD \xEF\xB6\x90 \xF0\x9F\x98\x80", "\xEF\xBF\xBD \xEF\xB6\x90 \xF0\x9F\x98\x80"},
+  };
+  for (const auto& [text, expected] : cases) {
+    SCOPED_TRACE(expected);
+    DaemonBed bed;
+    bed.installBag(R"({"version":"4","note":")" + text + R"("})");
+    const auto client = bed.connectAndConfigure();
+    const auto answer = bed.call(client, "Bag");
+    const auto& bag = answer->values.at(0).get<ipc::Dictionary>()->at("rawBag");
+    EXPECT_THAT(*bag.get<std::string>(), testing::HasSubstr("\"note\":\"" + expected + "\""));
+  }
+}
+
 TEST(ClientStateManagerTest, ConnectionsOfOneClientShareItsState) {
   DaemonBed bed;
   bed.connectAndConfigure("lanthe", 1);
