@@ -65,7 +65,7 @@ void sendError(Outlet& outlet, const CallOrigin& origin, std::string_view name,
   const auto call = makeStandIn(outlet, origin);
   if (!call) return;
   const std::string errorName(name);
-  const std::string errorText(text);
+  const auto errorText = wireText(text);
   const sd_bus_error error{errorName.c_str(), errorText.c_str(), 0};
   sd_bus_message* reply = nullptr;
   if (sd_bus_message_new_method_error(call.get(), &reply, &error) < 0) return;

@@ -8,9 +8,12 @@
 namespace zelkord::ipc {
 namespace {
 
+// Descriptors are scarcer than memory: so few of them may wait in messages.
+constexpr std::size_t kBytesForADescriptor = 4u << 20;
+
 constexpr std::string_view kReplacementCharacter = "\xEF\xBF\xBD";
 
-// Replaces every byte that is not part of a valid sequence, and every zero byte.
+// Replaces every byte that is not part of a valid sequence, every zero byte and every noncharacter.
 std::string validText(std::string_view text) {
   std::string valid;
   for (std::size_t at = 0; at < text.size();) {
@@ -18,10 +21,17 @@ std::string validText(std::string_view text) {
     for (std::size_t tried = 1; tried <= 4 && length == 0 && text[at] != '\0'; ++tried) {
       if (isValidUtf8(text.substr(at, tried))) length = std::min(tried, text.size() - at);
     }
-    valid += length > 0 ? text.substr(at, length) : kReplacementCharacter;
-    at += length > 0 ? length : 1;
+    const auto character = text.substr(at, length);
+    const bool isGood = length > 0 && !hasNoncharacters(character);
+    valid += isGood ? character : kReplacementCharacter;
+    at += std::max<std::size_t>(length, 1);
   }
   return valid;
+}
+
+// What libsystemd takes for a text.
+bool isWireText(std::string_view text) {
+  return text.find('\0') == std::string_view::npos && isValidUtf8(text) && !hasNoncharacters(text);
 }
 
 // Appends values to one message; every operation gives zero or a negative errno.
@@ -80,8 +90,7 @@ class WireWriter {
   int _write(std::uint64_t value) { return _basic('t', &value); }
   int _write(double value) { return _basic('d', &value); }
   int _write(const std::string& text) {
-    const bool valid = text.find('\0') == std::string::npos && isValidUtf8(text);
-    return _basic('s', valid ? text.c_str() : validText(text).c_str());
+    return _basic('s', isWireText(text) ? text.c_str() : validText(text).c_str());
   }
   int _write(const Data& data) {
     return std::min(0, sd_bus_message_append_array(message_, 'y', data.data(), data.size()));
@@ -112,6 +121,7 @@ struct WireSize {
   std::size_t operator()(const std::string& text) const { return 8 + text.size(); }
   std::size_t operator()(const Data& data) const { return 8 + data.size(); }
   std::size_t operator()(const Unsupported&) const { return 0; }
+  std::size_t operator()(const FileHandle&) const { return kBytesForADescriptor; }
   std::size_t operator()(const Value& value) const { return 8 + std::visit(*this, value.variant); }
   template <typename T>
   std::size_t operator()(const T& content) const {
@@ -128,6 +138,10 @@ struct WireSize {
 };
 
 }  // namespace
+
+std::string wireText(std::string_view text) {
+  return isWireText(text) ? std::string(text) : validText(text);
+}
 
 int encodeValues(sd_bus_message* message, std::string_view signature, const Values& values) {
   if (signatureOf(values) != signature) return -EINVAL;
