@@ -2,20 +2,25 @@
 
 #include <fcntl.h>
 #include <fmt/format.h>
+#include <sys/file.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
 #include <sys/un.h>
 #include <systemd/sd-daemon.h>
 
 #include <cerrno>
+#include <chrono>
 #include <cstring>
 #include <filesystem>
+#include <thread>
 #include <utility>
 
 namespace zelkord::ipc {
 namespace {
 
 constexpr int kSocketBacklog = SOMAXCONN;  // clients do not wait for a place
+constexpr int kLockAttempts = 100;
+constexpr auto kLockPause = std::chrono::milliseconds(5);
 
 std::optional<sockaddr_un> unixAddress(const std::string& path) {
   sockaddr_un address{.sun_family = AF_UNIX, .sun_path = {}};
@@ -32,13 +37,29 @@ OwnedFd makeUnixSocket() {
   return OwnedFd(::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0));
 }
 
-// Whether the name belongs to a socket that a dead process left.
+// Keeps others from taking a socket that is bound and does not listen yet for a dead one. Gives up
+// when somebody keeps the lock for long.
+OwnedFd lockDirectory(const std::string& directory) {
+  OwnedFd lock(::open(directory.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+  for (int i = 0; i < kLockAttempts && ::flock(lock.get(), LOCK_EX | LOCK_NB) != 0; ++i) {
+    if (errno != EWOULDBLOCK) break;
+    std::this_thread::sleep_for(kLockPause);
+  }
+  return lock;
+}
+
+// Whether the name belongs to a socket of ours that a dead process left.
 bool isStaleSocket(const std::string& path, const sockaddr_un& address) {
   struct stat status {};
   if (::lstat(path.c_str(), &status) != 0 || !S_ISSOCK(status.st_mode)) return false;
+  if (status.st_uid != ::geteuid()) return false;
   const auto probe = makeUnixSocket();
   return ::connect(probe.get(), genericAddress(address), sizeof(address)) != 0 &&
          errno == ECONNREFUSED;
+}
+
+bool isAnonymousName(const std::string& name) {
+  return name.size() == 32 && name.find_first_not_of("0123456789abcdef") == std::string::npos;
 }
 
 // Zero or an errno.
@@ -65,11 +86,24 @@ void makePrivateDirectory(const std::filesystem::path& directory) {
 std::variant<ListeningSocket, Error> ListeningSocket::make(const std::string& path) {
   const auto address = unixAddress(path);
   if (!address) return posixError(ENAMETOOLONG);
-  makePrivateDirectory(std::filesystem::path(path).parent_path());
+  const auto directory = std::filesystem::path(path).parent_path();
+  makePrivateDirectory(directory);
+  const auto lock = lockDirectory(directory);
   auto fd = makeUnixSocket();
   if (!fd) return posixError(errno);
   if (const int number = bindAndListen(fd.get(), path, *address)) return posixError(number);
   return ListeningSocket(std::move(fd), path);
+}
+
+void ListeningSocket::removeDead(const std::string& directory, const std::string& serviceName) {
+  const auto lock = lockDirectory(directory);
+  std::error_code ignored;
+  for (const auto& entry : std::filesystem::directory_iterator(directory, ignored)) {
+    const auto name = entry.path().filename().string();
+    if (name != serviceName && !isAnonymousName(name)) continue;
+    const auto address = unixAddress(entry.path());
+    if (address && isStaleSocket(entry.path(), *address)) ::unlink(entry.path().c_str());
+  }
 }
 
 std::optional<ListeningSocket> ListeningSocket::handedOver() {

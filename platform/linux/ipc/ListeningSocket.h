@@ -18,6 +18,9 @@ class ListeningSocket {
   // Makes the socket 0600, its directory 0700 when missing. A socket that nobody listens on any
   // more is replaced; one that is alive is an error (EADDRINUSE).
   static std::variant<ListeningSocket, Error> make(const std::string& path);
+  // Removes the sockets in the directory on which nobody listens any more: that of the service, and
+  // those with names of 32 hexadecimal digits. Others, and what is not ours, stay.
+  static void removeDead(const std::string& directory, const std::string& serviceName);
   // The first listening Unix socket that this process was started with.
   static std::optional<ListeningSocket> handedOver();
 
