@@ -47,7 +47,8 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   int pair[2];
   if (::socketpair(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0, pair) != 0) return 0;
   OwnedFd client(pair[0]);
-  const auto bus = adoptSocket(OwnedFd(pair[1]), true);
+  OwnedFd ours(pair[1]);
+  const auto bus = adoptSocket(ours, true);
   if (!bus) return 0;
   sd_bus_slot* slot = nullptr;
   sd_bus_add_filter(bus.get(), &slot, &onMessage, nullptr);

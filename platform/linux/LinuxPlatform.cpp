@@ -63,8 +63,10 @@ std::vector<std::string> profileCandidates(const ConfigurationDirectories& confi
   return candidates;
 }
 
-ipc::SdBusOptions busOptions(const LinuxPlatformOptions& options, const LinuxFileManager& files) {
+ipc::SdBusOptions busOptions(const LinuxPlatformOptions& options, const LinuxFileManager& files,
+                             PathWatcher& watcher) {
   ipc::SdBusOptions bus;
+  bus.watcher = &watcher;
   bus.runtimeDirectory = files.directories().runtime;
   bus.usesSessionBus = options.usesSessionBus;
   return bus;
@@ -153,7 +155,7 @@ struct LinuxPlatform::Services {
         settings(std::make_shared<LinuxSettings>(settingsOptions(files, configuration), files,
                                                  queues, log)),
         knowledge(hostDataHome(options.environment), files, queues, clock, log),
-        interprocess(queues, log, busOptions(options, files)),
+        interprocess(queues, log, limits, busOptions(options, files, watcher)),
         urlSessions(queues, urlServices(settings, networkProxy, meteredNetwork,
                                         {clock, log, files.directories().state + "/urlcache"})) {
     log.showPrivateDataWhen([weak = std::weak_ptr(settings)] {

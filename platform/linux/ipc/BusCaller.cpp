@@ -66,15 +66,27 @@ void BusCaller::_identified(sd_bus_message* answer) {
   const auto* decoded = std::get_if<Decoded>(&outcome);
   if (!decoded) return door_.vanished(name_);
   const auto& credentials = *decoded->values.at(0).get<Dictionary>();
-  const auto number = [&](const char* key) {
+  const auto number = [&](const char* key) -> std::optional<std::uint32_t> {
     const auto found = credentials.find(key);
-    return found == credentials.end() ? nullptr : found->second.get<std::uint32_t>();
+    const auto* value = found == credentials.end() ? nullptr : found->second.get<std::uint32_t>();
+    return value ? std::optional(*value) : std::nullopt;
   };
-  const auto* uid = number("UnixUserID");
-  const auto* pid = number("ProcessID");
-  state_ = uid && *uid == ::geteuid() ? State::Known : State::Refused;
-  if (uid && pid) peer_ = {static_cast<pid_t>(*pid), *uid};
+  const auto refusal = _admit(number("UnixUserID"), number("ProcessID"));
+  state_ = refusal ? State::Refused : State::Known;
+  if (refusal) refusal_ = *refusal;
   for (auto& message : std::exchange(waiting_, {})) take(message.get());
+  // Its next call is a new attempt.
+  if (refusal && refusal->error == kLimitsExceeded) door_.vanished(name_);
+}
+
+std::optional<BusCaller::Refusal> BusCaller::_admit(std::optional<std::uint32_t> uid,
+                                                    std::optional<std::uint32_t> pid) {
+  if (uid != ::geteuid()) return Refusal{kAccessDenied, "another user is served here"};
+  if (pid) peer_ = {static_cast<pid_t>(*pid), *uid};
+  auto share = context_.connections->takeBusCaller(peer_.pid);
+  if (!share) return Refusal{kLimitsExceeded, "too many callers on the bus"};
+  share_ = *std::move(share);
+  return std::nullopt;
 }
 
 void BusCaller::take(sd_bus_message* message) {
@@ -89,26 +101,31 @@ void BusCaller::take(sd_bus_message* message) {
     case State::Known:
       return door_.dispatcher().dispatch(message, *this);
     case State::Refused:
-      return door_.dispatcher().refuse(*plain_, originOf(message), kAccessDenied,
-                                       "another user is served here");
+      return door_.dispatcher().refuse(*plain_, originOf(message), refusal_.error, refusal_.text);
   }
 }
 
-std::shared_ptr<ServedConnection> BusCaller::receiver(const std::string& interface) {
+Receiver BusCaller::receiver(const std::string& interface) {
   const auto& configuration = door_.dispatcher().configuration();
-  if (connection_.connection) return connection_.connection;
-  if (interface == configuration.connectionInterface) {
-    connection_ = _makeSession();
-    ++context_.counts->connections;
-    door_.port().announce(connection_.connection);
-    return connection_.connection;
-  }
+  if (connection_.connection) return {connection_.connection, {}};
+  if (interface == configuration.connectionInterface) return _beginConnection();
   if (!shared_.connection && configuration.sharedHandler) {
     shared_ = _makeSession();
     shared_.connection->setHandler(configuration.sharedHandler);
     shared_.connection->open();
   }
-  return shared_.connection;
+  return {shared_.connection, kUnknownInterface};
+}
+
+Receiver BusCaller::_beginConnection() {
+  auto share = context_.connections->take(peer_.pid);
+  if (!share) return {nullptr, kLimitsExceeded};
+  connection_ = _makeSession();
+  connection_.share = *std::move(share);
+  connection_.holding = context_.memory->add(*this);
+  ++context_.counts->connections;
+  door_.port().announce(connection_.connection);
+  return {connection_.connection, {}};
 }
 
 BusCaller::Session BusCaller::_makeSession() {
@@ -117,7 +134,7 @@ BusCaller::Session BusCaller::_makeSession() {
       [this](MessagePtr message, std::size_t bytes) { door_.send(std::move(message), bytes); },
       [this] { _invalidateConnection(); });
   auto connection = std::make_shared<ServedConnection>(context_, peer_, outlet);
-  return {std::move(outlet), std::move(connection)};
+  return {std::move(outlet), std::move(connection), {}, {}};
 }
 
 void BusCaller::_invalidateConnection() {
@@ -127,8 +144,9 @@ void BusCaller::_invalidateConnection() {
 }
 
 void BusCaller::_endConnection() {
+  if (!connection_.connection) return;
+  connection_.holding.reset();
   const auto session = std::exchange(connection_, {});
-  if (!session.connection) return;
   session.outlet->end();
   session.connection->end();
   --context_.counts->connections;
@@ -145,7 +163,7 @@ void BusCaller::end() {
 
 FileHandle BusCaller::openPrivateConnection() { return door_.openPrivateConnection(peer_); }
 
-// The bus lets no malformed message through; if one comes all the same, it is dropped.
+// Its connection to the bus is not ours to close.
 void BusCaller::cutOff(const std::string& reason) {
   context_.log.error("message of {} dropped: {}", name_, reason);
 }

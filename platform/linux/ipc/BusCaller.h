@@ -1,6 +1,7 @@
 #pragma once
 
 #include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -15,10 +16,11 @@ class BusDoor;
 
 // One unique name that has called us, until it vanishes.
 //
-// States: Checking (the bus driver is asked who it is; calls wait), Known, Refused (another user:
-// every call is denied). Within Known there is at most one client connection, begun by a call of
-// the connection interface. Threading: the loop. Ownership: the bus door.
-class BusCaller final : public Caller {
+// States: Checking (the bus driver is asked who it is; calls wait), Known, Refused (another user,
+// or too many callers of its process: every call is denied). Within Known there is at most one
+// client connection, begun by a call of the connection interface. Threading: the loop. Ownership:
+// the bus door.
+class BusCaller final : public Caller, public ClientMemory::Holder {
  public:
   BusCaller(BusDoor& door, IpcContext& context, sd_bus* bus, std::string name);
   ~BusCaller() override;
@@ -31,10 +33,17 @@ class BusCaller final : public Caller {
 
   // Caller
   Outlet& outlet() override { return *plain_; }
-  std::shared_ptr<ServedConnection> receiver(const std::string& interface) override;
+  Receiver receiver(const std::string& interface) override;
   FileHandle openPrivateConnection() override;
   void cutOff(const std::string& reason) override;
   bool isPrivate() const override { return false; }
+  ServedConnection* connection() override { return connection_.connection.get(); }
+
+  // ClientMemory::Holder, while there is a connection
+  const std::shared_ptr<CallFlow>& calls() const override { return connection_.connection->flow(); }
+  std::size_t messageBytes() const override { return 0; }
+  std::size_t largestMessage() const override { return 0; }
+  void cutOffForMemory() override { _invalidateConnection(); }
 
  private:
   enum class State { Checking, Known, Refused };
@@ -42,12 +51,20 @@ class BusCaller final : public Caller {
   struct Session {
     std::shared_ptr<BusOutlet> outlet;
     std::shared_ptr<ServedConnection> connection;
+    Budget::Share share;
+    Subscription holding;
+  };
+  struct Refusal {
+    std::string_view error;
+    std::string_view text;
   };
 
   static int _onOwnerChanged(sd_bus_message* message, void* self, sd_bus_error* error);
   static int _onCredentials(sd_bus_message* message, void* self, sd_bus_error* error);
   static int _onMatched(sd_bus_message* message, void* self, sd_bus_error* error);
   void _identified(sd_bus_message* answer);
+  std::optional<Refusal> _admit(std::optional<std::uint32_t> uid, std::optional<std::uint32_t> pid);
+  Receiver _beginConnection();
   Session _makeSession();
   void _invalidateConnection();
   void _endConnection();
@@ -61,7 +78,9 @@ class BusCaller final : public Caller {
 
   // Loop state.
   State state_ = State::Checking;
+  Refusal refusal_;
   Peer peer_;
+  Budget::Share share_;
   std::vector<MessagePtr> waiting_;
   Session connection_;
   Session shared_;  // serves the shared handler

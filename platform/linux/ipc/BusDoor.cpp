@@ -9,29 +9,16 @@
 #include <utility>
 
 #include "platform/linux/ipc/Introspection.h"
+#include "platform/linux/ipc/WireEncoding.h"
 
 namespace zelkord::ipc {
 namespace {
 
 constexpr int kBusMessagesInARow = 64;
 // A bus daemon reads always; one that has stopped must not take our memory.
-constexpr std::uint64_t kMostBusMessagesQueued = 16'384;
+constexpr std::size_t kMostBusMessagesQueued = 16'384;
+constexpr std::size_t kMostBusBytesQueued = 64u << 20;
 constexpr std::uint64_t kBusCallTimeoutMicroseconds = 10'000'000;
-
-int openSessionBus(const std::string& address, BusPtr& out) {
-  sd_bus* bus = nullptr;
-  if (address.empty()) {
-    const int r = sd_bus_open_user(&bus);
-    out.reset(bus);
-    return r;
-  }
-  int r = sd_bus_new(&bus);
-  out.reset(bus);
-  if (r >= 0) r = sd_bus_set_address(bus, address.c_str());
-  if (r >= 0) r = sd_bus_set_bus_client(bus, 1);
-  if (r >= 0) r = sd_bus_start(bus);
-  return r;
-}
 
 std::uint64_t monotonicMicroseconds() {
   timespec now{};
@@ -42,14 +29,29 @@ std::uint64_t monotonicMicroseconds() {
 
 }  // namespace
 
+int openSessionBus(const std::string& address, BusPtr& out) {
+  sd_bus* bus = nullptr;
+  int r = 0;
+  if (address.empty()) {
+    r = sd_bus_open_user(&bus);
+    out.reset(bus);
+  } else {
+    r = sd_bus_new(&bus);
+    out.reset(bus);
+    if (r >= 0) r = sd_bus_set_address(bus, address.c_str());
+    if (r >= 0) r = sd_bus_set_bus_client(bus, 1);
+    if (r >= 0) r = sd_bus_start(bus);
+  }
+  if (r < 0) return r;
+  sd_bus_set_method_call_timeout(bus, kBusCallTimeoutMicroseconds);
+  sd_bus_set_exit_on_disconnect(bus, 0);
+  return 0;
+}
+
 BusName acquireBusName(const std::string& address, const std::string& name) {
   BusName result;
   int r = openSessionBus(address, result.bus);
-  if (r >= 0) {
-    sd_bus_set_method_call_timeout(result.bus.get(), kBusCallTimeoutMicroseconds);
-    sd_bus_set_exit_on_disconnect(result.bus.get(), 0);
-    r = sd_bus_request_name(result.bus.get(), name.c_str(), 0);
-  }
+  if (r >= 0) r = sd_bus_request_name(result.bus.get(), name.c_str(), 0);
   if (r >= 0) {
     result.outcome = BusName::Outcome::Owned;
     return result;
@@ -62,20 +64,23 @@ BusName acquireBusName(const std::string& address, const std::string& name) {
 
 BusDoor::BusDoor(IpcContext& context, BusPtr bus, ListenerConfiguration configuration,
                  std::shared_ptr<ListenerDelegate> delegate, std::string serviceInterface,
-                 OpenPrivate openPrivate)
+                 OpenPrivate openPrivate, Events events)
     : context_(context),
       port_(std::make_shared<DelegatePort>(context, std::move(delegate))),
       openPrivate_(std::move(openPrivate)),
+      events_(std::move(events)),
       dispatcher_(context, std::move(configuration), std::move(serviceInterface)),
       bus_(std::move(bus)) {}
+
+BusDoor::~BusDoor() { close(); }
 
 void BusDoor::start() {
   sd_bus_slot* slot = nullptr;
   sd_bus_add_filter(bus_.get(), &slot, &BusDoor::_onMessage, this);
   filter_.reset(slot);
-  events_ = EPOLLIN;
+  waitsFor_ = EPOLLIN;
   watch_ =
-      context_.loop.watch(sd_bus_get_fd(bus_.get()), events_, [this](std::uint32_t) { _pump(); });
+      context_.loop.watch(sd_bus_get_fd(bus_.get()), waitsFor_, [this](std::uint32_t) { _pump(); });
   _pump();
 }
 
@@ -84,8 +89,41 @@ void BusDoor::close() {
   watch_.reset();
   timeout_.reset();
   callers_.clear();
+  nameRequest_.reset();
   filter_.reset();
   bus_.reset();
+}
+
+void BusDoor::requestName(const std::string& name, std::function<void(NameAnswer)> answered) {
+  nameAnswered_ = std::move(answered);
+  sd_bus_slot* slot = nullptr;
+  const int r = sd_bus_request_name_async(bus_.get(), &slot, name.c_str(), SD_BUS_NAME_QUEUE,
+                                          &BusDoor::_onNameAnswer, this);
+  nameRequest_.reset(slot);
+  if (r < 0) return lose();
+  _updateWaiting();
+}
+
+int BusDoor::_onNameAnswer(sd_bus_message* message, void* self, sd_bus_error*) {
+  constexpr std::uint32_t kPrimaryOwner = 1;
+  constexpr std::uint32_t kInQueue = 2;
+  constexpr std::uint32_t kAlreadyOwner = 4;
+  std::uint32_t code = 0;
+  if (sd_bus_message_is_method_error(message, nullptr) <= 0) {
+    sd_bus_message_read(message, "u", &code);
+  }
+  auto answer = NameAnswer::Failed;
+  if (code == kPrimaryOwner || code == kAlreadyOwner) answer = NameAnswer::Owned;
+  if (code == kInQueue) answer = NameAnswer::Queued;
+  static_cast<BusDoor*>(self)->nameAnswered_(answer);
+  return 1;
+}
+
+void BusDoor::_takeDriverSignal(sd_bus_message* signal) {
+  const char* name = nullptr;
+  if (sd_bus_message_is_signal(signal, "org.freedesktop.DBus", "NameAcquired") <= 0) return;
+  if (sd_bus_message_read(signal, "s", &name) > 0) events_.nameAcquired(name);
+  sd_bus_message_rewind(signal, 1);
 }
 
 int BusDoor::_onMessage(sd_bus_message* message, void* self, sd_bus_error*) {
@@ -96,10 +134,20 @@ int BusDoor::_take(sd_bus_message* message) {
   std::uint8_t type = 0;
   sd_bus_message_get_type(message, &type);
   const char* interface = sd_bus_message_get_interface(message);
-  if (type != SD_BUS_MESSAGE_METHOD_CALL) return 0;
-  if (interface && std::strcmp(interface, "org.freedesktop.DBus.Peer") == 0) return 0;
   const char* sender = sd_bus_message_get_sender(message);
+  if (sender && std::strcmp(sender, "org.freedesktop.DBus") == 0) _takeDriverSignal(message);
+  const bool isPeer = interface && std::strcmp(interface, "org.freedesktop.DBus.Peer") == 0;
+  if (type != SD_BUS_MESSAGE_METHOD_CALL || isPeer) {
+    const auto found = callers_.find(sender ? sender : "");
+    if (found != callers_.end()) Dispatcher::noteMessage(*found->second);
+    return 0;
+  }
   if (!sender) return 1;
+  if (callers_.size() >= context_.connections->mostBusCallers() && !callers_.contains(sender)) {
+    context_.limits.refused("bus_callers", sender);
+    sd_bus_reply_method_errorf(message, kLimitsExceeded.data(), "too many callers on the bus");
+    return 1;
+  }
   auto& caller = callers_[sender];
   if (!caller) {
     caller = std::make_unique<BusCaller>(*this, context_, bus_.get(), sender);
@@ -110,9 +158,10 @@ int BusDoor::_take(sd_bus_message* message) {
 }
 
 void BusDoor::_pump() {
+  if (!watch_) return;  // lost, and about to be destroyed
   for (int i = 0; i < kBusMessagesInARow; ++i) {
     const int r = sd_bus_process(bus_.get(), nullptr);
-    if (r < 0) return _lost();
+    if (r < 0) return lose();
     if (r == 0) return _updateWaiting();
   }
   _updateWaiting();
@@ -126,11 +175,11 @@ void BusDoor::_pump() {
 
 // Waits for what sd-bus waits for: its descriptor, and the end of a call to the driver.
 void BusDoor::_updateWaiting() {
-  std::uint64_t writes = 0;
-  sd_bus_get_n_queued_write(bus_.get(), &writes);
-  const std::uint32_t events = writes > 0 ? EPOLLIN | EPOLLOUT : EPOLLIN;
-  if (std::exchange(events_, events) != events) {
-    context_.loop.changeEvents(sd_bus_get_fd(bus_.get()), events);
+  if (!watch_) return;
+  // poll's events are epoll's.
+  const auto wanted = static_cast<std::uint32_t>(std::max(0, sd_bus_get_events(bus_.get())));
+  if (std::exchange(waitsFor_, wanted) != wanted) {
+    context_.loop.changeEvents(sd_bus_get_fd(bus_.get()), wanted);
   }
   std::uint64_t due = UINT64_MAX;
   if (sd_bus_get_timeout(bus_.get(), &due) < 0 || due == UINT64_MAX) return timeout_.reset();
@@ -139,13 +188,21 @@ void BusDoor::_updateWaiting() {
                                  [this] { _pump(); });
 }
 
-void BusDoor::send(MessagePtr message, std::size_t) {
-  std::uint64_t writes = 0;
-  sd_bus_get_n_queued_write(bus_.get(), &writes);
-  if (writes >= kMostBusMessagesQueued) return;
+void BusDoor::send(MessagePtr message, std::size_t bytes) {
+  if (!_hasRoomToSend()) return context_.limits.refused("bus_messages", "the session bus");
   const int r = sd_bus_send(bus_.get(), message.get(), nullptr);
   if (r < 0) context_.log.error("message not sent on the bus: {}", std::strerror(-r));
+  queued_.push_back(bytes);
+  queuedBytes_ += bytes;
   if (!pumpsSoon_) _updateWaiting();
+}
+
+// What sd-bus sends by itself is small and not counted.
+bool BusDoor::_hasRoomToSend() {
+  std::uint64_t writes = 0;
+  sd_bus_get_n_queued_write(bus_.get(), &writes);
+  for (; queued_.size() > writes; queued_.pop_front()) queuedBytes_ -= queued_.front();
+  return queued_.size() < kMostBusMessagesQueued && queuedBytes_ < kMostBusBytesQueued;
 }
 
 void BusDoor::signal(const std::string& destination, const std::string& interface,
@@ -157,7 +214,7 @@ void BusDoor::signal(const std::string& destination, const std::string& interfac
   }
   MessagePtr owned(message);
   if (!destination.empty()) sd_bus_message_set_destination(message, destination.c_str());
-  if (text) sd_bus_message_append_basic(message, 's', text->c_str());
+  if (text) sd_bus_message_append_basic(message, 's', wireText(*text).c_str());
   send(std::move(owned), 256);
 }
 
@@ -170,14 +227,12 @@ void BusDoor::vanished(const std::string& name) {
   });
 }
 
-void BusDoor::_lost() {
-  context_.log.error("the session bus is gone; the private socket is still served");
+void BusDoor::lose() {
+  if (!watch_) return;
   watch_.reset();
   timeout_.reset();
   for (const auto& [name, caller] : callers_) caller->end();
-  context_.loop.soon([self = self_] {
-    if (*self) (*self)->close();
-  });
+  events_.lost();
 }
 
 }  // namespace zelkord::ipc

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <deque>
 #include <functional>
 #include <memory>
 #include <optional>
@@ -24,22 +25,35 @@ struct BusName {
   int error = 0;  // errno; of the last two outcomes
 };
 BusName acquireBusName(const std::string& address, const std::string& name);
+// Only connects; never blocks. Empty address: the session's own bus. Zero or a negative errno.
+int openSessionBus(const std::string& address, BusPtr& out);
 
 // The door on the session bus.
 //
 // States: serving; closed, by us or because the bus went away: its connections have then ended.
-// Threading: the loop, except `port`. Ownership: the transport; `close` first, then
-// destroy.
+// Threading: the loop, except `port`. Ownership: whoever hears of its events; destroyed when
+// nothing of it is on the stack.
 class BusDoor final {
  public:
   using OpenPrivate = std::function<FileHandle(Peer)>;
+  struct Events {
+    std::function<void()> lost;  // once
+    // A name that the bus has given us.
+    std::function<void(const std::string& name)> nameAcquired;
+  };
+  enum class NameAnswer { Owned, Queued, Failed };
 
   BusDoor(IpcContext& context, BusPtr bus, ListenerConfiguration configuration,
           std::shared_ptr<ListenerDelegate> delegate, std::string serviceInterface,
-          OpenPrivate openPrivate);
+          OpenPrivate openPrivate, Events events);
+  ~BusDoor();
 
   void start();
   void close();
+  // Asks for the name, and to be given it later when another program has it.
+  void requestName(const std::string& name, std::function<void(NameAnswer)> answered);
+  // As if the bus had gone.
+  void lose();
   // A signal with one string, or without; to everybody when `destination` is empty.
   void signal(const std::string& destination, const std::string& interface,
               const std::string& member, std::optional<std::string> text);
@@ -57,12 +71,15 @@ class BusDoor final {
   int _take(sd_bus_message* message);
   void _pump();
   void _updateWaiting();
-  void _lost();
+  bool _hasRoomToSend();
+  void _takeDriverSignal(sd_bus_message* signal);
+  static int _onNameAnswer(sd_bus_message* message, void* self, sd_bus_error* error);
 
   // Fixed after construction.
   IpcContext& context_;
   const std::shared_ptr<DelegatePort> port_;
   const OpenPrivate openPrivate_;
+  const Events events_;
 
   // Loop state.
   Dispatcher dispatcher_;
@@ -71,7 +88,11 @@ class BusDoor final {
   Subscription watch_;
   Subscription timeout_;
   bool pumpsSoon_ = false;
-  std::uint32_t events_ = 0;
+  std::uint32_t waitsFor_ = 0;
+  std::deque<std::size_t> queued_;  // sizes of the messages that wait, oldest first
+  std::size_t queuedBytes_ = 0;
+  SlotPtr nameRequest_;
+  std::function<void(NameAnswer)> nameAnswered_;
   std::unordered_map<std::string, std::unique_ptr<BusCaller>> callers_;
   // For tasks that may run after the end.
   const std::shared_ptr<BusDoor*> self_ = std::make_shared<BusDoor*>(this);

@@ -9,7 +9,6 @@ namespace zelkord::ipc {
 namespace {
 
 constexpr std::string_view kUnknownMethod = "org.freedesktop.DBus.Error.UnknownMethod";
-constexpr std::string_view kUnknownInterface = "org.freedesktop.DBus.Error.UnknownInterface";
 constexpr std::string_view kUnknownObject = "org.freedesktop.DBus.Error.UnknownObject";
 constexpr std::string_view kUnknownProperty = "org.freedesktop.DBus.Error.UnknownProperty";
 
@@ -40,15 +39,24 @@ Dispatcher::Dispatcher(IpcContext& context, ListenerConfiguration configuration,
 void Dispatcher::dispatch(sd_bus_message* message, Caller& caller) {
   std::uint8_t type = 0;
   sd_bus_message_get_type(message, &type);
-  if (type != SD_BUS_MESSAGE_METHOD_CALL) return;
+  if (type == SD_BUS_MESSAGE_METHOD_CALL && _dispatchCall(message, caller)) return;
+  noteMessage(caller);
+}
+
+void Dispatcher::noteMessage(Caller& caller) {
+  if (auto* connection = caller.connection()) connection->messageArrived();
+}
+
+bool Dispatcher::_dispatchCall(sd_bus_message* message, Caller& caller) {
   ++context_.counts->calls;
   const Target target{orEmpty(sd_bus_message_get_path(message)),
                       orEmpty(sd_bus_message_get_interface(message)),
                       orEmpty(sd_bus_message_get_member(message))};
-  if (caller.isPrivate() && _answerBusDriver(message, target, caller)) return;
-  if (_answerStandard(message, target, caller)) return;
+  if (caller.isPrivate() && _answerBusDriver(message, target, caller)) return false;
+  if (_answerStandard(message, target, caller)) return false;
   if (target.path == kObjectPath) return _callObject(message, target, caller);
   refuse(caller.outlet(), originOf(message), kUnknownObject, "no object at " + target.path);
+  return false;
 }
 
 void Dispatcher::refuse(Outlet& outlet, const CallOrigin& origin, std::string_view error,
@@ -100,7 +108,7 @@ void Dispatcher::_answerProperties(sd_bus_message* message, const Target& target
   }
 }
 
-void Dispatcher::_callObject(sd_bus_message* message, const Target& target, Caller& caller) {
+bool Dispatcher::_callObject(sd_bus_message* message, const Target& target, Caller& caller) {
   const auto origin = originOf(message);
   const Interface* interface = _interface(target.interface);
   const Method* method = interface ? methodOf(*interface, target.member) : nullptr;
@@ -112,15 +120,30 @@ void Dispatcher::_callObject(sd_bus_message* message, const Target& target, Call
       }
     }
   }
-  if (!method) return _refuseUnknown(origin, target, caller);
+  if (!method) {
+    _refuseUnknown(origin, target, caller);
+    return false;
+  }
   auto outcome = decodeArguments(message, method->in, configuration_->limits);
   if (const auto* failure = std::get_if<DecodeFailure>(&outcome)) {
-    if (failure->kind == DecodeFailure::Kind::Malformed) return caller.cutOff(failure->text);
-    const bool isType = failure->kind == DecodeFailure::Kind::WrongType;
-    return refuse(caller.outlet(), origin, isType ? kInvalidArgs : kLimitsExceeded, failure->text);
+    _refuseArguments(origin, *failure, caller);
+    return false;
   }
-  if (interface->name == serviceInterface_ && method->name == "Open") return _open(origin, caller);
-  _deliver(origin, *interface, *method, std::get<Decoded>(std::move(outcome)), caller);
+  if (interface->name == serviceInterface_ && method->name == "Open") {
+    _open(origin, caller);
+    return false;
+  }
+  return _deliver(origin, *interface, *method, std::get<Decoded>(std::move(outcome)), caller);
+}
+
+void Dispatcher::_refuseArguments(const CallOrigin& origin, const DecodeFailure& failure,
+                                  Caller& caller) {
+  using Kind = DecodeFailure::Kind;
+  // A bus lets texts through that sd-bus does not take for any, and its callers are not ours to cut
+  // off.
+  if (failure.kind == Kind::Malformed && caller.isPrivate()) return caller.cutOff(failure.text);
+  refuse(caller.outlet(), origin, failure.kind == Kind::OverLimit ? kLimitsExceeded : kInvalidArgs,
+         failure.text);
 }
 
 void Dispatcher::_refuseUnknown(const CallOrigin& origin, const Target& target, Caller& caller) {
@@ -130,19 +153,23 @@ void Dispatcher::_refuseUnknown(const CallOrigin& origin, const Target& target, 
          "no method " + target.interface + "." + target.member);
 }
 
-void Dispatcher::_deliver(const CallOrigin& origin, const Interface& interface,
+bool Dispatcher::_deliver(const CallOrigin& origin, const Interface& interface,
                           const Method& method, Decoded decoded, Caller& caller) {
-  const auto receiver = caller.receiver(interface.name);
+  const auto [receiver, error] = caller.receiver(interface.name);
   if (!receiver) {
-    return refuse(caller.outlet(), origin, kUnknownInterface, "nobody serves " + interface.name);
+    refuse(caller.outlet(), origin, error, "nobody can serve " + interface.name);
+    return false;
   }
-  if (!receiver->flow().hasRoom(decoded.bytes)) {
-    return refuse(caller.outlet(), origin, kLimitsExceeded, "too many calls under way");
+  auto share = receiver->flow()->take(decoded.bytes);
+  if (!share) {
+    refuse(caller.outlet(), origin, kLimitsExceeded, "too many calls under way");
+    return false;
   }
   auto reply = std::make_shared<PendingReply>(
       receiver->route(), origin, std::shared_ptr<const Method>(configuration_, &method),
-      receiver->flow().take(decoded.bytes));
+      *std::move(share));
   receiver->deliver({interface.name, method.name, std::move(decoded.values), std::move(reply)});
+  return true;
 }
 
 void Dispatcher::_open(const CallOrigin& origin, Caller& caller) {

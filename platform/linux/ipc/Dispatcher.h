@@ -13,19 +13,29 @@
 
 namespace zelkord::ipc {
 
+inline constexpr std::string_view kUnknownInterface = "org.freedesktop.DBus.Error.UnknownInterface";
+
+// Who gets a call; without a connection, the error that its caller gets.
+struct Receiver {
+  std::shared_ptr<ServedConnection> connection;
+  std::string_view error;
+};
+
 // Who made a call, as its door knows it.
 // Threading: the loop.
 class Caller {
  public:
   virtual ~Caller() = default;
   virtual Outlet& outlet() = 0;
-  // Who gets the calls of that interface; null: nobody.
-  virtual std::shared_ptr<ServedConnection> receiver(const std::string& interface) = 0;
+  // Who gets the calls of that interface.
+  virtual Receiver receiver(const std::string& interface) = 0;
   // A new private connection for the caller; an invalid handle when there is none to be had.
   virtual FileHandle openPrivateConnection() = 0;
   // Not the user we serve, or a message that cannot be one.
   virtual void cutOff(const std::string& reason) = 0;
   virtual bool isPrivate() const = 0;
+  // The connection that its messages keep from being idle, whoever answers them; null: none.
+  virtual ServedConnection* connection() = 0;
 };
 
 // Takes a method call apart: answers what every D-Bus peer is asked, checks and decodes the rest,
@@ -42,6 +52,8 @@ class Dispatcher {
 
   const ListenerConfiguration& configuration() const { return *configuration_; }
   void dispatch(sd_bus_message* message, Caller& caller);
+  // Tells the caller's connection of a message that goes nowhere else.
+  static void noteMessage(Caller& caller);
   // Answers with an error of the transport itself.
   void refuse(Outlet& outlet, const CallOrigin& origin, std::string_view error,
               std::string_view text);
@@ -53,12 +65,15 @@ class Dispatcher {
     std::string member;
   };
 
+  // True when the call is on its way to a handler.
+  bool _dispatchCall(sd_bus_message* message, Caller& caller);
   bool _answerBusDriver(sd_bus_message* message, const Target& target, Caller& caller);
   bool _answerStandard(sd_bus_message* message, const Target& target, Caller& caller);
   void _answerProperties(sd_bus_message* message, const Target& target, Caller& caller);
-  void _callObject(sd_bus_message* message, const Target& target, Caller& caller);
+  bool _callObject(sd_bus_message* message, const Target& target, Caller& caller);
+  void _refuseArguments(const CallOrigin& origin, const DecodeFailure& failure, Caller& caller);
   void _refuseUnknown(const CallOrigin& origin, const Target& target, Caller& caller);
-  void _deliver(const CallOrigin& origin, const Interface& interface, const Method& method,
+  bool _deliver(const CallOrigin& origin, const Interface& interface, const Method& method,
                 Decoded decoded, Caller& caller);
   void _open(const CallOrigin& origin, Caller& caller);
   const Interface* _interface(const std::string& name) const;

@@ -1,7 +1,9 @@
 #include <fcntl.h>
 #include <gtest/gtest.h>
 
+#include "platform/linux/ipc/BusPresence.h"
 #include "platform/linux/ipc/IpcTestSupport.h"
+#include "platform/linux/watch/PathWatcher.h"
 
 namespace zelkord::ipc {
 namespace {
@@ -55,6 +57,48 @@ TEST_P(DoorsTest, EveryCallIsAnsweredOrRefused) {
   EXPECT_EQ(client.call(known, "Handle", ""), "");
   EXPECT_EQ(server_.interprocess->statistics().connections, 1u);
   EXPECT_EQ(server_.interprocess->statistics().refused, 6u);
+}
+
+TEST_P(DoorsTest, TheHandlerHearsOfEveryMessage) {
+  auto client = this->client();
+  const std::string tooLong(65'537, 'x');
+  ASSERT_EQ(client.call(kTestInterface, "Echo", "s", "begin"), "");
+  const std::pair<const char*, std::function<void()>> cases[] = {
+      {"Peer", [&] { client.call("org.freedesktop.DBus.Peer", "Ping", ""); }},
+      {"Introspectable",
+       [&] { client.call("org.freedesktop.DBus.Introspectable", "Introspect", ""); }},
+      {"Properties",
+       [&] { client.call("org.freedesktop.DBus.Properties", "GetAll", "s", kTestInterface); }},
+      {"wrong signature", [&] { client.call(kTestInterface, "Echo", ""); }},
+      {"unknown member", [&] { client.call(kTestInterface, "Nothing", ""); }},
+      {"over a limit", [&] { client.call(kTestInterface, "Echo", "s", tooLong.c_str()); }},
+      {"signal", [&] { client.send(client.newSignal()); }},
+  };
+  int expected = server_.delegate->otherMessages;
+  for (const auto& [name, send] : cases) {
+    SCOPED_TRACE(name);
+    send();
+    ++expected;
+    EXPECT_TRUE(client.processUntil([&] { return server_.delegate->otherMessages == expected; }));
+  }
+  EXPECT_EQ(server_.delegate->calls, 1);
+}
+
+TEST_P(DoorsTest, NoncharactersArriveAsReplacementCharacters) {
+  auto client = this->client();
+  server_.delegate->onCall = [](const Call& call, const auto&) {
+    if (call.member == "Echo") {
+      call.reply->send(
+          {"a\xEF\xBF\xBE \xEF\xB7\x90 \xEF\xB7\xAF \xF0\x9F\xBF\xBF \xF4\x8F\xBF\xBEz"});
+    } else {
+      call.reply->fail("com.quenta.zelkord.Error.Refused", "no \xEF\xBF\xBF");
+    }
+  };
+  const std::string replaced = "\xEF\xBF\xBD";
+  EXPECT_EQ(client.call(kTestInterface, "Echo", "s", ""), "");
+  EXPECT_EQ(client.replyText(), "a" + replaced + " " + replaced + " " + replaced + " " + replaced +
+                                    " " + replaced + "z");
+  EXPECT_EQ(client.call(kTestInterface, "Refuse", ""), "com.quenta.zelkord.Error.Refused");
 }
 
 TEST_P(DoorsTest, TheDaemonKnowsWhoCallsAndCallsBack) {
@@ -158,6 +202,25 @@ TEST(BusDoorTest, OnlyTheConnectionInterfaceBeginsAConnection) {
   EXPECT_EQ(client.replyText(), "connected");
 }
 
+// sd-bus sends no such text; the bus lets it pass.
+TEST(BusDoorTest, ANoncharacterInACallIsAnsweredWithInvalidArgs) {
+  IpcTestServer server(true);
+  ASSERT_FALSE(server.listen());
+  for (const std::string character : {"fffe", "ffff", "fdd0", "0010ffff"}) {
+    SCOPED_TRACE(character);
+    const auto escape = (character.size() == 4 ? "\\u" : "\\U") + character;
+    const auto answer = server.directory.path() + "/answer";
+    const auto command = "gdbus call --timeout 10 --address " + server.bus->address() + " -d " +
+                         kTestService + " -o " + kTestPath + " -m " + kTestInterface +
+                         ".Echo \"'x" + escape + "'\" 2>" + answer;
+    EXPECT_NE(std::system(command.c_str()), 0);
+    std::ifstream file(answer);
+    const std::string text{std::istreambuf_iterator<char>(file), {}};
+    EXPECT_NE(text.find("InvalidArgs"), std::string::npos) << text;
+  }
+  EXPECT_EQ(server.interprocess->statistics().refused, 4u);
+}
+
 TEST(BusDoorTest, ANameOrSocketThatIsTakenFailsAndLeavesTheOtherOnesAlone) {
   IpcTestServer server(true);
   ASSERT_FALSE(server.listen());
@@ -166,7 +229,7 @@ TEST(BusDoorTest, ANameOrSocketThatIsTakenFailsAndLeavesTheOtherOnesAlone) {
     options.runtimeDirectory = server.directory.path() + folder;
     options.usesHandedOverSocket = false;
     options.sessionBusAddress = server.bus->address();
-    SdBusInterprocess second(server.queues, server.log, options);
+    SdBusInterprocess second(server.queues, server.log, server.limits, options);
     const auto error = second.listen(kTestService, ipcTestConfiguration(), server.delegate);
     ASSERT_TRUE(error);
     EXPECT_EQ(error->code, code);
@@ -221,6 +284,89 @@ TEST(BusDoorTest, ABusThatGoesAwayEndsItsClientsOnly) {
   EXPECT_TRUE(eventually([&] { return server.delegate->invalidated == 1; }));
   server.interprocess->postNotification("com.quenta.test");
   EXPECT_EQ(onSocket.call(kTestInterface, "Echo", "s", ""), "");
+}
+
+TEST(BusDoorTest, ABusThatComesBackIsJoinedAgain) {
+  for (const bool watches : {true, false}) {
+    SCOPED_TRACE(watches);
+    RecordingLog log;
+    PathWatcher watcher(log);
+    IpcTestServer server(true, [&](SdBusOptions& options) {
+      if (watches) options.watcher = &watcher;
+    });
+    ASSERT_FALSE(server.listen());
+    auto onSocket = server.socketClient();
+    ASSERT_EQ(onSocket.call(kTestInterface, "Echo", "s", ""), "");
+    for (int i = 0; i < 2; ++i) {
+      server.bus->stop();
+      ASSERT_TRUE(eventually([&] { return server.log.count(LogLevel::Error) == i + 1; }));
+      server.bus->start();
+      ASSERT_TRUE(eventually([&] {
+        auto onBus = server.busClient();
+        return onBus.call(kTestInterface, "Echo", "s", "").empty();
+      }));
+      EXPECT_EQ(onSocket.call(kTestInterface, "Echo", "s", ""), "");
+    }
+    EXPECT_EQ(server.log.count(LogLevel::Error), 2);
+    server.interprocess.reset();
+  }
+}
+
+TEST(BusDoorTest, ABusThatComesLateIsJoinedAndItsNameTakenWhenItIsFree) {
+  RecordingLog log;
+  PathWatcher watcher(log);
+  IpcTestDirectory directory;
+  IpcTestBus bus(directory.path());
+  const auto alias = directory.path() + "/alias";
+  std::optional<IpcTestClient> owner(std::in_place, bus.address(), true);
+  ASSERT_GE(sd_bus_request_name(owner->bus(), kTestService, 0), 0);
+  IpcTestServer server(false, [&](SdBusOptions& options) {
+    options.usesSessionBus = true;
+    options.sessionBusAddress = "unix:path=" + alias;
+    options.watcher = &watcher;
+  });
+  ASSERT_FALSE(server.listen());
+  std::filesystem::create_symlink(bus.socket(), alias);
+  EXPECT_TRUE(eventually([&] { return server.log.contains("is taken on the session bus"); }));
+  owner.reset();
+  EXPECT_TRUE(eventually([&] { return server.log.contains("is served on the session bus"); }));
+  IpcTestClient client(bus.address(), true);
+  EXPECT_EQ(client.call(kTestInterface, "Echo", "s", ""), "");
+  EXPECT_EQ(server.log.count(LogLevel::Error), 2);  // no bus, then the name
+  server.interprocess.reset();
+}
+
+TEST(BusDoorTest, WhatABusDoesNotReadIsBounded) {
+  IpcTestServer server(true);
+  ASSERT_FALSE(server.listen());
+  server.bus->signal(SIGSTOP);
+  const std::string key = "com.quenta.zelkord.limit.bus_messages";
+  auto onSocket = server.socketClient();
+  for (int i = 0; i < 400 && server.counters.value(key) == 0; ++i) {
+    for (int j = 0; j < 200; ++j) server.interprocess->postNotification("com.quenta.test");
+    EXPECT_EQ(onSocket.call(kTestInterface, "Echo", "s", ""), "");  // all of them are sent by then
+  }
+  EXPECT_GT(server.counters.value(key), 0);
+  server.bus->signal(SIGCONT);
+  auto client = server.busClient();
+  EXPECT_EQ(client.call(kTestInterface, "Echo", "s", ""), "");
+}
+
+TEST(BusPresenceTest, WaitsLongerAfterEachAttemptAndKnowsTheSocketOfAnAddress) {
+  for (const auto& [attempts, delay] : {std::pair{0, Duration(100ms)},
+                                        {1, Duration(200ms)},
+                                        {9, Duration(51'200ms)},
+                                        {10, Duration(60s)},
+                                        {1'000'000, Duration(60s)}}) {
+    EXPECT_EQ(rejoinDelay(attempts), delay) << attempts;
+  }
+  const std::pair<std::string, std::string> addresses[] = {
+      {"unix:path=/run/user/1/bus", "/run/user/1/bus"},
+      {"unix:path=/a%20b%2fc,guid=7;unix:path=/other", "/a b/c"},
+      {"unix:path=/cut%2", "/cut%2"},
+      {"unix:abstract=/x", ""},
+      {"", ""}};
+  for (const auto& [address, path] : addresses) EXPECT_EQ(socketPathOf(address), path) << address;
 }
 
 TEST(BusDoorTest, NotificationsReachTheBusAndPrivateConnections) {

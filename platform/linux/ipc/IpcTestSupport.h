@@ -30,6 +30,7 @@
 #include "platform/linux/ipc/SdBusInterprocess.h"
 #include "platform/linux/queues/LinuxClock.h"
 #include "platform/linux/queues/LinuxWorkQueues.h"
+#include "platform/testing/FakeCounters.h"
 #include "platform/testing/RecordingLog.h"
 
 namespace zelkord::ipc {
@@ -68,30 +69,34 @@ class IpcTestDirectory {
 // A session bus of our own.
 class IpcTestBus {
  public:
-  explicit IpcTestBus(const std::string& directory) {
-    const auto socket = directory + "/bus";
-    const auto configuration = directory + "/bus.conf";
-    std::ofstream(configuration)
-        << "<busconfig><type>session</type><listen>unix:path=" << socket
+  explicit IpcTestBus(const std::string& directory)
+      : socket_(directory + "/bus"), configuration_(directory + "/bus.conf") {
+    std::ofstream(configuration_)
+        << "<busconfig><type>session</type><listen>unix:path=" << socket_
         << "</listen><auth>EXTERNAL</auth><policy context='default'><allow send_destination='*'"
         << " eavesdrop='true'/><allow eavesdrop='true'/><allow own='*'/></policy>"
         << "<limit name='max_replies_per_connection'>50000</limit></busconfig>";
-    const auto option = "--config-file=" + configuration;
+    start();
+  }
+  ~IpcTestBus() { stop(); }
+  // Again, at the same address.
+  void start() {
+    const auto option = "--config-file=" + configuration_;
     const char* arguments[] = {"dbus-daemon", option.c_str(), "--nofork", "--nopidfile", nullptr};
     if (::posix_spawnp(&pid_, arguments[0], nullptr, nullptr, const_cast<char**>(arguments),
                        environ) != 0) {
       ADD_FAILURE() << "dbus-daemon does not start";
     }
-    address_ = "unix:path=" + socket;
-    if (!eventually([&] { return _accepts(socket); })) ADD_FAILURE() << "dbus-daemon is silent";
+    if (!eventually([&] { return _accepts(socket_); })) ADD_FAILURE() << "dbus-daemon is silent";
   }
-  ~IpcTestBus() { stop(); }
+  void signal(int number) { ::kill(pid_, number); }
   void stop() {
     if (pid_ <= 0) return;
     ::kill(pid_, SIGTERM);
     ::waitpid(std::exchange(pid_, 0), nullptr, 0);
   }
-  const std::string& address() const { return address_; }
+  std::string address() const { return "unix:path=" + socket_; }
+  const std::string& socket() const { return socket_; }
 
  private:
   // The socket's file is there a moment before anybody listens.
@@ -102,18 +107,23 @@ class IpcTestBus {
     return ::connect(socket.get(), reinterpret_cast<sockaddr*>(&address), sizeof(address)) == 0;
   }
 
+  const std::string socket_;
+  const std::string configuration_;
   pid_t pid_ = 0;
-  std::string address_;
 };
 
-// A handler made of a function.
+// A handler made of functions.
 class IpcTestHandler final : public CallHandler {
  public:
-  explicit IpcTestHandler(std::function<void(Call)> function) : function_(std::move(function)) {}
+  explicit IpcTestHandler(
+      std::function<void(Call)> function, std::function<void()> arrived = [] {})
+      : function_(std::move(function)), arrived_(std::move(arrived)) {}
   void handle(Call call) override { function_(std::move(call)); }
+  void messageArrived() override { arrived_(); }
 
  private:
   const std::function<void(Call)> function_;
+  const std::function<void()> arrived_;
 };
 
 // Admits everybody unless told otherwise; keeps every connection's weak reference.
@@ -127,6 +137,8 @@ class IpcTestDelegate final : public ListenerDelegate {
   std::atomic<int> placesTaken = 0;
   std::atomic<int> begun = 0;
   std::atomic<int> invalidated = 0;
+  std::atomic<int> calls = 0;
+  std::atomic<int> otherMessages = 0;
 
   void admit(const Peer& peer, Decide decide) override {
     ++admitted;
@@ -136,9 +148,12 @@ class IpcTestDelegate final : public ListenerDelegate {
   void connectionBegan(const std::shared_ptr<Connection>& connection) override {
     ++begun;
     const std::weak_ptr<Connection> weak = connection;
-    connection->setHandler(std::make_shared<IpcTestHandler>([this, weak](Call call) {
-      if (const auto open = weak.lock()) onCall(std::move(call), open);
-    }));
+    connection->setHandler(std::make_shared<IpcTestHandler>(
+        [this, weak](Call call) {
+          ++calls;
+          if (const auto open = weak.lock()) onCall(std::move(call), open);
+        },
+        [this] { ++otherMessages; }));
     connection->setInvalidationHandler([this] { ++invalidated; });
     const std::lock_guard lock(mutex_);
     connections_.push_back(weak);
@@ -210,6 +225,12 @@ class IpcTestClient {
     sd_bus_message* message = nullptr;
     sd_bus_message_new_method_call(bus_.get(), &message, kTestService, kTestPath, kTestInterface,
                                    member);
+    return MessagePtr(message);
+  }
+  MessagePtr newSignal() {
+    sd_bus_message* message = nullptr;
+    sd_bus_message_new_signal(bus_.get(), &message, kTestPath, "com.quenta.zelkord.Client1", "Any");
+    sd_bus_message_set_destination(message, kTestService);
     return MessagePtr(message);
   }
   // Sends without waiting; the answer is dropped.
@@ -339,7 +360,7 @@ class IpcTestServer {
     }
     if (change) change(options);
     delegate->onCall = answerIpcTestCall;
-    interprocess.emplace(queues, log, options);
+    interprocess.emplace(queues, log, limits, options);
     socketPath = options.runtimeDirectory + "/" + options.socketName;
   }
   ~IpcTestServer() { interprocess.reset(); }
@@ -357,6 +378,8 @@ class IpcTestServer {
   LinuxClock clock;
   RecordingLog log;
   std::shared_ptr<IpcTestDelegate> delegate = std::make_shared<IpcTestDelegate>();
+  FakeCounters counters;
+  LimitReports limits{clock, counters, Logger(log, "limits")};
   LinuxWorkQueues queues{clock};
   std::optional<SdBusInterprocess> interprocess;
   std::string socketPath;

@@ -23,6 +23,8 @@ class MessageGate {
   explicit MessageGate(std::size_t limit) : limit_(limit) {}
 
   bool isBetweenMessages() const { return !expected_; }
+  // What sd-bus keeps room for while a message is not whole; zero between messages.
+  std::size_t unfinishedBytes() const { return expected_.value_or(0); }
   // False: too large, or not a message.
   bool begin(const MessageHeader& header);
   // The message has come.

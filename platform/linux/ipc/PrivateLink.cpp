@@ -28,12 +28,12 @@ std::size_t bytesToRead(int fd) {
 }  // namespace
 
 PrivateLink::PrivateLink(PrivateListener& listener, IpcContext& context, BusPtr bus, Peer peer,
-                         Subscription place)
+                         Admission admission)
     : listener_(listener),
       context_(context),
       peer_(peer),
       bus_(std::move(bus)),
-      place_(std::move(place)),
+      admission_(std::move(admission)),
       gate_(context.options.messageBytes) {}
 
 void PrivateLink::start() {
@@ -41,6 +41,7 @@ void PrivateLink::start() {
   sd_bus_add_filter(bus_.get(), &slot, &PrivateLink::_onMessage, this);
   filter_.reset(slot);
   connection_ = std::make_shared<ServedConnection>(context_, peer_, weak_from_this());
+  holding_ = context_.memory->add(*this);
   ++context_.counts->connections;
   watch_ = context_.loop.watch(sd_bus_get_fd(bus_.get()), kLinkEvents,
                                [weak = weak_from_this()](std::uint32_t events) {
@@ -54,10 +55,12 @@ void PrivateLink::start() {
 void PrivateLink::end() {
   if (std::exchange(ended_, true)) return;
   watch_.reset();
-  context_.counts->queuedBytes -= std::exchange(queuedBytes_, 0);
+  holding_.reset();
+  _accountMemory(0, 0);
   --context_.counts->connections;
   connection_->end();
-  listener_.port().release(std::move(place_));
+  listener_.port().release(std::move(admission_.place));
+  admission_.share.reset();
   // sd-bus may be on the stack.
   context_.loop.soon([self = shared_from_this()] {
     self->filter_.reset();
@@ -85,22 +88,33 @@ int PrivateLink::_onMessage(sd_bus_message* message, void* self, sd_bus_error*) 
     return 1;
   }
   // sd-bus answers these by itself.
-  if (interface && std::strcmp(interface, "org.freedesktop.DBus.Peer") == 0) return 0;
+  if (interface && std::strcmp(interface, "org.freedesktop.DBus.Peer") == 0) {
+    Dispatcher::noteMessage(link);
+    return 0;
+  }
   link.listener_.dispatcher().dispatch(message, link);
   return 1;
 }
 
 void PrivateLink::_pump() {
   const auto self = shared_from_this();
-  for (int messages = 0; messages < kMessagesInARow;) {
-    if (ended_ || !_mayRead()) return;
-    const auto progress = _process();
-    if (ended_ || progress == Progress::Nothing) return;
-    if (progress == Progress::Message) ++messages;
-  }
+  const bool readAll = _readMessages();
+  if (ended_) return;
+  _accountMemory(queuedBytes_, gate_.unfinishedBytes());
+  if (readAll) return;
   context_.loop.soon([weak = weak_from_this()] {
     if (const auto link = weak.lock()) link->_pump();
   });
+}
+
+bool PrivateLink::_readMessages() {
+  for (int messages = 0; messages < kMessagesInARow;) {
+    if (ended_ || !_mayRead()) return true;
+    const auto progress = _process();
+    if (ended_ || progress == Progress::Nothing) return true;
+    if (progress == Progress::Message) ++messages;
+  }
+  return false;
 }
 
 // Looks at the next message's header. False when sd-bus has nothing to do.
@@ -159,24 +173,45 @@ std::size_t PrivateLink::_queuedMessages() const {
 void PrivateLink::_accountWrites(std::size_t newestBytes) {
   const auto count = _queuedMessages();
   if (count == 0 && queued_.empty()) return;
-  if (newestBytes > 0 && count > 0) queued_.push_back(newestBytes);
-  while (queued_.size() < count) queued_.push_back(kUnknownMessageBytes);
-  while (queued_.size() > count) queued_.pop_front();
-  std::size_t bytes = 0;
-  for (const auto size : queued_) bytes += size;
-  context_.counts->queuedBytes += bytes - std::exchange(queuedBytes_, bytes);
+  auto bytes = queuedBytes_;
+  const auto append = [&](std::size_t size) {
+    queued_.push_back(size);
+    bytes += size;
+  };
+  if (newestBytes > 0 && count > 0) append(newestBytes);
+  while (queued_.size() < count) append(kUnknownMessageBytes);
+  for (; queued_.size() > count; queued_.pop_front()) bytes -= queued_.front();
   if (waitsForWriting_ != (count > 0)) {
     waitsForWriting_ = count > 0;
     context_.loop.changeEvents(sd_bus_get_fd(bus_.get()),
                                waitsForWriting_ ? kLinkEvents | EPOLLOUT : kLinkEvents);
   }
-  if (_piledUpBytes() > context_.options.queuedBytes) cutOff("the client does not read");
+  _accountMemory(bytes, unfinishedBytes_);
+  if (!ended_ && _piledUpBytes() > context_.options.queuedBytes) cutOff("the client does not read");
+}
+
+void PrivateLink::_accountMemory(std::size_t queuedBytes, std::size_t unfinishedBytes) {
+  if (queuedBytes == queuedBytes_ && unfinishedBytes == unfinishedBytes_) return;
+  const auto before = messageBytes();
+  context_.counts->queuedBytes += queuedBytes - std::exchange(queuedBytes_, queuedBytes);
+  unfinishedBytes_ = unfinishedBytes;
+  const auto now = messageBytes();
+  auto& process = connection_->flow()->process();
+  if (now < before) process.remove(before - now);
+  if (now <= before) return;
+  process.add(now - before);
+  context_.memory->grew(process);
+}
+
+std::size_t PrivateLink::largestMessage() const {
+  const auto queued = std::max_element(queued_.begin(), queued_.end());
+  return std::max(unfinishedBytes_, queued == queued_.end() ? 0 : *queued);
 }
 
 // What waits besides the message that is being written and the largest other: an answer may be
 // larger than the limit, and follow another one at once.
 std::size_t PrivateLink::_piledUpBytes() const {
-  if (queued_.size() < 2) return 0;
+  if (queued_.size() < 2 || queuedBytes_ <= context_.options.queuedBytes) return 0;
   return queuedBytes_ - queued_.front() - *std::max_element(queued_.begin() + 1, queued_.end());
 }
 

@@ -22,14 +22,21 @@ class PrivateListener;
 // the loop. Ownership: its listener, until the end.
 class PrivateLink final : public Outlet,
                           public Caller,
+                          public ClientMemory::Holder,
                           public std::enable_shared_from_this<PrivateLink> {
  public:
+  // What is given back at its end: the delegate's place, and the part of the budget.
+  struct Admission {
+    Subscription place;
+    Budget::Share share;
+  };
+
   PrivateLink(PrivateListener& listener, IpcContext& context, BusPtr bus, Peer peer,
-              Subscription place);
+              Admission admission);
 
   void start();
   void end();
-  const std::shared_ptr<ServedConnection>& connection() const { return connection_; }
+  const std::shared_ptr<ServedConnection>& served() const { return connection_; }
 
   // Outlet
   sd_bus* bus() override { return ended_ ? nullptr : bus_.get(); }
@@ -39,20 +46,30 @@ class PrivateLink final : public Outlet,
 
   // Caller
   Outlet& outlet() override { return *this; }
-  std::shared_ptr<ServedConnection> receiver(const std::string&) override { return connection_; }
+  Receiver receiver(const std::string&) override { return {connection_, {}}; }
   FileHandle openPrivateConnection() override;
   void cutOff(const std::string& reason) override;
   bool isPrivate() const override { return true; }
+  ServedConnection* connection() override { return connection_.get(); }
+
+  // ClientMemory::Holder
+  const std::shared_ptr<CallFlow>& calls() const override { return connection_->flow(); }
+  std::size_t messageBytes() const override { return queuedBytes_ + unfinishedBytes_; }
+  std::size_t largestMessage() const override;
+  void cutOffForMemory() override { cutOff("too much memory is held for its process"); }
 
  private:
   enum class Progress { Message, Nothing, Some };
 
   static int _onMessage(sd_bus_message* message, void* self, sd_bus_error* error);
   void _pump();
+  // False when there is more to read.
+  bool _readMessages();
   bool _mayRead();
   Progress _process();
   std::size_t _queuedMessages() const;
   void _accountWrites(std::size_t newestBytes);
+  void _accountMemory(std::size_t queuedBytes, std::size_t unfinishedBytes);
   std::size_t _piledUpBytes() const;
 
   // Fixed after construction.
@@ -65,7 +82,8 @@ class PrivateLink final : public Outlet,
   BusPtr bus_;
   SlotPtr filter_;
   std::shared_ptr<ServedConnection> connection_;
-  Subscription place_;
+  Admission admission_;
+  Subscription holding_;
   Subscription watch_;
   MessageGate gate_;
   bool ended_ = false;
@@ -74,6 +92,7 @@ class PrivateLink final : public Outlet,
   bool waitsForWriting_ = false;
   std::deque<std::size_t> queued_;  // sizes of the messages that wait, oldest first
   std::size_t queuedBytes_ = 0;
+  std::size_t unfinishedBytes_ = 0;
 };
 
 }  // namespace zelkord::ipc

@@ -11,12 +11,20 @@
 
 #include "platform/linux/ipc/Introspection.h"
 #include "platform/linux/ipc/SocketAdoption.h"
+#include "platform/linux/ipc/WireEncoding.h"
 
 namespace zelkord::ipc {
 namespace {
 
 constexpr int kAcceptsInARow = 16;
 constexpr auto kAcceptPause = 100ms;
+constexpr auto kTimeToAuthenticateInScarcity = 1s;
+// For a moment, besides the socket's own.
+constexpr std::size_t kDescriptorsToAdopt = 3;
+
+bool isScarcity(int error) {
+  return error == EMFILE || error == ENFILE || error == ENOBUFS || error == ENOMEM;
+}
 
 std::string makeServerId() {
   sd_id128_t id{};
@@ -46,7 +54,7 @@ void PrivateListener::close() {
   watch_.reset();
   pause_.reset();
   socket_.reset();
-  for (auto& [key, guest] : std::exchange(guests_, {})) port_->release(std::move(guest.place));
+  while (!guests_.empty()) _dismiss(guests_.begin()->first);
   std::vector<std::shared_ptr<PrivateLink>> ending;
   for (const auto& [key, link] : links_) ending.push_back(link);
   for (const auto& link : ending) link->end();
@@ -54,90 +62,131 @@ void PrivateListener::close() {
 
 void PrivateListener::_accept() {
   for (int i = 0; i < kAcceptsInARow; ++i) {
-    OwnedFd socket(
-        ::accept4(socket_->descriptor(), nullptr, nullptr, SOCK_CLOEXEC | SOCK_NONBLOCK));
-    if (!socket) {
-      if (errno == EMFILE || errno == ENFILE || errno == ENOBUFS || errno == ENOMEM)
-        _pauseAccepting();
-      return;
-    }
+    auto socket = _acceptOne();
+    if (!socket) return;
     const auto peer = peerOfSocket(socket.get());
     if (peer) _consider(std::move(socket), {peer->pid, peer->uid});
   }
 }
 
-// Without it, the socket that cannot be accepted would wake the loop again at once.
-void PrivateListener::_pauseAccepting() {
-  context_.log.error("no new connections for a moment: {}", std::strerror(errno));
-  context_.loop.changeEvents(socket_->descriptor(), 0);
-  pause_ = context_.loop.after(
-      kAcceptPause, [this] { context_.loop.changeEvents(socket_->descriptor(), EPOLLIN); });
+OwnedFd PrivateListener::_acceptOne() {
+  const auto accept = [this] {
+    return OwnedFd(
+        ::accept4(socket_->descriptor(), nullptr, nullptr, SOCK_CLOEXEC | SOCK_NONBLOCK));
+  };
+  auto socket = accept();
+  if (!socket && isScarcity(errno)) {
+    if (!context_.reserve->spend(1 + kDescriptorsToAdopt) &&
+        !context_.connections->evictOldest(kTimeToAuthenticateInScarcity)) {
+      _pauseAccepting();
+      return socket;
+    }
+    socket = accept();
+    context_.reserve->refill();
+  }
+  return socket;
 }
 
-void PrivateListener::_consider(OwnedFd socket, Peer peer) {
+// Without it, the socket that cannot be accepted would wake the loop again at once.
+void PrivateListener::_pauseAccepting() {
+  context_.limits.refused("descriptors", "all connections");
+  context_.loop.changeEvents(socket_->descriptor(), 0);
+  pause_ = context_.loop.after(kAcceptPause, [this] {
+    context_.reserve->refill();
+    context_.loop.changeEvents(socket_->descriptor(), EPOLLIN);
+  });
+}
+
+bool PrivateListener::_consider(OwnedFd socket, Peer peer) {
   if (peer.uid != ::geteuid()) {
     context_.log.error("connection of user {} refused", peer.uid);
-    return;
+    return false;
   }
-  auto arrival =
-      std::make_shared<Arrival>(Arrival{std::move(socket), peer, std::chrono::steady_clock::now()});
+  Guest guest{std::move(socket), peer, std::chrono::steady_clock::now(), {}, {}, nullptr};
+  if (!dispatcher_.configuration().delegateBoundsConnections) {
+    auto share = context_.connections->take(peer.pid);
+    if (!share) return false;
+    guest.admission.share = *std::move(share);
+  }
+  const auto key = ++lastGuest_;
+  guest.waiting =
+      context_.connections->awaitAuthentication(peer.pid, [this, key] { _dismiss(key); });
+  guests_.emplace(key, std::move(guest));
+  _askAdmission(key, peer);
+  return true;
+}
+
+void PrivateListener::_askAdmission(std::uint64_t guest, Peer peer) {
   port_->askAdmission(peer, [weak = weak_from_this(), inbox = context_.loop.inbox(),
-                             arrival = std::move(arrival)](std::optional<Subscription> place) {
-    if (!place) {
-      arrival->socket.reset();
-      return;
-    }
-    auto held = std::make_shared<Subscription>(std::move(*place));
-    inbox->post([weak, arrival, held] {
-      if (const auto self = weak.lock()) self->_admitted(std::move(*arrival), std::move(*held));
+                             guest](std::optional<Subscription> place) {
+    auto held = std::make_shared<std::optional<Subscription>>(std::move(place));
+    inbox->post([weak, guest, held] {
+      if (const auto self = weak.lock()) self->_admitted(guest, std::move(*held));
     });
   });
 }
 
-void PrivateListener::_admitted(Arrival arrival, Subscription place) {
-  if (closed_ || !arrival.socket) return port_->release(std::move(place));
-  const auto key = ++lastHandshake_;
-  const auto elapsed = std::chrono::steady_clock::now() - arrival.accepted;
-  auto handshake = std::make_unique<Handshake>(context_.loop, std::move(arrival.socket),
-                                               Authenticator(arrival.peer.uid, serverId_),
-                                               [weak = weak_from_this(), key](bool succeeded) {
-                                                 if (const auto self = weak.lock())
-                                                   self->_authenticated(key, succeeded);
-                                               });
-  handshake->start(context_.options.authenticationTimeout - elapsed);
-  guests_[key] = {std::move(handshake), arrival.peer, std::move(place)};
+void PrivateListener::_admitted(std::uint64_t key, std::optional<Subscription> place) {
+  const auto found = guests_.find(key);
+  if (found == guests_.end()) {
+    if (place) port_->release(*std::move(place));
+    return;
+  }
+  if (!place) return _dismiss(key);
+  auto& guest = found->second;
+  guest.admission.place = *std::move(place);
+  guest.handshake = std::make_unique<Handshake>(context_.loop, std::move(guest.socket),
+                                                Authenticator(guest.peer.uid, serverId_),
+                                                [weak = weak_from_this(), key](bool succeeded) {
+                                                  if (const auto self = weak.lock())
+                                                    self->_authenticated(key, succeeded);
+                                                });
+  const auto elapsed = std::chrono::steady_clock::now() - guest.accepted;
+  guest.handshake->start(context_.options.authenticationTimeout - elapsed);
 }
 
-void PrivateListener::_authenticated(std::uint64_t handshake, bool succeeded) {
-  auto node = guests_.extract(handshake);
-  if (node.empty()) return;
-  auto& guest = node.mapped();
-  auto bus = succeeded
-                 ? adoptSocket(guest.handshake->takeSocket(), guest.handshake->passesDescriptors())
-                 : nullptr;
-  if (!bus) return port_->release(std::move(guest.place));
-  _begin(std::move(bus), guest.peer, std::move(guest.place));
-}
-
-void PrivateListener::_begin(BusPtr bus, Peer peer, Subscription place) {
-  auto link =
-      std::make_shared<PrivateLink>(*this, context_, std::move(bus), peer, std::move(place));
+void PrivateListener::_authenticated(std::uint64_t key, bool succeeded) {
+  const auto found = guests_.find(key);
+  if (found == guests_.end()) return;
+  auto& guest = found->second;
+  auto bus = succeeded ? _adopt(*guest.handshake) : nullptr;
+  if (!bus) return _dismiss(key);
+  const auto link = std::make_shared<PrivateLink>(*this, context_, std::move(bus), guest.peer,
+                                                  std::move(guest.admission));
+  guests_.erase(found);
   links_[link.get()] = link;
   link->start();
-  port_->announce(link->connection());
+  port_->announce(link->served());
+}
+
+void PrivateListener::_dismiss(std::uint64_t key) {
+  auto node = guests_.extract(key);
+  if (node.empty()) return;
+  if (auto& place = node.mapped().admission.place) port_->release(std::move(place));
+}
+
+// It takes a few descriptors for a moment.
+BusPtr PrivateListener::_adopt(Handshake& handshake) {
+  auto socket = handshake.takeSocket();
+  auto bus = adoptSocket(socket, handshake.passesDescriptors());
+  if (!bus && context_.reserve->spend(kDescriptorsToAdopt)) {
+    bus = adoptSocket(socket, handshake.passesDescriptors());
+  }
+  context_.reserve->refill();
+  return bus;
 }
 
 FileHandle PrivateListener::openConnection(Peer peer) {
   int pair[2];
   if (closed_ || ::socketpair(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0, pair) != 0) return {};
   FileHandle client(pair[0]);
-  _consider(OwnedFd(pair[1]), peer);
-  return client;
+  return _consider(OwnedFd(pair[1]), peer) ? client : FileHandle();
 }
 
 void PrivateListener::broadcast(const std::string& interface, const std::string& member,
                                 const std::string& text) {
   const auto links = links_;  // sending may end one
+  const auto valid = wireText(text);
   for (const auto& [key, link] : links) {
     sd_bus_message* signal = nullptr;
     if (!link->bus() || sd_bus_message_new_signal(link->bus(), &signal, kObjectPath.data(),
@@ -145,7 +194,7 @@ void PrivateListener::broadcast(const std::string& interface, const std::string&
       continue;
     }
     MessagePtr owned(signal);
-    if (sd_bus_message_append_basic(signal, 's', text.c_str()) < 0) continue;
+    if (sd_bus_message_append_basic(signal, 's', valid.c_str()) < 0) continue;
     link->send(std::move(owned), 256 + text.size());
   }
 }

@@ -18,10 +18,11 @@ namespace zelkord::ipc {
 // A private door: accepts sockets, has each admitted by the delegate and authenticated, and holds
 // the connections.
 //
-// A socket goes through: accepted, the user checked, admitted, authenticated, open. What ends
-// earlier is closed without a byte, or with what the authentication said. Threading: the loop's
-// thread, except `port`. Ownership: the transport; `close` first, then destroy. Errors: out of
-// descriptors, it stops accepting for a moment.
+// A socket goes through: accepted, the user checked, a place of the budget taken, admitted,
+// authenticated, open. What ends earlier is closed without a byte, or with what the authentication
+// said; up to there it may have to make room for another. Threading: the loop's thread, except
+// `port`. Ownership: the transport; `close` first, then destroy. Errors: out of descriptors, the
+// reserve lets the next clients in; without that it stops accepting for a moment.
 class PrivateListener final : public std::enable_shared_from_this<PrivateListener> {
  public:
   // `serviceInterface`: the interface with Open; empty for none.
@@ -41,18 +42,26 @@ class PrivateListener final : public std::enable_shared_from_this<PrivateListene
 
  private:
   using Instant = std::chrono::steady_clock::time_point;
-  struct Arrival {
-    OwnedFd socket;
+  // Accepted and not authenticated.
+  struct Guest {
+    OwnedFd socket;  // until the handshake has it
     Peer peer;
     Instant accepted;
+    PrivateLink::Admission admission;
+    Subscription waiting;
+    std::unique_ptr<Handshake> handshake;
   };
 
   void _accept();
+  OwnedFd _acceptOne();
   void _pauseAccepting();
-  void _consider(OwnedFd socket, Peer peer);
-  void _admitted(Arrival arrival, Subscription place);
-  void _authenticated(std::uint64_t handshake, bool succeeded);
-  void _begin(BusPtr bus, Peer peer, Subscription place);
+  // False: there is no place for it.
+  bool _consider(OwnedFd socket, Peer peer);
+  void _askAdmission(std::uint64_t guest, Peer peer);
+  void _admitted(std::uint64_t guest, std::optional<Subscription> place);
+  void _authenticated(std::uint64_t guest, bool succeeded);
+  void _dismiss(std::uint64_t guest);
+  BusPtr _adopt(Handshake& handshake);
 
   // Fixed after construction.
   IpcContext& context_;
@@ -61,16 +70,11 @@ class PrivateListener final : public std::enable_shared_from_this<PrivateListene
 
   // Loop state.
   Dispatcher dispatcher_;
-  struct Guest {
-    std::unique_ptr<Handshake> handshake;
-    Peer peer;
-    Subscription place;
-  };
   bool closed_ = false;
   std::optional<ListeningSocket> socket_;
   Subscription watch_;
   Subscription pause_;
-  std::uint64_t lastHandshake_ = 0;
+  std::uint64_t lastGuest_ = 0;
   std::unordered_map<std::uint64_t, Guest> guests_;
   std::unordered_map<PrivateLink*, std::shared_ptr<PrivateLink>> links_;
 };

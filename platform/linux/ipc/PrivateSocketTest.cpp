@@ -2,7 +2,10 @@
 #include <sys/resource.h>
 #include <sys/stat.h>
 
+#include <set>
+
 #include "platform/linux/ipc/IpcTestSupport.h"
+#include "platform/linux/ipc/ListeningSocket.h"
 
 namespace zelkord::ipc {
 namespace {
@@ -11,6 +14,7 @@ using namespace std::string_literals;
 
 const std::string kAuthentication = "\0AUTH EXTERNAL\r\nDATA\r\nBEGIN\r\n"s;
 constexpr std::size_t kMessageLimit = 4u << 20;
+constexpr const char* kDescriptorLimit = "com.quenta.zelkord.limit.descriptors";
 
 // The header of a method call whose whole size is that.
 std::string messageHeader(std::uint32_t size) {
@@ -216,23 +220,59 @@ TEST_F(PrivateSocketTest, ServesTwoHundredConnections) {
   expectNothingLeft();
 }
 
-TEST_F(PrivateSocketTest, WithoutDescriptorsAcceptingResumesLater) {
+TEST_F(PrivateSocketTest, WithoutDescriptorsAFewStillGetInAndTheRestLater) {
+  constexpr int kClients = 24;
+  std::vector<IpcRawClient> clients;  // their descriptors exist before the limit falls
+  for (int i = 0; i < kClients; ++i) clients.emplace_back(server_.socketPath + "-none");
   rlimit before{};
   ::getrlimit(RLIMIT_NOFILE, &before);
-  IpcRawClient waiting(server_.socketPath);
-  const int next = ::dup(0);
-  ::close(next);
-  ASSERT_TRUE(eventually([&] { return server_.delegate->admitted == 1; }));
-  IpcRawClient late(server_.socketPath + "-none");  // its descriptor exists before the limit falls
-  const rlimit none{static_cast<rlim_t>(late.descriptor() + 1), before.rlim_max};
+  const rlimit none{static_cast<rlim_t>(clients.back().descriptor() + 1), before.rlim_max};
   ::setrlimit(RLIMIT_NOFILE, &none);
   sockaddr_un address{.sun_family = AF_UNIX, .sun_path = {}};
   server_.socketPath.copy(address.sun_path, sizeof(address.sun_path) - 1);
-  EXPECT_EQ(::connect(late.descriptor(), reinterpret_cast<sockaddr*>(&address), sizeof(address)),
-            0);
-  EXPECT_TRUE(eventually([&] { return server_.log.contains("no new connections"); }));
+  for (auto& client : clients) {
+    ASSERT_EQ(
+        ::connect(client.descriptor(), reinterpret_cast<sockaddr*>(&address), sizeof(address)), 0);
+    client.send(kAuthentication);
+  }
+  EXPECT_TRUE(eventually([&] { return server_.counters.value(kDescriptorLimit) > 0; }));
+  EXPECT_TRUE(eventually([&] { return server_.delegate->begun > 0; }));
   ::setrlimit(RLIMIT_NOFILE, &before);
-  EXPECT_TRUE(eventually([&] { return server_.delegate->admitted == 2; }));
+  EXPECT_TRUE(eventually([&] { return server_.delegate->begun == kClients; }));
+}
+
+TEST_F(PrivateSocketTest, DeadSocketsOfEarlierRunsAreRemoved) {
+  const auto directory = server_.directory.path() + "/left/";
+  std::filesystem::create_directory(directory);
+  const auto bound = [&](const std::string& name) {
+    OwnedFd socket(::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0));
+    sockaddr_un address{.sun_family = AF_UNIX, .sun_path = {}};
+    (directory + name).copy(address.sun_path, sizeof(address.sun_path) - 1);
+    EXPECT_EQ(::bind(socket.get(), reinterpret_cast<sockaddr*>(&address), sizeof(address)), 0);
+    return socket;
+  };
+  const std::string dead(32, 'd'), alive(32, 'a'), file(32, 'f');
+  bound(dead);
+  bound("socket");
+  bound("somebody-elses");
+  const auto listening = bound(alive);
+  ASSERT_EQ(::listen(listening.get(), 1), 0);
+  std::ofstream(directory + file) << "no socket";
+  ListeningSocket::removeDead(directory, "socket");
+  std::set<std::string> left;
+  for (const auto& entry : std::filesystem::directory_iterator(directory)) {
+    left.insert(entry.path().filename());
+  }
+  EXPECT_EQ(left, (std::set<std::string>{alive, file, "somebody-elses"}));
+
+  bound(dead);
+  SdBusOptions options;
+  options.runtimeDirectory = directory;
+  options.usesHandedOverSocket = false;
+  options.usesSessionBus = false;
+  SdBusInterprocess second(server_.queues, server_.log, server_.limits, options);
+  EXPECT_FALSE(second.listen(kTestService, ipcTestConfiguration(), server_.delegate));
+  EXPECT_FALSE(std::filesystem::exists(directory + dead));
 }
 
 TEST_F(PrivateSocketTest, SocketsAreOursAloneAndVanish) {
@@ -262,7 +302,7 @@ TEST_F(PrivateSocketTest, OnlyADeadDaemonsSocketIsReplaced) {
   options.runtimeDirectory = server_.directory.path() + "/run";
   options.usesHandedOverSocket = false;
   options.usesSessionBus = false;
-  SdBusInterprocess second(server_.queues, server_.log, options);
+  SdBusInterprocess second(server_.queues, server_.log, server_.limits, options);
   const auto error = second.listen(kTestService, ipcTestConfiguration(), server_.delegate);
   ASSERT_TRUE(error);
   EXPECT_EQ(error->code, EADDRINUSE);
@@ -276,7 +316,7 @@ TEST_F(PrivateSocketTest, OnlyADeadDaemonsSocketIsReplaced) {
     ASSERT_EQ(::bind(dead.get(), reinterpret_cast<sockaddr*>(&address), sizeof(address)), 0);
   }
   options.runtimeDirectory = stale;
-  SdBusInterprocess third(server_.queues, server_.log, options);
+  SdBusInterprocess third(server_.queues, server_.log, server_.limits, options);
   EXPECT_FALSE(third.listen(kTestService, ipcTestConfiguration(), server_.delegate));
 }
 

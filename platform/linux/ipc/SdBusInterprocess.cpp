@@ -1,6 +1,7 @@
 #include "platform/linux/ipc/SdBusInterprocess.h"
 
 #include <fmt/format.h>
+#include <sys/resource.h>
 #include <systemd/sd-id128.h>
 #include <unistd.h>
 
@@ -11,7 +12,7 @@
 #include <utility>
 #include <vector>
 
-#include "platform/linux/ipc/BusDoor.h"
+#include "platform/linux/ipc/BusPresence.h"
 #include "platform/linux/ipc/ListeningSocket.h"
 #include "platform/linux/ipc/PrivateListener.h"
 
@@ -20,6 +21,8 @@ namespace {
 
 // A handler may be blocked for longer; it is then left behind.
 constexpr auto kLongestCleaning = 1s;
+// For a few clients and the moment in which each becomes a connection.
+constexpr std::size_t kReservedDescriptors = 8;
 
 std::string randomSocketName() {
   sd_id128_t id{};
@@ -35,6 +38,30 @@ Error transportError(int number, std::string reason) {
 }
 
 std::string notificationInterface(const std::string& name) { return name + ".Notification1"; }
+
+// As many descriptors as this process may open by now.
+std::uint64_t descriptorLimit() {
+  rlimit limit{};
+  ::getrlimit(RLIMIT_NOFILE, &limit);
+  return limit.rlim_cur;
+}
+
+IpcContext makeContext(EventLoop& loop, WorkQueues& queues, LogSink& log, LimitReports& limits,
+                       SdBusOptions options) {
+  const auto descriptors = options.descriptors > 0 ? options.descriptors : descriptorLimit();
+  const ClientMemory::Size memory{options.clientMemory, options.clientMemory / 4,
+                                  options.processCallsUnderWay};
+  return {.loop = loop,
+          .queues = queues,
+          .log = Logger(log, "Zelkor_Connection"),
+          .limits = limits,
+          .options = std::move(options),
+          .cleaning = queues.makeGroup(),
+          .connections =
+              std::make_shared<ConnectionBudgets>(ConnectionBudgets::sizeFor(descriptors), limits),
+          .memory = std::make_shared<ClientMemory>(memory, limits),
+          .reserve = std::make_shared<DescriptorReserve>(kReservedDescriptors)};
+}
 
 // The daemon's interfaces and the transport's own.
 ListenerConfiguration withNotifications(ListenerConfiguration configuration,
@@ -83,14 +110,14 @@ class DeafListener final : public AnonymousListener {
 // What the loop works with; late tasks hold it weakly.
 struct SdBusInterprocess::Doors {
   std::string name;
-  std::unique_ptr<BusDoor> bus;
+  std::unique_ptr<BusPresence> bus;
   std::shared_ptr<PrivateListener> socket;
   std::vector<std::weak_ptr<PrivateListener>> anonymous;
 };
 
-SdBusInterprocess::SdBusInterprocess(WorkQueues& queues, LogSink& log, SdBusOptions options)
-    : context_{loop_, queues, Logger(log, "Zelkor_Connection"), std::move(options),
-               queues.makeGroup()},
+SdBusInterprocess::SdBusInterprocess(WorkQueues& queues, LogSink& log, LimitReports& limits,
+                                     SdBusOptions options)
+    : context_(makeContext(loop_, queues, log, limits, std::move(options))),
       doors_(std::make_shared<Doors>()) {}
 
 SdBusInterprocess::~SdBusInterprocess() {
@@ -108,6 +135,7 @@ SdBusInterprocess::~SdBusInterprocess() {
 std::optional<Error> SdBusInterprocess::listen(const std::string& name,
                                                ListenerConfiguration configuration,
                                                std::shared_ptr<ListenerDelegate> delegate) {
+  ListeningSocket::removeDead(context_.options.runtimeDirectory, context_.options.socketName);
   configuration = withNotifications(std::move(configuration), name);
   const auto& options = context_.options;
   // Whoever sees the name finds the socket, and whom the socket answers finds the name: it listens
@@ -138,11 +166,16 @@ std::optional<Error> SdBusInterprocess::listen(const std::string& name,
     doors_->name = name;
     doors_->socket = std::make_shared<PrivateListener>(context_, configuration, delegate, service);
     doors_->socket->serve(std::move(*socket));
-    if (!onBus.bus) return;
-    doors_->bus = std::make_unique<BusDoor>(
-        context_, std::move(onBus.bus), configuration, delegate, service,
-        [listener = doors_->socket](Peer peer) { return listener->openConnection(peer); });
-    doors_->bus->start();
+    if (!options.usesSessionBus) return;
+    doors_->bus = std::make_unique<BusPresence>(
+        context_, name,
+        [&context = context_, configuration, delegate, service, listener = doors_->socket](
+            BusPtr bus, BusDoor::Events events) {
+          return std::make_unique<BusDoor>(
+              context, std::move(bus), configuration, delegate, service,
+              [listener](Peer peer) { return listener->openConnection(peer); }, std::move(events));
+        });
+    doors_->bus->begin(std::move(onBus.bus));
   });
   return std::nullopt;
 }
@@ -176,12 +209,20 @@ std::variant<std::string, Error> SdBusInterprocess::executableName(pid_t pid) co
   return std::string(path.substr(path.rfind('/') + 1));
 }
 
+Statistics SdBusInterprocess::statistics() const {
+  auto statistics = context_.counts->snapshot();
+  statistics.heldBytes = context_.memory->held();
+  return statistics;
+}
+
 void SdBusInterprocess::postNotification(std::string_view name) {
   loop_.inbox()->post([weak = std::weak_ptr(doors_), posted = std::string(name)] {
     const auto doors = weak.lock();
     if (!doors || !doors->socket) return;
     const auto interface = notificationInterface(doors->name);
-    if (doors->bus) doors->bus->signal({}, interface, "Posted", posted);
+    if (auto* bus = doors->bus ? doors->bus->door() : nullptr) {
+      bus->signal({}, interface, "Posted", posted);
+    }
     doors->socket->broadcast(interface, "Posted", posted);
   });
 }

@@ -22,12 +22,13 @@ namespace zelkord::ipc {
 // wake-up, or, while that sleeps, sent by the worker itself. It sleeps while nobody calls.
 //
 // Threading: any thread, except the constructor, `listen` (once) and the destructor: one thread.
-// Ownership: log and queues outlive it; anonymous listeners may outlive it, closed.
-// Errors: without a bus one error line, the socket alone is served; a name or a socket that is
-// taken fails `listen`.
+// Ownership: log, limits, queues and the options' watcher outlive it; anonymous listeners may
+// outlive it, closed.
+// Errors: without a bus one error line, the socket alone is served until there is one; a name or a
+// socket that is taken fails `listen`.
 class SdBusInterprocess final : public Interprocess {
  public:
-  SdBusInterprocess(WorkQueues& queues, LogSink& log, SdBusOptions options);
+  SdBusInterprocess(WorkQueues& queues, LogSink& log, LimitReports& limits, SdBusOptions options);
   ~SdBusInterprocess() override;
 
   std::optional<Error> listen(const std::string& name, ListenerConfiguration configuration,
@@ -35,7 +36,7 @@ class SdBusInterprocess final : public Interprocess {
   std::unique_ptr<AnonymousListener> makeAnonymousListener(
       ListenerConfiguration configuration, std::shared_ptr<ListenerDelegate> delegate) override;
   std::variant<std::string, Error> executableName(pid_t pid) const override;
-  Statistics statistics() const override { return context_.counts->snapshot(); }
+  Statistics statistics() const override;
 
   // The signal "Posted" to everybody on the bus and on the private connections of `listen`. Never
   // waits.

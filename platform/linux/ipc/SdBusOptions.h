@@ -1,9 +1,14 @@
 #pragma once
 
 #include <cstddef>
+#include <cstdint>
 #include <string>
 
 #include "base/Time.h"
+
+namespace zelkord {
+class PathWatcher;
+}
 
 namespace zelkord::ipc {
 
@@ -15,6 +20,8 @@ struct SdBusOptions {
   bool usesSessionBus = true;
   // A D-Bus address; empty: the session's own.
   std::string sessionBusAddress;
+  // Tells when a session bus that was not there may be; null: it is looked for now and then.
+  PathWatcher* watcher = nullptr;
   // Takes the first listening Unix socket that the service manager handed over, instead of making
   // one.
   bool usesHandedOverSocket = true;
@@ -28,6 +35,11 @@ struct SdBusOptions {
   // Calls of one connection that are not answered yet.
   std::size_t callsUnderWay = 1024;
   std::size_t callBytesUnderWay = 16u << 20;
+  // What all clients hold together, and the calls of one process. A process has a quarter.
+  std::size_t clientMemory = 256u << 20;
+  std::size_t processCallsUnderWay = 16'384;
+  // Of this process, for the size of the budgets; 0: as many as it may open.
+  std::uint64_t descriptors = 0;
 };
 
 }  // namespace zelkord::ipc

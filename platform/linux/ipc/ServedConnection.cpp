@@ -11,7 +11,8 @@ ServedConnection::ServedConnection(IpcContext& context, Peer peer, std::weak_ptr
       inbox_(context.loop.inbox()),
       log_(context.log),
       flow_(std::make_shared<CallFlow>(context.options.callsUnderWay,
-                                       context.options.callBytesUnderWay)),
+                                       context.options.callBytesUnderWay, context.memory,
+                                       peer.pid)),
       cleaning_(context.cleaning),
       queue_(context.queues.makeSerialQueue("com.quenta.zelkord.connection")) {}
 
@@ -66,6 +67,15 @@ void ServedConnection::deliver(Call call) {
   queue_->async([self = shared_from_this(), call = std::move(call)]() mutable {
     self->_handle(std::move(call));
   });
+}
+
+void ServedConnection::messageArrived() {
+  std::shared_ptr<CallHandler> handler;
+  {
+    const MutexLock lock(mutex_);
+    handler = handler_;
+  }
+  if (handler) handler->messageArrived();
 }
 
 void ServedConnection::open() {

@@ -36,9 +36,11 @@ class ServedConnection final : public Connection,
                   std::function<void(const Error&)> failure) override;
 
   // What its door does with it.
-  CallFlow& flow() { return *flow_; }
+  const std::shared_ptr<CallFlow>& flow() { return flow_; }
   PendingReply::Route route() const { return {inbox_, outlet_, log_}; }
   void deliver(Call call);
+  // A message that is not delivered.
+  void messageArrived();
   void open();
   void end();
 

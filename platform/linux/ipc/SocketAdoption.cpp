@@ -1,6 +1,7 @@
 #include "platform/linux/ipc/SocketAdoption.h"
 
 #include <fcntl.h>
+#include <sys/eventfd.h>
 #include <sys/socket.h>
 #include <systemd/sd-id128.h>
 
@@ -39,19 +40,28 @@ bool authenticateAsClient(sd_bus* bus, int fd, bool passesDescriptors) {
   return sd_bus_is_ready(bus) > 0;
 }
 
+bool makeReadNoDescriptors(sd_bus* bus) {
+  const OwnedFd noSocket(::eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK));
+  return noSocket && ::dup3(noSocket.get(), sd_bus_get_fd(bus), O_CLOEXEC) >= 0 &&
+         sd_bus_process(bus, nullptr) == 0;
+}
+
 }  // namespace
 
-BusPtr adoptSocket(OwnedFd socket, bool passesDescriptors) {
+BusPtr adoptSocket(OwnedFd& socket, bool passesDescriptors) {
   int pair[2];
   if (::socketpair(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0, pair) != 0)
     return nullptr;
-  const OwnedFd client(pair[0]);
+  OwnedFd client(pair[0]);
   auto bus = startServer(OwnedFd(pair[1]), passesDescriptors);
   if (!bus || !authenticateAsClient(bus.get(), client.get(), passesDescriptors)) return nullptr;
+  client.reset();
+  if (!makeReadNoDescriptors(bus.get())) return nullptr;
   ::setsockopt(socket.get(), SOL_SOCKET, SO_SNDBUF, &kSocketBufferBytes,
                sizeof(kSocketBufferBytes));
   ::fcntl(socket.get(), F_SETFL, ::fcntl(socket.get(), F_GETFL) | O_NONBLOCK);
   if (::dup3(socket.get(), sd_bus_get_fd(bus.get()), O_CLOEXEC) < 0) return nullptr;
+  socket.reset();
   return bus;
 }
 

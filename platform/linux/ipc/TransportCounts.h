@@ -15,7 +15,7 @@ struct TransportCounts {
   std::atomic<std::uint64_t> refused = 0;
   std::atomic<std::size_t> queuedBytes = 0;
 
-  Statistics snapshot() const { return {connections, calls, refused, queuedBytes}; }
+  Statistics snapshot() const { return {connections, calls, refused, queuedBytes, 0}; }
 };
 
 }  // namespace zelkord::ipc

@@ -20,7 +20,8 @@ class WireCodecTest : public testing::Test {
     int pair[2];
     EXPECT_EQ(::socketpair(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0, pair), 0);
     peer_ = OwnedFd(pair[0]);
-    bus_ = adoptSocket(OwnedFd(pair[1]), true);
+    OwnedFd ours(pair[1]);
+    bus_ = adoptSocket(ours, true);
   }
 
   MessagePtr message(const std::function<int(sd_bus_message*)>& fill) {

@@ -8,6 +8,12 @@
 namespace zelkord::ipc {
 namespace {
 
+// What values take in memory beside their contents, as the allocator rounds it.
+constexpr std::size_t kAllocationBytes = 24;
+constexpr std::size_t kBytesWithinAString = 16;
+constexpr std::size_t kEntryBytes =
+    sizeof(std::pair<const std::string, Value>) + 32 + kAllocationBytes;
+
 // Reads values off one message. Every operation is false once something failed; `failure` then says
 // what.
 class WireReader {
@@ -86,7 +92,7 @@ bool WireReader::_string(std::string& out) {
   const auto length = std::strlen(text);
   if (length > limits_.stringBytes) return _overLimit("a string is too long");
   out.assign(text, length);
-  bytes_ += length;
+  bytes_ += length < kBytesWithinAString ? 0 : length + kAllocationBytes;
   return true;
 }
 
@@ -126,7 +132,7 @@ template <typename Element>
 bool WireReader::_entries(const char* array, const char* contents, Element element) {
   const char kind = array[0] == '{' ? 'e' : 'r';
   return _array(array, [&] {
-    bytes_ += sizeof(Value);
+    bytes_ += kEntryBytes;
     return _check(sd_bus_message_enter_container(message_, kind, contents)) && element() &&
            _check(sd_bus_message_exit_container(message_));
   });

@@ -1,0 +1,97 @@
+#include "platform/linux/ipc/ClientMemory.h"
+
+#include <algorithm>
+
+#include "platform/linux/ipc/CallFlow.h"
+
+namespace zelkord::ipc {
+namespace {
+
+std::size_t bytesOf(const ClientMemory::Holder& holder) {
+  return holder.messageBytes() + holder.calls()->bytes();
+}
+
+}  // namespace
+
+std::shared_ptr<ClientMemory::Process> ClientMemory::process(pid_t pid) {
+  if (auto known = processes_[pid].lock()) return known;
+  std::erase_if(processes_, [](const auto& entry) { return entry.second.expired(); });
+  auto process = std::make_shared<Process>(pid, held_);
+  processes_[pid] = process;
+  return process;
+}
+
+Subscription ClientMemory::add(Holder& holder) {
+  holders_.push_back(&holder);
+  return Subscription([this, &holder] { std::erase(holders_, &holder); });
+}
+
+bool ClientMemory::hasRoomForCall(const Process& process, std::size_t bytes) {
+  const bool fits = process.calls < size_.callsOfOneProcess && bytes <= size_.ofOneProcess &&
+                    process.bytes() <= size_.ofOneProcess - bytes;
+  if (!fits) return false;
+  if (*held_ + bytes <= size_.inAll) return true;
+  _makeRoom(bytes);
+  return *held_ + bytes <= size_.inAll;
+}
+
+void ClientMemory::callRefused(const Process& process) {
+  reports_.refused("calls", processHolder(process.pid()));
+}
+
+void ClientMemory::grew(const Process& process) {
+  while (_isTooLarge(process) && _cutOffLargestOf(process)) {
+  }
+  if (*held_ > size_.inAll) _makeRoom(0);
+}
+
+bool ClientMemory::_isTooLarge(const Process& process) const {
+  if (process.bytes() <= size_.ofOneProcess) return false;
+  std::size_t largest = 0;
+  for (const auto* holder : holders_) {
+    if (&holder->calls()->process() != &process) continue;
+    largest = std::max(largest, holder->largestMessage());
+  }
+  return process.bytes() > size_.ofOneProcess + largest + _remains(&process);
+}
+
+void ClientMemory::_makeRoom(std::size_t bytes) {
+  std::erase_if(cutOff_, [](const auto& weak) { return weak.expired(); });
+  while (*held_ + bytes > size_.inAll + _remains(nullptr)) {
+    const auto* largest = _largestProcess();
+    if (!largest || !_cutOffLargestOf(*largest)) return;
+  }
+}
+
+std::size_t ClientMemory::_remains(const Process* process) const {
+  std::size_t bytes = 0;
+  for (const auto& weak : cutOff_) {
+    const auto calls = weak.lock();
+    if (calls && (!process || &calls->process() == process)) bytes += calls->bytes();
+  }
+  return bytes;
+}
+
+const ClientMemory::Process* ClientMemory::_largestProcess() const {
+  const Process* largest = nullptr;
+  for (const auto* holder : holders_) {
+    const auto& process = holder->calls()->process();
+    if (!largest || process.bytes() > largest->bytes()) largest = &process;
+  }
+  return largest;
+}
+
+bool ClientMemory::_cutOffLargestOf(const Process& process) {
+  Holder* largest = nullptr;
+  for (auto* holder : holders_) {
+    if (&holder->calls()->process() != &process) continue;
+    if (!largest || bytesOf(*holder) > bytesOf(*largest)) largest = holder;
+  }
+  if (!largest) return false;
+  reports_.refused("client_memory", processHolder(process.pid()));
+  cutOff_.push_back(largest->calls());
+  largest->cutOffForMemory();
+  return true;
+}
+
+}  // namespace zelkord::ipc
