@@ -3,9 +3,11 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <vector>
 
 #include "platform/linux/LinuxPlatform.h"
 #include "platform/linux/log/JournalLog.h"
+#include "platform/linux/queues/LinuxWorkQueues.h"
 #include "platform/testing/TemporaryDirectory.h"
 
 namespace zelkord {
@@ -122,6 +124,25 @@ TEST_F(LinuxPlatformTest, SaysWhyWhenThereIsNoPlaceForItsState) {
   root_.write("XDG_STATE_HOME", "a file");
   EXPECT_EQ(LinuxPlatform::make(options_, &error_), nullptr);
   EXPECT_THAT(*error_.reason(), HasSubstr("XDG_STATE_HOME/com.quenta.zelkord"));
+}
+
+TEST_F(LinuxPlatformTest, ARefusedWaitIsCountedAndNamed) {
+  const auto host = LinuxPlatform::make(options_, &error_);
+  ASSERT_TRUE(host) << error_.description();
+  const auto gate = host->queues().makeSemaphore(0);
+  std::vector<std::unique_ptr<SerialQueue>> waiters;
+  for (unsigned i = 0; i <= WorkerPool::kMaximumWaiting; ++i) {
+    waiters.push_back(host->queues().makeSerialQueue("waiter"));
+    waiters.back()->async([&] { gate->wait(20s); });
+  }
+  const auto refused = [&] {
+    return host->platform().counters.all()["com.quenta.zelkord.limit.waits"];
+  };
+  for (int i = 0; i < 20'000 && refused() == 0; ++i) ::usleep(1000);
+  gate->signal(WorkerPool::kMaximumWaiting);
+  waiters.clear();
+  EXPECT_EQ(refused(), 1);
+  EXPECT_THAT(root_.read("log"), HasSubstr("waits"));
 }
 
 }  // namespace
