@@ -99,11 +99,14 @@ std::vector<std::string> worstMessages(std::size_t bytes) {
     }
     messages.push_back(std::move(message));
   }
-  std::string map;  // of keys that differ
-  for (int key = 1; map.size() < bytes; ++key)
-    map += nested(5, nested(1, varint(static_cast<std::size_t>(key) & 0x7F) +
-                                   (key > 127 ? varint(static_cast<std::size_t>(key) >> 7) : "")));
-  messages.push_back(std::move(map));
+  for (const std::size_t size : {bytes / 4, bytes / 2, 3 * bytes / 4, bytes, 4 * bytes}) {
+    std::string map;  // of keys that differ
+    for (std::size_t key = 1; map.size() < size; ++key) {
+      const auto rest = key > 127 ? varint(key >> 7) : "";
+      map += nested(5, nested(1, varint(key & 0x7F) + rest));
+    }
+    messages.push_back(std::move(map));
+  }
   return messages;
 }
 
