@@ -27,6 +27,8 @@ constexpr bool kMeasuresMemory = true;
 constexpr rlim_t kFewDescriptors = 1024;
 constexpr std::chrono::seconds kServedWithin{1};
 constexpr std::size_t kProcessMemory = 64u << 20;
+constexpr std::size_t kLargestMessage = 4u << 20;
+constexpr std::size_t kSlack = 1u << 20;  // of the client that is served
 constexpr std::size_t kMemoryOverTheAccounted = 64u << 20;
 
 void limitDescriptors(rlim_t count) {
@@ -102,9 +104,10 @@ void sendDescriptors(const std::string& socket) {
   }
 }
 
+template <int kCount>
 void sendUnfinishedMessages(const std::string& socket) {
   const auto bytes = kBegin + headerOf(4u << 20) + std::string((4u << 20) - 17, 'x');
-  for (int i = 0; i < 150; ++i) sendAll(connectTo(socket), bytes);
+  for (int i = 0; i < kCount; ++i) sendAll(connectTo(socket), bytes);
 }
 
 void leaveRepliesUnread(const std::string& socket) {
@@ -127,7 +130,10 @@ class Attacker {
   Attacker(const std::string& socket, const Attack& attack) {
     EXPECT_EQ(::pipe2(pipe_, O_CLOEXEC), 0);
     pid_ = ::fork();
-    if (pid_ != 0) return;
+    if (pid_ != 0) {
+      ::close(pipe_[1]);
+      return;
+    }
     limitDescriptors(RLIM_INFINITY);
     attack.run(socket);
     ::close(pipe_[1]);
@@ -140,7 +146,6 @@ class Attacker {
   }
   // When all is sent.
   bool waitUntilDone() {
-    ::close(pipe_[1]);
     pollfd waiting{.fd = pipe_[0], .events = POLLIN, .revents = 0};
     return ::poll(&waiting, 1, std::chrono::milliseconds(kTestPatience).count()) == 1;
   }
@@ -191,7 +196,7 @@ TEST_P(HostileClientsTest, OneProcessKeepsNobodyElseOutAndHoldsItsShareOnly) {
   EXPECT_TRUE(attacker.waitUntilDone());
   for (int i = 0; i < 3; ++i) fastest = std::min(fastest, isServed());
   EXPECT_LT(fastest, kServedWithin);
-  EXPECT_LE(server.interprocess->statistics().heldBytes, kProcessMemory + (4u << 20));
+  EXPECT_LT(server.interprocess->statistics().heldBytes, kProcessMemory + kLargestMessage + kSlack);
   const auto residentLimit = residentBefore + kProcessMemory + kMemoryOverTheAccounted;
   EXPECT_TRUE(residentBytes() < residentLimit || !kMeasuresMemory) << residentBytes();
   EXPECT_LT(openDescriptors(), kFewDescriptors / 2);
@@ -201,9 +206,31 @@ INSTANTIATE_TEST_SUITE_P(Attacks, HostileClientsTest,
                          testing::Values(Attack{"Unauthenticated", connectAndSayNothing},
                                          Attack{"Connections", connectAndAuthenticate},
                                          Attack{"Descriptors", sendDescriptors},
-                                         Attack{"UnfinishedMessages", sendUnfinishedMessages},
+                                         Attack{"UnfinishedMessages", sendUnfinishedMessages<150>},
                                          Attack{"UnreadReplies", leaveRepliesUnread}),
                          [](const auto& attack) { return std::string(attack.param.name); });
+
+TEST(ClientMemoryLimitTest, ManyProcessesTogetherHoldNoMoreThanThereIs) {
+  constexpr std::size_t kAllMemory = 4 * kProcessMemory;
+  IpcTestDirectory directory;
+  std::vector<std::unique_ptr<Attacker>> attackers;
+  for (int i = 0; i < 6; ++i) {
+    attackers.push_back(std::make_unique<Attacker>(
+        directory.path() + "/socket", Attack{"UnfinishedMessages", sendUnfinishedMessages<20>}));
+  }
+  IpcTestServer server(false,
+                       [&](SdBusOptions& options) { options.runtimeDirectory = directory.path(); });
+  const auto residentBefore = residentBytes();
+  ASSERT_FALSE(server.listen());
+  for (const auto& attacker : attackers) EXPECT_TRUE(attacker->waitUntilDone());
+  auto client = server.socketClient();
+  EXPECT_EQ(client.call(kTestInterface, "Echo", "s", "served"), "");
+  const auto held = server.interprocess->statistics().heldBytes;
+  EXPECT_GT(held, kAllMemory / 2);
+  EXPECT_LE(held, kAllMemory);
+  const auto residentLimit = residentBefore + kAllMemory + kMemoryOverTheAccounted;
+  EXPECT_TRUE(residentBytes() < residentLimit || !kMeasuresMemory) << residentBytes();
+}
 
 TEST(ConnectionLimitTest, TwoHundredOfOneProcessFitAndTheNextButFewAreRefusedOnEveryDoor) {
   IpcTestServer server(true, [](SdBusOptions& options) { options.descriptors = kFewDescriptors; });
