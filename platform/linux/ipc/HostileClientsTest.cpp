@@ -287,6 +287,17 @@ TEST(ConnectionLimitTest, AMessageWithDescriptorsEndsItsConnectionAndNoneStaysOp
   EXPECT_TRUE(eventually([&] { return openDescriptors() <= before; }));
 }
 
+TEST(ConnectionLimitTest, DescriptorsInUnreadRepliesAreFew) {
+  IpcTestServer server(false);
+  ASSERT_FALSE(server.listen());
+  auto client = server.socketClient();
+  ASSERT_EQ(client.call(kTestInterface, "Handle", ""), "");
+  const auto before = openDescriptors();
+  for (int i = 0; i < 3000; ++i) client.send(client.newCall("Handle"));
+  EXPECT_TRUE(eventually([&] { return server.log.contains("does not read"); }));
+  EXPECT_TRUE(eventually([&] { return openDescriptors() < before + 16; }));
+}
+
 TEST(CallLimitTest, TheCallsOfAProcessAreBoundedOverItsConnections) {
   std::mutex mutex;
   std::vector<Call> kept;
