@@ -8,20 +8,17 @@ foreach(program IN ITEMS zelkord zelkorctl zelkor-sandbox)
   endif()
 endforeach()
 
-# A file that names places: its @ZK_…@ are filled at the installation, with the prefix that it is given.
+# A file that names places: they are filled at the installation, with the prefix that it is given.
 function(zk_install_template template destination)
   cmake_path(GET template STEM LAST_ONLY name)
   install(CODE "
-    cmake_path(ABSOLUTE_PATH CMAKE_INSTALL_PREFIX NORMALIZE OUTPUT_VARIABLE ZK_PREFIX)
-    foreach(place IN ITEMS BINDIR LIBDIR INCLUDEDIR)
-      set(BINDIR \"${CMAKE_INSTALL_BINDIR}\")
-      set(LIBDIR \"${CMAKE_INSTALL_LIBDIR}\")
-      set(INCLUDEDIR \"${CMAKE_INSTALL_INCLUDEDIR}\")
-      cmake_path(APPEND ZK_PREFIX \"\${\${place}}\" OUTPUT_VARIABLE ZK_\${place})
-    endforeach()
-    set(ZK_VERSION \"${PROJECT_VERSION}\")
+    cmake_path(ABSOLUTE_PATH CMAKE_INSTALL_PREFIX NORMALIZE)
+    cmake_path(APPEND CMAKE_INSTALL_PREFIX \"${CMAKE_INSTALL_BINDIR}\" OUTPUT_VARIABLE CMAKE_INSTALL_FULL_BINDIR)
+    cmake_path(APPEND CMAKE_INSTALL_PREFIX \"${CMAKE_INSTALL_LIBDIR}\" OUTPUT_VARIABLE CMAKE_INSTALL_FULL_LIBDIR)
+    cmake_path(APPEND CMAKE_INSTALL_PREFIX \"${CMAKE_INSTALL_INCLUDEDIR}\" OUTPUT_VARIABLE CMAKE_INSTALL_FULL_INCLUDEDIR)
+    set(PROJECT_VERSION \"${PROJECT_VERSION}\")
     configure_file(\"${template}\" \"${PROJECT_BINARY_DIR}/packaging/${name}\" @ONLY)
-    file(INSTALL \"${PROJECT_BINARY_DIR}/packaging/${name}\" DESTINATION \"\${ZK_PREFIX}/${destination}\")")
+    file(INSTALL \"${PROJECT_BINARY_DIR}/packaging/${name}\" DESTINATION \"\${CMAKE_INSTALL_PREFIX}/${destination}\")")
 endfunction()
 
 # zk_install_files(<pattern below the repository> <destination>)

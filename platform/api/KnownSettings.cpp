@@ -15,8 +15,8 @@ constexpr KnownSetting kKnownSettings[] = {
      "`name=value&name=value`: query items that most requests get besides their own; read at the "
      "start"},
     {"ZLKLocationAuthorization", SettingKind::Authorization, "",
-     "the user's answer about location; read before the device profile's, save that 1 or 2 from "
-     "either wins; counts at once"},
+     "the user's answer about location; read before the device profile's, save that 1 or 2 (no) "
+     "from either wins; counts at once"},
     {"ZLKLogPrivateData", SettingKind::Boolean, "false",
      "texts that people typed, headers, identifiers and coordinates show in the log instead of "
      "`<private>`; counts at once"},
