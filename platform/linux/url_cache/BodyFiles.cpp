@@ -3,7 +3,6 @@
 #include <dirent.h>
 #include <fcntl.h>
 #include <fmt/format.h>
-#include <sys/mman.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -17,6 +16,17 @@ namespace zelkord {
 namespace {
 
 constexpr std::string_view kBodySuffix = ".body";
+
+// False at an early end of the file, too.
+bool readFully(int file, std::string& bytes) {
+  for (std::size_t done = 0; done < bytes.size();) {
+    const auto count = ::read(file, bytes.data() + done, bytes.size() - done);
+    if (count < 0 && errno == EINTR) continue;
+    if (count <= 0) return false;
+    done += static_cast<std::size_t>(count);
+  }
+  return true;
+}
 
 std::string bodyFileName(std::int64_t id) { return fmt::format("{:016x}{}", id, kBodySuffix); }
 
@@ -58,7 +68,7 @@ std::optional<Error> BodyFiles::write(std::int64_t id, std::string_view bytes) {
   return error;
 }
 
-std::optional<Data> BodyFiles::map(std::int64_t id, std::uint64_t size) {
+std::optional<Data> BodyFiles::read(std::int64_t id, std::uint64_t size) {
   if (!open_) open_ = _openFolder();
   // O_NONBLOCK: a pipe that somebody put there must not wait for a writer.
   constexpr int kFlags = O_RDONLY | O_NOFOLLOW | O_CLOEXEC | O_NONBLOCK;
@@ -66,10 +76,10 @@ std::optional<Data> BodyFiles::map(std::int64_t id, std::uint64_t size) {
   struct stat status {};
   if (!file || ::fstat(file.get(), &status) != 0 || !S_ISREG(status.st_mode)) return std::nullopt;
   if (status.st_size <= 0 || static_cast<std::uint64_t>(status.st_size) != size) return {};
-  void* const start = ::mmap(nullptr, size, PROT_READ, MAP_PRIVATE, file.get(), 0);
-  if (start == MAP_FAILED) return std::nullopt;
-  std::shared_ptr<const void> mapping(start, [size](void* address) { ::munmap(address, size); });
-  return Data(std::move(mapping), {static_cast<const char*>(start), size});
+  if (size > kMaximumSize) return std::nullopt;
+  std::string bytes(size, '\0');
+  if (!readFully(file.get(), bytes)) return std::nullopt;
+  return Data(std::move(bytes));
 }
 
 void BodyFiles::remove(std::int64_t id) { ::unlinkat(open_.get(), bodyFileName(id).c_str(), 0); }

@@ -18,6 +18,9 @@ namespace zelkord {
 // Threading: one thread at a time. Errors: POSIX errors as values.
 class BodyFiles final {
  public:
+  // A larger one is not there, whoever made it.
+  static constexpr std::uint64_t kMaximumSize = 16 * 1024 * 1024;
+
   explicit BodyFiles(std::string folder) : folder_(std::move(folder)) {}
 
   const std::string& folder() const { return folder_; }
@@ -26,9 +29,9 @@ class BodyFiles final {
 
   // Requires a folder. A file that is there already is of nobody and goes.
   std::optional<Error> write(std::int64_t id, std::string_view bytes);
-  // The file, mapped; none when there is no regular file of that size. The mapping outlives the
-  // file.
-  std::optional<Data> map(std::int64_t id, std::uint64_t size);
+  // What is in the file; none when there is no regular file of that size. A copy: somebody may cut
+  // or change the file at any time, and reading a mapping of it would then end the process.
+  std::optional<Data> read(std::int64_t id, std::uint64_t size);
   void remove(std::int64_t id);
   // Removes all bodies of which nobody knows.
   void removeUnless(FunctionRef<bool(std::int64_t id)> isKnown);

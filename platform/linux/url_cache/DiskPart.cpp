@@ -86,8 +86,8 @@ StoredPointer DiskPart::read(const CacheEntry& entry) {
   const auto take = [&](const CacheDatabase::Row& row) {
     if (row.bodySize > entry.cost) return;
     auto response = decodeStoredHead(row.head);
-    const auto body =
-        row.body ? std::optional(Data(std::string(*row.body))) : files_.map(entry.id, row.bodySize);
+    const auto body = row.body ? std::optional(Data(std::string(*row.body)))
+                               : files_.read(entry.id, row.bodySize);
     if (!response || !body) return;
     if (row.digest != bytesOf(recordDigest(entry, row.head, body->view()))) return;
     response->body = *body;

@@ -11,7 +11,7 @@
 
 namespace zelkord {
 
-// The responses on disk: an index, and files for the bodies that are worth mapping.
+// The responses on disk: an index, and files for the bodies that are large.
 //
 // A body's file is written before its row and removed after it, so that a killed process leaves at
 // most a file that nobody knows. Each row has a digest of everything that belongs to the response;

@@ -1,5 +1,6 @@
 #include "platform/linux/url_cache/LinuxURLCache.h"
 
+#include <algorithm>
 #include <utility>
 
 #include "platform/linux/url_cache/CacheRules.h"
@@ -18,7 +19,7 @@ CachedResponse cachedFor(const URLRequest& request, const StoredResponse& stored
 
 LinuxURLCache::LinuxURLCache(const Host& host, const URLSessionConfiguration::Cache& limits)
     : clock_(host.clock),
-      maximumOnDisk_(limits.diskBytes / 10),
+      maximumOnDisk_(std::min(limits.diskBytes / 10, BodyFiles::kMaximumSize)),
       index_(limits.diskBytes),
       memory_(limits.memoryBytes),
       disk_(host.folder, limits.minimumMappedBytes, Logger(host.log, "")),

@@ -8,6 +8,7 @@
 #include <csignal>
 #include <filesystem>
 #include <functional>
+#include <thread>
 
 #include "platform/linux/url_cache/URLCacheTestSupport.h"
 #include "platform/testing/ForkedProcess.h"
@@ -141,6 +142,29 @@ TEST(LinuxURLCacheDamageTest, GivesOutNothingThatWasDamaged) {
     bed.restart();
     EXPECT_EQ(bed.find("http://h/mapped"), kMappedBody);
     EXPECT_EQ(bed.log.count(LogLevel::Error), errors);
+  }
+}
+
+TEST(LinuxURLCacheDamageTest, OutlivesFilesThatAreCutWhileTheyAreHeldAndRead) {
+  const std::string body(1'000'000, 'b');  // not held in memory
+  for (int round = 0; round < 10; ++round) {
+    const TemporaryDirectory state;
+    URLCacheTestBed bed(state / "urlcache");
+    bed.store("http://h/a", body);
+    bed.restart();
+    const auto held = bed.cache->lookup({.url = "http://h/a"});
+    ASSERT_TRUE(held);
+    std::thread cutter([&] {
+      std::this_thread::sleep_for(round * 200us);
+      std::filesystem::resize_file(state / kBodyFile, 5000);
+    });
+    for (int i = 0; i < 5; ++i) {
+      const auto found = bed.find("http://h/a");
+      EXPECT_TRUE(!found || *found == body);
+    }
+    cutter.join();
+    EXPECT_TRUE(held->data.view() == body);
+    EXPECT_FALSE(bed.find("http://h/a"));
   }
 }
 
