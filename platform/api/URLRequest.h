@@ -59,7 +59,7 @@ struct TimingData {
   std::int64_t bytesReceived = 0;
   int retries = 0;
   bool reused = false;
-  std::string interface;    // local address or device name of the connection
+  std::string interface;    // name of the network interface: "eth0"; "" when unknown
   std::string peerAddress;  // "ADDRESS:PORT"
 };
 

@@ -52,7 +52,7 @@ TEST(QueryFlowsTest, RecordBothEndsOfTheRequest) {
     AskedQuery query(kind);
     query.ask(true);
     query.task().setTimingData(
-        {.bytesSent = 99, .reused = true, .interface = "10.0.0.2", .peerAddress = "10.0.0.1:443"});
+        {.bytesSent = 99, .reused = true, .interface = "eth0", .peerAddress = "10.0.0.1:443"});
     query.succeed(200, kFlowResponse);
     EXPECT_THAT(query.bed.recordedClasses(),
                 ElementsAre(kind.startClass, "ZLKEndNetworkSearchFeedback"));
@@ -75,7 +75,7 @@ TEST(QueryFlowsTest, RecordBothEndsOfTheRequest) {
     const auto& end = query.record<ZLKEndNetworkSearchFeedback>(1);
     EXPECT_EQ(end.uuid, start.uuid);
     EXPECT_EQ(end.connectionReused, true);
-    EXPECT_EQ(end.interface, "10.0.0.2");
+    EXPECT_EQ(end.interface, "eth0");
     EXPECT_EQ(end.peerAddress, "10.0.0.1:443");
     EXPECT_EQ(end.statusCode, 200);
     EXPECT_EQ(end.responseSize, static_cast<std::int64_t>(std::string_view(kFlowResponse).size()));

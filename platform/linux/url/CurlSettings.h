@@ -1,10 +1,12 @@
 #pragma once
 
 #include <functional>
+#include <memory>
 #include <optional>
 #include <string>
 
 #include "base/Time.h"
+#include "platform/linux/url/InterfaceNames.h"
 
 namespace zelkord {
 
@@ -17,6 +19,7 @@ struct CurlSettings {
   // How long idle connections are kept while the network is metered.
   Duration meteredIdleTime = 10s;
   std::function<bool()> isMetered;  // any thread, cheap
+  std::shared_ptr<InterfaceNames> interfaces = std::make_shared<InterfaceNames>();  // the I/O loop
 };
 
 }  // namespace zelkord

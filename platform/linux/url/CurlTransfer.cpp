@@ -53,7 +53,8 @@ std::string endpointText(const std::string& address, long port) {
 CurlTransfer::CurlTransfer(const CurlSettings& settings, CURLSH* share)
     : handle_(curl_easy_init()),
       hasFastOpen_(settings.fastOpen),
-      multiplexes_(settings.multiplexes) {
+      multiplexes_(settings.multiplexes),
+      interfaces_(settings.interfaces) {
   ZK_CHECK(handle_, "an easy handle is made");
   setCommonOptions(handle_, settings, share);
   _setCallbacks();
@@ -242,7 +243,7 @@ void CurlTransfer::recordTiming(bool hasResponse) {
   timing_.bytesReceived += curlLong(handle_, CURLINFO_HEADER_SIZE);
   timing_.bytesReceived += curlNumber(handle_, CURLINFO_SIZE_DOWNLOAD_T);
   timing_.retries += std::max(0, requestsSent_ - 1);
-  timing_.interface = curlText(handle_, CURLINFO_LOCAL_IP);
+  timing_.interface = interfaces_->nameOf(curlText(handle_, CURLINFO_LOCAL_IP), IOLoop::now());
   timing_.peerAddress = endpointText(curlText(handle_, CURLINFO_PRIMARY_IP),
                                      curlLong(handle_, CURLINFO_PRIMARY_PORT));
 }

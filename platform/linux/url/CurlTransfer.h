@@ -81,6 +81,7 @@ class CurlTransfer final {
   CURL* const handle_;
   const bool hasFastOpen_;
   const bool multiplexes_;
+  const std::shared_ptr<InterfaceNames> interfaces_;
 
   // Of the task.
   std::shared_ptr<CurlURLTask> task_;

@@ -206,6 +206,7 @@ TEST_F(CurlURLSessionTest, DownloadsToAFileThatEndsWithTheCompletion) {
         path = result.file.value_or(URLResult::File{}).path;
         const auto handle = files.openForReading(path, nullptr);
         if (handle) mapped = handle->map(nullptr).value_or(Data());
+        EXPECT_NE(::truncate(path.c_str(), 0), 0) << "others cannot pull it away from the mapping";
         completion(finished, result);
       });
   task->resume();
@@ -284,7 +285,7 @@ TEST_F(CurlURLSessionTest, KeepsConnectionsAndReportsTiming) {
     EXPECT_EQ(timing.protocol, "http/1.1");
     EXPECT_GT(timing.bytesSent, 50);
     EXPECT_GT(timing.bytesReceived, 40);
-    EXPECT_EQ(timing.interface, "127.0.0.1");
+    EXPECT_EQ(timing.interface, "lo");
     EXPECT_EQ(timing.peerAddress, "127.0.0.1:" + std::to_string(server_.port()));
   }
 }
