@@ -30,12 +30,12 @@ std::uint64_t LimitReports::_toSay(std::string_view name, std::uint64_t times) {
 }
 
 struct Budget::Share::Account {
-  Account(std::string budgetName, Size budgetSize, LimitReports& limitReports)
+  Account(std::string budgetName, Size budgetSize, LimitReports* limitReports)
       : name(std::move(budgetName)), size(budgetSize), reports_(limitReports) {}
 
-  bool take(const std::string& holder, std::uint64_t amount) {
+  bool take(const std::string& holder, std::uint64_t amount, Refusal refusal) {
     if (_take(holder, amount)) return true;
-    reports_.refused(name, holder);
+    if (reports_ && refusal == Refusal::Reported) reports_->refused(name, holder);
     return false;
   }
 
@@ -85,7 +85,7 @@ struct Budget::Share::Account {
     return true;
   }
 
-  LimitReports& reports_;
+  LimitReports* const reports_;
   mutable Mutex mutex_;
   std::uint64_t held_ ZK_GUARDED_BY(mutex_) = 0;
   std::map<std::string, std::uint64_t, std::less<>> holders_ ZK_GUARDED_BY(mutex_);
@@ -113,7 +113,8 @@ Budget::Share::~Share() { reset(); }
 
 bool Budget::Share::resize(std::uint64_t amount) {
   if (!account_) return false;
-  if (amount > amount_ && !account_->take(holder_, amount - amount_)) return false;
+  if (amount > amount_ && !account_->take(holder_, amount - amount_, Refusal::Reported))
+    return false;
   if (amount < amount_) account_->giveBack(holder_, amount_ - amount);
   amount_ = amount;
   return true;
@@ -125,11 +126,15 @@ void Budget::Share::reset() {
 }
 
 Budget::Budget(std::string name, Size size, LimitReports& reports)
+    : Budget(std::move(name), size, &reports) {}
+
+Budget::Budget(std::string name, Size size, LimitReports* reports)
     : account_(std::make_shared<Share::Account>(std::move(name), size, reports)) {}
 
-std::optional<Budget::Share> Budget::take(std::string_view holder, std::uint64_t amount) {
+std::optional<Budget::Share> Budget::take(std::string_view holder, std::uint64_t amount,
+                                          Refusal refusal) {
   std::string owned(holder);
-  if (!account_->take(owned, amount)) return std::nullopt;
+  if (!account_->take(owned, amount, refusal)) return std::nullopt;
   return Share(account_, std::move(owned), amount);
 }
 

@@ -62,6 +62,9 @@ class Budget final {
   // The same, and half for one that is alone.
   static Size halvedWhenAlone(std::uint64_t inAll) { return {inAll, inAll / 4, inAll / 2}; }
 
+  // Silent: for who asks again and again for what was refused once.
+  enum class Refusal { Reported, Silent };
+
   // What a holder has of the budget; given back when destroyed. Move-only; empty after a move.
   // Threading: one thread at a time.
   class [[nodiscard]] Share {
@@ -87,9 +90,12 @@ class Budget final {
   };
 
   Budget(std::string name, Size size, LimitReports& reports);
+  // Null: nobody hears of refusals.
+  Budget(std::string name, Size size, LimitReports* reports);
 
   // Nothing when it does not fit.
-  std::optional<Share> take(std::string_view holder, std::uint64_t amount = 1);
+  std::optional<Share> take(std::string_view holder, std::uint64_t amount = 1,
+                            Refusal refusal = Refusal::Reported);
 
   const std::string& name() const;
   Size size() const;

@@ -12,8 +12,9 @@ struct CachedResponse {
   Data data;  // the decoded body
 };
 
-// What a session keeps of the responses to its requests. Ordinary tasks use it by themselves under
-// the rules of HTTP; here it is used by hand, and neither freshness nor no-store counts.
+// What is kept by hand of a session's responses: neither freshness nor no-store counts, nor whose
+// request asks. Ordinary tasks keep theirs by themselves, under the rules of HTTP, and apart: they
+// find nothing that is kept here, nor is what they keep found here.
 //
 // Threading: any thread; calls may block for the file system.
 // Errors: none. What cannot be kept is not kept, and what was damaged is not found.

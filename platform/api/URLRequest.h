@@ -17,6 +17,8 @@ namespace zelkord {
 using HTTPHeaders = std::vector<std::pair<std::string, std::string>>;
 
 enum class CachePolicy { UseProtocol, ReloadIgnoringLocalCache };
+// When there are too many transfers, those of low priority leave room for the others.
+enum class TransferPriority { Normal, Low };
 
 struct URLRequest {
   std::string url;  // absolute
@@ -25,6 +27,7 @@ struct URLRequest {
   Data body;
   Duration timeout = 60s;  // without progress, real time; the whole task may take ten times that
   CachePolicy cachePolicy = CachePolicy::UseProtocol;
+  TransferPriority priority = TransferPriority::Normal;
   // Asks for the network proxy service; counts once the proxy is enabled for the task.
   bool routed = false;
   // Asked on any thread for every URL that a redirect leads to; the task fails with -1002 when one

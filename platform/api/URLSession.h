@@ -47,6 +47,10 @@ class URLSession {
   virtual URLCache* cache() = 0;
   // Forgets what the URL cache holds in memory; the disk part stays.
   virtual void purgeMemoryCache() = 0;
+  // Nobody carries that identity any more: connections that may know of it close as soon as the
+  // tasks on them have ended, TLS sessions and all answers that came under it are dropped, from
+  // the disk too. Requests with it that come later leave nothing behind.
+  virtual void endIdentity(const std::string& identity) = 0;
 };
 
 struct URLSessionConfiguration {
@@ -57,6 +61,9 @@ struct URLSessionConfiguration {
     std::uint64_t minimumMappedBytes = 0;
   };
   std::optional<Cache> cache;  // none: no URL cache
+  // The header with which requests say whose they are. Requests of two identities share no
+  // connection, no TLS session, no validator and no cached answer. Empty: all are nobody's.
+  std::string identityHeader;
   bool storesCookies = false;
   Duration cellularPurgeTimeout = 10s;  // idle connections on a metered network
   unsigned timingDataMask = 15;         // all

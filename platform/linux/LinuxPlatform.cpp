@@ -75,7 +75,8 @@ ipc::SdBusOptions busOptions(const LinuxPlatformOptions& options, const LinuxFil
 CurlURLSessions::Services urlServices(const std::shared_ptr<LinuxSettings>& settings,
                                       std::shared_ptr<const ProxyConfigurationSource> proxies,
                                       const MeteredNetwork& network,
-                                      CurlURLSessions::Services::CacheHost cache) {
+                                      CurlURLSessions::Services::CacheHost cache,
+                                      LimitReports& limits) {
   CurlURLSessions::Services services;
   services.isMetered = [&network] { return network.isMetered(); };
   services.maximumResponseSize = [settings] {
@@ -84,6 +85,7 @@ CurlURLSessions::Services urlServices(const std::shared_ptr<LinuxSettings>& sett
   services.proxies = std::move(proxies);
   services.rootsFile = CurlURLSessions::rootsFileOfEnvironment();
   services.cache.emplace(std::move(cache));
+  services.reports = &limits;
   return services;
 }
 
@@ -156,8 +158,9 @@ struct LinuxPlatform::Services {
                                                  queues, log)),
         knowledge(hostDataHome(options.environment), files, queues, clock, log),
         interprocess(queues, log, limits, busOptions(options, files, watcher)),
-        urlSessions(queues, urlServices(settings, networkProxy, meteredNetwork,
-                                        {clock, log, files.directories().state + "/urlcache"})) {
+        urlSessions(queues,
+                    urlServices(settings, networkProxy, meteredNetwork,
+                                {clock, log, files.directories().state + "/urlcache"}, limits)) {
     log.showPrivateDataWhen([weak = std::weak_ptr(settings)] {
       const auto alive = weak.lock();
       return alive && boolSetting(*alive, "ZLKLogPrivateData");
@@ -193,7 +196,7 @@ struct LinuxPlatform::Services {
   NotificationCenter notificationCenter;
   CountedTransactions transactions{clock};
   LinuxCounters counters{files, queues, log};
-  LimitReports limits{clock, counters, Logger(log, "")};
+  LimitReports limits{clock, counters, Logger(log, "Zelkor")};
   TraceMarker trace{Logger(log, "")};
   LinuxSignals signals;
   LinuxProcess process{queues};

@@ -35,6 +35,11 @@ int FakeURLSession::purges() const {
   return purges_;
 }
 
+std::vector<std::string> FakeURLSession::endedIdentities() const {
+  const MutexLock lock(mutex_);
+  return endedIdentities_;
+}
+
 void FakeURLSession::setOnResume(std::function<void(FakeURLTask&)> handler) {
   shared_->onResume = std::move(handler);
 }
@@ -65,6 +70,11 @@ std::shared_ptr<FakeURLTask> FakeURLSession::_makeTask(URLRequest request,
 void FakeURLSession::purgeMemoryCache() {
   const MutexLock lock(mutex_);
   ++purges_;
+}
+
+void FakeURLSession::endIdentity(const std::string& identity) {
+  const MutexLock lock(mutex_);
+  endedIdentities_.push_back(identity);
 }
 
 }  // namespace zelkord

@@ -2,6 +2,7 @@
 
 #include <functional>
 #include <memory>
+#include <string>
 #include <vector>
 
 #include "base/Mutex.h"
@@ -31,6 +32,8 @@ class FakeURLSession final : public URLSession {
   std::vector<std::shared_ptr<FakeURLTask>> pending() const;
   void forgetTasks();
   int purges() const;
+  // In the order in which they ended.
+  std::vector<std::string> endedIdentities() const;
 
   // Called in `resume`, on its thread: may answer at once.
   void setOnResume(std::function<void(FakeURLTask&)> handler);
@@ -42,6 +45,7 @@ class FakeURLSession final : public URLSession {
   std::shared_ptr<URLTask> downloadTask(URLRequest request, URLCompletion completion) override;
   FakeURLCache* cache() override { return configuration_.cache ? &cache_ : nullptr; }
   void purgeMemoryCache() override;
+  void endIdentity(const std::string& identity) override;
 
  private:
   std::shared_ptr<FakeURLTask> _makeTask(URLRequest request, URLCompletion completion);
@@ -54,6 +58,7 @@ class FakeURLSession final : public URLSession {
   mutable Mutex mutex_;
   std::vector<std::shared_ptr<FakeURLTask>> tasks_ ZK_GUARDED_BY(mutex_);
   int purges_ ZK_GUARDED_BY(mutex_) = 0;
+  std::vector<std::string> endedIdentities_ ZK_GUARDED_BY(mutex_);
 };
 
 }  // namespace zelkord

@@ -9,6 +9,7 @@
 
 #include <array>
 #include <cstdlib>
+#include <cstring>
 #include <sstream>
 #include <utility>
 
@@ -25,12 +26,39 @@ bool passTestBytes(int from, int to) {
 
 }  // namespace
 
-TestHTTPConnection::TestHTTPConnection(int socket, SSL_CTX* tls) : socket_(socket) {
+TestHTTPConnection::TestHTTPConnection(int socket, SSL_CTX* tls, int number)
+    : socket_(socket), number_(number) {
   const int on = 1;
   setsockopt(socket_, IPPROTO_TCP, TCP_NODELAY, &on, sizeof on);
   if (!tls) return;
   ssl_.reset(SSL_new(tls));
   SSL_set_fd(ssl_.get(), socket_);
+  SSL_set_app_data(ssl_.get(), this);
+}
+
+void TestHTTPConnection::markTickets(SSL_CTX* tls) {
+  SSL_CTX_set_session_ticket_cb(tls, &TestHTTPConnection::_onTicket,
+                                &TestHTTPConnection::_onResumption, nullptr);
+}
+
+int TestHTTPConnection::_onTicket(SSL* ssl, void*) {
+  const int number = static_cast<TestHTTPConnection*>(SSL_get_app_data(ssl))->number_;
+  return SSL_SESSION_set1_ticket_appdata(SSL_get_session(ssl), &number, sizeof number);
+}
+
+SSL_TICKET_RETURN TestHTTPConnection::_onResumption(SSL* ssl, SSL_SESSION* session,
+                                                    const unsigned char*, std::size_t,
+                                                    SSL_TICKET_STATUS status, void*) {
+  if (status != SSL_TICKET_SUCCESS && status != SSL_TICKET_SUCCESS_RENEW) {
+    return SSL_TICKET_RETURN_IGNORE_RENEW;
+  }
+  void* bytes = nullptr;
+  std::size_t size = 0;
+  auto& connection = *static_cast<TestHTTPConnection*>(SSL_get_app_data(ssl));
+  if (SSL_SESSION_get0_ticket_appdata(session, &bytes, &size) == 1 && size == sizeof(int)) {
+    std::memcpy(&connection.resumedFrom_, bytes, size);
+  }
+  return SSL_TICKET_RETURN_USE_RENEW;
 }
 
 TestHTTPConnection::~TestHTTPConnection() { close(socket_); }

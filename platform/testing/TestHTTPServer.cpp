@@ -37,6 +37,7 @@ std::shared_ptr<SSL_CTX> makeServerTLS(const std::optional<TestCertificate>& ide
   ZK_CHECK(usable, "the server's certificate is usable");
   X509_free(certificate);
   EVP_PKEY_free(key);
+  TestHTTPConnection::markTickets(tls.get());
   return tls;
 }
 
@@ -84,6 +85,11 @@ TestHTTPServer::~TestHTTPServer() {
   }
   for (auto& thread : threads) thread.join();
   close(listener_);
+}
+
+void TestHTTPServer::answerWith(Handler handler) {
+  const MutexLock lock(mutex_);
+  handler_ = std::move(handler);
 }
 
 void TestHTTPServer::reply(const std::string& path, TestHTTPReply reply) {
@@ -152,10 +158,11 @@ void TestHTTPServer::_closed(int socket, bool resumedTLS) {
 
 void TestHTTPServer::_serve(int socket, int number) {
   blockTestSignals();
-  TestHTTPConnection connection(socket, tls_.get());
+  TestHTTPConnection connection(socket, tls_.get(), number);
   auto request = connection.handshake() ? connection.readRequest() : std::nullopt;
   while (request) {
     request->connection = number;
+    request->resumedFrom = connection.resumedFrom();
     const bool isTunnel = request->method == "CONNECT";
     const std::string target = request->target;
     const TestHTTPReply reply = _answer(*std::move(request));
@@ -201,6 +208,7 @@ TestHTTPReply TestHTTPServer::_answer(TestHTTPRequest request) {
   requests_.push_back(std::move(request));
   changed_.notify_all();
   if (isTunnel) return {.bytes = "HTTP/1.1 200 Connected\r\n\r\n"};
+  if (handler_) return handler_(requests_.back());
   const auto found = script_.find(path);
   if (found == script_.end()) return TestHTTPReply::make(404);
   auto& replies = found->second;

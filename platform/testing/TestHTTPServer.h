@@ -2,6 +2,7 @@
 
 #include <condition_variable>
 #include <deque>
+#include <functional>
 #include <map>
 #include <memory>
 #include <optional>
@@ -27,7 +28,8 @@ struct TestHTTPRequest {
   std::string target;   // with the query
   HTTPHeaders headers;  // in order
   std::string body;
-  int connection = 0;  // which connection brought it, from 1
+  int connection = 0;   // which connection brought it, from 1
+  int resumedFrom = 0;  // whose TLS session that one resumed; 0: nobody's
 
   std::optional<std::string> header(std::string_view name) const;
 };
@@ -46,6 +48,9 @@ class TestHTTPServer final {
   TestHTTPServer(const TestHTTPServer&) = delete;
   TestHTTPServer& operator=(const TestHTTPServer&) = delete;
 
+  // Asked instead of the script from now on.
+  using Handler = std::function<TestHTTPReply(const TestHTTPRequest& request)>;
+  void answerWith(Handler handler);
   // Adds to the script of a path (without its query).
   void reply(const std::string& path, TestHTTPReply reply);
 
@@ -80,6 +85,7 @@ class TestHTTPServer final {
   mutable Mutex mutex_;
   mutable std::condition_variable_any changed_;
   bool ending_ ZK_GUARDED_BY(mutex_) = false;
+  Handler handler_ ZK_GUARDED_BY(mutex_);
   std::map<std::string, std::deque<TestHTTPReply>> script_ ZK_GUARDED_BY(mutex_);
   std::vector<TestHTTPRequest> requests_ ZK_GUARDED_BY(mutex_);
   int connections_ ZK_GUARDED_BY(mutex_) = 0;

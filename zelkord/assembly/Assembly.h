@@ -55,6 +55,7 @@ class Assembly final {
 
   URLSession& urlSession() { return sessions_.urlSession(); }
   URLSession& bagSession() { return sessions_.bagSession(); }
+  void endIdentity(const std::string& identity) { sessions_.endIdentity(identity); }
 
   ZLKNetworkRequestFactory* requestFactory() const { return requestFactory_.get(); }
   ImageFetcher* imageFetcher() const { return imageFetcher_.get(); }

@@ -1,12 +1,17 @@
 #pragma once
 
+#include <atomic>
 #include <memory>
 #include <mutex>
+#include <string>
 
 #include "platform/api/SettingsStore.h"
 #include "platform/api/URLSession.h"
 
 namespace zelkord {
+
+// The header with the user identifier of a request.
+inline constexpr const char* kUserGuidHeader = "X-Quenta-UserGuid";
 
 // The daemon's URL sessions, each made at its first use.
 // Threading: any thread. Ownership: the platform outlives it.
@@ -19,6 +24,8 @@ class ServiceSessions final {
   URLSession& urlSession();
   // The bag fetch.
   URLSession& bagSession();
+  // Nothing of what the sessions made under a user identifier is used any more.
+  void endIdentity(const std::string& identity);
 
  private:
   URLSessions& sessions_;
@@ -27,6 +34,9 @@ class ServiceSessions final {
   std::once_flag bagOnce_;
   std::shared_ptr<URLSession> url_;
   std::shared_ptr<URLSession> bag_;
+  // Null until they are made.
+  std::atomic<URLSession*> madeURL_ = nullptr;
+  std::atomic<URLSession*> madeBag_ = nullptr;
 };
 
 }  // namespace zelkord

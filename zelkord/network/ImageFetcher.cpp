@@ -83,7 +83,10 @@ bool ImageFetcher::_isRouted() const {
 
 URLRequest ImageFetcher::_requestFor(const std::string& url, Duration timeout,
                                      RedirectRule accepts) const {
-  URLRequest request{.url = url, .timeout = timeout, .acceptsRedirect = std::move(accepts)};
+  URLRequest request{.url = url,
+                     .timeout = timeout,
+                     .priority = TransferPriority::Low,
+                     .acceptsRedirect = std::move(accepts)};
   const auto userAgent = zelkordUserAgent(assembly_.platform().device);
   if (userAgent) request.headers.emplace_back("User-Agent", *userAgent);
   return _isRouted() ? routedForm(std::move(request)) : request;

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "zelkord/assembly/ServiceSessions.h"
 #include "zelkord/network/RequestItems.h"
 
 namespace zelkord::items {
@@ -55,7 +56,7 @@ inline constexpr RequestItem kContextLanguage{ItemKind::DefaultItem, "lctxlang",
 inline constexpr RequestItem kDiagnosticsEnabled{ItemKind::DefaultItem, "du_enabled",
                                                  values::diagnosticsEnabled};
 
-inline constexpr RequestItem kUserGuid{ItemKind::Header, "X-Quenta-UserGuid", values::userGuid};
+inline constexpr RequestItem kUserGuid{ItemKind::Header, kUserGuidHeader, values::userGuid};
 inline constexpr RequestItem kUserAgent{ItemKind::Header, "User-Agent", values::userAgent};
 inline constexpr RequestItem kUIScale{ItemKind::Header, "X-Quenta-UI-Scale", values::uiScale};
 inline constexpr RequestItem kLanguages{ItemKind::Header, "X-Quenta-Languages", values::languages};

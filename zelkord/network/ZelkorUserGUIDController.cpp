@@ -1,5 +1,7 @@
 #include "zelkord/network/ZelkorUserGUIDController.h"
 
+#include <utility>
+
 #include "platform/api/RandomUUID.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/assembly/NotificationNames.h"
@@ -17,6 +19,10 @@ ZelkorUserGUIDController::ZelkorUserGUIDController(Assembly& assembly)
       lastKnownUserGUID_(randomUUID(assembly.platform().random)),
       lastKnownUserGUIDExpirationDate_(assembly.platform().clock.now() + kUserGUIDLifetime) {}
 
+ZelkorUserGUIDController::~ZelkorUserGUIDController() {
+  assembly_.endIdentity(lastKnownUserGUID_.string());
+}
+
 UUID ZelkorUserGUIDController::currentUserGUID() {
   UUID current;
   queue_->sync([this, &current] {
@@ -33,9 +39,10 @@ void ZelkorUserGUIDController::reset() {
 
 void ZelkorUserGUIDController::_rollGUID() {
   queue_->assertCurrent();
-  lastKnownUserGUID_ = randomUUID(assembly_.platform().random);
+  const auto ended = std::exchange(lastKnownUserGUID_, randomUUID(assembly_.platform().random));
   lastKnownUserGUIDExpirationDate_ = assembly_.platform().clock.now() + kUserGUIDLifetime;
-  queue_->async([&assembly = assembly_] {
+  queue_->async([&assembly = assembly_, ended] {
+    assembly.endIdentity(ended.string());
     assembly.reporter().addValue(1, "com.quenta.zelkord.userguid");
     assembly.notificationCenter().post(std::string(kZLKUserGUIDChangeNotification));
   });

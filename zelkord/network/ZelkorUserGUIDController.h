@@ -13,7 +13,8 @@ class Assembly;
 // The identifier that requests and feedback carry in place of the person: random, held in memory
 // only, replaced at its first use 900 s or more after it was made, or by `reset`. Each replacement
 // counts "com.quenta.zelkord.userguid" and posts "ZLKUserGUIDChangeNotification"; the first
-// identifier does neither.
+// identifier does neither. An identifier that is replaced, or whose controller goes, ends with the
+// URL sessions: no connection and no cached answer joins it to another.
 //
 // Threading: any thread but observers of that notification, which run on this controller's queue.
 // Age is steady time: the wall clock may jump.
@@ -21,6 +22,9 @@ class Assembly;
 class ZelkorUserGUIDController final : public UserGUIDSource {
  public:
   explicit ZelkorUserGUIDController(Assembly& assembly);
+  ~ZelkorUserGUIDController() override;
+  ZelkorUserGUIDController(const ZelkorUserGUIDController&) = delete;
+  ZelkorUserGUIDController& operator=(const ZelkorUserGUIDController&) = delete;
 
   UUID currentUserGUID() override;
   void reset() override;

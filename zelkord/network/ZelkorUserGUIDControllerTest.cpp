@@ -1,5 +1,8 @@
 #include <gtest/gtest.h>
 
+#include <memory>
+#include <vector>
+
 #include "platform/testing/FakePlatform.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/assembly/NotificationNames.h"
@@ -37,6 +40,27 @@ TEST_F(ZelkorUserGUIDControllerTest, ReplacesTheIdentifierAtItsFirstUseAfter900S
   EXPECT_EQ(counted(), 1);
   platform_.timeline.advance(10h);
   EXPECT_EQ(notified_, 1);  // an old one that nobody uses stays
+}
+
+TEST_F(ZelkorUserGUIDControllerTest, EndsOldIdentifiersWithTheSessionsThatThereAre) {
+  controller_.reset();
+  platform_.timeline.runUntilIdle();  // no session yet
+  const auto second = controller_.currentUserGUID().string();
+  assembly_.urlSession();
+  assembly_.bagSession();
+  controller_.reset();
+  const auto third = controller_.currentUserGUID().string();
+  platform_.timeline.advance(900s);
+  auto other = std::make_unique<ZelkorUserGUIDController>(assembly_);
+  const auto ofOther = other->currentUserGUID().string();
+  other.reset();
+  controller_.currentUserGUID();
+  platform_.timeline.runUntilIdle();
+  for (const char* name : {"urlSession", "bagSession"}) {
+    const auto session = platform_.urlSessions.find(name);
+    EXPECT_EQ(session->endedIdentities(), (std::vector{second, ofOther, third})) << name;
+    EXPECT_EQ(session->configuration().identityHeader, "X-Quenta-UserGuid");
+  }
 }
 
 TEST_F(ZelkorUserGUIDControllerTest, TheWallClockMayJump) {

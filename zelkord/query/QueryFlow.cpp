@@ -38,6 +38,8 @@ void QueryFlow::_send() {
   auto request = _makeRequest(bag.get(), guid);
   if (!request) return _reply(std::nullopt, zelkorError(kBagFault, "no URL"));
   httpRequest_ = *std::move(request);
+  // What people type goes before what they follow up.
+  if (traits_.transport != QueryTransport::Plain) httpRequest_.priority = TransferPriority::Low;
   _logRequest();
   state_->record(_makeStart(httpRequest_), *request_, guid);
   const auto task = _makeTask(bag.get());

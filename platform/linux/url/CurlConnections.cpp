@@ -12,37 +12,47 @@
 namespace zelkord {
 namespace {
 
-constexpr long kMaximumIdleConnections = 32;
 constexpr std::size_t kMaximumIdleHandles = 32;
 constexpr Duration kMaximumIdleTime = 118s;
 
 }  // namespace
 
 CurlConnections::CurlConnections(IOLoop& loop, CurlSettings settings)
-    : loop_(loop), settings_(std::move(settings)) {}
+    : loop_(loop), settings_(std::move(settings)), maximumIdle_(settings_.maximumIdleConnections) {}
 
 CurlConnections::~CurlConnections() { ZK_CHECK(!open_, "connections are closed before their end"); }
 
-void CurlConnections::begin(std::shared_ptr<CurlURLTask> task) {
-  if (closed_) return;
-  auto order = task->order();
-  if (!order) return task->finish({});
+void CurlConnections::begin(std::shared_ptr<CurlURLTask> task, CurlURLTask::Order order,
+                            TransferPlace place) {
+  ZK_CHECK(!retired_ && !closed_, "retired connections take no more tasks");
   _open();
   active_.push_back(_takeTransfer());
   CurlTransfer& transfer = *active_.back();
   transfer.place = active_.size() - 1;
   const bool metered = settings_.isMetered();
   transfer.setMaximumIdleTime(metered ? settings_.meteredIdleTime : kMaximumIdleTime);
-  transfer.begin(std::move(task), *std::move(order));
+  transfer.begin(std::move(task), std::move(order), std::move(place));
   _start(transfer);
 }
 
-void CurlConnections::cancel(CurlURLTask& task) {
-  if (!task.transfer) return;
+bool CurlConnections::cancel(CurlURLTask& task) {
+  if (!task.transfer) return false;
   CurlTransfer& transfer = *task.transfer;
+  if (transfer.place >= active_.size() || active_[transfer.place].get() != &transfer) return false;
   curl_multi_remove_handle(multi_, transfer.handle());
   transfer.recordTiming(false);
   _finish(transfer, {});
+  return true;
+}
+
+void CurlConnections::setMaximumIdle(long count) {
+  maximumIdle_ = count;
+  if (multi_) curl_multi_setopt(multi_, CURLMOPT_MAXCONNECTS, maximumIdle_);
+}
+
+void CurlConnections::retire() {
+  retired_ = true;
+  if (active_.empty()) close();
 }
 
 std::vector<std::shared_ptr<CurlURLTask>> CurlConnections::close() {
@@ -86,7 +96,7 @@ void CurlConnections::_open() {
   curl_multi_setopt(multi_, CURLMOPT_SOCKETDATA, this);
   curl_multi_setopt(multi_, CURLMOPT_TIMERFUNCTION, &CurlConnections::_onTimer);
   curl_multi_setopt(multi_, CURLMOPT_TIMERDATA, this);
-  curl_multi_setopt(multi_, CURLMOPT_MAXCONNECTS, kMaximumIdleConnections);
+  curl_multi_setopt(multi_, CURLMOPT_MAXCONNECTS, maximumIdle_);
   curl_multi_setopt(multi_, CURLMOPT_PIPELINING,
                     settings_.multiplexes ? CURLPIPE_MULTIPLEX : CURLPIPE_NOTHING);
 }
@@ -133,7 +143,8 @@ void CurlConnections::runDue(SteadyTime now) {
     _collectEnded();
   }
   if (overdueCheck_ <= now) _endOverdue(now);
-  if (purgeDue_ <= now) _closeMulti();
+  if (purgeDue_ > now) return;
+  retired_ ? retire() : _closeMulti();
 }
 
 void CurlConnections::_endOverdue(SteadyTime now) {
@@ -213,7 +224,9 @@ std::shared_ptr<CurlURLTask> CurlConnections::_release(CurlTransfer& transfer) {
   active_.pop_back();
   if (active_.empty()) {
     overdueCheck_ = kNever;
-    if (settings_.isMetered()) purgeDue_ = IOLoop::now() + settings_.meteredIdleTime;
+    // Not at once: libcurl may be at work.
+    if (retired_) purgeDue_ = IOLoop::now();
+    if (!retired_ && settings_.isMetered()) purgeDue_ = IOLoop::now() + settings_.meteredIdleTime;
   }
   return task;
 }

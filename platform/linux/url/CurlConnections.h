@@ -14,11 +14,12 @@
 
 namespace zelkord {
 
-// A session's connections: the multi handle with the transfers under way, easy handles to use
+// Connections of a session: the multi handle with the transfers under way, easy handles to use
 // again, and the TLS sessions to resume.
 //
 // States: unused; open (from the first task; on a metered network the multi handle, and with it the
-// connections, goes when it has been idle for a while, and comes back with the next task); closed.
+// connections, goes when it has been idle for a while, and comes back with the next task); retired,
+// when it closes as soon as it is idle; closed.
 //
 // Threading: the I/O loop; made and, once closed, destroyed on any.
 // Ownership: holds the tasks under way.
@@ -29,8 +30,13 @@ class CurlConnections final : public IOLoopClient {
   CurlConnections(const CurlConnections&) = delete;
   CurlConnections& operator=(const CurlConnections&) = delete;
 
-  void begin(std::shared_ptr<CurlURLTask> task);
-  void cancel(CurlURLTask& task);
+  void begin(std::shared_ptr<CurlURLTask> task, CurlURLTask::Order order, TransferPlace place);
+  // False when the task is not under way here.
+  bool cancel(CurlURLTask& task);
+  // How many connections may be kept for later.
+  void setMaximumIdle(long count);
+  void retire();
+  bool isClosed() const { return closed_; }
   // Gives up the tasks under way; the caller drops them.
   std::vector<std::shared_ptr<CurlURLTask>> close();
 
@@ -61,7 +67,9 @@ class CurlConnections final : public IOLoopClient {
 
   // The I/O loop.
   bool open_ = false;
+  bool retired_ = false;
   bool closed_ = false;
+  long maximumIdle_;
   CURLSH* share_ = nullptr;
   CURLM* multi_ = nullptr;
   std::vector<std::unique_ptr<CurlTransfer>> active_;

@@ -18,6 +18,7 @@ struct CurlSettings {
   std::optional<bool> tlsSessionTickets;  // none: libcurl's default
   // How long idle connections are kept while the network is metered.
   Duration meteredIdleTime = 10s;
+  long maximumIdleConnections = 32;
   std::function<bool()> isMetered;  // any thread, cheap
   std::shared_ptr<InterfaceNames> interfaces = std::make_shared<InterfaceNames>();  // the I/O loop
 };

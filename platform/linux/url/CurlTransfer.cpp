@@ -19,15 +19,9 @@ namespace {
 constexpr std::size_t kLongURL = 32'768;
 constexpr long kLargeUploadBuffer = 1L << 20;
 
-constexpr Duration kDefaultTimeout = 60s;
-constexpr Duration kMaximumTimeout = 24h * 7;
 constexpr int kTotalTimeoutFactor = 10;
 // The kernel takes smaller bodies at once, so that their progress is nothing to watch.
 constexpr std::size_t kWatchedBodySize = 64 * 1024;
-
-Duration timeoutOf(const URLRequest& request) {
-  return request.timeout > 0s ? std::min(request.timeout, kMaximumTimeout) : kDefaultTimeout;
-}
 
 std::string protocolName(long version) {
   switch (version) {
@@ -81,10 +75,12 @@ void CurlTransfer::_setCallbacks() {
   curl_easy_setopt(handle_, CURLOPT_XFERINFODATA, this);
 }
 
-void CurlTransfer::begin(std::shared_ptr<CurlURLTask> task, CurlURLTask::Order order) {
+void CurlTransfer::begin(std::shared_ptr<CurlURLTask> task, CurlURLTask::Order order,
+                         TransferPlace taken) {
   task_ = std::move(task);
   task_->transfer = this;
   order_ = std::move(order);
+  taken_ = std::move(taken);
   timing_ = {};
   redirects = 0;
   if (fastOpen_ != hasFastOpen_) _setFastOpen(hasFastOpen_);
@@ -122,6 +118,7 @@ std::shared_ptr<CurlURLTask> CurlTransfer::endTask() {
   curl_easy_setopt(handle_, CURLOPT_POSTFIELDS, nullptr);
   order_ = {};
   response_.begin(0);
+  taken_.reset();
   return std::exchange(task_, nullptr);
 }
 

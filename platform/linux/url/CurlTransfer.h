@@ -13,6 +13,7 @@
 #include "platform/linux/url/CurlURLTask.h"
 #include "platform/linux/url/HeaderLines.h"
 #include "platform/linux/url/ResponseCollector.h"
+#include "platform/linux/url/TransferPlace.h"
 
 namespace zelkord {
 
@@ -35,7 +36,7 @@ class CurlTransfer final {
   CURL* handle() const { return handle_; }
 
   // Takes a task up and sets the handle for its request.
-  void begin(std::shared_ptr<CurlURLTask> task, CurlURLTask::Order order);
+  void begin(std::shared_ptr<CurlURLTask> task, CurlURLTask::Order order, TransferPlace taken);
   // Sets the handle for another request of the same task: after a redirect, or the same again.
   void restart(std::shared_ptr<const URLRequest> request);
   // Gives the task back and is idle.
@@ -86,6 +87,7 @@ class CurlTransfer final {
   // Of the task.
   std::shared_ptr<CurlURLTask> task_;
   CurlURLTask::Order order_;  // with the request of the moment
+  TransferPlace taken_;
   TimingData timing_;
   bool fastOpen_ = false;
 

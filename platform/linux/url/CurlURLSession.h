@@ -1,15 +1,18 @@
 #pragma once
 
+#include <atomic>
 #include <cstdint>
 #include <functional>
 #include <memory>
+#include <string>
 
 #include "platform/api/URLSession.h"
-#include "platform/linux/url/CurlConnections.h"
+#include "platform/linux/url/CurlPartitions.h"
 #include "platform/linux/url/CurlSettings.h"
 #include "platform/linux/url/DelegateQueue.h"
 #include "platform/linux/url/IOLoop.h"
 #include "platform/linux/url/ProxyConfiguration.h"
+#include "platform/linux/url/TransferLine.h"
 
 namespace zelkord {
 
@@ -23,11 +26,13 @@ class CurlURLSession final : public URLSession,
  public:
   struct Services {
     std::shared_ptr<IOLoop> loop;
+    std::shared_ptr<TransferLine> line;
     std::function<std::uint64_t()> maximumResponseSize;
     std::shared_ptr<const ProxyConfigurationSource> proxies;  // may be null
   };
 
-  CurlURLSession(Services services, CurlSettings settings,
+  // `identityHeader` empty: all requests are nobody's.
+  CurlURLSession(Services services, CurlSettings settings, std::string identityHeader,
                  std::shared_ptr<DelegateQueue> delegateQueue);
   ~CurlURLSession() override;
 
@@ -36,6 +41,13 @@ class CurlURLSession final : public URLSession,
   std::shared_ptr<URLTask> downloadTask(URLRequest request, URLCompletion completion) override;
   URLCache* cache() override { return nullptr; }
   void purgeMemoryCache() override {}
+  void endIdentity(const std::string& identity) override;
+
+  // How many identities have ended.
+  std::uint64_t endings() const { return endings_; }
+  // A task that counts as made when so many had.
+  std::shared_ptr<URLTask> dataTask(URLRequest request, URLCompletion completion,
+                                    std::uint64_t endings);
 
   // For its tasks.
   void begin(const std::shared_ptr<CurlURLTask>& task);
@@ -47,7 +59,10 @@ class CurlURLSession final : public URLSession,
   // Fixed after construction.
   const Services services_;
   const std::shared_ptr<DelegateQueue> delegateQueue_;
-  const std::shared_ptr<CurlConnections> connections_;
+  const std::string identityHeader_;
+  const std::shared_ptr<CurlPartitions> partitions_;
+
+  std::atomic<std::uint64_t> endings_ = 0;  // of identities
 };
 
 }  // namespace zelkord

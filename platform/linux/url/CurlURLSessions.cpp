@@ -23,7 +23,10 @@ bool readFastOpenOfKernel() {
 }  // namespace
 
 CurlURLSessions::CurlURLSessions(WorkQueues& queues, Services services)
-    : queues_(queues), services_(std::move(services)), kernelHasFastOpen_(readFastOpenOfKernel()) {
+    : queues_(queues),
+      services_(std::move(services)),
+      kernelHasFastOpen_(readFastOpenOfKernel()),
+      line_(std::make_shared<TransferLine>(loop_, services_.limits, services_.reports)) {
   ZK_CHECK(curl_global_init(CURL_GLOBAL_DEFAULT) == CURLE_OK, "libcurl initialises");
 }
 
@@ -35,15 +38,17 @@ std::shared_ptr<URLSession> CurlURLSessions::make(const URLSessionConfiguration&
                         .fastOpen = kernelHasFastOpen_ && configuration.tcpFastOpen.value_or(false),
                         .tlsSessionTickets = configuration.tlsSessionTickets,
                         .meteredIdleTime = configuration.cellularPurgeTimeout,
+                        .maximumIdleConnections = services_.limits.idleConnections,
                         .isMetered = services_.isMetered};
   auto delegateQueue =
       std::make_shared<DelegateQueue>(queues_.makeSerialQueue("url." + configuration.name));
   auto session = std::make_shared<CurlURLSession>(
-      CurlURLSession::Services{loop_, services_.maximumResponseSize, services_.proxies},
-      std::move(settings), delegateQueue);
+      CurlURLSession::Services{loop_, line_, services_.maximumResponseSize, services_.proxies},
+      std::move(settings), configuration.identityHeader, delegateQueue);
   if (!configuration.cache || !services_.cache) return session;
   return std::make_shared<CachingURLSession>(std::move(session), std::move(delegateQueue),
-                                             _cache(*configuration.cache));
+                                             _cache(*configuration.cache),
+                                             configuration.identityHeader);
 }
 
 std::shared_ptr<LinuxURLCache> CurlURLSessions::_cache(

@@ -13,6 +13,8 @@
 #include "platform/api/WorkQueues.h"
 #include "platform/linux/url/IOLoop.h"
 #include "platform/linux/url/ProxyConfiguration.h"
+#include "platform/linux/url/TransferLimits.h"
+#include "platform/linux/url/TransferLine.h"
 
 namespace zelkord {
 
@@ -37,6 +39,8 @@ class CurlURLSessions final : public URLSessions {
     // Whether data costs money at the moment. Any thread, cheap.
     std::function<bool()> isMetered = [] { return false; };
     std::shared_ptr<const ProxyConfigurationSource> proxies;  // null: there is no such service
+    TransferLimits limits = TransferLimits::ofProcess();
+    LimitReports* reports = nullptr;  // outlives the sessions; null: refusals are not counted
     // PEM file with the trusted roots; empty: the system's.
     std::string rootsFile;
     // What sessions with a URL cache need for it; none: they have none. The clock and the log
@@ -69,6 +73,7 @@ class CurlURLSessions final : public URLSessions {
   const Services services_;
   const bool kernelHasFastOpen_;
   const std::shared_ptr<IOLoop> loop_ = std::make_shared<IOLoop>();
+  const std::shared_ptr<TransferLine> line_;
 
   Mutex mutex_;
   std::weak_ptr<LinuxURLCache> cache_ ZK_GUARDED_BY(mutex_);

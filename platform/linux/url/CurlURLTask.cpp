@@ -10,11 +10,11 @@
 namespace zelkord {
 
 CurlURLTask::CurlURLTask(std::weak_ptr<CurlURLSession> session,
-                         std::shared_ptr<DelegateQueue> delegateQueue, URLRequest request,
+                         std::shared_ptr<DelegateQueue> delegateQueue, Order order,
                          URLCompletion completion)
     : session_(std::move(session)),
       delegateQueue_(std::move(delegateQueue)),
-      order_{.request = std::make_shared<const URLRequest>(std::move(request))},
+      order_(std::move(order)),
       completion_(std::move(completion)) {}
 
 void CurlURLTask::resume() {

@@ -4,6 +4,7 @@
 #include <functional>
 #include <memory>
 #include <optional>
+#include <string>
 
 #include "base/Mutex.h"
 #include "platform/api/URLSession.h"
@@ -31,10 +32,12 @@ class CurlURLTask final : public URLTask, public std::enable_shared_from_this<Cu
     std::shared_ptr<const ProxyConfiguration> proxy;  // null: not enabled
     std::uint64_t maximumBody = 0;
     SteadyTime resumedAt{};
+    std::string identity;       // of whose requests it is; empty: nobody's
+    std::uint64_t endings = 0;  // how many identities of the session had ended when it was made
   };
 
   CurlURLTask(std::weak_ptr<CurlURLSession> session, std::shared_ptr<DelegateQueue> delegateQueue,
-              URLRequest request, URLCompletion completion);
+              Order order, URLCompletion completion);
 
   // URLTask
   void resume() override;

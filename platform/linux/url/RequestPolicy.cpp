@@ -12,6 +12,9 @@
 namespace zelkord {
 namespace {
 
+constexpr Duration kDefaultTimeout = 60s;
+constexpr Duration kMaximumTimeout = 24h * 7;
+
 // RFC 9110, 5.6.2.
 bool isHTTPToken(std::string_view text) {
   constexpr std::string_view kAllowed =
@@ -101,6 +104,10 @@ std::variant<URLRequest, Error> redirected(const URLRequest& request, const URLR
   followMethodRules(next, response.status.value_or(0));
   if (!from || !from->sameEndpoint(*to)) dropPrivateHeaders(next);
   return next;
+}
+
+Duration timeoutOf(const URLRequest& request) {
+  return request.timeout > 0s ? std::min(request.timeout, kMaximumTimeout) : kDefaultTimeout;
 }
 
 bool mayBeRepeated(const URLRequest& request) {

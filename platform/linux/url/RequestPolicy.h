@@ -22,6 +22,9 @@ bool isRedirect(const URLResponse& response);
 // headers that begin with "X-Quenta-" do not leave for another host and port.
 std::variant<URLRequest, Error> redirected(const URLRequest& request, const URLResponse& response);
 
+// How long it may go without progress: its own time-out within bounds, or the default one.
+Duration timeoutOf(const URLRequest& request);
+
 // Whether a request that reached nobody may be sent once more by itself.
 bool mayBeRepeated(const URLRequest& request);
 

@@ -10,7 +10,7 @@ namespace {
 
 // "zlkc", and the version of the tables and of what is in them.
 constexpr std::int64_t kApplicationId = 0x7A6C6B63;
-constexpr std::int64_t kVersion = 1;
+constexpr std::int64_t kVersion = 2;
 constexpr int kForeignCode = -1;  // none of SQLite's
 constexpr std::int64_t kMaximumCount = std::int64_t{1} << 62;
 constexpr std::int64_t kMaximumEntryCost = std::int64_t{1} << 30;
@@ -19,7 +19,8 @@ constexpr std::size_t kMaximumRows = 2 * CacheIndex::kMaximumCount;
 // Little memory, a short log, and nothing in a foreign file runs. Nobody else opens the file.
 constexpr const char* kSettings =
     "PRAGMA locking_mode=EXCLUSIVE; PRAGMA cache_size=-256; PRAGMA trusted_schema=OFF;"
-    "PRAGMA cell_size_check=ON; PRAGMA wal_autocheckpoint=256; PRAGMA journal_size_limit=1048576";
+    "PRAGMA cell_size_check=ON; PRAGMA secure_delete=ON; PRAGMA wal_autocheckpoint=256; PRAGMA "
+    "journal_size_limit=1048576";
 
 // The size of the file follows what is in it. Only VACUUM changes that once there is a file.
 constexpr const char* kNewFile = "PRAGMA auto_vacuum=INCREMENTAL; VACUUM";
@@ -28,9 +29,9 @@ constexpr const char* kNewFile = "PRAGMA auto_vacuum=INCREMENTAL; VACUUM";
 constexpr const char* kEntriesTable =
     "CREATE TABLE entries(id INTEGER PRIMARY KEY, url BLOB NOT NULL, vary TEXT NOT NULL,"
     " variant BLOB NOT NULL, cost INTEGER NOT NULL, used INTEGER NOT NULL, head BLOB NOT NULL,"
-    " digest BLOB NOT NULL, size INTEGER NOT NULL, body BLOB)";
-constexpr const char* kMark = "; PRAGMA application_id=2053925731; PRAGMA user_version=1; COMMIT";
-static_assert(kApplicationId == 2053925731 && kVersion == 1);
+    " digest BLOB NOT NULL, size INTEGER NOT NULL, body BLOB, scope INTEGER NOT NULL)";
+constexpr const char* kMark = "; PRAGMA application_id=2053925731; PRAGMA user_version=2; COMMIT";
+static_assert(kApplicationId == 2053925731 && kVersion == 2);
 
 sqlite::Failure foreignFile() { return {kForeignCode, "it is of another version or program"}; }
 
@@ -40,6 +41,7 @@ std::optional<CacheEntry> entryOfRow(const sqlite::Statement& rows) {
   const auto variant = digestFromBytes(rows.bytes(3));
   const auto vary = rows.text(2);
   const auto id = rows.integer(0), cost = rows.integer(4), used = rows.integer(5);
+  const auto scope = rows.integer(6);
   // Far from the ends: ids and uses are counted on, costs are added up.
   const bool isSane = id > 0 && id <= kMaximumCount && cost >= 0 && cost <= kMaximumEntryCost &&
                       used >= 0 && used <= kMaximumCount && vary.size() <= kMaximumVaryNames;
@@ -49,7 +51,8 @@ std::optional<CacheEntry> entryOfRow(const sqlite::Statement& rows) {
                     .vary = std::string(vary),
                     .variant = *variant,
                     .cost = static_cast<std::uint64_t>(cost),
-                    .used = static_cast<std::uint64_t>(used)};
+                    .used = static_cast<std::uint64_t>(used),
+                    .scope = static_cast<std::uint64_t>(scope)};
 }
 
 std::optional<std::int64_t> firstNumber(sqlite::Database& database, const char* sql,
@@ -113,7 +116,7 @@ void CacheDatabase::remove() {
 }
 
 std::optional<sqlite::Failure> CacheDatabase::load(std::vector<CacheEntry>& entries) {
-  auto rows = database_->prepare("SELECT id, url, vary, variant, cost, used FROM entries");
+  auto rows = database_->prepare("SELECT id, url, vary, variant, cost, used, scope FROM entries");
   CacheIndex::Ids senseless;
   while (rows.step()) {
     if (entries.size() + senseless.size() >= kMaximumRows) return foreignFile();
@@ -160,10 +163,14 @@ std::optional<sqlite::Failure> CacheDatabase::write(const Changes& changes) {
   return database_->execute("PRAGMA incremental_vacuum");
 }
 
+std::optional<sqlite::Failure> CacheDatabase::emptyLog() {
+  return database_->execute("PRAGMA wal_checkpoint(TRUNCATE)");
+}
+
 std::optional<sqlite::Failure> CacheDatabase::_add(const Changes& changes) {
   if (changes.added.empty()) return std::nullopt;
   auto put = database_->prepare(
-      "INSERT OR REPLACE INTO entries VALUES(?1, ?2, ?3, ?4, ?5, ?6, ?7, ?8, ?9, ?10)");
+      "INSERT OR REPLACE INTO entries VALUES(?1, ?2, ?3, ?4, ?5, ?6, ?7, ?8, ?9, ?10, ?11)");
   for (const auto& [entry, row] : changes.added) {
     put.bind(1, entry->id)
         .bindBytes(2, bytesOf(entry->url))
@@ -173,7 +180,8 @@ std::optional<sqlite::Failure> CacheDatabase::_add(const Changes& changes) {
         .bind(6, static_cast<std::int64_t>(entry->used))
         .bindBytes(7, row.head)
         .bindBytes(8, row.digest)
-        .bind(9, static_cast<std::int64_t>(row.bodySize));
+        .bind(9, static_cast<std::int64_t>(row.bodySize))
+        .bind(11, static_cast<std::int64_t>(entry->scope));
     row.body ? put.bindBytes(10, *row.body) : put.bindNull(10);
     if (auto failure = put.run()) return failure;
   }

@@ -52,8 +52,10 @@ class CacheDatabase final {
     const CacheIndex::Ids* removed = nullptr;
     const CacheIndex::Uses* used = nullptr;
   };
-  // All or nothing.
+  // All or nothing. What is removed is overwritten.
   std::optional<sqlite::Failure> write(const Changes& changes);
+  // Overwrites what else is left of removed rows, in the log.
+  std::optional<sqlite::Failure> emptyLog();
 
  private:
   std::optional<sqlite::Failure> _prepareTables();

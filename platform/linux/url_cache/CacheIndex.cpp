@@ -83,6 +83,15 @@ CacheIndex::Ids CacheIndex::removeURL(const Digest& url) {
   return gone;
 }
 
+CacheIndex::Ids CacheIndex::removeScope(std::uint64_t scope) {
+  Ids gone;
+  for (const auto& entry : order_) {
+    if (entry.scope == scope) gone.push_back(entry.id);
+  }
+  for (const auto id : gone) remove(id);
+  return gone;
+}
+
 void CacheIndex::clear() {
   byURL_.clear();
   byId_.clear();

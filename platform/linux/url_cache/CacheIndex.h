@@ -41,6 +41,7 @@ class CacheIndex final {
   bool remove(std::int64_t id);
   // Gives the ids that were there.
   Ids removeURL(const Digest& url);
+  Ids removeScope(std::uint64_t scope);
   void clear();
 
   // What was used since the last call.

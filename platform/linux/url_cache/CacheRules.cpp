@@ -56,11 +56,6 @@ bool saysHowToStore(const URLResponse& response) {
   return hasAnyHeader(response.headers, kRulesOfCaching);
 }
 
-void dropRulesOfCaching(URLResponse& response) {
-  std::erase_if(response.headers,
-                [](const auto& header) { return isOneOf(kRulesOfCaching, header.first); });
-}
-
 bool mayBeStored(const URLResult& result, const StoredResponse& candidate) {
   const int status = candidate.response.status.value_or(0);
   if (result.error || !result.data || !isStorableStatus(status)) return false;

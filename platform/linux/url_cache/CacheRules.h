@@ -26,12 +26,8 @@ bool mayBeStored(const URLResult& result, const StoredResponse& candidate);
 // A cheap test that most responses fail which may not be stored.
 bool saysHowToStore(const URLResponse& response);
 
-// Whether a response, possibly put there by hand, may answer ordinary tasks.
+// Whether a response may answer tasks at all.
 bool mayAnswerTasks(const StoredResponse& stored);
-
-// What it says of these holds for the URL that gave it: under another one it answers no task, and
-// no server is asked about it.
-void dropRulesOfCaching(URLResponse& response);
 
 // Whether a request with that outcome has changed what its URL stands for (RFC 9111, 4.4).
 bool isUnsafeMethod(const URLRequest& request);

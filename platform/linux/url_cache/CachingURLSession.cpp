@@ -8,22 +8,29 @@
 
 namespace zelkord {
 
-CachingURLSession::CachingURLSession(std::shared_ptr<URLSession> network,
+CachingURLSession::CachingURLSession(std::shared_ptr<CurlURLSession> network,
                                      std::shared_ptr<DelegateQueue> delegateQueue,
-                                     std::shared_ptr<LinuxURLCache> cache)
+                                     std::shared_ptr<LinuxURLCache> cache,
+                                     std::string identityHeader)
     : network_(std::move(network)),
       delegateQueue_(std::move(delegateQueue)),
-      cache_(std::move(cache)) {}
+      cache_(std::move(cache)),
+      identityHeader_(std::move(identityHeader)) {}
 
 std::shared_ptr<URLTask> CachingURLSession::dataTask(URLRequest request, URLCompletion completion) {
-  if (isUnsafeMethod(request)) return _unsafeTask(std::move(request), std::move(completion));
+  const auto endings = network_->endings();
+  const auto scope = _scopeOf(request);
+  if (isUnsafeMethod(request)) {
+    return _unsafeTask(scope, std::move(request), std::move(completion));
+  }
   const auto use = cacheUseOf(request);
   if (use == CacheUse::None) return network_->dataTask(std::move(request), std::move(completion));
-  if (use == CacheUse::StoreOnly || !cache_->mayHave(request.url)) {
-    return _plainTask(std::move(request), std::move(completion));
+  if (use == CacheUse::StoreOnly || !cache_->mayHave(scope, request.url)) {
+    return _plainTask(scope, std::move(request), std::move(completion));
   }
-  return std::make_shared<CachingURLTask>(weak_from_this(), delegateQueue_, std::move(request),
-                                          std::move(completion));
+  return std::make_shared<CachingURLTask>(weak_from_this(), delegateQueue_,
+                                          CachingURLTask::Origin{scope, endings},
+                                          std::move(request), std::move(completion));
 }
 
 std::shared_ptr<URLTask> CachingURLSession::downloadTask(URLRequest request,
@@ -31,23 +38,35 @@ std::shared_ptr<URLTask> CachingURLSession::downloadTask(URLRequest request,
   return network_->downloadTask(std::move(request), std::move(completion));
 }
 
-std::shared_ptr<URLTask> CachingURLSession::_plainTask(URLRequest request,
+CacheScopes::Scope CachingURLSession::_scopeOf(const URLRequest& request) {
+  const auto identity = identityHeader_.empty() ? std::nullopt : request.header(identityHeader_);
+  return cache_->scopeOf(identity.value_or(""));
+}
+
+void CachingURLSession::endIdentity(const std::string& identity) {
+  cache_->endIdentity(identity);
+  network_->endIdentity(identity);
+}
+
+std::shared_ptr<URLTask> CachingURLSession::_plainTask(CacheScopes::Scope scope, URLRequest request,
                                                        URLCompletion completion) {
-  auto keeping = [cache = cache_, requestedAt = cache_->now(), completion = std::move(completion)](
-                     const std::shared_ptr<URLTask>& task, const URLResult& result) {
-    keepIfAllowed(*cache, *task, result, requestedAt);
+  auto keeping = [cache = cache_, scope, requestedAt = cache_->now(),
+                  completion = std::move(completion)](const std::shared_ptr<URLTask>& task,
+                                                      const URLResult& result) {
+    keepIfAllowed(*cache, scope, *task, result, requestedAt);
     completion(task, result);
   };
   return network_->dataTask(std::move(request), std::move(keeping));
 }
 
-std::shared_ptr<URLTask> CachingURLSession::_unsafeTask(URLRequest request,
+std::shared_ptr<URLTask> CachingURLSession::_unsafeTask(CacheScopes::Scope scope,
+                                                        URLRequest request,
                                                         URLCompletion completion) {
-  auto forgetting = [cache = cache_, url = request.url, completion = std::move(completion)](
+  auto forgetting = [cache = cache_, scope, url = request.url, completion = std::move(completion)](
                         const std::shared_ptr<URLTask>& task, const URLResult& result) {
     if (changesResource(result)) {
-      cache->forget(url);
-      cache->forget(task->currentRequest().url);
+      cache->forget(scope, url);
+      cache->forget(scope, task->currentRequest().url);
     }
     completion(task, result);
   };

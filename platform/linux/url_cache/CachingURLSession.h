@@ -1,10 +1,12 @@
 #pragma once
 
 #include <memory>
+#include <string>
 #include <unordered_set>
 
 #include "base/Mutex.h"
 #include "platform/api/URLSession.h"
+#include "platform/linux/url/CurlURLSession.h"
 #include "platform/linux/url/DelegateQueue.h"
 #include "platform/linux/url_cache/LinuxURLCache.h"
 
@@ -22,31 +24,37 @@ class CachingURLTask;
 class CachingURLSession final : public URLSession,
                                 public std::enable_shared_from_this<CachingURLSession> {
  public:
-  // `delegateQueue` is the one on which the network session's completions run.
-  CachingURLSession(std::shared_ptr<URLSession> network,
+  // `delegateQueue` is the one on which the network session's completions run, `identityHeader`
+  // the network session's, too.
+  CachingURLSession(std::shared_ptr<CurlURLSession> network,
                     std::shared_ptr<DelegateQueue> delegateQueue,
-                    std::shared_ptr<LinuxURLCache> cache);
+                    std::shared_ptr<LinuxURLCache> cache, std::string identityHeader);
 
   // URLSession
   std::shared_ptr<URLTask> dataTask(URLRequest request, URLCompletion completion) override;
   std::shared_ptr<URLTask> downloadTask(URLRequest request, URLCompletion completion) override;
   URLCache* cache() override { return cache_.get(); }
   void purgeMemoryCache() override { cache_->purgeMemory(); }
+  void endIdentity(const std::string& identity) override;
 
   // For its tasks.
-  URLSession& network() { return *network_; }
+  CurlURLSession& network() { return *network_; }
   LinuxURLCache& responses() { return *cache_; }
   void hold(const std::shared_ptr<CachingURLTask>& task);
   void release(const std::shared_ptr<CachingURLTask>& task);
 
  private:
-  std::shared_ptr<URLTask> _unsafeTask(URLRequest request, URLCompletion completion);
-  std::shared_ptr<URLTask> _plainTask(URLRequest request, URLCompletion completion);
+  std::shared_ptr<URLTask> _unsafeTask(CacheScopes::Scope scope, URLRequest request,
+                                       URLCompletion completion);
+  std::shared_ptr<URLTask> _plainTask(CacheScopes::Scope scope, URLRequest request,
+                                      URLCompletion completion);
+  CacheScopes::Scope _scopeOf(const URLRequest& request);
 
   // Fixed after construction.
-  const std::shared_ptr<URLSession> network_;
+  const std::shared_ptr<CurlURLSession> network_;
   const std::shared_ptr<DelegateQueue> delegateQueue_;
   const std::shared_ptr<LinuxURLCache> cache_;
+  const std::string identityHeader_;
 
   Mutex mutex_;
   std::unordered_set<std::shared_ptr<CachingURLTask>> held_ ZK_GUARDED_BY(mutex_);

@@ -16,10 +16,11 @@ constexpr int kNotModified = 304;
 }  // namespace
 
 CachingURLTask::CachingURLTask(std::weak_ptr<CachingURLSession> session,
-                               std::shared_ptr<DelegateQueue> delegateQueue, URLRequest request,
-                               URLCompletion completion)
+                               std::shared_ptr<DelegateQueue> delegateQueue, Origin origin,
+                               URLRequest request, URLCompletion completion)
     : session_(std::move(session)),
       delegateQueue_(std::move(delegateQueue)),
+      origin_(origin),
       request_(std::move(request)),
       completion_(std::move(completion)) {}
 
@@ -31,9 +32,9 @@ void CachingURLTask::resume() {
     if (state_ != State::Suspended) return;
     state_ = State::Looking;
   }
-  session->responses().find(request_, [self = shared_from_this()](StoredPointer stored) {
-    self->_found(std::move(stored));
-  });
+  session->responses().find(
+      origin_.scope, request_,
+      [self = shared_from_this()](StoredPointer stored) { self->_found(std::move(stored)); });
 }
 
 void CachingURLTask::_found(StoredPointer stored) {
@@ -76,9 +77,11 @@ CachingURLTask::Next CachingURLTask::_beginLoading(std::shared_ptr<URLTask> load
 std::shared_ptr<URLTask> CachingURLTask::_makeLoader(CachingURLSession& session,
                                                      const URLRequest& request) {
   auto loader = session.network().dataTask(
-      request, [weak = weak_from_this()](const std::shared_ptr<URLTask>&, const URLResult& result) {
+      request,
+      [weak = weak_from_this()](const std::shared_ptr<URLTask>&, const URLResult& result) {
         if (const auto self = weak.lock()) self->_loaded(result);
-      });
+      },
+      origin_.endings);
   bool proxyEnabled = false;
   {
     const MutexLock lock(mutex_);
@@ -93,7 +96,7 @@ void CachingURLTask::_loaded(const URLResult& result) {
   if (!session) return;
   if (!result.error && result.status() == kNotModified && _isConditional()) {
     if (_settle304(*session, result)) return;
-    session->responses().forget(request_.url);
+    session->responses().forget(origin_.scope, request_.url);
     return _load(*session, nullptr);
   }
   WallTime requestedAt;
@@ -101,11 +104,12 @@ void CachingURLTask::_loaded(const URLResult& result) {
     const MutexLock lock(mutex_);
     requestedAt = requestedAt_;
   }
-  const bool kept = keepIfAllowed(session->responses(), *_loader(), result, requestedAt);
+  const bool kept =
+      keepIfAllowed(session->responses(), origin_.scope, *_loader(), result, requestedAt);
   const bool isElsewhere = _loader()->currentRequest().url != request_.url;
   // What came is newer than what was kept, unless the server has failed.
   const bool isNews = !result.error && result.status() < 500;
-  if (isNews && (!kept || isElsewhere)) session->responses().forget(request_.url);
+  if (isNews && (!kept || isElsewhere)) session->responses().forget(origin_.scope, request_.url);
   _complete(result);
 }
 
@@ -125,9 +129,9 @@ bool CachingURLTask::_settle304(CachingURLSession& session, const URLResult& res
   auto fresh = freshened(*asked, *result.response, requestedAt, now);
   const auto answer = answerFromCache(request_, fresh, now);
   if (mayBeStored(result, fresh)) {
-    responses.keep(request_, std::move(fresh));
+    responses.keep(origin_.scope, request_, std::move(fresh));
   } else {
-    responses.forget(request_.url);
+    responses.forget(origin_.scope, request_.url);
   }
   _complete(answer);
   return true;

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstdint>
 #include <functional>
 #include <memory>
 #include <optional>
@@ -7,6 +8,7 @@
 #include "base/Mutex.h"
 #include "platform/api/URLSession.h"
 #include "platform/linux/url/DelegateQueue.h"
+#include "platform/linux/url_cache/CacheScopes.h"
 #include "platform/linux/url_cache/StoredResponse.h"
 
 namespace zelkord {
@@ -25,8 +27,14 @@ class CachingURLSession;
 // or finished. A task whose session is gone never completes.
 class CachingURLTask final : public URLTask, public std::enable_shared_from_this<CachingURLTask> {
  public:
+  // As things were when it was made.
+  struct Origin {
+    CacheScopes::Scope scope = CacheScopes::kEnded;
+    std::uint64_t endings = 0;  // CurlURLSession::endings
+  };
+
   CachingURLTask(std::weak_ptr<CachingURLSession> session,
-                 std::shared_ptr<DelegateQueue> delegateQueue, URLRequest request,
+                 std::shared_ptr<DelegateQueue> delegateQueue, Origin origin, URLRequest request,
                  URLCompletion completion);
 
   // URLTask
@@ -58,6 +66,7 @@ class CachingURLTask final : public URLTask, public std::enable_shared_from_this
   // Fixed after construction.
   const std::weak_ptr<CachingURLSession> session_;
   const std::shared_ptr<DelegateQueue> delegateQueue_;
+  const Origin origin_;
   const URLRequest request_;
 
   mutable Mutex mutex_;

@@ -42,6 +42,10 @@ std::optional<Digest> digestFromBytes(std::string_view bytes) {
   return digest;
 }
 
-Digest cacheKeyOf(std::string_view url) { return digestOf(url.substr(0, url.find('#'))); }
+Digest cacheKeyOf(std::string_view url, std::uint64_t scope) {
+  const auto whole = url.substr(0, url.find('#'));
+  if (scope == 0) return digestOf(whole);
+  return digestOfParts({{reinterpret_cast<const char*>(&scope), sizeof scope}, whole});
+}
 
 }  // namespace zelkord

@@ -2,6 +2,7 @@
 
 #include <array>
 #include <cstddef>
+#include <cstdint>
 #include <cstring>
 #include <initializer_list>
 #include <optional>
@@ -22,8 +23,8 @@ std::string_view bytesOf(const Digest& digest);
 // None for bytes of another length.
 std::optional<Digest> digestFromBytes(std::string_view bytes);
 
-// Under which a URL's responses are kept: its own digest, without the fragment.
-Digest cacheKeyOf(std::string_view url);
+// Under which a URL's responses are kept within a scope: a digest of both, without the fragment.
+Digest cacheKeyOf(std::string_view url, std::uint64_t scope = 0);
 
 // For hash tables: a digest is as random as it gets.
 struct DigestHash {

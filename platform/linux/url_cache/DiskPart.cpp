@@ -148,6 +148,7 @@ DiskPart::Outcome DiskPart::_writeOpen(const Changes& changes) {
     }
   }
   if (database_.isOpen()) _writeRows(batch, outcome);
+  if (database_.isOpen() && changes.erases) database_.emptyLog();
   return outcome;
 }
 

@@ -35,6 +35,7 @@ class DiskPart final {
     std::vector<CacheRecord> added;
     CacheIndex::Ids removed;
     CacheIndex::Uses used;
+    bool erases = false;  // nothing may be left of what is removed
   };
   struct Outcome {
     CacheIndex::Ids notAdded;

@@ -49,7 +49,14 @@ void LinuxURLCache::_open() {
   knownResets_ = disk_.resets();
   queue_->async([this] { _removeOrphans(); });
   const MutexLock lock(mutex_);
+  for (const auto& entry : entries) {
+    if (entry.scope != CacheScopes::kByHand) removed_.push_back(entry.id);
+  }
+  erases_ = !removed_.empty();
+  if (erases_) _scheduleWrite();
+  // All of them: their ids are not given out again.
   for (const auto id : index_.load(std::move(entries))) removed_.push_back(id);
+  for (const auto id : removed_) index_.remove(id);
   open_ = true;
 }
 
@@ -98,15 +105,28 @@ std::optional<CachedResponse> LinuxURLCache::lookup(const URLRequest& request) {
 void LinuxURLCache::store(const URLRequest& request, CachedResponse response) {
   _makeSureItIsOpen();
   const auto key = cacheKeyOf(request.url);
-  const auto giver = std::exchange(response.response.url, {});
-  if (!giver.empty() && cacheKeyOf(giver) != key) dropRulesOfCaching(response.response);
+  response.response.url.clear();
   const auto now = clock_.wallNow();
-  _add(key, request,
+  _add(CacheScopes::kByHand, key, request,
        std::make_shared<const StoredResponse>(
            StoredResponse{std::move(response.response), std::move(response.data), now, now}));
 }
 
-bool LinuxURLCache::mayHave(const std::string& url) {
+CacheScopes::Scope LinuxURLCache::scopeOf(const std::string& identity) {
+  const MutexLock lock(mutex_);
+  return scopes_.of(identity);
+}
+
+void LinuxURLCache::endIdentity(const std::string& identity) {
+  const MutexLock lock(mutex_);
+  for (const auto scope : scopes_.end(identity)) {
+    const auto gone = index_.removeScope(scope);
+    _dropAll(gone);
+    erases_ = erases_ || !gone.empty();
+  }
+}
+
+bool LinuxURLCache::mayHave(CacheScopes::Scope scope, const std::string& url) {
   {
     const MutexLock lock(mutex_);
     if (!open_) {
@@ -115,20 +135,20 @@ bool LinuxURLCache::mayHave(const std::string& url) {
     }
     if (index_.empty()) return false;
   }
-  const auto key = cacheKeyOf(url);
+  const auto key = cacheKeyOf(url, scope);
   const MutexLock lock(mutex_);
   return index_.hasURL(key);
 }
 
-void LinuxURLCache::find(const URLRequest& request, Found found) {
+void LinuxURLCache::find(CacheScopes::Scope scope, const URLRequest& request, Found found) {
   if (!_isOpen()) {
-    queue_->async([this, request, found = std::move(found)]() mutable {
+    queue_->async([this, scope, request, found = std::move(found)]() mutable {
       _open();
-      find(request, std::move(found));
+      find(scope, request, std::move(found));
     });
     return;
   }
-  auto place = _locate(cacheKeyOf(request.url), request);
+  auto place = _locate(cacheKeyOf(request.url, scope), request);
   if (!place.entry) return found(std::move(place.stored));
   // The callback may be the last to hold the session, and with it this cache.
   queue_->async([this, entry = *std::move(place.entry), found = std::move(found)] {
@@ -137,24 +157,31 @@ void LinuxURLCache::find(const URLRequest& request, Found found) {
   });
 }
 
-void LinuxURLCache::keep(const URLRequest& request, StoredResponse response) {
+void LinuxURLCache::keep(CacheScopes::Scope scope, const URLRequest& request,
+                         StoredResponse response) {
   auto stored = std::make_shared<const StoredResponse>(std::move(response));
-  const auto key = cacheKeyOf(request.url);
-  if (_isOpen()) return _add(key, request, std::move(stored));
-  queue_->async([this, key, request, stored = std::move(stored)] {
+  const auto key = cacheKeyOf(request.url, scope);
+  if (_isOpen()) return _add(scope, key, request, std::move(stored));
+  queue_->async([this, scope, key, request, stored = std::move(stored)] {
     _open();
-    _add(key, request, stored);
+    _add(scope, key, request, stored);
   });
 }
 
-void LinuxURLCache::_add(const Digest& key, const URLRequest& request, StoredPointer stored) {
+void LinuxURLCache::_add(CacheScopes::Scope scope, const Digest& key, const URLRequest& request,
+                         StoredPointer stored) {
   auto vary = varyNames(stored->response);
   if (!vary) return;
   const auto variant = variantOf(*vary, request);
-  CacheEntry entry{
-      .url = key, .vary = *std::move(vary), .variant = variant, .cost = costOf(*stored)};
+  CacheEntry entry{.url = key,
+                   .vary = *std::move(vary),
+                   .variant = variant,
+                   .cost = costOf(*stored),
+                   .scope = scope};
   const bool goesToDisk = entry.cost <= maximumOnDisk_;
   const MutexLock lock(mutex_);
+  // Ended while the response was on its way.
+  if (scope != CacheScopes::kByHand && !scopes_.isLive(scope)) return;
   for (const auto id : index_.add(entry)) _drop(id);
   memory_.put(entry.id, stored);
   if (goesToDisk) {
@@ -188,19 +215,23 @@ void LinuxURLCache::_drop(std::int64_t id) {
   }
 }
 
-void LinuxURLCache::forget(const std::string& url) {
-  const auto key = cacheKeyOf(url);
+void LinuxURLCache::forget(CacheScopes::Scope scope, const std::string& url) {
   if (!_isOpen()) {
-    queue_->async([this, url] {
+    queue_->async([this, scope, url] {
       _open();
-      forget(url);
+      forget(scope, url);
     });
     return;
   }
+  const auto ofTasks = cacheKeyOf(url, scope), byHand = cacheKeyOf(url);
   const MutexLock lock(mutex_);
-  const auto gone = index_.removeURL(key);
-  for (const auto id : gone) _drop(id);
-  if (!gone.empty()) _scheduleWrite();
+  _dropAll(index_.removeURL(ofTasks));
+  _dropAll(index_.removeURL(byHand));
+}
+
+void LinuxURLCache::_dropAll(const CacheIndex::Ids& ids) {
+  for (const auto id : ids) _drop(id);
+  if (!ids.empty()) _scheduleWrite();
 }
 
 void LinuxURLCache::purgeMemory() {
@@ -222,6 +253,7 @@ DiskPart::Changes LinuxURLCache::_takeChanges() {
   }
   changes.removed = std::exchange(removed_, {});
   changes.used = index_.takeUses();
+  changes.erases = std::exchange(erases_, false);
   return changes;
 }
 
@@ -241,6 +273,7 @@ void LinuxURLCache::_settle(const DiskPart::Changes& changes, const DiskPart::Ou
   // Tried again with what is written next.
   if (!outcome.removedRows) {
     removed_.insert(removed_.end(), changes.removed.begin(), changes.removed.end());
+    erases_ = erases_ || changes.erases;
   }
 }
 

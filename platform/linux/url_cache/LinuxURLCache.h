@@ -15,12 +15,16 @@
 #include "platform/api/URLSession.h"
 #include "platform/api/WorkQueues.h"
 #include "platform/linux/url_cache/CacheIndex.h"
+#include "platform/linux/url_cache/CacheScopes.h"
 #include "platform/linux/url_cache/DiskPart.h"
 #include "platform/linux/url_cache/MemoryPart.h"
 
 namespace zelkord {
 
 // The URL cache: responses in memory, as many as fit, and on disk.
+//
+// What tasks keep is apart for each scope (CacheScopes) and from what is stored by hand. No scope
+// outlives the process: what an earlier one left in any is removed when the cache opens.
 //
 // What is stored is found at once. It is written soon after, many responses in one transaction; a
 // response over a tenth of the disk part is held in memory only. The rules of HTTP are its user's.
@@ -51,14 +55,17 @@ class LinuxURLCache final : public URLCache {
   std::optional<CachedResponse> lookup(const URLRequest& request) override;
   void store(const URLRequest& request, CachedResponse response) override;
 
+  // The rest is for tasks. A scope that has ended has nothing, and takes nothing.
+  CacheScopes::Scope scopeOf(const std::string& identity);
+  void endIdentity(const std::string& identity);
   // False when nothing is kept for the URL. True also while nobody knows; then the cache opens.
-  bool mayHave(const std::string& url);
+  bool mayHave(CacheScopes::Scope scope, const std::string& url);
   // Calls back with what is kept for the request, or null: at once when that needs no disk, else on
   // the cache's queue, unless the cache ends before.
-  void find(const URLRequest& request, Found found);
-  void keep(const URLRequest& request, StoredResponse response);
-  // Drops all that is kept for the URL.
-  void forget(const std::string& url);
+  void find(CacheScopes::Scope scope, const URLRequest& request, Found found);
+  void keep(CacheScopes::Scope scope, const URLRequest& request, StoredResponse response);
+  // Drops all that is kept for the URL in the scope or by hand.
+  void forget(CacheScopes::Scope scope, const std::string& url);
   void purgeMemory();
 
   WallTime now() const { return clock_.wallNow(); }
@@ -79,7 +86,9 @@ class LinuxURLCache final : public URLCache {
   void _makeSureItIsOpen();
   Place _locate(const Digest& key, const URLRequest& request);
   StoredPointer _readFromDisk(const CacheEntry& entry);
-  void _add(const Digest& key, const URLRequest& request, StoredPointer stored);
+  void _add(CacheScopes::Scope scope, const Digest& key, const URLRequest& request,
+            StoredPointer stored);
+  void _dropAll(const CacheIndex::Ids& ids) ZK_REQUIRES(mutex_);
   void _drop(std::int64_t id) ZK_REQUIRES(mutex_);
   void _scheduleWrite() ZK_REQUIRES(mutex_);
   void _write();
@@ -96,12 +105,14 @@ class LinuxURLCache final : public URLCache {
   mutable Mutex mutex_;
   bool open_ ZK_GUARDED_BY(mutex_) = false;
   bool opening_ ZK_GUARDED_BY(mutex_) = false;
+  CacheScopes scopes_ ZK_GUARDED_BY(mutex_);
   CacheIndex index_ ZK_GUARDED_BY(mutex_);
   MemoryPart memory_ ZK_GUARDED_BY(mutex_);
   std::map<std::int64_t, Waiting> waiting_ ZK_GUARDED_BY(mutex_);  // to be written
   // Held in memory only: they could not be written, or are too large for it.
   std::unordered_set<std::int64_t> memoryOnly_ ZK_GUARDED_BY(mutex_);
   CacheIndex::Ids removed_ ZK_GUARDED_BY(mutex_);  // from the disk, as soon as may be
+  bool erases_ ZK_GUARDED_BY(mutex_) = false;      // with the next write
   bool writeScheduled_ ZK_GUARDED_BY(mutex_) = false;
 
   // Queue state.

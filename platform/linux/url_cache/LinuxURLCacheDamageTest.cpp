@@ -85,7 +85,7 @@ TEST(LinuxURLCacheDamageTest, GivesOutNothingThatWasDamaged) {
        false, 1},
       {"empty index", [](const auto& state) { state.write(kIndexFile, ""); }, false, 0},
       {"another version",
-       [](const auto& state) { runSQL(state / kIndexFile, "PRAGMA user_version = 2"); }, false, 1},
+       [](const auto& state) { runSQL(state / kIndexFile, "PRAGMA user_version = 1"); }, false, 1},
       {"another program's",
        [](const auto& state) { runSQL(state / kIndexFile, "PRAGMA application_id = 2"); }, false,
        1},
@@ -100,7 +100,7 @@ TEST(LinuxURLCacheDamageTest, GivesOutNothingThatWasDamaged) {
          runSQL(state / kIndexFile,
                 "DROP TABLE entries; CREATE VIEW entries AS WITH RECURSIVE n(id) AS"
                 " (SELECT 1 UNION ALL SELECT id + 1 FROM n) SELECT id, zeroblob(32) AS url,"
-                " '' AS vary, zeroblob(32) AS variant, 0 AS cost, 0 AS used FROM n");
+                " '' AS vary, zeroblob(32) AS variant, 0 AS cost, 0 AS used, 0 AS scope FROM n");
        },
        false, 1},
       {"rows without end",
@@ -108,7 +108,7 @@ TEST(LinuxURLCacheDamageTest, GivesOutNothingThatWasDamaged) {
          runSQL(state / kIndexFile,
                 "WITH RECURSIVE n(i) AS (SELECT 3 UNION ALL SELECT i + 1 FROM n LIMIT 20000)"
                 " INSERT INTO entries SELECT i, zeroblob(32), '', zeroblob(32), 0, 0, '', '', 0,"
-                " '' FROM n");
+                " '', 0 FROM n");
        },
        false, 1},
       {"a body of a terabyte",

@@ -3,6 +3,8 @@
 
 #include <algorithm>
 #include <filesystem>
+#include <fstream>
+#include <iterator>
 #include <thread>
 #include <vector>
 
@@ -13,6 +15,8 @@ namespace zelkord {
 namespace {
 
 namespace fs = std::filesystem;
+
+constexpr auto kByHand = CacheScopes::kByHand;
 
 std::string bigBody(char c) { return std::string(20'000, c); }
 
@@ -59,9 +63,9 @@ TEST_F(LinuxURLCacheTest, FindsWhatWasStoredAtOnceAndAfterARestart) {
 }
 
 TEST_F(LinuxURLCacheTest, TouchesNoFileBeforeThereIsSomethingToKeep) {
-  EXPECT_TRUE(bed_.cache->mayHave("http://h/"));
+  EXPECT_TRUE(bed_.cache->mayHave(kByHand, "http://h/"));
   EXPECT_EQ(bed_.find("http://h/"), std::nullopt);
-  EXPECT_FALSE(bed_.cache->mayHave("http://h/"));
+  EXPECT_FALSE(bed_.cache->mayHave(kByHand, "http://h/"));
   bed_.restart();
   EXPECT_FALSE(state_.has("urlcache"));
   EXPECT_EQ(bed_.log.entries().size(), 0u);
@@ -110,9 +114,9 @@ TEST_F(LinuxURLCacheTest, ForgetsAllVariantsOfAURL) {
   bed_.store("http://h/a", bigBody('a'), {{"Vary", "X"}});
   bed_.store("http://h/b", bigBody('b'));
   bed_.restart();
-  bed_.cache->forget("http://h/a");
-  bed_.cache->forget("http://h/none");
-  EXPECT_FALSE(bed_.cache->mayHave("http://h/a") && bed_.find("http://h/a"));
+  bed_.cache->forget(kByHand, "http://h/a");
+  bed_.cache->forget(kByHand, "http://h/none");
+  EXPECT_FALSE(bed_.cache->mayHave(kByHand, "http://h/a") && bed_.find("http://h/a"));
   bed_.restart();
   EXPECT_EQ(bed_.find("http://h/a"), std::nullopt);
   EXPECT_EQ(bed_.find("http://h/b"), bigBody('b'));
@@ -137,7 +141,7 @@ TEST(LinuxURLCacheLimitsTest, KeepsTheDiskPartWithinItsLimit) {
     EXPECT_EQ(bed.find(url(i)).has_value(), i != 1) << i;
   }
   EXPECT_EQ(countOfBodies(bed.folder), 5);
-  for (int i = 0; i < 21; ++i) bed.cache->forget(url(i));
+  for (int i = 0; i < 21; ++i) bed.cache->forget(kByHand, url(i));
   bed.stop();
   EXPECT_LT(fs::file_size(bed.folder + "/index.db"), 40'000u) << "room is given back";
 }
@@ -169,14 +173,64 @@ TEST_F(LinuxURLCacheTest, RemovesNothingBehindALink) {
   for (const char* name : theirs) EXPECT_EQ(state_.read(name), "of somebody else") << name;
 }
 
+// Whether the bytes are anywhere in the cache's files.
+bool isOnDisk(const std::string& folder, const std::string& bytes) {
+  for (const auto& file : fs::directory_iterator(folder)) {
+    std::ifstream stream(file.path(), std::ios::binary);
+    const std::string all{std::istreambuf_iterator<char>(stream), {}};
+    if (all.find(bytes) != std::string::npos) return true;
+  }
+  return false;
+}
+
+TEST_F(LinuxURLCacheTest, LeavesNothingOfAnEndedIdentityOnTheDisk) {
+  const URLRequest request{.url = "http://h/hand"};
+  const auto keep = [&](const std::string& who, const std::string& body) {
+    bed_.cache->keep(bed_.cache->scopeOf(who), {.url = "http://h/" + who},
+                     {{.status = 200, .headers = {{"ETag", "tag of " + who}}}, Data(body)});
+  };
+  const auto isThere = [&](const char* tag) {
+    bed_.cache->lookup(request);  // what waits to be written is
+    return isOnDisk(bed_.folder, tag);
+  };
+  for (const bool killed : {false, true}) {
+    SCOPED_TRACE(killed);
+    bed_.restart();
+    bed_.store(request.url, bigBody('h'), {{"ETag", "tag by hand"}});
+    keep("b", "small");
+    keep("", "nobody's");
+    keep("a", bigBody('a'));
+    keep("c", "small");
+    bed_.restart();  // all is written, nothing removed, as when it is killed
+    for (const char* tag : {"tag of a", "tag of b", "tag of c", "tag by hand"}) {
+      EXPECT_TRUE(isOnDisk(bed_.folder, tag));
+    }
+    if (!killed) {
+      bed_.find("");  // opens it
+      for (const char* who : {"a", "b", "", "c"}) keep(who, bigBody('x'));
+      for (const char* who : {"a", "b"}) bed_.cache->endIdentity(who);
+      keep("a", "too late");
+    }
+    bed_.cache->purgeMemory();
+    EXPECT_TRUE(bed_.find(request.url) == bigBody('h')) << "what is kept by hand stays";
+    bed_.cache->purgeMemory();
+    EXPECT_TRUE(bed_.find(request.url) == bigBody('h')) << "after the writing";
+    EXPECT_FALSE(isThere("tag of a"));
+    EXPECT_FALSE(isThere("tag of b"));
+    EXPECT_EQ(isThere("tag of c"), !killed) << "whose identity lives on";
+    EXPECT_TRUE(isThere("tag by hand"));
+    EXPECT_EQ(countOfBodies(bed_.folder), killed ? 1 : 2);
+  }
+}
+
 TEST_F(LinuxURLCacheTest, EndsWhileItOpens) {
   bed_.store("http://h/a", bigBody('a'));
   for (int i = 0; i < 50; ++i) {
     bed_.restart();
     if (i % 2 == 0) {
-      bed_.cache->mayHave("http://h/a");
+      bed_.cache->mayHave(kByHand, "http://h/a");
     } else {
-      bed_.cache->find({.url = "http://h/a"}, [](const StoredPointer&) {});
+      bed_.cache->find(kByHand, {.url = "http://h/a"}, [](const StoredPointer&) {});
     }
   }
   bed_.restart();
@@ -196,7 +250,7 @@ TEST_F(LinuxURLCacheTest, StoresAndFindsOnManyThreads) {
         const auto url = "http://h/" + std::to_string(key);
         if (i % 3 == 0) bed_.store(url, body(key));
         if (i % 50 == 49) bed_.cache->purgeMemory();
-        if (i % 31 == 30) bed_.cache->forget(url);
+        if (i % 31 == 30) bed_.cache->forget(kByHand, url);
         const auto found = bed_.find(url);
         if (found) ++(*found == body(key) ? hits : wrong);
       }

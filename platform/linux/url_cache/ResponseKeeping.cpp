@@ -13,8 +13,8 @@
 
 namespace zelkord {
 
-bool keepIfAllowed(LinuxURLCache& cache, const URLTask& task, const URLResult& result,
-                   WallTime requestedAt) {
+bool keepIfAllowed(LinuxURLCache& cache, CacheScopes::Scope scope, const URLTask& task,
+                   const URLResult& result, WallTime requestedAt) {
   if (result.error || !result.data || !result.response) return false;
   if (!saysHowToStore(*result.response)) return false;
   StoredResponse candidate{.response = {.status = result.response->status,
@@ -23,7 +23,7 @@ bool keepIfAllowed(LinuxURLCache& cache, const URLTask& task, const URLResult& r
                            .requestedAt = requestedAt,
                            .receivedAt = cache.now()};
   if (!mayBeStored(result, candidate)) return false;
-  cache.keep(unconditionalRequest(task.currentRequest()), std::move(candidate));
+  cache.keep(scope, unconditionalRequest(task.currentRequest()), std::move(candidate));
   return true;
 }
 

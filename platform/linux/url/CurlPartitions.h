@@ -1,0 +1,63 @@
+#pragma once
+
+#include <cstdint>
+#include <deque>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "platform/linux/url/CurlConnections.h"
+#include "platform/linux/url/CurlSettings.h"
+#include "platform/linux/url/CurlURLTask.h"
+#include "platform/linux/url/IOLoop.h"
+#include "platform/linux/url/TransferPlace.h"
+
+namespace zelkord {
+
+// A session's connections, apart for each identity that its requests carry: requests of two
+// identities share neither a connection nor a TLS session to resume. Requests without one go where
+// the latest with one went, or to connections that the next identity takes over.
+//
+// What has ended takes no more requests: its connections close when the last task on them is
+// through. Late requests of an ended identity, and those without one that were made before an
+// ending, get connections that nobody else uses.
+//
+// Threading: the I/O loop; made and, once closed, destroyed on any. Ownership: holds the tasks
+// under way.
+class CurlPartitions final {
+ public:
+  CurlPartitions(IOLoop& loop, CurlSettings settings);
+
+  void begin(std::shared_ptr<CurlURLTask> task, CurlURLTask::Order order, TransferPlace place);
+  void cancel(CurlURLTask& task);
+  void endIdentity(const std::string& identity);
+  // Gives up the tasks under way; the caller drops them.
+  std::vector<std::shared_ptr<CurlURLTask>> close();
+
+ private:
+  struct Partition {
+    std::string identity;  // empty: nobody's yet
+    std::shared_ptr<CurlConnections> connections;
+  };
+  using Partitions = std::vector<Partition>;
+
+  CurlConnections& _connectionsFor(const CurlURLTask::Order& order);
+  bool _isPast(const CurlURLTask::Order& order) const;
+  CurlConnections& _add(const std::string& identity);
+  std::shared_ptr<CurlConnections> _make() const;
+  void _retire(Partitions::iterator partition);
+  void _shareIdleConnections();
+
+  // Fixed after construction.
+  IOLoop& loop_;
+  const CurlSettings settings_;
+
+  // The I/O loop.
+  bool closed_ = false;
+  Partitions live_;  // the last used by an identity last
+  std::vector<std::shared_ptr<CurlConnections>> retired_;
+  std::deque<std::string> ended_;  // the latest last
+  std::uint64_t endings_ = 0;
+};
+
+}  // namespace zelkord
