@@ -2,6 +2,7 @@
 
 #include <openssl/ec.h>
 #include <openssl/pem.h>
+#include <openssl/ssl.h>
 #include <openssl/x509v3.h>
 
 #include <cctype>
@@ -66,6 +67,20 @@ TestCertificate TestCertificate::make(const std::string& host, Validity validity
   PEM_write_bio_X509(certificate.get(), x509.get());
   PEM_write_bio_PrivateKey(privateKey.get(), key.get(), nullptr, nullptr, 0, nullptr, nullptr);
   return {textOfBIO(certificate.get()), textOfBIO(privateKey.get())};
+}
+
+std::shared_ptr<SSL_CTX> TestCertificate::serverContext() const {
+  std::shared_ptr<SSL_CTX> tls(SSL_CTX_new(TLS_server_method()), &SSL_CTX_free);
+  const BIOPointer certificateText(BIO_new_mem_buf(certificate.data(), -1), &BIO_free_all);
+  const BIOPointer keyText(BIO_new_mem_buf(privateKey.data(), -1), &BIO_free_all);
+  const X509Pointer x509(PEM_read_bio_X509(certificateText.get(), nullptr, nullptr, nullptr),
+                         &X509_free);
+  const KeyPointer key(PEM_read_bio_PrivateKey(keyText.get(), nullptr, nullptr, nullptr),
+                       &EVP_PKEY_free);
+  const bool usable = SSL_CTX_use_certificate(tls.get(), x509.get()) == 1 &&
+                      SSL_CTX_use_PrivateKey(tls.get(), key.get()) == 1;
+  ZK_CHECK(usable, "the server's certificate is usable");
+  return tls;
 }
 
 }  // namespace zelkord

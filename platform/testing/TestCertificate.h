@@ -1,9 +1,12 @@
 #pragma once
 
 #include <chrono>
+#include <memory>
 #include <string>
 
 #include "base/Namespace.h"
+
+struct ssl_ctx_st;
 
 namespace zelkord {
 
@@ -16,6 +19,9 @@ struct TestCertificate {
   enum class Validity { Current, Expired, NamedBySubject };
   // For a host name or an IP address.
   static TestCertificate make(const std::string& host, Validity validity = Validity::Current);
+
+  // For servers that show it.
+  std::shared_ptr<ssl_ctx_st> serverContext() const;
 };
 
 }  // namespace zelkord

@@ -2,7 +2,6 @@
 
 #include <arpa/inet.h>
 #include <netinet/in.h>
-#include <openssl/pem.h>
 #include <openssl/ssl.h>
 #include <pthread.h>
 #include <sys/socket.h>
@@ -23,24 +22,6 @@ namespace {
 constexpr int kMaximumTestConnections = 256;
 constexpr Duration kTestPatience = 10s;
 
-std::shared_ptr<SSL_CTX> makeServerTLS(const std::optional<TestCertificate>& identity) {
-  if (!identity) return nullptr;
-  std::shared_ptr<SSL_CTX> tls(SSL_CTX_new(TLS_server_method()), &SSL_CTX_free);
-  BIO* bio = BIO_new_mem_buf(identity->certificate.data(), -1);
-  X509* certificate = PEM_read_bio_X509(bio, nullptr, nullptr, nullptr);
-  BIO_free(bio);
-  bio = BIO_new_mem_buf(identity->privateKey.data(), -1);
-  EVP_PKEY* key = PEM_read_bio_PrivateKey(bio, nullptr, nullptr, nullptr);
-  BIO_free(bio);
-  const bool usable = SSL_CTX_use_certificate(tls.get(), certificate) == 1 &&
-                      SSL_CTX_use_PrivateKey(tls.get(), key) == 1;
-  ZK_CHECK(usable, "the server's certificate is usable");
-  X509_free(certificate);
-  EVP_PKEY_free(key);
-  TestHTTPConnection::markTickets(tls.get());
-  return tls;
-}
-
 // Writes to closed connections are answered with an error, not a signal.
 void blockTestSignals() {
   sigset_t signals;
@@ -56,7 +37,9 @@ std::optional<std::string> TestHTTPRequest::header(std::string_view name) const 
 }
 
 TestHTTPServer::TestHTTPServer(const std::optional<TestCertificate>& certificate)
-    : tls_(makeServerTLS(certificate)), listener_(socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
+    : tls_(certificate ? certificate->serverContext() : nullptr),
+      listener_(socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
+  if (tls_) TestHTTPConnection::markTickets(tls_.get());
   sockaddr_in address{};
   address.sin_family = AF_INET;
   address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);

@@ -17,6 +17,7 @@
 #include "base/Check.h"
 #include "platform/linux/url/URLSessionTestSupport.h"
 #include "platform/testing/TestCertificate.h"
+#include "platform/testing/TestHTTP2Server.h"
 
 namespace zelkord {
 namespace {
@@ -127,6 +128,39 @@ TEST(CurlURLSessionHTTP2Test, SendsManyRequestsOverOneConnection) {
   }
   EXPECT_EQ(connections, 1);
   EXPECT_EQ(loadURL(*session, {.url = server.url() + "/none"}).result.status(), 404);
+}
+
+TEST(CurlURLSessionHTTP2Test, OutlivesResetStreamsAndConnectionsThatGoAway) {
+  using Action = TestHTTP2Server::Action;
+  const auto certificate = TestCertificate::make("127.0.0.1");
+  const URLTestFile roots(certificate.certificate);
+  const struct {
+    const char* name;
+    Action action;
+    std::int64_t code;  // of the request that meets it
+    const char* text;
+    bool keepsConnection;  // for the next one
+  } cases[] = {
+      {"reset", Action::Reset, -1005, "", true},
+      {"reset half-way", Action::ResetHalfWay, -1005, "hel", true},
+      {"answered, then away", Action::AnswerAndGoAway, 0, "hello", false},
+      {"away, unanswered", Action::GoAwayAndClose, -1005, "", false},
+  };
+  for (const auto& [name, action, code, text, keepsConnection] : cases) {
+    SCOPED_TRACE(name);
+    TestHTTP2Server server(certificate, {Action::Answer, action});
+    URLSessionTestBed bed({.rootsFile = roots.path()});
+    const auto session = bed.make({.name = "test", .pipelining = true});
+    const URLRequest request{.url = server.url(), .timeout = 10s};
+    EXPECT_EQ(loadURL(*session, request).text(), "hello");
+    const auto met = loadURL(*session, request);
+    EXPECT_EQ(met.errorCode(), code);
+    EXPECT_EQ(met.text(), text);
+    const auto next = loadURL(*session, request);
+    EXPECT_EQ(next.text(), "hello");
+    EXPECT_EQ(next.timing.protocol, "h2");
+    EXPECT_EQ(server.connections(), keepsConnection ? 1 : 2);
+  }
 }
 
 }  // namespace

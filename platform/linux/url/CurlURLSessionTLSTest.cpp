@@ -1,5 +1,6 @@
 #include <gtest/gtest.h>
 
+#include <cstdlib>
 #include <future>
 #include <memory>
 #include <string>
@@ -140,6 +141,42 @@ TEST(CurlURLSessionProxyTest, GoesStraightOtherwise) {
     EXPECT_EQ(results.wait(1).front().status(), 404);
   }
   EXPECT_EQ(proxy.connections(), 0);
+}
+
+// A variable of the environment, for the length of a test.
+class EnvironmentVariable {
+ public:
+  EnvironmentVariable(const char* name, const std::string& value) : name_(name) {
+    setenv(name, value.c_str(), 1);
+  }
+  ~EnvironmentVariable() { unsetenv(name_); }
+  EnvironmentVariable(const EnvironmentVariable&) = delete;
+  EnvironmentVariable& operator=(const EnvironmentVariable&) = delete;
+
+ private:
+  const char* const name_;
+};
+
+TEST(CurlURLSessionProxyTest, LeavesTheEnvironmentsProxiesAndExceptionsAlone) {
+  const auto certificate = TestCertificate::make("listed.example");
+  const URLTestFile roots(certificate.certificate);
+  TestHTTPServer server(certificate), plain, ours, theirs;
+  server.reply("/", TestHTTPReply::make(200, "through ours"));
+  plain.reply("/", TestHTTPReply::make(200, "straight"));
+  const EnvironmentVariable http("http_proxy", theirs.url("")),
+      https("https_proxy", theirs.url("")), all("ALL_PROXY", theirs.url("")),
+      none("no_proxy", "listed.example");
+  URLSessionTestBed bed({.proxies = proxyFor(ours, "listed.example"), .rootsFile = roots.path()});
+  const auto session = bed.make();
+  EXPECT_EQ(loadURL(*session, {.url = plain.url("/")}).text(), "straight");
+  URLResults results;
+  const auto task = session->dataTask({.url = server.url("/", "listed.example"), .routed = true},
+                                      results.completion());
+  EXPECT_TRUE(task->enableProxy(nullptr));
+  task->resume();
+  EXPECT_EQ(results.wait(1).front().data.value_or(Data()).view(), "through ours");
+  EXPECT_EQ(ours.connections(), 1);
+  EXPECT_EQ(theirs.connections(), 0);
 }
 
 TEST(CurlURLSessionProxyTest, SaysWhenThereIsNoProxy) {
