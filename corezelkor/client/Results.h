@@ -3,6 +3,7 @@
 #include <optional>
 #include <string_view>
 
+#include "base/Export.h"
 #include "base/Json.h"
 #include "corezelkor/client/ClientTypes.h"
 
@@ -19,6 +20,6 @@ namespace zelkor {
 // it.
 //
 // `typed` is the query string as it was sent. An empty one is gone on from by everything.
-std::optional<json::array> resultsFor(std::string_view typed, const ClientAnswer& answer);
+ZK_EXPORT std::optional<json::array> resultsFor(std::string_view typed, const ClientAnswer& answer);
 
 }  // namespace zelkor
