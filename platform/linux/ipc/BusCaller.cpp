@@ -74,7 +74,7 @@ void BusCaller::_identified(sd_bus_message* answer) {
   const auto refusal = _admit(number("UnixUserID"), number("ProcessID"));
   state_ = refusal ? State::Refused : State::Known;
   if (refusal) refusal_ = *refusal;
-  for (auto& message : std::exchange(waiting_, {})) take(message.get());
+  for (auto& waiting : std::exchange(waiting_, {})) _serve(std::move(waiting.call));
   // Its next call is a new attempt.
   if (refusal && refusal->error == kLimitsExceeded) door_.vanished(name_);
 }
@@ -90,19 +90,22 @@ std::optional<BusCaller::Refusal> BusCaller::_admit(std::optional<std::uint32_t>
 }
 
 void BusCaller::take(sd_bus_message* message) {
-  switch (state_) {
-    case State::Checking:
-      if (waiting_.size() < context_.options.callsUnderWay) {
-        waiting_.emplace_back(sd_bus_message_ref(message));
-      } else {
-        door_.dispatcher().refuse(*plain_, originOf(message), kLimitsExceeded, "too many calls");
-      }
-      return;
-    case State::Known:
-      return door_.dispatcher().dispatch(message, *this);
-    case State::Refused:
-      return door_.dispatcher().refuse(*plain_, originOf(message), refusal_.error, refusal_.text);
+  auto call = door_.dispatcher().take(message);
+  state_ == State::Checking ? _wait(std::move(call)) : _serve(std::move(call));
+}
+
+void BusCaller::_wait(TakenCall call) {
+  const auto origin = call.origin;
+  auto share = door_.unidentified().take(call.bytes());
+  if (!share || waiting_.size() >= context_.options.callsUnderWay) {
+    return door_.dispatcher().refuse(*plain_, origin, kLimitsExceeded, "too many calls");
   }
+  waiting_.push_back({std::move(call), *std::move(share)});
+}
+
+void BusCaller::_serve(TakenCall call) {
+  if (state_ == State::Known) return door_.dispatcher().dispatch(std::move(call), *this);
+  door_.dispatcher().refuse(*plain_, call.origin, refusal_.error, refusal_.text);
 }
 
 Receiver BusCaller::receiver(const std::string& interface) {

@@ -54,6 +54,11 @@ class BusCaller final : public Caller, public ClientMemory::Holder {
     Budget::Share share;
     Subscription holding;
   };
+  // A call while the driver is asked.
+  struct Waiting {
+    TakenCall call;
+    CallFlow::Share share;
+  };
   struct Refusal {
     std::string_view error;
     std::string_view text;
@@ -63,6 +68,8 @@ class BusCaller final : public Caller, public ClientMemory::Holder {
   static int _onCredentials(sd_bus_message* message, void* self, sd_bus_error* error);
   static int _onMatched(sd_bus_message* message, void* self, sd_bus_error* error);
   void _identified(sd_bus_message* answer);
+  void _wait(TakenCall call);
+  void _serve(TakenCall call);
   std::optional<Refusal> _admit(std::optional<std::uint32_t> uid, std::optional<std::uint32_t> pid);
   Receiver _beginConnection();
   Session _makeSession();
@@ -81,7 +88,7 @@ class BusCaller final : public Caller, public ClientMemory::Holder {
   Refusal refusal_;
   Peer peer_;
   Budget::Share share_;
-  std::vector<MessagePtr> waiting_;
+  std::vector<Waiting> waiting_;
   Session connection_;
   Session shared_;  // serves the shared handler
   SlotPtr match_;

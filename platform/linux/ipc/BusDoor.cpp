@@ -15,6 +15,7 @@ namespace zelkord::ipc {
 namespace {
 
 constexpr int kBusMessagesInARow = 64;
+constexpr pid_t kNoProcess = 0;
 // A bus daemon reads always; one that has stopped must not take our memory.
 constexpr std::size_t kMostBusMessagesQueued = 16'384;
 constexpr std::size_t kMostBusBytesQueued = 64u << 20;
@@ -69,6 +70,9 @@ BusDoor::BusDoor(IpcContext& context, BusPtr bus, ListenerConfiguration configur
       port_(std::make_shared<DelegatePort>(context, std::move(delegate))),
       openPrivate_(std::move(openPrivate)),
       events_(std::move(events)),
+      unidentified_(std::make_shared<CallFlow>(context.options.processCallsUnderWay,
+                                               context.options.clientMemory / 4, context.memory,
+                                               kNoProcess)),
       dispatcher_(context, std::move(configuration), std::move(serviceInterface)),
       bus_(std::move(bus)) {}
 

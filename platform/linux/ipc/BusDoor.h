@@ -61,6 +61,8 @@ class BusDoor final {
   // For its callers.
   Dispatcher& dispatcher() { return dispatcher_; }
   DelegatePort& port() { return *port_; }
+  // Calls of those of whom it is not known yet what process they are.
+  CallFlow& unidentified() { return *unidentified_; }
   void send(MessagePtr message, std::size_t bytes);
   FileHandle openPrivateConnection(Peer peer) { return openPrivate_(peer); }
   // The name has left the bus; its caller ends once sd-bus is off the stack.
@@ -80,6 +82,7 @@ class BusDoor final {
   const std::shared_ptr<DelegatePort> port_;
   const OpenPrivate openPrivate_;
   const Events events_;
+  const std::shared_ptr<CallFlow> unidentified_;
 
   // Loop state.
   Dispatcher dispatcher_;

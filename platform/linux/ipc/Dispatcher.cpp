@@ -39,23 +39,45 @@ Dispatcher::Dispatcher(IpcContext& context, ListenerConfiguration configuration,
 void Dispatcher::dispatch(sd_bus_message* message, Caller& caller) {
   std::uint8_t type = 0;
   sd_bus_message_get_type(message, &type);
-  if (type == SD_BUS_MESSAGE_METHOD_CALL && _dispatchCall(message, caller)) return;
+  if (type == SD_BUS_MESSAGE_METHOD_CALL) return dispatch(take(message), caller);
   noteMessage(caller);
+}
+
+TakenCall Dispatcher::take(sd_bus_message* message) const {
+  TakenCall call{.origin = originOf(message),
+                 .path = orEmpty(sd_bus_message_get_path(message)),
+                 .interface = orEmpty(sd_bus_message_get_interface(message)),
+                 .member = orEmpty(sd_bus_message_get_member(message))};
+  if (call.path == kObjectPath) _findMethod(call);
+  if (call.method) {
+    call.arguments = decodeArguments(message, call.method->in, configuration_->limits);
+  }
+  return call;
+}
+
+void Dispatcher::_findMethod(TakenCall& call) const {
+  for (const auto& candidate : configuration_->interfaces) {
+    if (!call.interface.empty() && call.interface != candidate.name) continue;
+    call.described = &candidate;
+    call.method = methodOf(candidate, call.member);
+    if (call.method) return;
+  }
+}
+
+void Dispatcher::dispatch(TakenCall call, Caller& caller) {
+  if (!_dispatchCall(call, caller)) noteMessage(caller);
 }
 
 void Dispatcher::noteMessage(Caller& caller) {
   if (auto* connection = caller.connection()) connection->messageArrived();
 }
 
-bool Dispatcher::_dispatchCall(sd_bus_message* message, Caller& caller) {
+bool Dispatcher::_dispatchCall(TakenCall& call, Caller& caller) {
   ++context_.counts->calls;
-  const Target target{orEmpty(sd_bus_message_get_path(message)),
-                      orEmpty(sd_bus_message_get_interface(message)),
-                      orEmpty(sd_bus_message_get_member(message))};
-  if (caller.isPrivate() && _answerBusDriver(message, target, caller)) return false;
-  if (_answerStandard(message, target, caller)) return false;
-  if (target.path == kObjectPath) return _callObject(message, target, caller);
-  refuse(caller.outlet(), originOf(message), kUnknownObject, "no object at " + target.path);
+  if (caller.isPrivate() && _answerBusDriver(call, caller)) return false;
+  if (_answerStandard(call, caller)) return false;
+  if (call.path == kObjectPath) return _callObject(call, caller);
+  refuse(caller.outlet(), call.origin, kUnknownObject, "no object at " + call.path);
   return false;
 }
 
@@ -66,74 +88,61 @@ void Dispatcher::refuse(Outlet& outlet, const CallOrigin& origin, std::string_vi
 }
 
 // There is no bus on a private connection, but tools begin with it.
-bool Dispatcher::_answerBusDriver(sd_bus_message* message, const Target& target, Caller& caller) {
-  if (target.interface != "org.freedesktop.DBus") return false;
-  const auto origin = originOf(message);
-  if (target.member == "Hello") {
-    sendReply(caller.outlet(), origin, "s", {":1." + std::to_string(++hellos_)});
-  } else if (target.member == "AddMatch" || target.member == "RemoveMatch") {
-    sendReply(caller.outlet(), origin, "", {});
+bool Dispatcher::_answerBusDriver(const TakenCall& call, Caller& caller) {
+  if (call.interface != "org.freedesktop.DBus") return false;
+  if (call.member == "Hello") {
+    sendReply(caller.outlet(), call.origin, "s", {":1." + std::to_string(++hellos_)});
+  } else if (call.member == "AddMatch" || call.member == "RemoveMatch") {
+    sendReply(caller.outlet(), call.origin, "", {});
   } else {
-    refuse(caller.outlet(), origin, kUnknownMethod, "there is no bus on this connection");
+    refuse(caller.outlet(), call.origin, kUnknownMethod, "there is no bus on this connection");
   }
   return true;
 }
 
-bool Dispatcher::_answerStandard(sd_bus_message* message, const Target& target, Caller& caller) {
-  if (target.interface == "org.freedesktop.DBus.Introspectable") {
-    if (target.member == "Introspect") {
-      sendReply(caller.outlet(), originOf(message), "s",
-                {introspectionDocument(target.path, configuration_->interfaces)});
+bool Dispatcher::_answerStandard(const TakenCall& call, Caller& caller) {
+  if (call.interface == "org.freedesktop.DBus.Introspectable") {
+    if (call.member == "Introspect") {
+      sendReply(caller.outlet(), call.origin, "s",
+                {introspectionDocument(call.path, configuration_->interfaces)});
     } else {
-      _refuseUnknown(originOf(message), target, caller);
+      _refuseUnknown(call, caller);
     }
     return true;
   }
-  if (target.interface != "org.freedesktop.DBus.Properties") return false;
-  _answerProperties(message, target, caller);
+  if (call.interface != "org.freedesktop.DBus.Properties") return false;
+  _answerProperties(call, caller);
   return true;
 }
 
 // No object has properties.
-void Dispatcher::_answerProperties(sd_bus_message* message, const Target& target, Caller& caller) {
-  const auto origin = originOf(message);
-  if (target.path != kObjectPath) {
-    refuse(caller.outlet(), origin, kUnknownObject, "no object at " + target.path);
-  } else if (target.member == "GetAll") {
-    sendReply(caller.outlet(), origin, "a{sv}", {Dictionary{}});
-  } else if (target.member == "Get" || target.member == "Set") {
-    refuse(caller.outlet(), origin, kUnknownProperty, "there are no properties");
+void Dispatcher::_answerProperties(const TakenCall& call, Caller& caller) {
+  if (call.path != kObjectPath) {
+    refuse(caller.outlet(), call.origin, kUnknownObject, "no object at " + call.path);
+  } else if (call.member == "GetAll") {
+    sendReply(caller.outlet(), call.origin, "a{sv}", {Dictionary{}});
+  } else if (call.member == "Get" || call.member == "Set") {
+    refuse(caller.outlet(), call.origin, kUnknownProperty, "there are no properties");
   } else {
-    _refuseUnknown(origin, target, caller);
+    _refuseUnknown(call, caller);
   }
 }
 
-bool Dispatcher::_callObject(sd_bus_message* message, const Target& target, Caller& caller) {
-  const auto origin = originOf(message);
-  const Interface* interface = _interface(target.interface);
-  const Method* method = interface ? methodOf(*interface, target.member) : nullptr;
-  if (target.interface.empty()) {
-    for (const auto& candidate : configuration_->interfaces) {
-      if ((method = methodOf(candidate, target.member))) {
-        interface = &candidate;
-        break;
-      }
-    }
-  }
-  if (!method) {
-    _refuseUnknown(origin, target, caller);
+bool Dispatcher::_callObject(TakenCall& call, Caller& caller) {
+  if (!call.method) {
+    _refuseUnknown(call, caller);
     return false;
   }
-  auto outcome = decodeArguments(message, method->in, configuration_->limits);
-  if (const auto* failure = std::get_if<DecodeFailure>(&outcome)) {
-    _refuseArguments(origin, *failure, caller);
+  if (const auto* failure = std::get_if<DecodeFailure>(&call.arguments)) {
+    _refuseArguments(call.origin, *failure, caller);
     return false;
   }
-  if (interface->name == serviceInterface_ && method->name == "Open") {
-    _open(origin, caller);
+  if (call.described->name == serviceInterface_ && call.method->name == "Open") {
+    _open(call.origin, caller);
     return false;
   }
-  return _deliver(origin, *interface, *method, std::get<Decoded>(std::move(outcome)), caller);
+  return _deliver(call.origin, *call.described, *call.method,
+                  std::get<Decoded>(std::move(call.arguments)), caller);
 }
 
 void Dispatcher::_refuseArguments(const CallOrigin& origin, const DecodeFailure& failure,
@@ -146,11 +155,11 @@ void Dispatcher::_refuseArguments(const CallOrigin& origin, const DecodeFailure&
          failure.text);
 }
 
-void Dispatcher::_refuseUnknown(const CallOrigin& origin, const Target& target, Caller& caller) {
-  const bool isStandard = target.interface.starts_with("org.freedesktop.DBus.");
-  const bool isInterface = isStandard || target.interface.empty() || _interface(target.interface);
-  refuse(caller.outlet(), origin, isInterface ? kUnknownMethod : kUnknownInterface,
-         "no method " + target.interface + "." + target.member);
+void Dispatcher::_refuseUnknown(const TakenCall& call, Caller& caller) {
+  const bool isStandard = call.interface.starts_with("org.freedesktop.DBus.");
+  const bool isInterface = isStandard || call.interface.empty() || _interface(call.interface);
+  refuse(caller.outlet(), call.origin, isInterface ? kUnknownMethod : kUnknownInterface,
+         "no method " + call.interface + "." + call.member);
 }
 
 bool Dispatcher::_deliver(const CallOrigin& origin, const Interface& interface,

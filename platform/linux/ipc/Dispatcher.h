@@ -4,6 +4,7 @@
 
 #include <memory>
 #include <string>
+#include <variant>
 
 #include "platform/api/Interprocess.h"
 #include "platform/linux/ipc/IpcContext.h"
@@ -38,6 +39,23 @@ class Caller {
   virtual ServedConnection* connection() = 0;
 };
 
+// A call that has been read off its message.
+struct TakenCall {
+  CallOrigin origin;
+  std::string path;
+  std::string interface;  // empty: any that has the member
+  std::string member;
+  // Of the dispatcher's configuration; null: there is no such method.
+  const Interface* described = nullptr;
+  const Method* method = nullptr;
+  std::variant<Decoded, DecodeFailure> arguments;
+
+  std::size_t bytes() const {
+    const auto* decoded = std::get_if<Decoded>(&arguments);
+    return decoded ? decoded->bytes : 0;
+  }
+};
+
 // Takes a method call apart: answers what every D-Bus peer is asked, checks and decodes the rest,
 // hands it on.
 //
@@ -52,6 +70,9 @@ class Dispatcher {
 
   const ListenerConfiguration& configuration() const { return *configuration_; }
   void dispatch(sd_bus_message* message, Caller& caller);
+  // The same in two steps.
+  TakenCall take(sd_bus_message* call) const;
+  void dispatch(TakenCall call, Caller& caller);
   // Tells the caller's connection of a message that goes nowhere else.
   static void noteMessage(Caller& caller);
   // Answers with an error of the transport itself.
@@ -59,20 +80,15 @@ class Dispatcher {
               std::string_view text);
 
  private:
-  struct Target {
-    std::string path;
-    std::string interface;  // empty: any that has the member
-    std::string member;
-  };
-
+  void _findMethod(TakenCall& call) const;
   // True when the call is on its way to a handler.
-  bool _dispatchCall(sd_bus_message* message, Caller& caller);
-  bool _answerBusDriver(sd_bus_message* message, const Target& target, Caller& caller);
-  bool _answerStandard(sd_bus_message* message, const Target& target, Caller& caller);
-  void _answerProperties(sd_bus_message* message, const Target& target, Caller& caller);
-  bool _callObject(sd_bus_message* message, const Target& target, Caller& caller);
+  bool _dispatchCall(TakenCall& call, Caller& caller);
+  bool _answerBusDriver(const TakenCall& call, Caller& caller);
+  bool _answerStandard(const TakenCall& call, Caller& caller);
+  void _answerProperties(const TakenCall& call, Caller& caller);
+  bool _callObject(TakenCall& call, Caller& caller);
   void _refuseArguments(const CallOrigin& origin, const DecodeFailure& failure, Caller& caller);
-  void _refuseUnknown(const CallOrigin& origin, const Target& target, Caller& caller);
+  void _refuseUnknown(const TakenCall& call, Caller& caller);
   bool _deliver(const CallOrigin& origin, const Interface& interface, const Method& method,
                 Decoded decoded, Caller& caller);
   void _open(const CallOrigin& origin, Caller& caller);
