@@ -286,9 +286,10 @@ TEST_F(FeedbackReportsTest, CountsAndDonatesEngagements) {
     const auto engagements = sum(".zelkor.engagements");
     const auto donated = bed_.fakes.knowledge.donations().size();
     HVResultEngagementFeedback engagement;
-    engagement.result = resultOfQuery(9);
-    engagement.result->topHit = wanted.topHit;
-    engagement.result->resultType = wanted.resultType;
+    auto result = resultOfQuery(9);
+    result.topHit = wanted.topHit;
+    result.resultType = wanted.resultType;
+    engagement.result = result;
     engagement.completedQuery = wanted.query;
     report(bed_.connectAndConfigure(wanted.client), engagement);
     EXPECT_EQ(manager_->records().all().back().clientQueryId, 9u);
