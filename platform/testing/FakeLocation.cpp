@@ -3,7 +3,6 @@
 #include <algorithm>
 
 namespace zelkord {
-namespace {
 
 // One manager's side of the shared state.
 struct FakeLocationClient {
@@ -11,8 +10,6 @@ struct FakeLocationClient {
   WorkQueue* queue = nullptr;
   bool updating = false;
 };
-
-}  // namespace
 
 struct FakeLocation::State {
   mutable Mutex mutex;

@@ -23,7 +23,8 @@ class FeedbackRoom final {
  public:
   // Bytes as _cost tells them: nearly what the record takes.
   static constexpr Budget::Size kWaiting{32 * 1024 * 1024, 8 * 1024 * 1024};
-  static constexpr Budget::Size kOneOffSessions{120, 30};
+  // As many as there may be files of them: more would only drive each other out.
+  static constexpr Budget::Size kOneOffSessions{512, 128};
   static constexpr Duration kOneOffPeriod = std::chrono::seconds(60);
 
   explicit FeedbackRoom(Assembly& assembly);

@@ -29,17 +29,17 @@ class StoredSessionsTest : public testing::Test {
 
 TEST_F(StoredSessionsTest, OnlySoManySessionsForOneOccasionBeginInAMinute) {
   constexpr const char* kCounter = "com.quenta.zelkord.limit.feedback_sessions";
-  EXPECT_EQ(make(7, 11'700), 30);
-  EXPECT_EQ(bed_.counter(kCounter), 11'700 - 30);
-  EXPECT_EQ(make(0, 40), 30);  // the daemon's own, while every keystroke fails
-  EXPECT_EQ(make(8, 40), 30);
-  EXPECT_EQ(make(9, 40), 30);
+  EXPECT_EQ(make(7, 11'700), 128);
+  EXPECT_EQ(bed_.counter(kCounter), 11'700 - 128);
+  EXPECT_EQ(make(0, 200), 128);  // the daemon's own, while every keystroke fails
+  EXPECT_EQ(make(8, 200), 128);
+  EXPECT_EQ(make(9, 200), 128);
   EXPECT_EQ(make(10, 1), 0);
-  EXPECT_EQ(bed_.storage->containers.size(), 120u);
+  EXPECT_EQ(bed_.storage->containers.size(), 512u);
   bed_.fakes.timeline.advance(59s);
   EXPECT_EQ(make(7, 1), 0);
   bed_.fakes.timeline.advance(1s);
-  EXPECT_EQ(make(7, 40), 30);
+  EXPECT_EQ(make(7, 200), 128);
   EXPECT_EQ(bed_.fakes.log.count("limit feedback_sessions reached by pid 7"), 2);
 }
 
