@@ -27,9 +27,8 @@ Subscription ClientMemory::add(Holder& holder) {
 }
 
 bool ClientMemory::hasRoomForCall(const Process& process, std::size_t bytes) {
-  const bool fits = process.calls < size_.callsOfOneProcess && bytes <= size_.ofOneProcess &&
-                    process.bytes() <= size_.ofOneProcess - bytes;
-  if (!fits) return false;
+  const bool fits = process.calls < size_.callsOfOneProcess && bytes <= size_.ofOneProcess;
+  if (!fits || !_mayHold(process, bytes)) return false;
   if (*held_ + bytes <= size_.inAll) return true;
   _makeRoom(bytes);
   return *held_ + bytes <= size_.inAll;
@@ -40,19 +39,24 @@ void ClientMemory::callRefused(const Process& process) {
 }
 
 void ClientMemory::grew(const Process& process) {
-  while (_isTooLarge(process) && _cutOffLargestOf(process)) {
+  while (!_mayHold(process, 0) && _cutOffLargestOf(process)) {
   }
   if (*held_ > size_.inAll) _makeRoom(0);
 }
 
-bool ClientMemory::_isTooLarge(const Process& process) const {
-  if (process.bytes() <= size_.ofOneProcess) return false;
+bool ClientMemory::_mayHold(const Process& process, std::size_t bytes) const {
+  const auto wanted = process.bytes() + bytes;
+  if (wanted <= size_.ofOneProcess) return true;
+  return wanted <= size_.ofOneProcess + _largestMessageOf(process) + _remains(&process);
+}
+
+std::size_t ClientMemory::_largestMessageOf(const Process& process) const {
   std::size_t largest = 0;
   for (const auto* holder : holders_) {
     if (&holder->calls()->process() != &process) continue;
     largest = std::max(largest, holder->largestMessage());
   }
-  return process.bytes() > size_.ofOneProcess + largest + _remains(&process);
+  return largest;
 }
 
 void ClientMemory::_makeRoom(std::size_t bytes) {

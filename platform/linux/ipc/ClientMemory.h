@@ -80,7 +80,9 @@ class ClientMemory final {
   std::size_t held() const { return *held_; }
 
  private:
-  bool _isTooLarge(const Process& process) const;
+  // Whether it may hold so many more bytes.
+  bool _mayHold(const Process& process, std::size_t bytes) const;
+  std::size_t _largestMessageOf(const Process& process) const;
   // Cuts off until `bytes` more fit, or nobody is left.
   void _makeRoom(std::size_t bytes);
   // What the calls of connections that were cut off still hold, of that process or of all.

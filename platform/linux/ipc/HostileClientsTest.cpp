@@ -1,10 +1,12 @@
 #include <fcntl.h>
 #include <gtest/gtest.h>
+#include <malloc.h>
 #include <sys/resource.h>
 
 #include <array>
 
 #include "platform/linux/ipc/IpcTestSupport.h"
+#include "platform/linux/process/StartMemory.h"
 
 namespace zelkord::ipc {
 namespace {
@@ -162,6 +164,13 @@ std::size_t residentBytes() {
   return resident * static_cast<std::size_t>(::sysconf(_SC_PAGESIZE));
 }
 
+// Without what earlier tests have left behind, and with the heap as the daemon has it.
+std::size_t residentBytesOnly() {
+  keepHeapSmall();
+  ::malloc_trim(0);
+  return residentBytes();
+}
+
 std::size_t openDescriptors() {
   return static_cast<std::size_t>(
       std::distance(std::filesystem::directory_iterator("/proc/self/fd"), {}));
@@ -184,7 +193,7 @@ TEST_P(HostileClientsTest, OneProcessKeepsNobodyElseOutAndHoldsItsShareOnly) {
   Attacker attacker(directory_.path() + "/socket", GetParam());
   IpcTestServer server(
       false, [this](SdBusOptions& options) { options.runtimeDirectory = directory_.path(); });
-  const auto residentBefore = residentBytes();
+  const auto residentBefore = residentBytesOnly();
   ASSERT_FALSE(server.listen());
   const auto isServed = [&] {
     const auto begun = std::chrono::steady_clock::now();
@@ -198,7 +207,8 @@ TEST_P(HostileClientsTest, OneProcessKeepsNobodyElseOutAndHoldsItsShareOnly) {
   EXPECT_LT(fastest, kServedWithin);
   EXPECT_LT(server.interprocess->statistics().heldBytes, kProcessMemory + kLargestMessage + kSlack);
   const auto residentLimit = residentBefore + kProcessMemory + kMemoryOverTheAccounted;
-  EXPECT_TRUE(residentBytes() < residentLimit || !kMeasuresMemory) << residentBytes();
+  EXPECT_TRUE(eventually([&] { return residentBytes() < residentLimit || !kMeasuresMemory; }))
+      << residentBytes() - residentBefore;
   EXPECT_LT(openDescriptors(), kFewDescriptors / 2);
 }
 
@@ -220,7 +230,7 @@ TEST(ClientMemoryLimitTest, ManyProcessesTogetherHoldNoMoreThanThereIs) {
   }
   IpcTestServer server(false,
                        [&](SdBusOptions& options) { options.runtimeDirectory = directory.path(); });
-  const auto residentBefore = residentBytes();
+  const auto residentBefore = residentBytesOnly();
   ASSERT_FALSE(server.listen());
   for (const auto& attacker : attackers) EXPECT_TRUE(attacker->waitUntilDone());
   auto client = server.socketClient();
@@ -229,7 +239,8 @@ TEST(ClientMemoryLimitTest, ManyProcessesTogetherHoldNoMoreThanThereIs) {
   EXPECT_GT(held, kAllMemory / 2);
   EXPECT_LE(held, kAllMemory);
   const auto residentLimit = residentBefore + kAllMemory + kMemoryOverTheAccounted;
-  EXPECT_TRUE(residentBytes() < residentLimit || !kMeasuresMemory) << residentBytes();
+  EXPECT_TRUE(eventually([&] { return residentBytes() < residentLimit || !kMeasuresMemory; }))
+      << residentBytes() - residentBefore;
 }
 
 TEST(ConnectionLimitTest, TwoHundredOfOneProcessFitAndTheNextButFewAreRefusedOnEveryDoor) {
