@@ -28,7 +28,7 @@ Subscription ClientMemory::add(Holder& holder) {
 
 bool ClientMemory::hasRoomForCall(const Process& process, std::size_t bytes) {
   const bool fits = process.calls < size_.callsOfOneProcess && bytes <= size_.ofOneProcess;
-  if (!fits || !_mayHold(process, bytes)) return false;
+  if (!fits || !_mayHold(process, process.bytes() + bytes)) return false;
   if (*held_ + bytes <= size_.inAll) return true;
   _makeRoom(bytes);
   return *held_ + bytes <= size_.inAll;
@@ -39,15 +39,19 @@ void ClientMemory::callRefused(const Process& process) {
 }
 
 void ClientMemory::grew(const Process& process) {
-  while (!_mayHold(process, 0) && _cutOffLargestOf(process)) {
+  // The remains go by themselves, at any moment.
+  const auto isTooLarge = [&] {
+    const auto bytes = process.bytes();
+    return !_mayHold(process, bytes - std::min(bytes, _remains(&process)));
+  };
+  while (isTooLarge() && _cutOffLargestOf(process)) {
   }
   if (*held_ > size_.inAll) _makeRoom(0);
 }
 
 bool ClientMemory::_mayHold(const Process& process, std::size_t bytes) const {
-  const auto wanted = process.bytes() + bytes;
-  if (wanted <= size_.ofOneProcess) return true;
-  return wanted <= size_.ofOneProcess + _largestMessageOf(process) + _remains(&process);
+  if (bytes <= size_.ofOneProcess) return true;
+  return bytes <= size_.ofOneProcess + _largestMessageOf(process);
 }
 
 std::size_t ClientMemory::_largestMessageOf(const Process& process) const {
@@ -60,7 +64,6 @@ std::size_t ClientMemory::_largestMessageOf(const Process& process) const {
 }
 
 void ClientMemory::_makeRoom(std::size_t bytes) {
-  std::erase_if(cutOff_, [](const auto& weak) { return weak.expired(); });
   while (*held_ + bytes > size_.inAll + _remains(nullptr)) {
     const auto* largest = _largestProcess();
     if (!largest || !_cutOffLargestOf(*largest)) return;
@@ -93,6 +96,7 @@ bool ClientMemory::_cutOffLargestOf(const Process& process) {
   }
   if (!largest) return false;
   reports_.refused("client_memory", processHolder(process.pid()));
+  std::erase_if(cutOff_, [](const auto& weak) { return weak.expired(); });
   cutOff_.push_back(largest->calls());
   largest->cutOffForMemory();
   return true;

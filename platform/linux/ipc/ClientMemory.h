@@ -80,7 +80,7 @@ class ClientMemory final {
   std::size_t held() const { return *held_; }
 
  private:
-  // Whether it may hold so many more bytes.
+  // Whether it may hold so much.
   bool _mayHold(const Process& process, std::size_t bytes) const;
   std::size_t _largestMessageOf(const Process& process) const;
   // Cuts off until `bytes` more fit, or nobody is left.
