@@ -41,6 +41,7 @@ void addPath(CLI::App& app, const std::string& name, std::filesystem::path& targ
 
 void describe(CLI::App& app, Options& options) {
   app.set_help_flag();
+  app.option_defaults()->multi_option_policy(CLI::MultiOptionPolicy::TakeLast);
   addPath(app, "--state", options.state, "DIR",
           "Keep the certificate, the index, the request log and the uploads in DIR");
   addNumber(app, "--port", options.port, "Listen on port N; 0, the default, takes any free one");

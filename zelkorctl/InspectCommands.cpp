@@ -133,8 +133,7 @@ int runStatus(const Invocation& invocation) {
     printJson(invocation, *status);
   } else {
     printObject(invocation, status->get_object());
-    const auto* bag = objectIn(status->get_object(), "bag");
-    if (bag && objectIn(*bag, "last_failure")) {
+    if (const auto bag = missingBagIn(*result.value); bag && objectIn(*bag, "last_failure")) {
       invocation.surroundings.out << '\n' << bagFetchText(*bag) << '\n';
     }
   }

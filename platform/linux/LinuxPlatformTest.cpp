@@ -117,7 +117,9 @@ TEST_F(LinuxPlatformTest, OnlyALogFileThatWasAskedForMustBeOne) {
   EXPECT_TRUE(LinuxPlatform::make(options_, &error_)) << error_.description();
   const auto said = testing::internal::GetCapturedStderr();
   const auto expected = "zelkord: no log: " + root_ / kDirectories[0] + "/zelkord.log";
-  if (!JournalLog::isThere()) EXPECT_THAT(said, HasSubstr(expected));
+  if (!JournalLog::isThere()) {
+    EXPECT_THAT(said, HasSubstr(expected));
+  }
 }
 
 TEST_F(LinuxPlatformTest, SaysWhyWhenThereIsNoPlaceForItsState) {

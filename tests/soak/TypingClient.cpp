@@ -162,7 +162,9 @@ void TypingClient::_judge(const Question& question, sd_bus_message* reply) {
   if (!reader.ok()) _fault("an answer of another form");
   if (answer.queryId != question.queryId) _fault("an answer to another query");
   if (answer.error) {
-    if (!isKnownError(*answer.error)) _fault("an error for no known reason");
+    if (habits_.strict || !isKnownError(*answer.error)) {
+      _fault("an error for no known reason: " + answer.error->description());
+    }
     ++tally_.errors[answer.error->domain + " " + std::to_string(answer.error->code)];
   } else if (answer.reply) {
     ++tally_.answered;

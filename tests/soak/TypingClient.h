@@ -32,6 +32,8 @@ class TypingClient {
     std::string address;
     std::string identifier;
     std::chrono::microseconds pause;  // between keystrokes, on average
+    // Whether the service behaves: then a search always has data or a newer one under way.
+    bool strict = false;
   };
 
   TypingClient(Habits habits, const Words& words, Tally& tally, unsigned seed);

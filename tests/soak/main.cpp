@@ -5,7 +5,8 @@
 // Simulated clients at a daemon's private door, in two halves with the same load. Status 0 when
 // every question was answered exactly once, or not for a reason that can be seen from outside, the
 // daemon is not larger after the second half than after the first one, and 99 of 100 searches had
-// their data within the limit. With --seconds the halves end after that time instead.
+// their data within the limit. With --seconds the halves end after that time instead. With
+// --strict yes the service is known to behave: every error is a fault.
 
 #include <fmt/core.h>
 
@@ -35,6 +36,7 @@ struct Options {
   double growthLimit = 6;   // MiB
   double latencyLimit = 0;  // ms of the 99th percentile; 0: none
   int seconds = 0;          // 0: keystrokes end it
+  bool strict = false;
 };
 
 Options parse(int count, char** arguments) {
@@ -48,6 +50,7 @@ Options parse(int count, char** arguments) {
       {"--seed", [&](const auto& text) { options.seed = std::stoul(text); }},
       {"--daemon", [&](const auto& text) { options.daemon = std::stoi(text); }},
       {"--seconds", [&](const auto& text) { options.seconds = std::stoi(text); }},
+      {"--strict", [&](const auto& text) { options.strict = text == "yes"; }},
       {"--latency-limit", [&](const auto& text) { options.latencyLimit = std::stod(text); }},
       {"--growth-limit", [&](const auto& text) { options.growthLimit = std::stod(text); }}};
   for (int i = 1; i + 1 < count; i += 2) known.at(arguments[i])(arguments[i + 1]);
@@ -113,7 +116,7 @@ double runHalf(const Options& options, const Words& words, Tally& tally, const E
     Clients clients;
     for (std::size_t i = 0; i < options.clients; ++i) {
       TypingClient::Habits habits{options.address, "com.quenta.soak" + std::to_string(i % 5),
-                                  std::chrono::milliseconds(options.pause)};
+                                  std::chrono::milliseconds(options.pause), options.strict};
       const auto seed = options.seed + static_cast<unsigned>(i + tally.keystrokes);
       clients.push_back(std::make_unique<TypingClient>(std::move(habits), words, tally, seed));
     }

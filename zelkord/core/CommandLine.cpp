@@ -95,6 +95,7 @@ void addFlags(CLI::App& app, CommandLine& line) {
 
 void describe(CLI::App& app, CommandLine& line) {
   app.set_help_flag();
+  app.option_defaults()->multi_option_policy(CLI::MultiOptionPolicy::TakeLast);
   addLogOptions(app, line);
   addTimeOptions(app, line);
   addFlags(app, line);

@@ -63,7 +63,9 @@ TEST_F(ContextUpdaterTest, FollowsEveryChangeThatTheHostAnnounces) {
     world.notify(notification);
     EXPECT_THAT(world.request("search")->url, HasSubstr(after));
     EXPECT_EQ(posted, refreshes);
-    if (refreshes > 0) EXPECT_GT(world.factory().contextGeneration(), generation);
+    if (refreshes > 0) {
+      EXPECT_GT(world.factory().contextGeneration(), generation);
+    }
   }
 }
 

@@ -14,6 +14,7 @@ struct Aim {
   std::string stateFolder;  // the daemon's, empty: leave its files alone
   std::string stalledURL;   // takes connections and never answers
   std::string hostileURL;   // answers with what makes the daemon complain
+  std::string keptURL;      // with a number behind it: a large answer that may be kept
 };
 
 // One way to use up what all clients share.

@@ -1,6 +1,7 @@
 // What uses up transfers, image places, workers and the log.
 
 #include <fmt/core.h>
+#include <unistd.h>
 
 #include "corezelkor/client/internal/Wire.h"
 #include "tests/soak/hostile/Attack.h"
@@ -10,9 +11,6 @@ namespace zelkord::soak {
 namespace {
 
 using namespace std::chrono_literals;
-
-constexpr const char* kIdentifier = "com.quenta.hostile";
-constexpr const char* kAgent = "Hostile/1.0";
 
 class StalledCards final : public Attack {
  public:
@@ -24,7 +22,7 @@ class StalledCards final : public Attack {
     std::vector<Caller> callers;
     for (int i = 0; i < 4; ++i) {
       Caller caller(addressOfSocket(aim_.socket));
-      if (caller.configure(kIdentifier, kAgent).empty()) continue;
+      if (caller.configure(kHostileIdentifier, kHostileAgent).empty()) continue;
       sent += _ask(caller);
       caller.process(500ms, ~0ull);
       callers.push_back(std::move(caller));
@@ -54,7 +52,7 @@ class StalledImages final : public Attack {
   std::chrono::milliseconds rest() const override { return 500ms; }
   std::uint64_t round() override {
     Caller caller(addressOfSocket(aim_.socket));
-    const auto endpoint = caller.configure(kIdentifier, kAgent);
+    const auto endpoint = caller.configure(kHostileIdentifier, kHostileAgent);
     Caller images(endpoint.empty() ? "unix:path=/nonexistent" : endpoint);
     std::uint64_t sent = 0;
     for (int call = 0; call < 4; ++call) {
@@ -91,10 +89,54 @@ class LongTexts final : public Attack {
     std::uint64_t sent = 0;
     for (int i = 0; i < 20; ++i) {
       Caller caller(addressOfSocket(aim_.socket));
-      caller.configure(kIdentifier, text + std::to_string(i));
-      ++sent;
+      if (caller.isOpen()) ++sent;
+      caller.configure(kHostileIdentifier, text + std::to_string(i));
     }
     return sent;
+  }
+
+ private:
+  const Aim aim_;
+};
+
+class NewIdentifiers final : public Attack {
+ public:
+  explicit NewIdentifiers(const Aim& aim) : aim_(aim) {}
+  const char* name() const override { return "an identifier a connection"; }
+  std::chrono::milliseconds rest() const override { return 500ms; }
+  std::uint64_t round() override {
+    std::uint64_t sent = 0;
+    for (int i = 0; i < 50; ++i) {
+      Caller caller(addressOfSocket(aim_.socket));
+      if (caller.isOpen()) ++sent;
+      caller.configure(fmt::format("{}.{}.{}", kHostileIdentifier, ::getpid(), ++number_),
+                       kHostileAgent);
+    }
+    return sent;
+  }
+
+ private:
+  const Aim aim_;
+  std::uint64_t number_ = 0;
+};
+
+// Large answers that are kept on the disk, and asked for again.
+class KeptAnswers final : public Attack {
+ public:
+  explicit KeptAnswers(const Aim& aim) : aim_(aim) {}
+  const char* name() const override { return "large answers that are kept"; }
+  std::chrono::milliseconds rest() const override { return 300ms; }
+  std::uint64_t round() override {
+    Caller caller(addressOfSocket(aim_.socket));
+    if (caller.configure(kHostileIdentifier, kHostileAgent).empty()) return 0;
+    zelkor::ZLKMoreResultsRequest request;
+    for (int i = 1; i <= 20; ++i) {
+      request.queryId = i;
+      request.moreResultsURL = fmt::format("{}{}", aim_.keptURL, i);
+      caller.request(request);
+    }
+    caller.process(2s, 20);
+    return caller.answered();
   }
 
  private:
@@ -108,7 +150,7 @@ class NoisyAnswers final : public Attack {
   std::chrono::milliseconds rest() const override { return 1s; }
   std::uint64_t round() override {
     Caller caller(addressOfSocket(aim_.socket));
-    if (caller.configure(kIdentifier, kAgent).empty()) return 0;
+    if (caller.configure(kHostileIdentifier, kHostileAgent).empty()) return 0;
     zelkor::ZLKMoreResultsRequest request;
     request.queryId = 1;
     request.moreResultsURL = aim_.hostileURL;
@@ -128,6 +170,8 @@ std::vector<std::unique_ptr<Attack>> callAttacks(const Aim& aim) {
   attacks.push_back(std::make_unique<StalledCards>(aim));
   attacks.push_back(std::make_unique<StalledImages>(aim));
   attacks.push_back(std::make_unique<LongTexts>(aim));
+  attacks.push_back(std::make_unique<NewIdentifiers>(aim));
+  attacks.push_back(std::make_unique<KeptAnswers>(aim));
   attacks.push_back(std::make_unique<NoisyAnswers>(aim));
   return attacks;
 }

@@ -13,6 +13,10 @@
 
 namespace zelkord::soak {
 
+// How the attackers configure themselves.
+inline constexpr const char* kHostileIdentifier = "com.quenta.hostile";
+inline constexpr const char* kHostileAgent = "Hostile/1.0";
+
 // A client at a private door that calls what it likes.
 //
 // Threading: one thread. Errors: refused calls and closed connections end quietly; `isOpen` tells.

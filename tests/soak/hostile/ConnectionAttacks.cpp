@@ -1,5 +1,6 @@
 // What uses up connections, descriptors and the memory of messages.
 
+#include <algorithm>
 #include <thread>
 
 #include "tests/soak/hostile/Attack.h"
@@ -23,7 +24,7 @@ class Unauthenticated final : public Attack {
       if (i % 100 == 99) std::this_thread::sleep_for(10ms);
     }
     std::this_thread::sleep_for(1s);
-    return held.size();
+    return static_cast<std::uint64_t>(std::ranges::count_if(held, &RawConnection::isOpen));
   }
 
  private:
@@ -63,14 +64,17 @@ class UnfinishedMessages final : public Attack {
   std::uint64_t round() override {
     constexpr std::uint32_t kBody = 3'900'000;
     const auto bytes = headOfLongCall(kBody) + std::string(kBody - 1, 'x');
-    std::uint64_t sent = 0;
+    std::uint64_t begun = 0;
     std::vector<RawConnection> held;
     for (int i = 0; i < 150; ++i) {
       RawConnection connection(aim_.socket);
-      if (connection.authenticate() && connection.send(bytes)) ++sent;
+      if (!connection.authenticate()) continue;
+      ++begun;
+      connection.send(bytes);
       held.push_back(std::move(connection));
     }
-    return sent + 1;
+    std::this_thread::sleep_for(1s);
+    return begun;
   }
 
  private:
@@ -90,13 +94,14 @@ class UnreadAnswers final : public Attack {
       if (!caller.configure("com.quenta.hostile", "Hostile/1.0").empty()) sent += _askMuch(caller);
       held.push_back(std::move(caller));
     }
+    std::this_thread::sleep_for(2s);
     return sent;
   }
 
  private:
   static std::uint64_t _askMuch(Caller& caller) {
     std::uint64_t sent = 0;
-    while (sent < 200 && caller.call("com.quenta.zelkord.Daemon1", "Bag", [](auto&) {})) ++sent;
+    while (sent < 2'000 && caller.call("com.quenta.zelkord.Daemon1", "Bag", [](auto&) {})) ++sent;
     return sent;
   }
   const Aim aim_;

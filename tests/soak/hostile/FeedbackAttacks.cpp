@@ -11,8 +11,6 @@ namespace {
 
 using namespace std::chrono_literals;
 
-constexpr const char* kIdentifier = "com.quenta.hostile";
-
 class ManyUserAgents final : public Attack {
  public:
   explicit ManyUserAgents(const Aim& aim) : aim_(aim) {}
@@ -22,7 +20,8 @@ class ManyUserAgents final : public Attack {
     std::uint64_t sent = 0;
     for (int i = 0; i < 50; ++i) {
       Caller caller(addressOfSocket(aim_.socket));
-      if (caller.configure(kIdentifier, fmt::format("Hostile/{}", ++number_)).empty()) continue;
+      if (caller.configure(kHostileIdentifier, fmt::format("Hostile/{}", ++number_)).empty())
+        continue;
       if (caller.report("HVRankingFeedback", "")) ++sent;
       caller.process(100ms, 1);
     }
@@ -48,7 +47,7 @@ class EmptyResults final : public Attack {
   static std::uint64_t reportMany(const Aim& aim, const char* feedbackClass,
                                   const std::string& message, int times) {
     Caller caller(addressOfSocket(aim.socket));
-    if (caller.configure(kIdentifier, "Hostile/1.0").empty()) return 0;
+    if (caller.configure(kHostileIdentifier, kHostileAgent).empty()) return 0;
     std::uint64_t sent = 0;
     for (int i = 0; i < times; ++i) {
       if (caller.report(feedbackClass, message)) ++sent;

@@ -13,17 +13,18 @@ namespace {
 
 using namespace std::chrono_literals;
 
-class LockedSettings final : public Attack {
+class LockedDatabase final : public Attack {
  public:
-  explicit LockedSettings(const Aim& aim) : path_(aim.stateFolder + "/defaults.db") {}
-  const char* name() const override { return "settings that another program has locked"; }
+  LockedDatabase(const Aim& aim, const std::string& file, const char* name)
+      : path_(aim.stateFolder + "/" + file), name_(name) {}
+  const char* name() const override { return name_; }
   std::chrono::milliseconds rest() const override { return 2s; }
   std::uint64_t round() override {
-    if (!std::filesystem::exists(path_)) return 1;  // nothing written yet, nothing to lock
     sqlite3* opened = nullptr;
     const int result = sqlite3_open_v2(path_.c_str(), &opened, SQLITE_OPEN_READWRITE, nullptr);
     const std::unique_ptr<sqlite3, int (*)(sqlite3*)> database(opened, sqlite3_close);
     if (result != SQLITE_OK) return 0;
+    sqlite3_busy_timeout(opened, 1000);
     if (sqlite3_exec(opened, "BEGIN EXCLUSIVE", nullptr, nullptr, nullptr) != SQLITE_OK) return 0;
     std::this_thread::sleep_for(1s);
     sqlite3_exec(opened, "ROLLBACK", nullptr, nullptr, nullptr);
@@ -32,29 +33,28 @@ class LockedSettings final : public Attack {
 
  private:
   const std::string path_;
+  const char* const name_;
 };
 
 class CutCacheFiles final : public Attack {
  public:
   explicit CutCacheFiles(const Aim& aim) : folder_(aim.stateFolder + "/urlcache") {}
   const char* name() const override { return "cached bodies that are cut"; }
-  std::chrono::milliseconds rest() const override { return 500ms; }
+  std::chrono::milliseconds rest() const override { return 100ms; }
   std::uint64_t round() override {
-    std::uint64_t looked = 1;
+    using Entries = std::filesystem::recursive_directory_iterator;
+    std::uint64_t cut = 0;
     std::error_code error;
-    for (auto entry = std::filesystem::recursive_directory_iterator(folder_, error);
-         !error && entry != std::filesystem::recursive_directory_iterator();
-         entry.increment(error)) {
-      ++looked;
-      if (entry->path().extension() == ".db" ||
-          entry->path().string().find(".db-") != std::string::npos)
+    for (Entries entry(folder_, error); !error && entry != Entries(); entry.increment(error)) {
+      std::error_code gone;
+      const auto size = entry->is_regular_file(gone) ? entry->file_size(gone) : 0;
+      if (gone || size == 0 || entry->path().filename().string().find(".db") != std::string::npos) {
         continue;
-      std::error_code ignored;
-      if (looked % 3 == 0 && entry->is_regular_file(ignored)) {
-        std::filesystem::resize_file(entry->path(), entry->file_size(ignored) / 2, ignored);
       }
+      std::filesystem::resize_file(entry->path(), size / 2, gone);
+      if (!gone) ++cut;
     }
-    return looked;
+    return cut;
   }
 
  private:
@@ -66,7 +66,10 @@ class CutCacheFiles final : public Attack {
 std::vector<std::unique_ptr<Attack>> fileAttacks(const Aim& aim) {
   std::vector<std::unique_ptr<Attack>> attacks;
   if (aim.stateFolder.empty()) return attacks;
-  attacks.push_back(std::make_unique<LockedSettings>(aim));
+  attacks.push_back(
+      std::make_unique<LockedDatabase>(aim, "defaults.db", "settings that are locked"));
+  attacks.push_back(
+      std::make_unique<LockedDatabase>(aim, "counters.db", "counters that are locked"));
   attacks.push_back(std::make_unique<CutCacheFiles>(aim));
   return attacks;
 }

@@ -1,4 +1,4 @@
-// usage: zelkord_hostile --socket PATH --state FOLDER --hostile URL --seconds N
+// usage: zelkord_hostile --socket PATH --state FOLDER --hostile URL --kept URL --seconds N
 //
 // A process that attacks the daemon in every way at once, each on a thread of its own, for that
 // long. Prints what each attack got through; status 1 when one of them did nothing at all.
@@ -48,7 +48,7 @@ void raiseDescriptorLimit() {
 std::map<std::string, std::string> optionsOf(int count, char** arguments) {
   std::map<std::string, std::string> options;
   for (int i = 1; i + 1 < count; i += 2) options[arguments[i]] = arguments[i + 1];
-  for (const char* needed : {"--socket", "--state", "--hostile", "--seconds"}) {
+  for (const char* needed : {"--socket", "--state", "--hostile", "--kept", "--seconds"}) {
     if (!options.contains(needed)) throw std::out_of_range(std::string(needed) + " is missing");
   }
   return options;
@@ -57,8 +57,8 @@ std::map<std::string, std::string> optionsOf(int count, char** arguments) {
 int run(const std::map<std::string, std::string>& options) {
   raiseDescriptorLimit();
   const StalledHost stalled;
-  auto attacks = allAttacks(
-      {options.at("--socket"), options.at("--state"), stalled.url(), options.at("--hostile")});
+  auto attacks = allAttacks({options.at("--socket"), options.at("--state"), stalled.url(),
+                             options.at("--hostile"), options.at("--kept")});
   const auto end = Clock::now() + std::chrono::seconds(std::stoul(options.at("--seconds")));
   std::vector<std::uint64_t> done(attacks.size());
   std::vector<std::thread> threads;
