@@ -28,7 +28,7 @@ std::string bigEndian(std::uint32_t number) {
 
 int selectHTTP2(SSL*, const unsigned char** out, unsigned char* outSize, const unsigned char* in,
                 unsigned inSize, void*) {
-  constexpr unsigned char kProtocols[] = {2, 'h', '2'};
+  static constexpr unsigned char kProtocols[] = {2, 'h', '2'};
   const int found = SSL_select_next_proto(const_cast<unsigned char**>(out), outSize, kProtocols,
                                           sizeof kProtocols, in, inSize);
   return found == OPENSSL_NPN_NEGOTIATED ? SSL_TLSEXT_ERR_OK : SSL_TLSEXT_ERR_ALERT_FATAL;
