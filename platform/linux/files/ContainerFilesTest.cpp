@@ -5,9 +5,15 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <atomic>
 #include <cerrno>
+#include <functional>
+#include <string>
 
 #include "platform/linux/files/LinuxContainerFiles.h"
+#include "platform/linux/files/LinuxFileManager.h"
+#include "platform/linux/queues/LinuxWorkQueues.h"
+#include "platform/linux/url_cache/BodyFiles.h"
 #include "platform/testing/FakeFileManager.h"
 #include "platform/testing/ForkedProcess.h"
 #include "platform/testing/TemporaryDirectory.h"
@@ -133,6 +139,46 @@ TEST_F(LinuxContainerFilesTest, TakesTheEarlierOfBirthAndChange) {
   const bool knowsBirth = (status.stx_mask & STATX_BTIME) && status.stx_btime.tv_sec > 0;
   const auto birth = static_cast<double>(status.stx_btime.tv_sec);
   EXPECT_NEAR(change(5'000'000'000), knowsBirth ? birth : 5e9, 1);
+}
+
+TEST(DiskWaitsTest, WhoeverWaitsForADiskLeavesTheWorkersToOthers) {
+  const TemporaryDirectory root;
+  LinuxFileManager files({root.path(), root.path(), root.path()});
+  LinuxContainerFiles containers;
+  BodyFiles bodies(root / "bodies");
+  ASSERT_FALSE(bodies.makeFolder());
+  const std::string body(1 << 16, 'b');
+  ASSERT_FALSE(bodies.write(1, body));
+  ASSERT_FALSE(containers.createExclusively(root / "file"));
+  const struct {
+    const char* name;
+    std::function<void()> operation;
+  } kCases[] = {
+      {"read", [&] { files.read(root / "file", 1, nullptr); }},
+      {"openForReading", [&] { files.openForReading(root / "file", nullptr); }},
+      {"remove", [&] { files.remove(root / "none"); }},
+      {"list", [&] { containers.list(root.path(), nullptr); }},
+      {"createExclusively", [&] { containers.createExclusively(root / "file"); }},
+      {"openForAppending", [&] { containers.openForAppending(root / "file", nullptr); }},
+      {"cut", [&] { containers.cut(root / "file", 0); }},
+      {"bodies: write", [&] { bodies.write(2, body); }},
+      {"bodies: read", [&] { bodies.read(1, body.size()); }},
+      {"bodies: remove", [&] { bodies.remove(3); }},
+      {"bodies: removeUnless", [&] { bodies.removeUnless([](auto) { return true; }); }},
+  };
+  const LinuxClock clock;
+  LinuxWorkQueues queues(clock, 2);
+  for (const auto& [name, operation] : kCases) {
+    std::atomic<bool> seen = false;
+    const auto deadline = clock.realNow() + 10s;
+    const auto queue = queues.makeSerialQueue("disk");
+    queue->async([&, &work = operation] {
+      while (!seen && clock.realNow() < deadline) work();
+    });
+    while (!seen && clock.realNow() < deadline) seen = queues.workers().blocked > 0;
+    queue->sync([] {});
+    EXPECT_TRUE(seen) << name;
+  }
 }
 
 }  // namespace

@@ -62,6 +62,7 @@ Descriptor openToWrite(const std::string& path, struct stat& status) {
 
 std::optional<std::vector<std::string>> LinuxContainerFiles::list(const std::string& directory,
                                                                   Error* error) {
+  const BlockingScope blocking;
   const std::unique_ptr<DIR, int (*)(DIR*)> listing(::opendir(directory.c_str()), ::closedir);
   std::vector<std::string> names;
   if (listing) errno = 0;
@@ -92,6 +93,7 @@ std::optional<FileAttributes> LinuxContainerFiles::attributes(const std::string&
 }
 
 std::optional<Error> LinuxContainerFiles::createExclusively(const std::string& path) {
+  const BlockingScope blocking;
   constexpr int kFlags = O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC | O_NOFOLLOW;
   const Descriptor file(::open(path.c_str(), kFlags, 0600));
   return file ? std::nullopt : std::optional(posixError(errno));
@@ -99,6 +101,7 @@ std::optional<Error> LinuxContainerFiles::createExclusively(const std::string& p
 
 std::unique_ptr<AppendFile> LinuxContainerFiles::openForAppending(const std::string& path,
                                                                   Error* error) {
+  const BlockingScope blocking;
   struct stat status {};
   auto file = openToWrite(path, status);
   if (file) {
@@ -110,6 +113,7 @@ std::unique_ptr<AppendFile> LinuxContainerFiles::openForAppending(const std::str
 }
 
 std::optional<Error> LinuxContainerFiles::cut(const std::string& path, std::uint64_t length) {
+  const BlockingScope blocking;
   struct stat status {};
   const auto file = openToWrite(path, status);
   const bool done = file && ::ftruncate(file.get(), static_cast<off_t>(length)) == 0;

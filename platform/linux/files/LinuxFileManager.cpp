@@ -92,6 +92,7 @@ std::optional<std::string> LinuxFileManager::read(const std::string& path, std::
     if (error) *error = posixError(number);
     return std::nullopt;
   };
+  const BlockingScope blocking;
   const auto file = openRegularFile(path);
   std::string bytes;
   if (!file) return failed(errno);
@@ -101,6 +102,7 @@ std::optional<std::string> LinuxFileManager::read(const std::string& path, std::
 
 std::unique_ptr<FileHandle> LinuxFileManager::openForReading(const std::string& path,
                                                              Error* error) {
+  const BlockingScope blocking;
   auto file = openRegularFile(path);
   if (file) return std::make_unique<LinuxFileHandle>(std::move(file));
   if (error) *error = posixError(errno);
@@ -128,6 +130,7 @@ std::optional<Error> LinuxFileManager::setPermissions(const std::string& path, u
 }
 
 std::optional<Error> LinuxFileManager::remove(const std::string& path) {
+  const BlockingScope blocking;
   return ::unlink(path.c_str()) == 0 ? std::nullopt : lastPosixError();
 }
 

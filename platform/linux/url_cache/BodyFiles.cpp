@@ -12,6 +12,8 @@
 #include <string_view>
 #include <vector>
 
+#include "platform/linux/queues/BlockingScope.h"
+
 namespace zelkord {
 namespace {
 
@@ -55,6 +57,7 @@ std::optional<Error> BodyFiles::makeFolder() {
 }
 
 std::optional<Error> BodyFiles::write(std::int64_t id, std::string_view bytes) {
+  const BlockingScope blocking;
   const auto name = bodyFileName(id);
   constexpr int kFlags = O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC;
   Descriptor file(::openat(open_.get(), name.c_str(), kFlags, 0600));
@@ -69,6 +72,7 @@ std::optional<Error> BodyFiles::write(std::int64_t id, std::string_view bytes) {
 }
 
 std::optional<Data> BodyFiles::read(std::int64_t id, std::uint64_t size) {
+  const BlockingScope blocking;
   if (!open_) open_ = _openFolder();
   // O_NONBLOCK: a pipe that somebody put there must not wait for a writer.
   constexpr int kFlags = O_RDONLY | O_NOFOLLOW | O_CLOEXEC | O_NONBLOCK;
@@ -82,9 +86,13 @@ std::optional<Data> BodyFiles::read(std::int64_t id, std::uint64_t size) {
   return Data(std::move(bytes));
 }
 
-void BodyFiles::remove(std::int64_t id) { ::unlinkat(open_.get(), bodyFileName(id).c_str(), 0); }
+void BodyFiles::remove(std::int64_t id) {
+  const BlockingScope blocking;
+  ::unlinkat(open_.get(), bodyFileName(id).c_str(), 0);
+}
 
 void BodyFiles::removeUnless(FunctionRef<bool(std::int64_t id)> isKnown) {
+  const BlockingScope blocking;
   const auto folder = _openFolder();
   const std::unique_ptr<DIR, int (*)(DIR*)> listing(
       ::fdopendir(::fcntl(folder.get(), F_DUPFD_CLOEXEC, 0)), ::closedir);
