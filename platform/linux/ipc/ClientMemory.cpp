@@ -47,6 +47,8 @@ void ClientMemory::grew(const Process& process) {
   while (isTooLarge() && _cutOffLargestOf(process)) {
   }
   if (*held_ > size_.inAll) _makeRoom(0);
+  while (*held_ > _mostWithRemains() && _cutOffMostMessages()) {
+  }
 }
 
 bool ClientMemory::_mayHold(const Process& process, std::size_t bytes) const {
@@ -94,12 +96,23 @@ bool ClientMemory::_cutOffLargestOf(const Process& process) {
     if (&holder->calls()->process() != &process) continue;
     if (!largest || bytesOf(*holder) > bytesOf(*largest)) largest = holder;
   }
-  if (!largest) return false;
-  reports_.refused("client_memory", processHolder(process.pid()));
-  std::erase_if(cutOff_, [](const auto& weak) { return weak.expired(); });
-  cutOff_.push_back(largest->calls());
-  largest->cutOffForMemory();
+  if (largest) _cutOff(*largest);
+  return largest != nullptr;
+}
+
+bool ClientMemory::_cutOffMostMessages() {
+  const auto most = std::ranges::max_element(
+      holders_, {}, [](const Holder* holder) { return holder->messageBytes(); });
+  if (most == holders_.end() || (*most)->messageBytes() == 0) return false;
+  _cutOff(**most);
   return true;
+}
+
+void ClientMemory::_cutOff(Holder& holder) {
+  reports_.refused("client_memory", processHolder(holder.calls()->process().pid()));
+  std::erase_if(cutOff_, [](const auto& weak) { return weak.expired(); });
+  cutOff_.push_back(holder.calls());
+  holder.cutOffForMemory();
 }
 
 }  // namespace zelkord::ipc

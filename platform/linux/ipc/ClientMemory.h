@@ -22,6 +22,10 @@ class CallFlow;
 // largest connection of the largest process. A process's largest message does not count for its
 // own limit: an answer may be larger than that.
 //
+// The calls of a connection that was cut off hold their memory until their handlers let go. Nobody
+// else is cut off for that, unless it comes to more than a quarter beyond the limit: then those
+// with the largest messages are.
+//
 // Threading: `held` and what is said of a process on any thread, the rest on the loop.
 // Ownership: shared with everything that counts; the reports outlive it.
 class ClientMemory final {
@@ -90,6 +94,10 @@ class ClientMemory final {
   const Process* _largestProcess() const;
   // False: it has no connection.
   bool _cutOffLargestOf(const Process& process);
+  // False: nobody holds any.
+  bool _cutOffMostMessages();
+  void _cutOff(Holder& holder);
+  std::size_t _mostWithRemains() const { return size_.inAll + size_.inAll / 4; }
 
   const Size size_;
   LimitReports& reports_;

@@ -1,6 +1,8 @@
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <map>
+#include <memory>
 #include <optional>
 #include <utility>
 #include <vector>
@@ -166,6 +168,27 @@ TEST_F(ClientMemoryTest, WhatIsLeftOfAConnectionThatWasCutOffCostsNobodyElseThei
   kept.reset();
   EXPECT_TRUE(fourth.calls()->take(10'000));
   EXPECT_EQ(memory_->held(), 320'000u);
+}
+
+TEST_F(ClientMemoryTest, WhatIsLeftOfConnectionsThatWereCutOffIsBoundedToo) {
+  std::vector<std::unique_ptr<TestHolder>> small, large;
+  std::vector<std::optional<CallFlow::Share>> kept;
+  for (const pid_t pid : {1, 2, 3}) {
+    TestHolder cutOff(memory_, pid);
+    kept.push_back(cutOff.calls()->take(90'000));
+    cutOff.hold(10'000);
+    small.push_back(std::make_unique<TestHolder>(memory_, pid));
+    small.back()->hold(10'000);
+    EXPECT_TRUE(cutOff.isCutOff());
+  }
+  for (const pid_t pid : {4, 5, 6, 7, 8}) {
+    large.push_back(std::make_unique<TestHolder>(memory_, pid));
+    large.back()->hold(40'000);
+    EXPECT_LE(memory_->held(), 500'000u);
+  }
+  const auto isCutOff = [](const auto& holder) { return holder->isCutOff(); };
+  EXPECT_EQ(std::ranges::count_if(large, isCutOff), 1);
+  EXPECT_EQ(std::ranges::count_if(small, isCutOff), 0);
 }
 
 TEST_F(ClientMemoryTest, CallsThatDoNotFitAreRefused) {
