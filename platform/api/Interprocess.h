@@ -172,7 +172,7 @@ struct ListenerConfiguration {
   // Gets bus callers' calls of the other interfaces while they have no connection. May be null.
   std::shared_ptr<CallHandler> sharedHandler;
   Limits limits;
-  // The delegate's admission says how many connections there are; they count in no budget.
+  // The delegate's admission says how many connections there are; those count in no budget then.
   bool delegateBoundsConnections = false;
 };
 

@@ -6,8 +6,10 @@
 #include <vector>
 
 #include "platform/linux/LinuxPlatform.h"
+#include "platform/linux/ipc/ConnectionBudgets.h"
 #include "platform/linux/log/JournalLog.h"
 #include "platform/linux/queues/LinuxWorkQueues.h"
+#include "platform/linux/url/TransferLimits.h"
 #include "platform/testing/TemporaryDirectory.h"
 
 namespace zelkord {
@@ -145,6 +147,18 @@ TEST_F(LinuxPlatformTest, ARefusedWaitIsCountedAndNamed) {
   waiters.clear();
   EXPECT_EQ(refused(), 1);
   EXPECT_THAT(root_.read("log"), HasSubstr("waits"));
+}
+
+TEST(DescriptorsTest, WhatDoorsAndTransfersMayTakeTogetherFits) {
+  constexpr std::uint64_t kEverythingElse = 128;
+  for (const std::uint64_t descriptors : {1024u, 4096u, 65'536u}) {
+    const auto doors = ipc::ConnectionBudgets::sizeFor(descriptors);
+    const auto transfers = TransferLimits::of(descriptors);
+    const auto idle = 2 * static_cast<std::uint64_t>(transfers.idleConnections);
+    EXPECT_LE(doors.connections + doors.unadmitted + transfers.transfers.inAll * 4 + idle +
+                  kEverythingElse,
+              descriptors);
+  }
 }
 
 }  // namespace

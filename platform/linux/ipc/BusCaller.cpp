@@ -126,6 +126,7 @@ Receiver BusCaller::_beginConnection() {
   connection_ = _makeSession();
   connection_.share = *std::move(share);
   connection_.holding = context_.memory->add(*this);
+  connection_.open = context_.connections->holdOpen(peer_.pid, [this] { _invalidateConnection(); });
   ++context_.counts->connections;
   door_.port().announce(connection_.connection);
   return {connection_.connection, {}};
@@ -137,7 +138,7 @@ BusCaller::Session BusCaller::_makeSession() {
       [this](MessagePtr message, std::size_t bytes) { door_.send(std::move(message), bytes); },
       [this] { _invalidateConnection(); });
   auto connection = std::make_shared<ServedConnection>(context_, peer_, outlet);
-  return {std::move(outlet), std::move(connection), {}, {}};
+  return {std::move(outlet), std::move(connection), {}, {}, {}};
 }
 
 void BusCaller::_invalidateConnection() {

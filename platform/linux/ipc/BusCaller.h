@@ -53,6 +53,7 @@ class BusCaller final : public Caller, public ClientMemory::Holder {
     std::shared_ptr<ServedConnection> connection;
     Budget::Share share;
     Subscription holding;
+    Subscription open;
   };
   // A call while the driver is asked.
   struct Waiting {

@@ -20,7 +20,8 @@ class ConnectionBudgetsTest : public testing::Test {
  protected:
   struct Socket {
     Budget::Share share;
-    Subscription waiting;
+    Subscription waiting;  // then: open
+    pid_t pid = 0;
   };
   // Accepts a socket of that process; false when there is no place.
   bool accept(pid_t pid) {
@@ -29,14 +30,18 @@ class ConnectionBudgetsTest : public testing::Test {
     const int number = ++last_;
     auto& socket = sockets_[number];
     socket.share = *std::move(share);
-    socket.waiting = budgets_.awaitAuthentication(pid, [this, number] {
-      left_.push_back(number);
-      sockets_.erase(number);
-    });
+    socket.waiting = budgets_.awaitAuthentication(pid, [this, number] { leave(number); });
+    socket.pid = pid;
     return true;
   }
   void authenticateAll() {
-    for (auto& [number, socket] : sockets_) socket.waiting.reset();
+    for (auto& [number, socket] : sockets_) {
+      socket.waiting = budgets_.holdOpen(socket.pid, [this, number = number] { leave(number); });
+    }
+  }
+  void leave(int number) {
+    left_.push_back(number);
+    sockets_.erase(number);
   }
   std::vector<int> left() { return std::exchange(left_, {}); }
 
@@ -84,6 +89,31 @@ TEST_F(ConnectionBudgetsTest, WhenEveryPlaceIsTakenAnUnauthenticatedOneGoes) {
   EXPECT_EQ(left().size(), 1u);
   authenticateAll();
   EXPECT_FALSE(accept(8));
+}
+
+TEST_F(ConnectionBudgetsTest, WhoHasItsShareMakesRoomForItsNextByItself) {
+  for (const pid_t pid : {1, 1, 2, 2, 3, 3, 4, 4, 1, 1}) {
+    EXPECT_TRUE(accept(pid));
+    authenticateAll();
+  }
+  for (const pid_t pid : {2, 2, 3, 3, 4, 4}) EXPECT_TRUE(accept(pid));
+  EXPECT_FALSE(accept(1));  // it has nothing but open ones
+  EXPECT_TRUE(left().empty());
+  EXPECT_TRUE(accept(4));
+  EXPECT_TRUE(accept(5));
+  EXPECT_EQ(left(), (std::vector<int>{15, 11})) << "its own; among equals, the oldest";
+}
+
+TEST_F(ConnectionBudgetsTest, WhoKeptMoreThanItsShareMakesRoomForNewcomers) {
+  for (int i = 0; i < 8; ++i) EXPECT_TRUE(accept(1));
+  authenticateAll();
+  for (const pid_t pid : {2, 2, 2, 2, 3, 3, 3, 3}) EXPECT_TRUE(accept(pid));
+  authenticateAll();
+  for (const pid_t pid : {4, 4, 5, 5}) EXPECT_TRUE(accept(pid));
+  EXPECT_EQ(left(), (std::vector<int>{8, 7, 6, 5})) << "its newest, down to its share";
+  authenticateAll();
+  EXPECT_FALSE(accept(6));
+  EXPECT_TRUE(left().empty());
 }
 
 // A connection that holds what a test says.

@@ -262,6 +262,12 @@ TEST(ConnectionLimitTest, TwoHundredOfOneProcessFitAndTheNextButFewAreRefusedOnE
   const auto endpoint = server.interprocess->makeAnonymousListener(configuration, server.delegate);
   IpcTestClient bounded(endpoint->address(), false);
   EXPECT_EQ(bounded.call(kTestInterface, "Echo", "s", ""), "");
+  server.delegate->onAdmit = [](const Peer&, const IpcTestDelegate::Decide&) {};
+  const auto path = endpoint->address().substr(endpoint->address().find('/'));
+  std::vector<std::unique_ptr<IpcRawClient>> waiting;
+  for (int i = 0; i < 32; ++i) waiting.push_back(std::make_unique<IpcRawClient>(path));
+  EXPECT_EQ(IpcRawClient(path).readToEnd(), "") << "too many wait for their admission";
+  EXPECT_EQ(server.counters.value("com.quenta.zelkord.limit.unadmitted_connections"), 1);
   EXPECT_GE(server.counters.value("com.quenta.zelkord.limit.connections"), 3);
   for (int i = 0; i < 6; ++i) clients.pop_back();
   EXPECT_TRUE(eventually([&] { return onBus.call(kTestInterface, "Echo", "s", "").empty(); }));

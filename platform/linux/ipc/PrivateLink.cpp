@@ -42,6 +42,10 @@ void PrivateLink::start() {
   filter_.reset(slot);
   connection_ = std::make_shared<ServedConnection>(context_, peer_, weak_from_this());
   holding_ = context_.memory->add(*this);
+  if (admission_.share) {
+    open_ = context_.connections->holdOpen(
+        peer_.pid, [this] { cutOff("its process has more than its share, and others none"); });
+  }
   ++context_.counts->connections;
   watch_ = context_.loop.watch(sd_bus_get_fd(bus_.get()), kLinkEvents,
                                [weak = weak_from_this()](std::uint32_t events) {
@@ -56,6 +60,7 @@ void PrivateLink::end() {
   if (std::exchange(ended_, true)) return;
   watch_.reset();
   holding_.reset();
+  open_.reset();
   _accountMemory(0, 0);
   --context_.counts->connections;
   connection_->end();

@@ -84,6 +84,7 @@ class PrivateLink final : public Outlet,
   std::shared_ptr<ServedConnection> connection_;
   Admission admission_;
   Subscription holding_;
+  Subscription open_;
   Subscription watch_;
   MessageGate gate_;
   bool ended_ = false;

@@ -103,14 +103,15 @@ bool PrivateListener::_consider(OwnedFd socket, Peer peer) {
     return false;
   }
   Guest guest{std::move(socket), peer, std::chrono::steady_clock::now(), {}, {}, nullptr};
-  if (!dispatcher_.configuration().delegateBoundsConnections) {
-    auto share = context_.connections->take(peer.pid);
-    if (!share) return false;
-    guest.admission.share = *std::move(share);
-  }
+  const bool delegateBounds = dispatcher_.configuration().delegateBoundsConnections;
+  auto& budgets = *context_.connections;
+  auto share = delegateBounds ? budgets.takeUnadmitted(peer.pid) : budgets.take(peer.pid);
+  if (!share) return false;
+  guest.admission.share = *std::move(share);
   const auto key = ++lastGuest_;
-  guest.waiting =
-      context_.connections->awaitAuthentication(peer.pid, [this, key] { _dismiss(key); });
+  if (!delegateBounds) {
+    guest.waiting = budgets.awaitAuthentication(peer.pid, [this, key] { _dismiss(key); });
+  }
   guests_.emplace(key, std::move(guest));
   _askAdmission(key, peer);
   return true;
@@ -135,6 +136,7 @@ void PrivateListener::_admitted(std::uint64_t key, std::optional<Subscription> p
   if (!place) return _dismiss(key);
   auto& guest = found->second;
   guest.admission.place = *std::move(place);
+  if (dispatcher_.configuration().delegateBoundsConnections) guest.admission.share.reset();
   guest.handshake = std::make_unique<Handshake>(context_.loop, std::move(guest.socket),
                                                 Authenticator(guest.peer.uid, serverId_),
                                                 [weak = weak_from_this(), key](bool succeeded) {

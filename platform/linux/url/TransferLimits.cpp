@@ -9,7 +9,8 @@ namespace {
 
 constexpr std::uint64_t kLeastTransfers = 16;
 constexpr std::uint64_t kMostTransfers = 1024;
-constexpr std::uint64_t kDescriptorsPerTransfer = 8;  // twice what it takes at worst
+// Four times what it takes at worst: the doors have half of the descriptors, and files a part.
+constexpr std::uint64_t kDescriptorsPerTransfer = 16;
 constexpr std::uint64_t kMostWaiting = 16'384;
 constexpr std::uint64_t kLeastIdle = 8;
 constexpr std::uint64_t kMostIdle = 32;
