@@ -161,13 +161,16 @@ void ZelkorBagController::_install(const BagPointer& bag, BagOrigin origin) {
 }
 
 std::shared_ptr<const json::object> ZelkorBagController::cacheBagDictionary(
-    json::object dictionary) {
-  auto cached = std::make_shared<const json::object>(_dictionaryToCacheBag(std::move(dictionary)));
-  disk_.write(*cached);
+    json::object dictionary, const std::string* fetchedUnder) {
+  const auto url = cacheURL_.get(*this, userAgent_);
+  auto cached =
+      std::make_shared<const json::object>(_dictionaryToCacheBag(std::move(dictionary), *url));
+  if (!fetchedUnder || *fetchedUnder == *url) disk_.write(*cached);
   return cached;
 }
 
-json::object ZelkorBagController::_dictionaryToCacheBag(json::object dictionary) {
+json::object ZelkorBagController::_dictionaryToCacheBag(json::object dictionary,
+                                                        const std::string& url) {
   // The service cannot switch its own replacement off for ever.
   if (const auto* disabled = dictionary.find(kBagRefreshDisabledKey);
       disabled != dictionary.end()) {
@@ -175,7 +178,7 @@ json::object ZelkorBagController::_dictionaryToCacheBag(json::object dictionary)
   }
   const auto now = assembly_.platform().clock.wallNow();
   dictionary[kBagExpirationKey] = secondsSince1970(now) + secondsOf(kBagLifetime);
-  dictionary[kBagURLKey] = *cacheURL_.get(*this, userAgent_);
+  dictionary[kBagURLKey] = url;
   return dictionary;
 }
 
@@ -274,8 +277,8 @@ void ZelkorBagController::_finishFetch(Fetch& fetch, const URLTask& task, const 
                       assembly_.log(Category::Bag), assembly_.platform().log.showsPrivateData());
   BagPointer bag;
   if (response.dictionary) {
-    bag = std::make_shared<const ZLKBag>(cacheBagDictionary(std::move(*response.dictionary)),
-                                         userAgent_);
+    bag = std::make_shared<const ZLKBag>(
+        cacheBagDictionary(std::move(*response.dictionary), fetch.cacheURL.get()), userAgent_);
     cacheBagState(bag, BagOrigin::Network);
     assembly_.reporter().addValue(1, "com.quenta.zelkord.bag.fetches");
   } else {

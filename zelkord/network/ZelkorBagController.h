@@ -70,8 +70,11 @@ class ZelkorBagController final : public std::enable_shared_from_this<ZelkorBagC
 
   // Null is ignored. A bag from disk never replaces one that is installed.
   void cacheBagState(BagPointer bag, BagOrigin origin);
-  // Adds the daemon's keys, writes the file, returns what it wrote.
-  std::shared_ptr<const json::object> cacheBagDictionary(json::object dictionary);
+  // Adds the daemon's keys, writes the file, returns what it wrote. What was fetched under another
+  // URL than the present one (`fetchedUnder`; null: the present one) is not written: the next start
+  // would take it for this one's.
+  std::shared_ptr<const json::object> cacheBagDictionary(json::object dictionary,
+                                                         const std::string* fetchedUnder = nullptr);
   // The file's content, null when there is none; begins a fetch when it is due.
   std::shared_ptr<const json::object> diskCachedBagDictionary();
 
@@ -81,7 +84,7 @@ class ZelkorBagController final : public std::enable_shared_from_this<ZelkorBagC
 
   bool _isRefreshRequiredForCachedBag(const json::object* dictionary);
   std::optional<WallTime> _nextAttempt();
-  json::object _dictionaryToCacheBag(json::object dictionary);
+  json::object _dictionaryToCacheBag(json::object dictionary, const std::string& url);
   void _handleRefreshNotification();
   void _fetchBagStateWithVersion(const std::optional<std::string>& version);
   void _fetchBagStateWithVersion(const std::optional<std::string>& version, FetchCallback callback);

@@ -203,12 +203,17 @@ TEST_F(ZelkorBagControllerTest, AFetchWhoseURLChangesMeanwhileIsFollowedByAnothe
   EXPECT_EQ(readVersion(), "chinese");
   EXPECT_EQ(fetchesUnderWay(), 0u);
 
-  // When that one fails, the bag of the other country does not pass for this one's.
+  // When that one fails, the bag of the other country does not pass for this one's, nor does it
+  // after a restart.
   move("DE");
   move("CN");
   reply(200, R"({"version": "global"})");
   reply(500, "");
   EXPECT_EQ(fetchesUnderWay(), 0u);
+  EXPECT_EQ((*platform_.propertyLists.decode(*platform_.files.bytes(kPath), nullptr))
+                .as_object()
+                .at("version"),
+            "chinese");
   EXPECT_EQ(readVersion(), "global");
   reply(200, R"({"version": "chinese"})");
   EXPECT_EQ(readVersion(), "chinese");
