@@ -95,7 +95,7 @@ URLRequest ImageFetcher::_requestFor(const std::string& url, Duration timeout,
 ImageFetcher::Image ImageFetcher::_cachedImage(const URLRequest& request) {
   auto* cache = assembly_.urlSession().cache();
   auto cached = cache ? cache->lookup(request) : std::nullopt;
-  // Ordinary tasks keep other answers there too.
+  // Only images are kept by hand, and only a whole answer is one.
   if (!cached || cached->response.status != kOK) return std::nullopt;
   return std::move(cached->data);
 }
