@@ -7,6 +7,7 @@
 #include "platform/api/Platform.h"
 #include "zelkord/ZelkorLogging/Tracing.h"
 #include "zelkord/ZelkorLogging/ZelkorLogging.h"
+#include "zelkord/assembly/MapsSessions.h"
 #include "zelkord/assembly/ServiceSessions.h"
 #include "zelkord/assembly/ZelkorDiagnosticDataReporter.h"
 
@@ -41,7 +42,8 @@ class Assembly final {
         tracing_(ZLKTracingSetup(platform.settings, platform.trace, logging_.defaultLog())),
         reporter_(platform.counters),
         limits_(platform.clock, platform.counters, logging_[Category::Zelkor]),
-        sessions_(platform.urlSessions, platform.settings) {}
+        sessions_(platform.urlSessions, platform.settings),
+        mapsSessions_(platform.maps) {}
 
   Platform& platform() const { return platform_; }
   SettingsStore& userDefaults() const { return platform_.settings; }
@@ -55,7 +57,12 @@ class Assembly final {
 
   URLSession& urlSession() { return sessions_.urlSession(); }
   URLSession& bagSession() { return sessions_.bagSession(); }
-  void endIdentity(const std::string& identity) { sessions_.endIdentity(identity); }
+  MapsSessions& mapsSessions() const { return mapsSessions_; }
+  // Nothing that the service saw under a user identifier is used any more.
+  void endIdentity(const UUID& identifier) {
+    mapsSessions_.endIdentity(identifier);
+    sessions_.endIdentity(identifier.string());
+  }
 
   ZLKNetworkRequestFactory* requestFactory() const { return requestFactory_.get(); }
   ImageFetcher* imageFetcher() const { return imageFetcher_.get(); }
@@ -149,6 +156,7 @@ class Assembly final {
   const ZelkorDiagnosticDataReporter reporter_;
   LimitReports limits_;
   ServiceSessions sessions_;
+  mutable MapsSessions mapsSessions_;
   // In the order in which they are made; released in the reverse one.
   Slot<SessionStorage> persistentStorage_;
   Slot<FeedbackStreams> flusherXPCListener_;

@@ -1,9 +1,12 @@
 #include <gmock/gmock.h>
 
+#include <map>
+
 #include "zelkord/assembly/NotificationNames.h"
 #include "zelkord/network/ContextUpdater.h"
 #include "zelkord/network/RequestFactoryTestSupport.h"
 #include "zelkord/network/VisibilityRestrictions.h"
+#include "zelkord/network/ZelkorUserGUIDController.h"
 
 namespace zelkord {
 namespace {
@@ -212,6 +215,73 @@ TEST_F(ContextUpdaterTest, TheMapsSessionRotatesWithTheUserIdentifier) {
   EXPECT_EQ(headerOf("search", "X-Quenta-GeoSession"), "session-1");
   EXPECT_EQ(world_.factory().getMapsUserSessionEntityAndReset(false)->sessionEntityString(),
             "session-1");
+}
+
+// The session that a search under the identifier carries.
+class MapsSessionTest : public ContextUpdaterTest {
+ protected:
+  MapsSessionTest() { world_.start(); }
+  std::string sessionUnder(const UUID& identifier) {
+    world_.userGuid = identifier;
+    return headerOf("search", "X-Quenta-GeoSession");
+  }
+  std::string toldUnder(const UUID& identifier) {
+    const auto session = world_.factory().getMapsUserSessionEntityAndReset(false, identifier);
+    return session->sessionEntityString().value_or("");
+  }
+  void announce() { world_.fake.timeline.runUntilIdle(); }
+
+  ZelkorUserGUIDController guids_{world_.assembly};
+};
+
+TEST_F(MapsSessionTest, BelongsToOneIdentifierAlsoBeforeAChangeIsAnnounced) {
+  const auto first = guids_.currentUserGUID();
+  EXPECT_EQ(sessionUnder(first), "session-0");
+  world_.fake.timeline.advance(900s);
+  const auto second = guids_.currentUserGUID();
+  EXPECT_EQ(sessionUnder(second), "session-1");
+  EXPECT_EQ(sessionUnder(first), "session-0");
+  EXPECT_EQ(toldUnder(first), "session-0");
+  announce();
+  EXPECT_EQ(sessionUnder(second), "session-1");
+  EXPECT_EQ(toldUnder(first), "session-1");
+  EXPECT_EQ(world_.fake.maps.resets, 1) << "once a change";
+
+  guids_.reset();
+  announce();
+  EXPECT_EQ(world_.fake.maps.resets, 2);
+  EXPECT_EQ(sessionUnder(first), "") << "it has ended";
+  EXPECT_EQ(sessionUnder(second), "") << "it was held while another thread began a new one";
+  EXPECT_EQ(sessionUnder(guids_.currentUserGUID()), "session-2");
+  EXPECT_EQ(world_.fake.maps.resets, 2);
+}
+
+TEST_F(MapsSessionTest, IdentifiersOfSeveralClientsKeepTheirOwn) {
+  ZelkorUserGUIDController others(world_.assembly);
+  const auto mine = guids_.currentUserGUID();
+  const auto another = others.currentUserGUID();
+  for (int i = 0; i < 2; ++i) {
+    EXPECT_EQ(sessionUnder(mine), "session-0");
+    EXPECT_EQ(sessionUnder(another), "session-1");
+    EXPECT_EQ(toldUnder(mine), "session-0");
+  }
+  guids_.reset();
+  announce();
+  EXPECT_EQ(sessionUnder(another), "session-1") << "only the other one has changed";
+  EXPECT_EQ(sessionUnder(guids_.currentUserGUID()), "session-2");
+  world_.fake.maps.session = "given";
+  EXPECT_EQ(sessionUnder(guids_.currentUserGUID()), "given") << "as the device says";
+}
+
+TEST_F(MapsSessionTest, IsNeverSharedByHoweverManyIdentifiers) {
+  std::map<std::string, UUID> holders;
+  for (int round = 0; round < 2; ++round) {
+    for (std::uint8_t i = 0; i < 150; ++i) {
+      for (const UUID& user : {UUID{{1, i}}, UUID{{2, i}}}) {
+        EXPECT_EQ(holders.try_emplace(sessionUnder(user), user).first->second, user);
+      }
+    }
+  }
 }
 
 TEST_F(ContextUpdaterTest, AMapsSessionWithoutIdentifierIsLogged) {

@@ -118,10 +118,10 @@ std::string geoMetadata(const RequestInputs&, const RequestContext& c) {
   return c.mapsClientMetadata;
 }
 
-// Maps keeps its session and environment itself; it answers from memory.
+// Maps keeps its sessions and its environment itself; it answers from memory.
 
 std::string geoSession(const RequestInputs& inputs, const RequestContext&) {
-  const auto session = inputs.assembly.platform().maps.userSession(false);
+  const auto session = inputs.assembly.mapsSessions().ofRequest(inputs.userGuid);
   if (!session) return {};
   if (!*session) {
     inputs.assembly.log(Category::Request)

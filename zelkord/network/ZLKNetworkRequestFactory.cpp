@@ -50,7 +50,7 @@ void ZLKNetworkRequestFactory::start() {
   bagFollower_->start();
   guidObserver_ = assembly_.notificationCenter().observe(
       std::string(kZLKUserGUIDChangeNotification),
-      [&assembly = assembly_](const Notification&) { assembly.platform().maps.userSession(true); });
+      [&assembly = assembly_](const Notification&) { assembly.mapsSessions().identityChanged(); });
 }
 
 std::optional<URLRequest> ZLKNetworkRequestFactory::searchRequest(
@@ -227,8 +227,9 @@ void ZLKNetworkRequestFactory::didUpdateStorefrontIdentifier(
 }
 
 std::optional<MapsUserSession> ZLKNetworkRequestFactory::getMapsUserSessionEntityAndReset(
-    bool reset) const {
-  auto identifier = assembly_.platform().maps.userSession(reset);
+    bool reset, const std::optional<UUID>& userGuid) const {
+  auto identifier = reset ? assembly_.platform().maps.userSession(true)
+                          : assembly_.mapsSessions().ofReply(userGuid);
   if (!identifier) return std::nullopt;
   return MapsUserSession{std::move(*identifier)};
 }

@@ -83,8 +83,10 @@ class ZLKNetworkRequestFactory final : public BagRequests, public SubscriptionDe
   void didUpdateSubscriptionDictionaries(json::array subscriptions) override;
   void didUpdateStorefrontIdentifier(std::optional<std::string> identifier) override;
 
-  // The session shared with maps, a new one after a reset; none when maps has no session.
-  std::optional<MapsUserSession> getMapsUserSessionEntityAndReset(bool reset) const;
+  // The session shared with maps, a new one after a reset; none when maps has no session. With an
+  // identifier and no reset, the one that its requests carry.
+  std::optional<MapsUserSession> getMapsUserSessionEntityAndReset(
+      bool reset, const std::optional<UUID>& userGuid = std::nullopt) const;
   // The user has searched: downloads tell the precise location from now on.
   void setPerformedSearch();
 

@@ -19,9 +19,7 @@ ZelkorUserGUIDController::ZelkorUserGUIDController(Assembly& assembly)
       lastKnownUserGUID_(randomUUID(assembly.platform().random)),
       lastKnownUserGUIDExpirationDate_(assembly.platform().clock.now() + kUserGUIDLifetime) {}
 
-ZelkorUserGUIDController::~ZelkorUserGUIDController() {
-  assembly_.endIdentity(lastKnownUserGUID_.string());
-}
+ZelkorUserGUIDController::~ZelkorUserGUIDController() { assembly_.endIdentity(lastKnownUserGUID_); }
 
 UUID ZelkorUserGUIDController::currentUserGUID() {
   UUID current;
@@ -42,7 +40,7 @@ void ZelkorUserGUIDController::_rollGUID() {
   const auto ended = std::exchange(lastKnownUserGUID_, randomUUID(assembly_.platform().random));
   lastKnownUserGUIDExpirationDate_ = assembly_.platform().clock.now() + kUserGUIDLifetime;
   queue_->async([&assembly = assembly_, ended] {
-    assembly.endIdentity(ended.string());
+    assembly.endIdentity(ended);
     assembly.reporter().addValue(1, "com.quenta.zelkord.userguid");
     assembly.notificationCenter().post(std::string(kZLKUserGUIDChangeNotification));
   });

@@ -14,7 +14,7 @@ class Assembly;
 // only, replaced at its first use 900 s or more after it was made, or by `reset`. Each replacement
 // counts "com.quenta.zelkord.userguid" and posts "ZLKUserGUIDChangeNotification"; the first
 // identifier does neither. An identifier that is replaced, or whose controller goes, ends with the
-// URL sessions: no connection and no cached answer joins it to another.
+// URL sessions and with maps: no connection, no cached answer and no session joins it to another.
 //
 // Threading: any thread but observers of that notification, which run on this controller's queue.
 // Age is steady time: the wall clock may jump.

@@ -34,14 +34,14 @@ void QueryFlow::start() {
 void QueryFlow::_send() {
   _logDispatch();
   const auto bag = state_->currentBag();
-  const auto guid = state_->guidController().currentUserGUID();
-  auto request = _makeRequest(bag.get(), guid);
+  userGuid_ = state_->guidController().currentUserGUID();
+  auto request = _makeRequest(bag.get(), userGuid_);
   if (!request) return _reply(std::nullopt, zelkorError(kBagFault, "no URL"));
   httpRequest_ = *std::move(request);
   // What people type goes before what they follow up.
   if (traits_.transport != QueryTransport::Plain) httpRequest_.priority = TransferPriority::Low;
   _logRequest();
-  state_->record(_makeStart(httpRequest_), *request_, guid);
+  state_->record(_makeStart(httpRequest_), *request_, userGuid_);
   const auto task = _makeTask(bag.get());
   if (traits_.routing == QueryRouting::ThroughProxy) useRoutingProxy(assembly_, *task);
   task->resume();
@@ -123,7 +123,8 @@ ZLKReply QueryFlow::_makeReply(Data data) const {
   ZLKReply reply;
   reply.scale = request_->scale;
   reply.data = std::move(data);
-  const auto session = assembly_.requestFactory()->getMapsUserSessionEntityAndReset(false);
+  const auto session =
+      assembly_.requestFactory()->getMapsUserSessionEntityAndReset(false, userGuid_);
   if (session) reply.geoSessionEntityString = session->sessionEntityString();
   return reply;
 }

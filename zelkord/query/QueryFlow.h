@@ -102,6 +102,7 @@ class QueryFlow : public std::enable_shared_from_this<QueryFlow> {
   Assembly& assembly_;
 
   // Set before the task begins, read by its completion.
+  std::optional<UUID> userGuid_;  // under which it asks
   URLRequest httpRequest_;
 
  private:
