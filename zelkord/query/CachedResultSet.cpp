@@ -22,13 +22,15 @@ std::uint32_t lengthOf(const std::string& text) {
 }  // namespace
 
 FetchedResponse::FetchedResponse(std::string_view typed, const URLRequest& request,
-                                 std::string identifier, Data body, SteadyTime now)
+                                 std::string identifier, Data body, SteadyTime now,
+                                 const UUID& user)
     : input(lowercased(typed)),
       inputLength(lengthOf(input)),
       uiScale(scaleOf(request)),
       uuid(std::move(identifier)),
       data(std::move(body)),
-      arrival(now) {}
+      arrival(now),
+      userGuid(user) {}
 
 CachedResultSet::CachedResultSet(std::shared_ptr<const FetchedResponse> response,
                                  const json::object& resultSet)

@@ -9,6 +9,7 @@
 #include "base/Data.h"
 #include "base/Json.h"
 #include "base/Time.h"
+#include "base/UUID.h"
 #include "platform/api/URLRequest.h"
 
 namespace zelkord {
@@ -16,9 +17,10 @@ namespace zelkord {
 // What the result sets of one response share. Immutable.
 struct FetchedResponse {
   // `typed` is the text typed when the response was fetched, `request` the one that fetched it,
-  // `uuid` the query's identifier, `body` the whole response's, `now` when it arrived.
+  // `uuid` the query's identifier, `body` the whole response's, `now` when it arrived, `userGuid`
+  // the user identifier of the request.
   FetchedResponse(std::string_view typed, const URLRequest& request, std::string uuid, Data body,
-                  SteadyTime now);
+                  SteadyTime now, const UUID& userGuid = {});
 
   const std::string input;          // lower-cased
   const std::uint32_t inputLength;  // UTF-16 units
@@ -26,6 +28,7 @@ struct FetchedResponse {
   const std::string uuid;
   const Data data;
   const SteadyTime arrival;
+  const UUID userGuid;
 };
 
 // One result set of a search response, as the query cache keeps it. Immutable; reference-counted by
@@ -46,6 +49,7 @@ class CachedResultSet final : public boost::intrusive_ref_counter<CachedResultSe
   bool hasExpired(SteadyTime now) const { return expireTime_ <= now; }
   const std::string& uuid() const { return response_->uuid; }
   double uiScale() const { return uiScale_; }  // of the request; 0 when it named none
+  const UUID& userGuid() const { return response_->userGuid; }
   const Data& data() const { return response_->data; }
   std::uint64_t cost() const { return data().size(); }  // bytes
 

@@ -23,13 +23,14 @@ constexpr std::string_view kClearingNotifications[] = {kZLKUserGUIDChangeNotific
 // The shortest completions among the entries of one walk, in its order.
 class ShortestCompletions {
  public:
-  ShortestCompletions(std::size_t textLength, double scale)
-      : textLength_(textLength), scale_(scale) {}
+  ShortestCompletions(std::size_t textLength, double scale, const UUID& userGuid)
+      : textLength_(textLength), scale_(scale), userGuid_(userGuid) {}
 
   void consider(const CachedResultSet& entry) {
     if (entry.queryLength() > shortest_) return;
     if (scale_ > 0 && scale_ != entry.uiScale()) return;
     if (textLength_ < entry.inputLength()) return;
+    if (userGuid_ != entry.userGuid()) return;
     if (entry.queryLength() < shortest_) entries_.clear();
     shortest_ = entry.queryLength();
     entries_.push_back(&entry);
@@ -40,6 +41,7 @@ class ShortestCompletions {
  private:
   const std::size_t textLength_;
   const double scale_;
+  const UUID& userGuid_;
   std::size_t shortest_ = std::numeric_limits<std::size_t>::max();
   std::vector<const CachedResultSet*> entries_;
 };
@@ -114,18 +116,19 @@ CachedResultSet::Pointer QueryCache::get(const std::string& text) {
   return getRequest(request);
 }
 
-CachedResultSet::Pointer QueryCache::getRequest(const ZLKRequest& request) {
+CachedResultSet::Pointer QueryCache::getRequest(const ZLKRequest& request, const UUID& userGuid) {
   const auto text = lowercased(request.queryString);
   assembly_.log(Category::Caching).debug("cache lookup: {}", priv(text));
   CachedResultSet::Pointer found;
-  queue_->sync([&] { found = _find(text, request.scale); });
+  queue_->sync([&] { found = _find(text, request.scale, userGuid); });
   return found;
 }
 
-CachedResultSet::Pointer QueryCache::_find(const std::string& text, double scale) {
+CachedResultSet::Pointer QueryCache::_find(const std::string& text, double scale,
+                                           const UUID& userGuid) {
   queue_->assertCurrent();
   const auto now = assembly_.platform().clock.now();
-  ShortestCompletions shortest(utf16Length(text), scale);
+  ShortestCompletions shortest(utf16Length(text), scale, userGuid);
   std::vector<CachedResultSet::Pointer> expired;
   tree_.keysMatchingPrefix(text, [&](std::string_view, const CachedResultSet& entry, bool&) {
     if (entry.hasExpired(now)) {

@@ -41,8 +41,9 @@ class QueryCache final : public std::enable_shared_from_this<QueryCache> {
   void set(std::vector<CachedResultSet::Pointer> resultSets);
   // The best set for the request's text and scale; null when there is none. Of the completions that
   // begin with the text and were fetched for no longer text, the shortest one; among those the best
-  // score.
-  CachedResultSet::Pointer getRequest(const ZLKRequest& request);
+  // score. Only of what was fetched under the user identifier: an entry of another one waits to be
+  // cleared.
+  CachedResultSet::Pointer getRequest(const ZLKRequest& request, const UUID& userGuid = {});
   CachedResultSet::Pointer get(const std::string& text);
   void removeAllObjects();
   std::size_t count();
@@ -51,7 +52,7 @@ class QueryCache final : public std::enable_shared_from_this<QueryCache> {
   void _cacheClearNotification();
   bool _accepts(const CachedResultSet::Pointer& resultSet) const;
   void _store(const CachedResultSet::Pointer& resultSet);
-  CachedResultSet::Pointer _find(const std::string& text, double scale);
+  CachedResultSet::Pointer _find(const std::string& text, double scale, const UUID& userGuid);
   void _clearCache();
   void _didBecomeNonEmpty();
   void _didBecomeEmpty();

@@ -48,13 +48,15 @@ bool SearchFlow::_isLongEnough() {
 bool SearchFlow::_answersFromCache() {
   auto* cache = state_->queryCache();
   if (!cache) return false;
-  const auto cached = cache->getRequest(*request_);
+  // First, for it may be a new one.
+  userGuid_ = state_->guidController().currentUserGUID();
+  const auto cached = cache->getRequest(*request_, *userGuid_);
   if (!cached || !request_->queryItems.empty()) return false;
   auto reply = _makeReply(cached->data());
   state_->count("ondevicecachehits");
   state_->record(std::make_shared<ZLKCacheHitFeedback>(kCacheHitTrigger, request_->queryString,
                                                        cached->uuid()),
-                 *request_, state_->guidController().currentUserGUID());
+                 *request_, userGuid_);
   _reply(std::move(reply), std::nullopt);
   return true;
 }
@@ -77,8 +79,10 @@ void SearchFlow::_cacheResponse(const json::value& rawResponse, const Data& data
   auto* cache = state_->queryCache();
   const auto* entries = rawResponse.if_array();
   if (!cache || !entries || request_->queryString.empty()) return;
-  const auto response = std::make_shared<const FetchedResponse>(
-      request_->queryString, httpRequest_, request_->uuid, data, assembly_.platform().clock.now());
+  if (userGuid_ != state_->guidController().currentUserGUID()) return;
+  const auto response =
+      std::make_shared<const FetchedResponse>(request_->queryString, httpRequest_, request_->uuid,
+                                              data, assembly_.platform().clock.now(), *userGuid_);
   std::vector<CachedResultSet::Pointer> resultSets;
   for (const auto& entry : *entries) {
     const auto* resultSet = entry.if_object();

@@ -3,6 +3,7 @@
 
 #include "halvane/DaemonFeedback.h"
 #include "zelkord/assembly/NotificationNames.h"
+#include "zelkord/feedback/UserGUIDSource.h"
 #include "zelkord/query/QueryCache.h"
 #include "zelkord/query/QueryTestSupport.h"
 #include "zelkord/query/SearchFlow.h"
@@ -88,6 +89,22 @@ TEST_F(SearchFlowTest, AnswersALaterKeystrokeFromTheCache) {
   withItems.queryItems = {{"a", "b"}};
   EXPECT_EQ(bed_.search(*state, withItems)->count, 0);
   EXPECT_EQ(bed_.urlSession().tasks().size(), 2u);
+}
+
+TEST_F(SearchFlowTest, AnAnswerIsNotUsedUnderAnotherUserIdentifier) {
+  bed_.installBag(kTestBag);
+  const auto state = bed_.makeState();
+  bed_.search(*state, "s");
+  answer(200, kOneResultSet);
+  EXPECT_EQ(bed_.search(*state, "sn")->count, 1);
+  bed_.fakes.timeline.advance(900s);
+  EXPECT_EQ(bed_.search(*state, "sno")->count, 0) << "the search is what ends the identifier";
+  EXPECT_EQ(bed_.urlSession().tasks().size(), 2u);
+  state->guidController().reset();
+  bed_.fakes.timeline.runUntilIdle();
+  answer(200, kOneResultSet);
+  EXPECT_EQ(state->queryCache()->count(), 0u) << "it was asked for under the old one";
+  EXPECT_EQ(bed_.search(*state, "snow")->count, 0);
 }
 
 TEST_F(SearchFlowTest, CachesEveryEntryButThoseInError) {
