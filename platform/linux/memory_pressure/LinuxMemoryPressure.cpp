@@ -1,6 +1,6 @@
 #include "platform/linux/memory_pressure/LinuxMemoryPressure.h"
 
-#include <vector>
+#include <utility>
 
 namespace zelkord {
 
@@ -12,7 +12,6 @@ struct LinuxMemoryPressure::Listeners {
   };
   Mutex mutex;
   std::uint64_t nextId ZK_GUARDED_BY(mutex) = 0;
-  bool missingWasLogged ZK_GUARDED_BY(mutex) = false;
   std::map<std::uint64_t, Listener> byId ZK_GUARDED_BY(mutex);
   std::unique_ptr<PressureWatch> watch ZK_GUARDED_BY(mutex);
 
@@ -64,10 +63,11 @@ void LinuxMemoryPressure::_watch() ZK_NO_ANALYSIS {
     if (const auto listeners = weak.lock()) listeners->tellAll();
   };
   listeners_->watch = watchKernelPressure(pressureFile_.c_str(), critical);
-  if (!listeners_->watch) listeners_->watch = watchLowMemoryMonitor(critical);
-  if (listeners_->watch || listeners_->missingWasLogged) return;
-  listeners_->missingWasLogged = true;
-  log_.info("this system does not tell about memory pressure");
+  if (listeners_->watch) return;
+  listeners_->watch = watchLowMemoryMonitor(critical, [log = log_, wasLogged = false]() mutable {
+    if (!std::exchange(wasLogged, true))
+      log.info("this system does not tell about memory pressure");
+  });
 }
 
 }  // namespace zelkord

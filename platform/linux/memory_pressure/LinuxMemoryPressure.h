@@ -12,8 +12,8 @@
 namespace zelkord {
 
 // Critical memory pressure: the kernel's pressure-stall information, else the system bus's
-// LowMemoryMonitor, else none, which is logged once. Watches from the first listener on, asleep in
-// between; nothing polls.
+// LowMemoryMonitor, else none until there is a bus, which is logged once. Watches from the first
+// listener on, asleep in between; nothing polls.
 //
 // Threading: any thread. Ownership: subscriptions may outlive it.
 class LinuxMemoryPressure final : public MemoryPressure {

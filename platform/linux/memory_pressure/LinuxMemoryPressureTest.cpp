@@ -1,6 +1,11 @@
 #include <gtest/gtest.h>
 #include <stdlib.h>
+#include <systemd/sd-bus.h>
 
+#include <atomic>
+#include <optional>
+
+#include "platform/linux/ipc/IpcTestSupport.h"
 #include "platform/linux/memory_pressure/LinuxMemoryPressure.h"
 #include "platform/testing/ManualTimeline.h"
 #include "platform/testing/RecordingLog.h"
@@ -18,7 +23,36 @@ TEST(LinuxMemoryPressureTest, SaysOnceThatNothingTellsAboutPressure) {
     auto subscription = pressure.onCritical(*queue, [] {});
     EXPECT_TRUE(subscription);
   }
-  EXPECT_EQ(log.entries().size(), 1u);
+  EXPECT_TRUE(ipc::eventually([&] { return log.entries().size() == 1; }));
+  ::unsetenv("DBUS_SYSTEM_BUS_ADDRESS");
+}
+
+// A monitor of the bus of the moment warns until it is heard.
+bool isHeard(const std::atomic<int>& warnings) {
+  const auto before = warnings.load();
+  const auto bus = openSystemBus(nullptr);
+  ::sd_bus_request_name(bus.get(), "org.freedesktop.LowMemoryMonitor", 0);
+  return ipc::eventually([&] {
+    ::sd_bus_emit_signal(bus.get(), "/org/freedesktop/LowMemoryMonitor",
+                         "org.freedesktop.LowMemoryMonitor", "LowMemoryWarning", "y", 255);
+    ::sd_bus_flush(bus.get());
+    return warnings > before;
+  });
+}
+
+TEST(LinuxMemoryPressureTest, HearsAMonitorOfABusThatRestarts) {
+  const ipc::IpcTestDirectory directory;
+  std::optional<ipc::IpcTestBus> bus(directory.path());
+  ::setenv("DBUS_SYSTEM_BUS_ADDRESS", bus->address().c_str(), 1);
+  std::atomic<int> warnings = 0;
+  std::atomic<int> missing = 0;
+  const auto watch = watchLowMemoryMonitor([&] { ++warnings; }, [&] { ++missing; });
+  EXPECT_TRUE(isHeard(warnings));
+  bus->stop();
+  EXPECT_TRUE(ipc::eventually([&] { return missing == 1; }));
+  bus.emplace(directory.path());
+  EXPECT_TRUE(isHeard(warnings));
+  ::unsetenv("DBUS_SYSTEM_BUS_ADDRESS");
 }
 
 TEST(LinuxMemoryPressureTest, ASubscriptionMayOutliveTheService) {

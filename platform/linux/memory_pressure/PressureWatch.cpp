@@ -44,16 +44,19 @@ class KernelPressureWatch final : public PressureWatch {
 
 class LowMemoryWatch final : public PressureWatch {
  public:
-  LowMemoryWatch(BusConnection bus, std::function<void()> critical)
-      : critical_(std::move(critical)), bus_(std::move(bus)) {
-    sd_bus_match_signal_async(bus_.bus(), nullptr, "org.freedesktop.LowMemoryMonitor",
-                              "/org/freedesktop/LowMemoryMonitor",
-                              "org.freedesktop.LowMemoryMonitor", "LowMemoryWarning", warned,
-                              nullptr, this);
-    bus_.start([] {});
+  LowMemoryWatch(std::function<void()> critical, std::function<void()> missing)
+      : critical_(std::move(critical)),
+        bus_({[this](sd_bus* bus) { connected(bus); },
+              [missing = std::move(missing)](const std::string&) { missing(); }}) {
+    bus_.start();
   }
 
  private:
+  void connected(sd_bus* bus) {
+    sd_bus_match_signal_async(
+        bus, nullptr, "org.freedesktop.LowMemoryMonitor", "/org/freedesktop/LowMemoryMonitor",
+        "org.freedesktop.LowMemoryMonitor", "LowMemoryWarning", warned, nullptr, this);
+  }
   static int warned(sd_bus_message* message, void* self, sd_bus_error*) {
     unsigned char level = 0;
     if (sd_bus_message_read_basic(message, 'y', &level) >= 0 && level == kCriticalLevel) {
@@ -63,7 +66,7 @@ class LowMemoryWatch final : public PressureWatch {
   }
 
   const std::function<void()> critical_;
-  BusThread bus_;  // last: its thread ends before the call-back goes
+  SystemBusListener bus_;  // last: its thread ends before the call-back goes
 };
 
 }  // namespace
@@ -77,10 +80,9 @@ std::unique_ptr<PressureWatch> watchKernelPressure(const char* path,
   return std::make_unique<KernelPressureWatch>(std::move(pressure), std::move(critical));
 }
 
-std::unique_ptr<PressureWatch> watchLowMemoryMonitor(std::function<void()> critical) {
-  auto bus = openSystemBus(nullptr);
-  if (!bus) return nullptr;
-  return std::make_unique<LowMemoryWatch>(std::move(bus), std::move(critical));
+std::unique_ptr<PressureWatch> watchLowMemoryMonitor(std::function<void()> critical,
+                                                     std::function<void()> missing) {
+  return std::make_unique<LowMemoryWatch>(std::move(critical), std::move(missing));
 }
 
 }  // namespace zelkord

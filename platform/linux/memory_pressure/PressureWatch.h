@@ -4,7 +4,7 @@
 #include <memory>
 #include <thread>
 
-#include "platform/linux/bus/SystemBus.h"
+#include "platform/linux/bus/SystemBusListener.h"
 #include "platform/linux/files/Descriptor.h"
 
 namespace zelkord {
@@ -20,7 +20,9 @@ class PressureWatch {
 std::unique_ptr<PressureWatch> watchKernelPressure(const char* path,
                                                    std::function<void()> critical);
 
-// The system bus's LowMemoryMonitor, level 255. Null without a system bus.
-std::unique_ptr<PressureWatch> watchLowMemoryMonitor(std::function<void()> critical);
+// The system bus's LowMemoryMonitor, level 255, however often the bus goes and comes back. Both
+// call-backs run on a thread of the watch's own; `missing` each time that there is no bus any more.
+std::unique_ptr<PressureWatch> watchLowMemoryMonitor(std::function<void()> critical,
+                                                     std::function<void()> missing);
 
 }  // namespace zelkord
