@@ -85,8 +85,9 @@ void HostLocaleWatcher::connected(sd_bus* bus) {
   };
   match("/org/freedesktop/locale1", BusCallbacks::localeChanged);
   match("/org/freedesktop/timedate1", BusCallbacks::timeZoneChanged);
-  // Before its first word the environment counts, whatever locale1 would say.
-  if (localeIsKnown_) readLocale(bus);
+  // At first the environment counts, whatever locale1 would say; what it says while the bus is away
+  // is not heard.
+  if (std::exchange(wasConnected_, true)) readLocale(bus);
 }
 
 void HostLocaleWatcher::away(const std::string& problem) {
@@ -101,7 +102,6 @@ void HostLocaleWatcher::readLocale(sd_bus* bus) {
 }
 
 void HostLocaleWatcher::localeArrived(std::map<std::string, std::string> variables) {
-  localeIsKnown_ = true;
   queue_->async([this, variables = std::move(variables)] {
     queue_->assertCurrent();
     variables_ = variables;

@@ -49,7 +49,7 @@ class HostLocaleWatcher final {
 
   // State of the bus listener's thread.
   bool complained_ = false;
-  bool localeIsKnown_ = false;  // locale1 has said something
+  bool wasConnected_ = false;
 
   struct BusCallbacks;
   std::vector<Subscription> watches_;

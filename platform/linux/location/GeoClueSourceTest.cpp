@@ -293,5 +293,35 @@ TEST(HostLocaleWatcherTest, HearsOfTheSystemsLocaleAlsoAfterTheBusHasRestarted) 
   }
 }
 
+TEST(HostLocaleWatcherTest, ReadsWhatTheSystemSaidWhileTheBusWasAway) {
+  PrivateSystemBus bus;
+  const LinuxClock clock;
+  LinuxWorkQueues queues(clock, 2);
+  RecordingLog log;
+  PathWatcher files(log);
+  HeardEvents heard;
+  HostLocaleSources sources;
+  sources.environment = [](const std::string&) { return "de_DE"; };
+  std::optional<HostLocaleWatcher> watcher(
+      std::in_place, sources, [&](const HostLocale& host) { heard.note(host.locale); }, queues,
+      files, log);
+  const auto announcer = openSystemBus(nullptr);
+  EXPECT_TRUE(ipc::eventually([&] {
+    ::sd_bus_emit_signal(announcer.get(), "/org/freedesktop/timedate1",
+                         "org.freedesktop.DBus.Properties", "PropertiesChanged", "sa{sv}as",
+                         "org.freedesktop.timedate1", 0, 0);
+    ::sd_bus_process(announcer.get(), nullptr);
+    return heard.hasHeard();
+  }));
+  EXPECT_EQ(heard.wait(), "de_DE") << "the environment counts at first";
+
+  PrivateSystemBus next;  // on which the service is before the watcher
+  HostServicesDouble services("org.freedesktop.locale1");
+  services.start("LANG=it_IT.UTF-8");
+  bus.restart();
+  EXPECT_TRUE(ipc::eventually([&] { return heard.wait() == "it_IT"; }));
+  watcher.reset();
+}
+
 }  // namespace
 }  // namespace zelkord
