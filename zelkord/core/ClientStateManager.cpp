@@ -101,7 +101,11 @@ void ClientStateManager::_save() {
     entries.push_back(std::move(entry));
   }
   assembly_.userDefaults().set(kSessionsKey, std::move(entries));
-  assembly_.userDefaults().flush();
+  // Elsewhere: it may wait for the disk, and every new client waits for this queue.
+  auto& elsewhere = assembly_.platform().queues.global(QualityOfService::Default);
+  elsewhere.async([weak = weak_from_this()] {
+    if (const auto self = weak.lock()) self->assembly_.userDefaults().flush();
+  });
 }
 
 std::vector<ipc::StringMap> ClientStateManager::sessions() {
