@@ -31,7 +31,7 @@ struct ContainerStore {
     fakes.settings.set("ZLKSessionMaxAge", 1e9);
   }
   std::shared_ptr<SessionContainer> container() {
-    auto container = storage->createFileContainerForWriting(SessionKind::Managed);
+    auto container = storage->createFileContainerForWriting(SessionKind::Managed, {});
     container->writeSessionHeader(testHeader());
     return container;
   }

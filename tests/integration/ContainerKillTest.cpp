@@ -81,7 +81,7 @@ void recordFrom(int thread, SessionContainer& container, std::uint64_t first,
   LinuxWorkQueues queues(clock, 2);
   StorageOnDisk disk(directory, clock, queues);
   for (std::uint64_t first = 1;; first += kRecordsASession) {
-    const auto container = disk.storage->createFileContainerForWriting(SessionKind::Managed);
+    const auto container = disk.storage->createFileContainerForWriting(SessionKind::Managed, {});
     container->writeSessionHeader(testHeader());
     std::vector<std::thread> threads;
     for (int thread = 0; thread < kThreads; ++thread) {

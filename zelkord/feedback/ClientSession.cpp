@@ -106,7 +106,8 @@ ClientSession::Opening ClientSession::_opening(Assembly& assembly,
 
 void ClientSession::_open(std::optional<ZelkorFeedback> feedback, SessionKind kind) {
   auto* storage = assembly_.persistentStorage();
-  const auto container = storage ? storage->createFileContainerForWriting(kind) : nullptr;
+  const auto holder = feedback ? feedbackHolder(*feedback) : std::string();
+  const auto container = storage ? storage->createFileContainerForWriting(kind, holder) : nullptr;
   storageHandle_.set(container);
   if (container) container->writeSessionHeader(header());
   if (feedback) addFeedback(*std::move(feedback));

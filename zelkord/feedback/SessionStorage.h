@@ -3,6 +3,7 @@
 #include <cstdint>
 #include <functional>
 #include <memory>
+#include <string>
 
 #include "halvane/StoredFeedback.h"
 #include "zelkord/feedback/ZelkorFeedback.h"
@@ -30,8 +31,9 @@ enum class SessionKind : std::uint8_t { Managed, OneOff };
 class SessionStorage {
  public:
   virtual ~SessionStorage() = default;
-  // Open for writing; null when there can be none.
-  virtual std::shared_ptr<SessionContainer> createFileContainerForWriting(SessionKind kind) = 0;
+  // Open for writing; null when there can be none. `holder` is the first record's, of budgets.
+  virtual std::shared_ptr<SessionContainer> createFileContainerForWriting(
+      SessionKind kind, const std::string& holder) = 0;
   // No record follows; the container may be read and uploaded.
   virtual void closeSession(std::shared_ptr<SessionContainer> container) = 0;
   // Returns when everything handed over so far has been written, or could not be.

@@ -51,7 +51,8 @@ struct RecordingStorage final : SessionStorage {
   std::vector<std::shared_ptr<RecordingContainer>> containers;  // every one ever made
   bool isFull = false;
 
-  std::shared_ptr<SessionContainer> createFileContainerForWriting(SessionKind) override {
+  std::shared_ptr<SessionContainer> createFileContainerForWriting(SessionKind,
+                                                                  const std::string&) override {
     if (isFull) return nullptr;
     containers.push_back(std::make_shared<RecordingContainer>());
     return containers.back();

@@ -34,7 +34,7 @@ class FileContainerTest : public testing::Test {
   std::shared_ptr<FileContainer> forWriting(std::uint64_t limit = 100'000) {
     fakes_.files.put(kPath, "");
     auto shared = services(limit);
-    const auto place = shared->room->open(SessionKind::Managed);
+    const auto place = shared->room->open(SessionKind::Managed, {});
     return std::make_shared<FileContainer>(std::move(shared), kPath, *place);
   }
   FileContainer::Services services(std::uint64_t limit) {

@@ -70,8 +70,8 @@ void ZelkorPersistentStorage::start() {
 
 // That the file can be written is tried now, while its session can still be told.
 std::shared_ptr<SessionContainer> ZelkorPersistentStorage::createFileContainerForWriting(
-    SessionKind kind) {
-  const auto place = services_->room->open(kind);
+    SessionKind kind, const std::string& holder) {
+  const auto place = services_->room->open(kind, holder);
   if (!place) return nullptr;
   const auto url = _newFileUrl();
   if (!url) {

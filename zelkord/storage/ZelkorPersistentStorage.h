@@ -33,7 +33,8 @@ class ZelkorPersistentStorage final : public SessionStorage,
   // Finds what an earlier process left. Once, before anything else.
   void start();
 
-  std::shared_ptr<SessionContainer> createFileContainerForWriting(SessionKind kind) override;
+  std::shared_ptr<SessionContainer> createFileContainerForWriting(
+      SessionKind kind, const std::string& holder) override;
   void closeSession(std::shared_ptr<SessionContainer> container) override;
   // Waits for the queue, so not from there.
   std::vector<std::shared_ptr<FileContainer>> getAvailableSessionHandles();

@@ -34,8 +34,9 @@ class ZelkorPersistentStorageTest : public testing::Test {
     return urls;
   }
   // A session of one record, from its beginning to its end.
-  void record(ZelkorPersistentStorage& storage, SessionKind kind, const std::string& text = "{}") {
-    const auto session = storage.createFileContainerForWriting(kind);
+  void record(ZelkorPersistentStorage& storage, SessionKind kind, const std::string& text = "{}",
+              std::int64_t pid = 7) {
+    const auto session = storage.createFileContainerForWriting(kind, processHolder(pid));
     ASSERT_TRUE(session);
     session->writeSessionHeader(testHeader());
     session->writeFeedback(numberedFeedback(1, 0, text), nullptr);
@@ -73,7 +74,7 @@ TEST_F(ZelkorPersistentStorageTest, NumbersFilesBeyondThoseFound) {
     for (const auto* name : test.found) fakes.files.put("/caches/" + std::string(name), "x");
     const auto storage = std::make_shared<ZelkorPersistentStorage>(assembly);
     storage->start();
-    EXPECT_EQ(url(storage->createFileContainerForWriting(SessionKind::Managed)),
+    EXPECT_EQ(url(storage->createFileContainerForWriting(SessionKind::Managed, {})),
               "/caches/" + std::string(test.next));
     for (const auto* name : test.found) {
       EXPECT_TRUE(fakes.files.bytes("/caches/" + std::string(name)));
@@ -85,7 +86,8 @@ TEST_F(ZelkorPersistentStorageTest, TakesTheNextFreeNumber) {
   const auto storage = start();
   fakes_.files.put("/caches/session.0", "somebody's");
   fakes_.files.putDirectory("/caches/session.1");
-  EXPECT_EQ(url(storage->createFileContainerForWriting(SessionKind::Managed)), "/caches/session.2");
+  EXPECT_EQ(url(storage->createFileContainerForWriting(SessionKind::Managed, {})),
+            "/caches/session.2");
   EXPECT_EQ(fakes_.files.bytes("/caches/session.0"), "somebody's");
   EXPECT_EQ(fakes_.files.mode("/caches/session.2"), 0600u);
   EXPECT_TRUE(fakes_.log.contains("new file url /caches/session.2"));
@@ -93,7 +95,7 @@ TEST_F(ZelkorPersistentStorageTest, TakesTheNextFreeNumber) {
 
 TEST_F(ZelkorPersistentStorageTest, LeadsAContainerFromWritingToDeletion) {
   const auto storage = start();
-  const auto session = storage->createFileContainerForWriting(SessionKind::Managed);
+  const auto session = storage->createFileContainerForWriting(SessionKind::Managed, {});
   session->writeSessionHeader(testHeader());
   session->writeFeedback(numberedFeedback(1), nullptr);
   EXPECT_THAT(available(*storage), ElementsAre());
@@ -115,7 +117,7 @@ TEST_F(ZelkorPersistentStorageTest, LeadsAContainerFromWritingToDeletion) {
 
 TEST_F(ZelkorPersistentStorageTest, WritesEverythingBeforeItEnds) {
   auto storage = start();
-  auto session = storage->createFileContainerForWriting(SessionKind::Managed);
+  auto session = storage->createFileContainerForWriting(SessionKind::Managed, {});
   session->writeSessionHeader(testHeader());
   session->writeFeedback(numberedFeedback(1), nullptr);
   session->writeFeedback(numberedFeedback(2), nullptr);
@@ -162,10 +164,10 @@ TEST_F(ZelkorPersistentStorageTest, LeavesDamageAsItIs) {
 
 TEST_F(ZelkorPersistentStorageTest, WhatEndedFirstGoesWhenThereAreTooManyFiles) {
   const auto storage = start();
-  const auto open = storage->createFileContainerForWriting(SessionKind::Managed);
+  const auto open = storage->createFileContainerForWriting(SessionKind::Managed, {});
   for (int i = 1; i <= 600; ++i) record(*storage, SessionKind::Managed);
   EXPECT_EQ(fakes_.counters.value(kGone), 0);
-  for (int i = 601; i <= 2000; ++i) record(*storage, SessionKind::OneOff);
+  for (int i = 601; i <= 2000; ++i) record(*storage, SessionKind::OneOff, "{}", i % 4);
   const auto kept = available(*storage);
   // One-off sessions keep to their part; beyond it the first of theirs went, not others.
   EXPECT_EQ(kept.size(), 1023u);
@@ -174,7 +176,7 @@ TEST_F(ZelkorPersistentStorageTest, WhatEndedFirstGoesWhenThereAreTooManyFiles) 
   EXPECT_EQ(fakes_.files.paths().size(), 1024u);
   EXPECT_TRUE(fakes_.files.bytes("/caches/session.0"));  // is still open
   EXPECT_EQ(fakes_.counters.value(kGone), 2001 - 1024);
-  EXPECT_EQ(fakes_.log.count("limit containers reached by one-off sessions"), 1);
+  EXPECT_EQ(fakes_.log.count("limit containers reached by pid "), 1);
   EXPECT_EQ(fakes_.counters.value("com.quenta.zelkord.limit.containers_full"), 0);
 }
 
@@ -182,7 +184,7 @@ TEST_F(ZelkorPersistentStorageTest, WhatEndedFirstGoesWhenThereAreTooManyBytes) 
   const auto storage = start();
   const std::string large(1'000'000, 'x');
   for (int i = 0; i < 5; ++i) record(*storage, SessionKind::Managed, large);
-  for (int i = 0; i < 300; ++i) record(*storage, SessionKind::OneOff, large);
+  for (int i = 0; i < 300; ++i) record(*storage, SessionKind::OneOff, large, i % 5);
   EXPECT_EQ(available(*storage).size(), 5u + 67);
   for (int i = 0; i < 300; ++i) record(*storage, SessionKind::Managed, large);
   EXPECT_EQ(available(*storage).size(), 268u);
@@ -191,18 +193,38 @@ TEST_F(ZelkorPersistentStorageTest, WhatEndedFirstGoesWhenThereAreTooManyBytes) 
   EXPECT_EQ(fakes_.counters.value(kGone), 605 - 268);
 }
 
+TEST_F(ZelkorPersistentStorageTest, AProcessDrivesOutOnlyItsOwnSessionsForOneOccasion) {
+  const auto storage = start();
+  record(*storage, SessionKind::OneOff, "{}", 1);
+  record(*storage, SessionKind::Managed);
+  for (int i = 2; i < 302; ++i) record(*storage, SessionKind::OneOff, "{}", 2);
+  const std::string large(1'000'000, 'x');
+  for (int i = 302; i < 402; ++i) record(*storage, SessionKind::OneOff, large, 3);
+  EXPECT_EQ(available(*storage).size(), 2u + 128 + 16);
+  EXPECT_TRUE(fakes_.files.bytes("/caches/session.0"));
+  EXPECT_FALSE(fakes_.files.bytes("/caches/session.173"));
+  EXPECT_TRUE(fakes_.files.bytes("/caches/session.174"));
+  // Many processes fill the part of all: whoever has most gives way.
+  for (int pid = 10; pid < 20; ++pid) {
+    for (int i = 0; i < 15; ++i) record(*storage, SessionKind::OneOff, large, pid);
+  }
+  for (const char* small : {"/caches/session.0", "/caches/session.1", "/caches/session.174"}) {
+    EXPECT_TRUE(fakes_.files.bytes(small)) << small;
+  }
+}
+
 TEST_F(ZelkorPersistentStorageTest, RefusesWhatOpenContainersLeaveNoPlaceFor) {
   const auto storage = start();
   std::vector<std::shared_ptr<SessionContainer>> open;
   for (int i = 0; i < 1024; ++i) {
-    open.push_back(storage->createFileContainerForWriting(SessionKind::Managed));
+    open.push_back(storage->createFileContainerForWriting(SessionKind::Managed, {}));
   }
-  EXPECT_EQ(url(storage->createFileContainerForWriting(SessionKind::Managed)), "none");
-  EXPECT_EQ(url(storage->createFileContainerForWriting(SessionKind::OneOff)), "none");
+  EXPECT_EQ(url(storage->createFileContainerForWriting(SessionKind::Managed, {})), "none");
+  EXPECT_EQ(url(storage->createFileContainerForWriting(SessionKind::OneOff, {})), "none");
   EXPECT_EQ(fakes_.counters.value("com.quenta.zelkord.limit.containers_full"), 2);
   EXPECT_EQ(fakes_.files.paths().size(), 1024u);
   open.pop_back();  // nobody completed its session
-  EXPECT_EQ(url(storage->createFileContainerForWriting(SessionKind::Managed)),
+  EXPECT_EQ(url(storage->createFileContainerForWriting(SessionKind::Managed, {})),
             "/caches/session.1024");
 }
 
@@ -253,7 +275,7 @@ TEST_F(ZelkorPersistentStorageTest, LivesWithACachesDirectoryThatFails) {
     fakes_.log.clear();
     fakes_.files.fail(test.operation, EACCES);
     const auto storage = start();
-    const auto container = storage->createFileContainerForWriting(SessionKind::Managed);
+    const auto container = storage->createFileContainerForWriting(SessionKind::Managed, {});
     EXPECT_EQ(container == nullptr, test.operation != Operation::List);
     EXPECT_EQ(fakes_.files.paths().size(), container ? 1u : 0u);
     EXPECT_TRUE(fakes_.log.contains(test.text));
