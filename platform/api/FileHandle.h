@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstdint>
 #include <optional>
 
 #include "base/Data.h"
@@ -11,9 +12,10 @@ namespace zelkord {
 class FileHandle {
  public:
   virtual ~FileHandle() = default;
-  // The whole file as it is now, mapped read-only and private; outlives the handle. None on
-  // failure, of an empty file too: `error` is then the POSIX error.
-  virtual std::optional<Data> map(Error* error) = 0;
+  // The whole file as it is now, read-only and private; whatever becomes of the file changes
+  // nothing of it, and it outlives the handle. None on failure, of an empty file or one of more
+  // than `limit` bytes too: `error` is then the POSIX error.
+  virtual std::optional<Data> map(std::uint64_t limit, Error* error) = 0;
 };
 
 }  // namespace zelkord

@@ -12,9 +12,9 @@ class Handle final : public FileHandle {
     if (!failure_ && bytes_.empty()) failure_ = posixError(EINVAL);
   }
 
-  std::optional<Data> map(Error* error) override {
-    if (!failure_) return Data(bytes_);
-    if (error) *error = *failure_;
+  std::optional<Data> map(std::uint64_t limit, Error* error) override {
+    if (!failure_ && bytes_.size() <= limit) return Data(bytes_);
+    if (error) *error = failure_.value_or(posixError(EFBIG));
     return std::nullopt;
   }
 

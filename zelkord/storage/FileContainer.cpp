@@ -218,7 +218,7 @@ std::optional<StoredSession> FileContainer::_unarchiveObject(FileHandle* handle)
     return std::nullopt;
   }
   Error error;
-  auto data = mmapFileHandle(*handle, &error);
+  auto data = mmapFileHandle(*handle, &error, services_->maxFileSize);
   if (!data) {
     log.error("mmap: {}", error.description());
     return std::nullopt;

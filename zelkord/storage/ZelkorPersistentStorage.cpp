@@ -8,6 +8,7 @@
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/assembly/UserAgent.h"
 #include "zelkord/storage/ContainerFormat.h"
+#include "zelkord/storage/mmapFileHandle.h"
 
 namespace zelkord {
 namespace {
@@ -200,12 +201,12 @@ void ZelkorPersistentStorage::_offer(Scan scan) {
   for (const auto& path : services_->room->endedPaths()) _trim(path);
 }
 
-// Without a mapping there is nothing to cut: an empty file, or one that reading will complain of.
+// Without its bytes there is nothing to cut: an empty file, or one that reading will complain of.
 void ZelkorPersistentStorage::_trim(const std::string& path) {
   std::optional<std::uint64_t> end;
   std::uint64_t size = 0;
   if (const auto file = services_->files.openForReading(path, nullptr)) {
-    const auto data = file->map(nullptr);
+    const auto data = mmapFileHandle(*file, nullptr, services_->maxFileSize);
     if (!data) return;
     size = data->size();
     end = endOfWholeRecords(data->view(), services_->maxFileSize);

@@ -2,6 +2,8 @@
 
 namespace zelkord {
 
-std::optional<Data> mmapFileHandle(FileHandle& handle, Error* error) { return handle.map(error); }
+std::optional<Data> mmapFileHandle(FileHandle& handle, Error* error, std::uint64_t limit) {
+  return handle.map(limit, error);
+}
 
 }  // namespace zelkord

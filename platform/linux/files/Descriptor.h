@@ -3,6 +3,8 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <cstdint>
+#include <string>
 #include <string_view>
 #include <utility>
 
@@ -42,6 +44,22 @@ inline bool writeFully(int file, std::string_view bytes) {
     bytes.remove_prefix(static_cast<std::size_t>(count));
   }
   return true;
+}
+
+// Appends all that is left of the file. False, with errno set, when that fails or is more than
+// `limit` bytes.
+inline bool readFully(int file, std::uint64_t limit, std::string& bytes) {
+  constexpr std::size_t kStep = 64 * 1024;
+  while (bytes.size() <= limit) {
+    const auto old = bytes.size();
+    bytes.resize(old + kStep);
+    const auto count = ::read(file, bytes.data() + old, kStep);
+    bytes.resize(old + (count > 0 ? static_cast<std::size_t>(count) : 0));
+    if (count == 0) return true;
+    if (count < 0 && errno != EINTR) return false;
+  }
+  errno = EFBIG;
+  return false;
 }
 
 }  // namespace zelkord

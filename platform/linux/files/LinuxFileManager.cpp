@@ -20,20 +20,6 @@ constexpr std::string_view kUnfinishedPrefix = ".unfinished.";
 
 std::optional<Error> lastPosixError() { return posixError(errno); }
 
-bool readFully(int file, std::uint64_t limit, std::string& bytes) {
-  constexpr std::size_t kStep = 64 * 1024;
-  while (bytes.size() <= limit) {
-    const auto old = bytes.size();
-    bytes.resize(old + kStep);
-    const auto count = ::read(file, bytes.data() + old, kStep);
-    bytes.resize(old + (count > 0 ? static_cast<std::size_t>(count) : 0));
-    if (count == 0) return true;
-    if (count < 0 && errno != EINTR) return false;
-  }
-  errno = EFBIG;
-  return false;
-}
-
 std::string parentOf(const std::string& path) {
   const auto slash = path.rfind('/');
   return slash == 0 || slash == std::string::npos ? "/" : path.substr(0, slash);

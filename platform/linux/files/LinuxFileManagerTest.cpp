@@ -123,6 +123,23 @@ TEST_F(LinuxFileManagerTest, DoesNotWaitForWhoeverFillsAPipe) {
   EXPECT_EQ(readError(files_, root_ / "pipe", 10)->code, EINVAL);
 }
 
+TEST_F(LinuxFileManagerTest, WhatWasReadStaysWhenTheFileIsCut) {
+  const std::string bytes(300'000, 'x');
+  root_.write("file", bytes);
+  const auto handle = files_.openForReading(root_ / "file", nullptr);
+  ASSERT_TRUE(handle);
+  const auto data = handle->map(bytes.size(), nullptr);
+  ASSERT_EQ(::truncate((root_ / "file").c_str(), 0), 0);
+  ASSERT_TRUE(data);
+  EXPECT_EQ(data->view(), bytes);
+  Error error;
+  EXPECT_FALSE(handle->map(1, &error));
+  EXPECT_EQ(error.code, EINVAL);
+  root_.write("file", "xy");
+  EXPECT_FALSE(handle->map(1, &error));
+  EXPECT_EQ(error.code, EFBIG);
+}
+
 TEST_F(LinuxFileManagerTest, RemovesWhatACrashLeft) {
   root_.write(".unfinished.a1b2c3", "half");
   root_.write("bag.plist", "whole");

@@ -205,7 +205,7 @@ TEST_F(CurlURLSessionTest, DownloadsToAFileThatEndsWithTheCompletion) {
       {.url = server_.url("/image")}, [&](const auto& finished, const URLResult& result) {
         path = result.file.value_or(URLResult::File{}).path;
         const auto handle = files.openForReading(path, nullptr);
-        if (handle) mapped = handle->map(nullptr).value_or(Data());
+        if (handle) mapped = handle->map(UINT64_MAX, nullptr).value_or(Data());
         EXPECT_NE(::truncate(path.c_str(), 0), 0) << "others cannot pull it away from the mapping";
         completion(finished, result);
       });
