@@ -143,8 +143,7 @@ void FileContainer::_finish(const WaitingRecord& record, bool written) {
   queue_.assertCurrent();
   if (record.fit == RecordFit::TooLarge) {
     services_->reporter.addValue(1, kFileSizeExceeded);
-    services_->log.error("bytes written ({}) + feedback ({}) exceeds max session size ({})",
-                         record.offset, record.payload, services_->maxFileSize);
+    _complainOfSize(record);
   }
   if (!written && record.kind != RecordKind::Feedback) {
     services_->log.error("{}", record.kind == RecordKind::Version ? "Could not write version string"
@@ -152,6 +151,14 @@ void FileContainer::_finish(const WaitingRecord& record, bool written) {
     _closeFile();
   }
   if (record.done) record.done();
+}
+
+// A full session may go on for hours.
+void FileContainer::_complainOfSize(const WaitingRecord& record) {
+  queue_.assertCurrent();
+  if (std::exchange(full_, true)) return;
+  services_->log.error("bytes written ({}) + feedback ({}) exceeds max session size ({})",
+                       record.offset, record.payload, services_->maxFileSize);
 }
 
 void FileContainer::close() {

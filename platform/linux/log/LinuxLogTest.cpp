@@ -172,12 +172,37 @@ TEST(LogFoldingTest, APlaceWhoseLinesDifferIsBoundedToo) {
 
 TEST(LogFoldingTest, LeavesAloneWhatManyTypingClientsCause) {
   FoldingBed bed;
-  for (int key = 0; key < 3'000; ++key) {
-    bed.logger.notice("search {} begins", key);
-    bed.logger.notice("search {} ends", key);
+  const std::string about(100, 'x');
+  for (int key = 0; key < 65'000; ++key) {
+    bed.logger.notice("search {} begins, {}", key, about);
     if (key % 1000 == 999) bed.timeline.advance(1s);
   }
-  EXPECT_EQ(bed.lines.size(), 6'000u);
+  EXPECT_EQ(bed.lines.size(), 65'000u);
+}
+
+TEST(LogFoldingTest, LongLinesOfAPlaceAreBoundedByTheirBytes) {
+  FoldingBed bed;
+  const auto bytesOf = [&](int seconds) {
+    bed.lines.clear();
+    for (int second = 0; second < seconds; ++second) {
+      for (int i = 0; i < 500; ++i) {
+        bed.logger.notice("client configuration {} {}", i, std::string(8'000, 'x'));
+      }
+      bed.timeline.advance(1s);
+    }
+    std::size_t bytes = 0;
+    for (const auto& line : bed.lines) bytes += line.size();
+    return bytes;
+  };
+  EXPECT_LE(bytesOf(1), LogFolding::kBytesOfASecond);
+  EXPECT_GT(bytesOf(1), LogFolding::kBytesOfASecond / 2);
+  // Besides the line a second that tells how many are left out.
+  EXPECT_LE(bytesOf(57), LogFolding::kBytesOfAMinute + 57 * kLongestLogLine);
+  bed.lines.clear();
+  bed.logger.error("another place");
+  EXPECT_THAT(bed.lines, testing::Contains("another place"));
+  bed.timeline.advance(2s);
+  EXPECT_GT(bytesOf(1), LogFolding::kBytesOfASecond / 2) << "in the next minute";
 }
 
 TEST(LogFoldingTest, LongTextsAreCutAtACharacter) {

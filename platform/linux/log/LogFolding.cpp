@@ -6,10 +6,13 @@
 #include <functional>
 #include <utility>
 
+#include "platform/linux/log/LogLine.h"
+
 namespace zelkord {
 namespace {
 
 constexpr Duration kFoldingSecond = 1s;
+constexpr Duration kFoldingMinute = 60s;
 
 std::string summaryText(std::uint64_t count, bool isOneText, const std::string& text) {
   return isOneText ? fmt::format("repeated {} times: {}", count, text)
@@ -23,18 +26,26 @@ bool LogFolding::admit(SteadyTime now, Place place, std::string_view text,
   if (now >= firstDue_) _takeDue(now, due);
   const auto at = seconds_.try_emplace(std::move(place)).first;
   auto& second = at->second;
-  if (now >= second.end) second = {.end = now + kFoldingSecond};
-  if (_hasRoom(second, text)) return true;
+  if (now >= second.end) second = {.end = now + kFoldingSecond, .minute = second.minute};
+  if (_hasRoom(now, second, text)) return true;
   _fold(at, text);
   return false;
 }
 
-bool LogFolding::_hasRoom(Second& second, std::string_view text) {
-  if (second.lines >= kLines) return false;
+bool LogFolding::_hasRoom(SteadyTime now, Second& second, std::string_view text) {
+  auto& minute = second.minute;
+  if (now >= minute.end) minute = {.end = now + kFoldingMinute};
+  const auto bytes = std::min(text.size(), kLongestLogLine);
+  if (second.lines >= kLines || second.bytes + bytes > kBytesOfASecond ||
+      minute.bytes + bytes > kBytesOfAMinute) {
+    return false;
+  }
   auto& times = second.texts[std::hash<std::string_view>()(text)];
   if (times >= kEqualLines) return false;
   ++times;
   ++second.lines;
+  second.bytes += bytes;
+  minute.bytes += bytes;
   return true;
 }
 
@@ -59,7 +70,7 @@ void LogFolding::_takeDue(SteadyTime now, std::vector<Summary>& due) {
     }
     due.push_back({place.level, place.category,
                    summaryText(second.folded, second.isOneText, second.lastFolded)});
-    second = {};
+    second = {.minute = second.minute};
     return true;
   });
 }
