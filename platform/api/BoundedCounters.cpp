@@ -9,6 +9,20 @@ std::int64_t saturatedSum(std::int64_t a, std::int64_t b) {
   return b > 0 ? INT64_MAX : INT64_MIN;
 }
 
+// What has a part from a client has a word of ours behind it, so that it is none of these, but for
+// the few with one of these groups' names.
+bool isOfOwnWords(std::string_view key) {
+  constexpr std::string_view kPrefix = "com.quenta.zelkord.";
+  if (!key.starts_with(kPrefix)) return false;
+  key.remove_prefix(kPrefix.size());
+  for (const std::string_view group : {"limit.", "bag.", "dp."}) {
+    if (!key.starts_with(group)) continue;
+    key.remove_prefix(group.size());
+    break;
+  }
+  return key.find('.') == std::string_view::npos;
+}
+
 }  // namespace
 
 void BoundedCounters::add(std::string_view key, std::int64_t amount) {
@@ -22,13 +36,20 @@ void BoundedCounters::set(std::string_view key, std::int64_t value) {
   place = own != values_.end() && &place == &own->second ? value : saturatedSum(place, value);
 }
 
-// The last place is kept for the others.
 std::int64_t& BoundedCounters::_place(std::string_view key) {
   const auto found = key.size() <= kMaximumKeySize ? values_.find(key) : values_.end();
   if (found != values_.end()) return found->second;
-  const auto own = values_.size() - values_.count(kOthers);
-  const bool fits = key.size() <= kMaximumKeySize && own + 1 < kMaximumKeys;
-  return values_.try_emplace(std::string(fits ? key : kOthers), 0).first->second;
+  if (!_hasRoomFor(key)) key = kOthers;
+  const auto [place, isNew] = values_.try_emplace(std::string(key), 0);
+  if (isNew && !isOfOwnWords(key)) ++ofClients_;
+  return place->second;
+}
+
+// The last place is kept for the others.
+bool BoundedCounters::_hasRoomFor(std::string_view key) const {
+  if (key.size() > kMaximumKeySize) return false;
+  if (!isOfOwnWords(key)) return ofClients_ + 1 < kMaximumKeys - kKeptForOwnWords;
+  return values_.size() - values_.count(kOthers) + 1 < kMaximumKeys;
 }
 
 }  // namespace zelkord

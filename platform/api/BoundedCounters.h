@@ -18,6 +18,8 @@ class BoundedCounters final {
  public:
   static constexpr std::size_t kMaximumKeySize = 256;  // bytes
   static constexpr std::size_t kMaximumKeys = 4096;    // with the one for all others
+  // Of these, places that keys with parts from clients leave to those of the daemon's own words.
+  static constexpr std::size_t kKeptForOwnWords = 256;
   static constexpr std::string_view kOthers = "com.quenta.zelkord.other";
 
   using Values = std::map<std::string, std::int64_t, std::less<>>;
@@ -31,8 +33,10 @@ class BoundedCounters final {
  private:
   // Whose number changes for `key`: its own, or the others'.
   std::int64_t& _place(std::string_view key);
+  bool _hasRoomFor(std::string_view key) const;
 
   Values values_;
+  std::size_t ofClients_ = 0;  // of the values: those whose key may have a part from a client
 };
 
 }  // namespace zelkord

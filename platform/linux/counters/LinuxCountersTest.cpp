@@ -65,7 +65,9 @@ TEST_F(LinuxCountersTest, GoOnAfterARestart) {
 }
 
 TEST_F(LinuxCountersTest, AFloodOfKeysCountsUnderOneForAllOthers) {
-  const auto key = [](int i) { return "com.quenta.zelkord.agent " + std::to_string(i); };
+  const auto key = [](int i) {
+    return "com.quenta.zelkord.limit.agent " + std::to_string(i) + ".sessions";
+  };
   const auto counters = make();
   counters->add("mine", 1);
   for (int i = 0; i < 10'000; ++i) counters->add(key(i), 2);
@@ -74,12 +76,26 @@ TEST_F(LinuxCountersTest, AFloodOfKeysCountsUnderOneForAllOthers) {
   counters->set("late", 7);
   counters->set("mine", 9);
   const auto all = counters->all();
-  EXPECT_EQ(all.size(), 4096u);
+  EXPECT_EQ(all.size(), 3840u);
   EXPECT_EQ(all.at("mine"), 9);
-  EXPECT_EQ(all.at(key(4093)), 2);
-  EXPECT_EQ(all.at("com.quenta.zelkord.other"), (10'000 - 4094) * 2 + 1000 * 3 + 5 + 7);
+  EXPECT_EQ(all.at(key(3837)), 2);
+  EXPECT_EQ(all.at("com.quenta.zelkord.other"), (10'000 - 3838) * 2 + 1000 * 3 + 5 + 7);
   counters->save();
   EXPECT_EQ(make()->all(), all);
+}
+
+TEST_F(LinuxCountersTest, KeysOfClientsLeaveRoomForTheDaemonsOwn) {
+  const auto counters = make();
+  for (int i = 0; i < 5'000; ++i) {
+    counters->add("com.quenta.zelkord.agent " + std::to_string(i) + ".sessions", 1);
+  }
+  for (int i = 0; i < 300; ++i) {
+    counters->add("com.quenta.zelkord.limit.budget_" + std::to_string(i), 1);
+  }
+  const auto all = counters->all();
+  EXPECT_EQ(all.size(), 4096u);
+  EXPECT_EQ(all.at("com.quenta.zelkord.limit.budget_255"), 1);
+  EXPECT_EQ(all.at("com.quenta.zelkord.other"), 5'000 - 3839 + 300 - 256);
 }
 
 TEST_F(LinuxCountersTest, AStoreOfAnEarlierVersionIsCutDown) {
@@ -93,10 +109,10 @@ TEST_F(LinuxCountersTest, AStoreOfAnEarlierVersionIsCutDown) {
   EXPECT_GT(root_.read("counters.db").size(), 3'000'000u);
   database.reset();
   const auto all = make()->all();
-  EXPECT_EQ(all.size(), 4096u);
-  EXPECT_EQ(all.at("com.quenta.zelkord.other"), 12'000 + 1 - 4095);
+  EXPECT_EQ(all.size(), 3840u);
+  EXPECT_EQ(all.at("com.quenta.zelkord.other"), 12'000 + 1 - 3839);
   EXPECT_LT(root_.read("counters.db").size(), 500'000u);
-  EXPECT_EQ(log_.count("cut down to 4096"), 1);
+  EXPECT_EQ(log_.count("cut down to 3840"), 1);
   EXPECT_EQ(make()->all(), all);
   EXPECT_EQ(log_.count("cut down"), 1);
 }
