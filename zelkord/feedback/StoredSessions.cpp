@@ -12,7 +12,7 @@ std::shared_ptr<SessionManager> StoredSessions::makeManager(
 }
 
 std::shared_ptr<FeedbackSession> StoredSessions::makeSession(ZelkorFeedback first) {
-  if (!room_->takeSession(first) || !room_->take(first)) return nullptr;
+  if (!room_->take(first) || !room_->takeSession(first)) return nullptr;
   return ClientSession::make(assembly_, std::move(first), SessionEndReason::None,
                              SessionKind::OneOff);
 }

@@ -44,9 +44,10 @@ TEST_F(StoredSessionsTest, OnlySoManySessionsForOneOccasionBeginInAMinute) {
 }
 
 TEST_F(StoredSessionsTest, ARecordThatIsTooLargeToWaitMakesNoSession) {
-  EXPECT_EQ(make(7, 1, 2 * 1024 * 1024), 0);
-  EXPECT_EQ(bed_.counter("com.quenta.zelkord.limit.feedback_waiting"), 1);
+  EXPECT_EQ(make(7, 200, 2 * 1024 * 1024), 0);
+  EXPECT_EQ(bed_.counter("com.quenta.zelkord.limit.feedback_waiting"), 200);
   EXPECT_TRUE(bed_.storage->containers.empty());
+  EXPECT_EQ(make(7, 128), 128) << "it takes no session's place either";
 }
 
 }  // namespace
