@@ -45,6 +45,7 @@ class ZK_EXPORT Client {
 
   ZLKFuture<ClientResult<ClientBag>> bag();
   ZLKFuture<ClientResult<std::vector<ClientSessionEntry>>> listSessions();
+  // Only daemons of a later version answer it; others know no such method.
   ZLKFuture<ClientResult<ResourceFile>> fileHandleForResource(std::string identifier);
 
   // What the user did with the results of a query: a feedback message by its class name and in its

@@ -20,13 +20,14 @@ class ZK_EXPORT DiagnosticsClient {
 
   // JSON texts.
   ZLKFuture<ClientResult<std::string>> status() const;
+  // Only daemons of a later version answer these two; others know no such method.
   ZLKFuture<ClientResult<std::string>> transfers() const;
   ZLKFuture<ClientResult<std::string>> resources() const;
 
   // Counters by key.
   ZLKFuture<ClientResult<std::map<std::string, std::int64_t>>> metrics() const;
 
-  // Starts the download of a file that the bag lists.
+  // Starts the download of a file that the bag lists. Likewise for daemons of a later version.
   ZLKFuture<ClientResult<Nothing>> fetchResource(std::string identifier) const;
 
   // A setting as JSON; an empty text when there is none. An empty domain is the daemon's own, an
