@@ -60,9 +60,11 @@ if(TARGET corezelkor)
   install(FILES "${PROJECT_SOURCE_DIR}/cmake/corezelkorConfig.cmake" "${PROJECT_BINARY_DIR}/corezelkorConfigVersion.cmake"
     DESTINATION "${package}")
   zk_install_template("${PROJECT_SOURCE_DIR}/packaging/corezelkor.pc.in" "${CMAKE_INSTALL_LIBDIR}/pkgconfig")
-  install(DIRECTORY base halvane corezelkor "${PROJECT_BINARY_DIR}/generated/corezelkor"
-    DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}/corezelkor"
+  # The library's own headers, and of the others what these include.
+  install(DIRECTORY corezelkor DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}/corezelkor"
     FILES_MATCHING PATTERN "*.h" PATTERN "*TestSupport.h" EXCLUDE PATTERN examples EXCLUDE
-    PATTERN internal EXCLUDE)
+    PATTERN internal EXCLUDE PATTERN dbus EXCLUDE PATTERN proto EXCLUDE)
+  install(FILES base/Data.h base/Error.h base/Export.h base/Json.h base/Mutex.h base/Namespace.h base/ThreadSafety.h
+    base/Time.h DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}/corezelkor/base")
 endif()
 install(FILES "${PROJECT_SOURCE_DIR}/LICENSE" DESTINATION "${CMAKE_INSTALL_DOCDIR}")
