@@ -2,6 +2,8 @@
 
 #include <strings.h>
 
+#include <algorithm>
+
 #include "base/Guarded.h"
 #include "platform/api/RandomUUID.h"
 #include "zelkord/assembly/Assembly.h"
@@ -106,14 +108,19 @@ std::optional<ImageFetcher::Ticket> ImageFetcher::_join(const std::string& url) 
     queue_->assertCurrent();
     const auto found = byURL_.find(url);
     if (found == byURL_.end()) return;
-    auto& pending = pendingRequests_.at(found->second);
-    ++pending.wanted;
-    pending.end.reset();
+    pendingRequests_.at(found->second).end.reset();
     line_.want(found->second);
-    ticket = Ticket{pending.fetch->promise.future(), found->second};
+    ticket = _admit(found->second);
   });
   if (ticket) assembly_.log(Category::Images).debug("pending {}", _shown(url));
   return ticket;
+}
+
+ImageFetcher::Ticket ImageFetcher::_admit(DownloadId download) {
+  queue_->assertCurrent();
+  auto& pending = pendingRequests_.at(download);
+  pending.waiters.emplace(++lastWaiter_, nullptr);
+  return {pending.fetch->promise.future(), {download, lastWaiter_}};
 }
 
 ImageFetcher::Ticket ImageFetcher::_enqueue(const std::shared_ptr<Fetch>& fetch,
@@ -122,24 +129,25 @@ ImageFetcher::Ticket ImageFetcher::_enqueue(const std::shared_ptr<Fetch>& fetch,
   auto hostPlace = place ? hostPlaces_.take(fetch->host) : std::nullopt;
   if (!hostPlace) return {ZLKFuture<Image>(std::nullopt)};
   Begun due;
-  bool isNew = false;
+  std::optional<Ticket> ticket;
   queue_->sync([&] {
     queue_->assertCurrent();
-    isNew = byURL_.try_emplace(fetch->request.url, lastDownload_ + 1).second;
+    const bool isNew = byURL_.try_emplace(fetch->request.url, lastDownload_ + 1).second;
     if (!isNew) return;  // another thread was faster
     fetch->id = ++lastDownload_;
     fetch->place = *std::move(place);
     fetch->hostPlace = *std::move(hostPlace);
     pendingRequests_[fetch->id].fetch = fetch;
     line_.add(fetch->host, fetch->id);
+    ticket = _admit(fetch->id);
     due = _takeDue();
   });
-  if (!isNew) {
+  if (!ticket) {
     auto joined = _join(fetch->request.url);
     return joined ? *std::move(joined) : _enqueue(fetch, holder);
   }
   for (const auto& begun : due) _begin(begun);
-  return {fetch->promise.future(), fetch->id};
+  return *std::move(ticket);
 }
 
 ImageFetcher::Begun ImageFetcher::_takeDue() {
@@ -150,7 +158,7 @@ ImageFetcher::Begun ImageFetcher::_takeDue() {
     const auto& fetch = due.emplace_back(pending.fetch);
     fetch->place.reset();
     fetch->hostPlace.reset();
-    if (pending.wanted == 0) _limit(pending);
+    if (pending.waiters.empty()) _limit(pending);
   }
   return due;
 }
@@ -187,7 +195,13 @@ void ImageFetcher::_finish(Fetch& fetch, const URLTask& task, const URLResult& r
 void ImageFetcher::_leave(DownloadId download, DownloadLine::Connections connections,
                           bool hasFailed) {
   queue_->assertCurrent();
-  const auto host = pendingRequests_.at(download).fetch->host;
+  auto& pending = pendingRequests_.at(download);
+  const auto host = pending.fetch->host;
+  std::vector<Reaction> reactions;
+  for (auto& [id, reaction] : pending.waiters) {
+    if (reaction) reactions.push_back(std::move(reaction));
+  }
+  _react(std::move(reactions), pending.fetch->promise.future());
   line_.ended(host, connections);
   _forget(download);
   if (hasFailed) {
@@ -196,35 +210,66 @@ void ImageFetcher::_leave(DownloadId download, DownloadLine::Connections connect
   for (const auto& begun : _takeDue()) _begin(begun);
 }
 
-void ImageFetcher::release(std::vector<DownloadId> downloads) {
-  if (downloads.empty()) return;
-  queue_->async([weak = weak_from_this(), downloads = std::move(downloads)] {
-    const auto self = weak.lock();
-    if (!self) return;
-    for (const auto download : downloads) self->_release(download);
+void ImageFetcher::await(const Ticket& ticket, Reaction reaction) {
+  queue_->sync([&] {
+    queue_->assertCurrent();
+    const auto found = pendingRequests_.find(ticket.waiter.download);
+    if (found == pendingRequests_.end()) return _react({std::move(reaction)}, ticket.image);
+    const auto waiter = found->second.waiters.find(ticket.waiter.id);
+    if (waiter != found->second.waiters.end()) waiter->second = std::move(reaction);
   });
 }
 
-void ImageFetcher::_release(DownloadId download) {
+// What was dropped meanwhile has no image yet, and nobody waits for it.
+void ImageFetcher::_react(std::vector<Reaction> reactions, const ZLKFuture<Image>& image) {
+  if (reactions.empty() || !image.isFulfilled()) return;
+  assembly_.platform()
+      .queues.global(QualityOfService::High)
+      .async([reactions = std::move(reactions), image] {
+        for (const auto& reaction : reactions) reaction(image.get());
+      });
+}
+
+void ImageFetcher::release(std::vector<Waiter> waiters) {
+  std::erase_if(waiters, [](const auto& waiter) { return waiter.download == 0; });
+  if (waiters.empty()) return;
+  queue_->async([weak = weak_from_this(), waiters = std::move(waiters)] {
+    const auto self = weak.lock();
+    if (!self) return;
+    for (const auto& waiter : waiters) self->_release(waiter);
+  });
+}
+
+void ImageFetcher::_release(const Waiter& waiter) {
   queue_->assertCurrent();
-  const auto found = pendingRequests_.find(download);
+  const auto found = pendingRequests_.find(waiter.download);
   if (found == pendingRequests_.end()) return;
   auto& pending = found->second;
-  if (pending.wanted == 0 || --pending.wanted > 0) return;
-  if (!line_.isWaiting(download)) return _limit(pending);
-  for (const auto dropped : line_.abandon(download)) _drop(dropped);
+  if (pending.waiters.erase(waiter.id) == 0 || !pending.waiters.empty()) return;
+  if (!line_.isWaiting(waiter.download)) return _limit(pending);
+  for (const auto dropped : line_.abandon(waiter.download)) _drop(dropped);
 }
 
 void ImageFetcher::_limit(Pending& pending) {
   queue_->assertCurrent();
+  const auto now = assembly_.platform().clock.realNow();
+  if (!pending.endsAt) pending.endsAt = deadlineAfter(now, pending.fetch->request.timeout);
   pending.end = queue_->after(
-      pending.fetch->request.timeout,
-      [weak = std::weak_ptr(pending.fetch)] {
-        const auto abandoned = weak.lock();
-        const auto task = abandoned ? abandoned->task.get().lock() : nullptr;
-        if (task) task->cancel();
+      std::max<Duration>(*pending.endsAt - now, Duration::zero()),
+      [weak = weak_from_this(), download = pending.fetch->id] {
+        if (const auto self = weak.lock()) self->_cancel(download);
       },
       TimeBase::Real);
+}
+
+void ImageFetcher::_cancel(DownloadId download) {
+  queue_->assertCurrent();
+  const auto found = pendingRequests_.find(download);
+  if (found == pendingRequests_.end() || !found->second.waiters.empty()) return;
+  const auto task = found->second.fetch->task.get().lock();
+  if (!task) return;
+  _unlist(download);
+  task->cancel();
 }
 
 // Who reacts to its end does so elsewhere, and may ask for the next image.
@@ -238,9 +283,14 @@ void ImageFetcher::_drop(DownloadId download) {
 
 void ImageFetcher::_forget(DownloadId download) {
   queue_->assertCurrent();
-  const auto found = pendingRequests_.find(download);
-  byURL_.erase(found->second.fetch->request.url);
-  pendingRequests_.erase(found);
+  _unlist(download);
+  pendingRequests_.erase(download);
+}
+
+void ImageFetcher::_unlist(DownloadId download) {
+  queue_->assertCurrent();
+  const auto listed = byURL_.find(pendingRequests_.at(download).fetch->request.url);
+  if (listed != byURL_.end() && listed->second == download) byURL_.erase(listed);
 }
 
 ImageFetcher::Image ImageFetcher::_imageOf(const Fetch& fetch, const URLResult& result) {

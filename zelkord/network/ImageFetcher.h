@@ -27,7 +27,8 @@ class Assembly;
 //
 // A download waits in the line, is under way, or has ended. Who wanted it and does so no more says
 // so (`release`). What nobody wants gives way to all others while it waits, and once under way has
-// the request's time-out to end; a host that fails it gets no more of them.
+// the request's time-out to end, from when that was first so; a host that fails it gets no more of
+// them.
 //
 // Threading: any thread; a fetch may block for the URL cache's files, never for the network.
 // Ownership: owned by the assembly. A download holds it weakly.
@@ -39,10 +40,17 @@ class ImageFetcher final : public std::enable_shared_from_this<ImageFetcher> {
   // The bytes, mapped; none when the fetch failed.
   using Image = std::optional<Data>;
   using RedirectRule = std::function<bool(const std::string& url)>;
+  using Reaction = std::function<void(const Image&)>;
   using DownloadId = DownloadLine::Id;
+  using WaiterId = std::uint64_t;
+  // One who wants a download.
+  struct Waiter {
+    DownloadId download = 0;  // 0: there is nothing to wait for, nor to release
+    WaiterId id = 0;
+  };
   struct Ticket {
     ZLKFuture<Image> image;
-    DownloadId download = 0;  // 0: there is none to release
+    Waiter waiter;
   };
 
   static constexpr std::uint64_t kMostWaiting = 10'000;
@@ -55,16 +63,22 @@ class ImageFetcher final : public std::enable_shared_from_this<ImageFetcher> {
   // line.
   Ticket fetchImageData(const std::string& url, Duration timeoutInterval,
                         RedirectRule acceptsRedirect = {}, const std::string& holder = {});
-  // Of each of these one who wanted it does so no more.
-  void release(std::vector<DownloadId> downloads);
+  // Calls back once on a global queue, now or when the download has ended; not, and `reaction` is
+  // let go of, when the waiter is released before. Once a ticket.
+  void await(const Ticket& ticket, Reaction reaction);
+  // None of these waits any more.
+  void release(std::vector<Waiter> waiters);
 
  private:
   struct Fetch;
   // Of a download that has not ended.
   struct Pending {
     std::shared_ptr<Fetch> fetch;
-    std::size_t wanted = 1;
-    Subscription end;  // of one that is under way and that nobody wants
+    std::map<WaiterId, Reaction> waiters;
+    // Of one that is under way and that nobody wants, and when that is; it stays the same for those
+    // who want it once more and again do not.
+    Subscription end;
+    std::optional<SteadyTime> endsAt;
   };
   using Begun = std::vector<std::shared_ptr<Fetch>>;
 
@@ -73,14 +87,19 @@ class ImageFetcher final : public std::enable_shared_from_this<ImageFetcher> {
   Image _cachedImage(const URLRequest& request);
   // The download that is on its way, if there is one, is wanted once more.
   std::optional<Ticket> _join(const std::string& url);
+  Ticket _admit(DownloadId download);
   Ticket _enqueue(const std::shared_ptr<Fetch>& fetch, const std::string& holder);
   Begun _takeDue();
   void _begin(const std::shared_ptr<Fetch>& fetch);
   void _finish(Fetch& fetch, const URLTask& task, const URLResult& result);
   void _leave(DownloadId download, DownloadLine::Connections connections, bool hasFailed);
-  void _release(DownloadId download);
+  void _release(const Waiter& waiter);
   // Of one that is under way and that nobody wants.
   void _limit(Pending& pending);
+  // Of the same. Who asks for its URL from here on begins a new download.
+  void _cancel(DownloadId download);
+  void _unlist(DownloadId download);
+  void _react(std::vector<Reaction> reactions, const ZLKFuture<Image>& image);
   void _drop(DownloadId download);
   void _forget(DownloadId download);
   Image _imageOf(const Fetch& fetch, const URLResult& result);
@@ -99,8 +118,9 @@ class ImageFetcher final : public std::enable_shared_from_this<ImageFetcher> {
 
   // Queue state.
   std::map<DownloadId, Pending> pendingRequests_ ZK_ON(queue_);
-  std::map<std::string, DownloadId> byURL_ ZK_ON(queue_);
+  std::map<std::string, DownloadId> byURL_ ZK_ON(queue_);  // without what is cancelled
   DownloadId lastDownload_ ZK_ON(queue_) = 0;
+  WaiterId lastWaiter_ ZK_ON(queue_) = 0;
   DownloadLine line_ ZK_ON(queue_);
 };
 

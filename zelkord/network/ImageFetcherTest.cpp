@@ -32,8 +32,8 @@ class ImageFetcherTest : public testing::Test {
   ImageFetcher::Ticket ask(const std::string& url, const std::string& holder = "pid 1") {
     return assembly_.imageFetcher()->fetchImageData(url, 7s, {}, holder);
   }
-  void release(std::vector<ImageFetcher::DownloadId> downloads) {
-    assembly_.imageFetcher()->release(std::move(downloads));
+  void release(std::vector<ImageFetcher::Waiter> waiters) {
+    assembly_.imageFetcher()->release(std::move(waiters));
     fakes_.timeline.runUntilIdle();
   }
   static std::string numbered(const std::string& host, std::size_t number) {
@@ -259,10 +259,9 @@ TEST_F(ImageFetcherTest, NeitherAHostNorWhoAsksTakesAllPlaces) {
 }
 
 TEST_F(ImageFetcherTest, DropsWhatNobodyWaitsForAndHasNotBegun) {
-  std::vector<ImageFetcher::DownloadId> left;
+  std::vector<ImageFetcher::Waiter> left;
   const auto first = ask(numbered("stalled.example", 0));
-  for (std::size_t i = 1; i < 1000; ++i)
-    left.push_back(ask(numbered("stalled.example", i)).download);
+  for (std::size_t i = 1; i < 1000; ++i) left.push_back(ask(numbered("stalled.example", i)).waiter);
   const auto shared = ask(numbered("stalled.example", 999), "pid 2");
   const auto begun = session().tasks().size();
   release(std::move(left));
@@ -286,8 +285,10 @@ TEST_F(ImageFetcherTest, DropsWhatNobodyWaitsForAndHasNotBegun) {
 TEST_F(ImageFetcherTest, WhatNobodyWaitsForHasTheTimeOutToEnd) {
   const auto slow = ask(kImageURL);
   const auto wantedAgain = ask(numbered("img.example", 1));
-  release({slow.download, wantedAgain.download, slow.download});
-  fakes_.timeline.advance(6s);
+  release({slow.waiter, wantedAgain.waiter, slow.waiter});
+  fakes_.timeline.advance(4s);
+  release({ask(kImageURL).waiter});  // gives it no more time
+  fakes_.timeline.advance(2s);
   EXPECT_FALSE(ask(numbered("img.example", 1)).image.isFulfilled());
   EXPECT_EQ(session().pending().size(), 2u);
   fakes_.timeline.advance(1s);
@@ -296,6 +297,38 @@ TEST_F(ImageFetcherTest, WhatNobodyWaitsForHasTheTimeOutToEnd) {
   fakes_.timeline.advance(60s);
   answer(200, "bytes");
   EXPECT_EQ(wantedAgain.image.get(), Data("bytes"));
+}
+
+TEST_F(ImageFetcherTest, HoldsNothingOfThoseWhoWaitNoMore) {
+  const auto stays = ask(kImageURL);
+  const auto held = std::make_shared<int>();
+  std::vector<Image> reactions;
+  const auto react = [&reactions, held](const Image& image) { reactions.push_back(image); };
+  assembly_.imageFetcher()->await(stays, react);
+  const auto once = held.use_count();
+  for (int i = 0; i < 100; ++i) {
+    const auto leaves = ask(kImageURL);
+    assembly_.imageFetcher()->await(leaves, react);
+    release({leaves.waiter});
+    assembly_.imageFetcher()->await(leaves, react);  // too late
+  }
+  EXPECT_EQ(held.use_count(), once);
+  answer(200, "bytes");
+  assembly_.imageFetcher()->await(stays, react);
+  fakes_.timeline.runUntilIdle();
+  EXPECT_THAT(reactions, testing::ElementsAre(Data("bytes"), Data("bytes")));
+}
+
+TEST_F(ImageFetcherTest, WhatIsCancelledIsSharedWithNobody) {
+  const auto slow = ask(kImageURL);
+  release({slow.waiter});
+  std::optional<ZLKFuture<Image>> late;
+  slow.image.then([&](const Image&) { late = fetch(); });  // not known to have ended yet
+  fakes_.timeline.advance(7s);
+  ASSERT_TRUE(late);
+  answer(200, "bytes");
+  EXPECT_EQ(late->get(), Data("bytes"));
+  EXPECT_TRUE(fakes_.transactions.openNames().empty());
 }
 
 TEST_F(ImageFetcherTest, LeavesNobodyWaitingWhenItIsGone) {

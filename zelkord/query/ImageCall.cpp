@@ -65,36 +65,35 @@ bool ImageCall::ask() {
   const auto self = shared_from_this();  // the end may let go of it
   if (_isGivenUp()) return false;
   const auto end = std::min(urls_.size(), next_ + kAskedAtOnce);
-  while (next_ < end) _ask(urls_[next_++]);
+  while (next_ < end) _ask(next_++);
   if (end < urls_.size()) return true;
   _arrived();
   if (order_.deadline <= assembly_.platform().clock.realNow()) _end(Answer::Given);
   return false;
 }
 
-void ImageCall::_ask(const std::string& url) {
+void ImageCall::_ask(std::size_t place) {
   auto* fetcher = assembly_.imageFetcher();
-  const auto ticket = fetcher->fetchImageData(url, bag_->timeoutIntervalForRequest(),
+  const auto ticket = fetcher->fetchImageData(urls_[place], bag_->timeoutIntervalForRequest(),
                                               acceptsRedirect_, order_.holder);
   if (const auto* image = ticket.image.find()) {
-    if (*image) arrived_.add(url, **image);
+    if (*image) arrived_.add(urls_[place], **image);
     return;
   }
-  if (!_expect(ticket.download)) return fetcher->release({ticket.download});
-  auto& queue = assembly_.platform().queues.global(QualityOfService::High);
-  ticket.image.then([weak = weak_from_this(), url, &queue](const ImageFetcher::Image& image) {
+  if (!_expect(ticket.waiter)) return fetcher->release({ticket.waiter});
+  fetcher->await(ticket, [weak = weak_from_this(), place](const ImageFetcher::Image& image) {
     const auto self = weak.lock();
     if (!self) return;
-    if (image) self->arrived_.add(url, *image);
-    queue.async([self] { self->_arrived(); });
+    if (image) self->arrived_.add(self->urls_[place], *image);
+    self->_arrived();
   });
 }
 
-bool ImageCall::_expect(ImageFetcher::DownloadId download) {
+bool ImageCall::_expect(ImageFetcher::Waiter waiter) {
   const MutexLock lock(mutex_);
   if (over_) return false;
   ++outstanding_;
-  downloads_.push_back(download);
+  waiters_.push_back(waiter);
   return true;
 }
 
@@ -120,7 +119,7 @@ void ImageCall::giveUp() {
 }
 
 void ImageCall::_end(Answer answer) {
-  std::vector<ImageFetcher::DownloadId> downloads;
+  std::vector<ImageFetcher::Waiter> waiters;
   Completion completion;
   Subscription timer;  // holds this object
   {
@@ -128,10 +127,10 @@ void ImageCall::_end(Answer answer) {
     if (over_) return;
     over_ = true;
     timer = std::move(timer_);
-    downloads = std::move(downloads_);
+    waiters = std::move(waiters_);
     completion = std::move(completion_);
   }
-  assembly_.imageFetcher()->release(std::move(downloads));
+  assembly_.imageFetcher()->release(std::move(waiters));
   if (answer == Answer::Given) completion(_loaded());
 }
 

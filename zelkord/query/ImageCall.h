@@ -60,9 +60,9 @@ class ImageCall final : public std::enable_shared_from_this<ImageCall> {
             Completion completion);
   static ArrivedImages::Order _placesOf(const ImageOrder& order, const ZLKBag& bag);
   void _start();
-  void _ask(const std::string& url);
+  void _ask(std::size_t place);
   // Whether the call still counts on what it asks for.
-  bool _expect(ImageFetcher::DownloadId download);
+  bool _expect(ImageFetcher::Waiter waiter);
   void _arrived();
   bool _isGivenUp();
   void _end(Answer answer);
@@ -75,7 +75,7 @@ class ImageCall final : public std::enable_shared_from_this<ImageCall> {
   const std::shared_ptr<const ZLKBag> bag_;
   ArrivedImages arrived_;
 
-  // Of who asks.
+  // Of who asks; the URLs are fixed before the first `ask`.
   std::vector<std::string> urls_;
   std::size_t next_ = 0;
   ImageFetcher::RedirectRule acceptsRedirect_;
@@ -84,7 +84,7 @@ class ImageCall final : public std::enable_shared_from_this<ImageCall> {
   std::size_t outstanding_ ZK_GUARDED_BY(mutex_) = 1;  // the asking itself counts as one
   bool over_ ZK_GUARDED_BY(mutex_) = false;
   bool givenUp_ ZK_GUARDED_BY(mutex_) = false;
-  std::vector<ImageFetcher::DownloadId> downloads_ ZK_GUARDED_BY(mutex_);
+  std::vector<ImageFetcher::Waiter> waiters_ ZK_GUARDED_BY(mutex_);
   Completion completion_ ZK_GUARDED_BY(mutex_);
   Subscription timer_ ZK_GUARDED_BY(mutex_);
 };
