@@ -1,5 +1,6 @@
 #pragma once
 
+#include <functional>
 #include <map>
 #include <string>
 
@@ -11,7 +12,11 @@ namespace zelkord {
 // Keeps by URL what is stored, and nothing by itself. Threading: any thread.
 class FakeURLCache final : public URLCache {
  public:
+  // Called in `lookup`, on its thread: may take its time. Set while nothing looks anything up.
+  void setOnLookup(std::function<void()> handler) { onLookup_ = std::move(handler); }
+
   std::optional<CachedResponse> lookup(const URLRequest& request) override {
+    if (onLookup_) onLookup_();
     const MutexLock lock(mutex_);
     const auto found = kept_.find(request.url);
     return found == kept_.end() ? std::nullopt : std::optional(found->second);
@@ -26,6 +31,7 @@ class FakeURLCache final : public URLCache {
   }
 
  private:
+  std::function<void()> onLookup_;
   mutable Mutex mutex_;
   std::map<std::string, CachedResponse> kept_ ZK_GUARDED_BY(mutex_);
 };

@@ -84,13 +84,10 @@ void EndpointConnection::_loadImages(const ipc::Call& call) {
   auto share = imageCalls_->take(holder_);
   if (!share) return call.reply->fail(ipc::kLimitsExceeded, "too many calls for images");
   const auto timeout = durationOfMilliseconds(*call.arguments.at(1).get<std::uint64_t>());
-  imagesQueue_->async([self = shared_from_this(), answer = _imageAnswer(call, *std::move(share)),
-                       order = ImageOrder{.descriptors = std::get<std::vector<ImageDescriptor>>(
-                                              std::move(descriptors)),
-                                          .deadline = deadlineAfter(received, timeout),
-                                          .holder = holder_}]() mutable {
-    self->_beginImages(std::move(order), std::move(answer));
-  });
+  _beginImages({.descriptors = std::get<std::vector<ImageDescriptor>>(std::move(descriptors)),
+                .deadline = deadlineAfter(received, timeout),
+                .holder = holder_},
+               _imageAnswer(call, *std::move(share)));
 }
 
 ImageCall::Completion EndpointConnection::_imageAnswer(const ipc::Call& call, Budget::Share share) {
@@ -110,8 +107,9 @@ void EndpointConnection::_beginImages(ImageOrder order, ImageCall::Completion co
 }
 
 void EndpointConnection::_askForImages(const std::shared_ptr<ImageCall>& call) {
-  if (!call->ask()) return;
-  imagesQueue_->async([self = shared_from_this(), call] { self->_askForImages(call); });
+  imagesQueue_->async([self = shared_from_this(), call] {
+    if (call->ask()) self->_askForImages(call);
+  });
 }
 
 bool EndpointConnection::_remember(const std::shared_ptr<ImageCall>& call) {

@@ -20,7 +20,8 @@ class ClientStateManager;
 // seconds without a message or a call under way.
 //
 // Threading: on the connection's queue. Calls for images ask on a queue of their own, a few images
-// each in turn, so that none waits for another one. The connection's end gives all of them up.
+// each in turn, so that none waits for another one; what blocks that queue delays no call's
+// deadline. The connection's end gives all of them up.
 // Errors: wrong arguments are answered with a D-Bus error, a call for images beyond the client
 // process's share with LimitsExceeded.
 class EndpointConnection final : public ipc::CallHandler,

@@ -103,6 +103,24 @@ TEST_F(EndpointImagesTest, EachCallCountsItsOwnTimeFromReceipt) {
   }
 }
 
+TEST_F(EndpointImagesTest, ALookUpThatTakesItsTimeDelaysNoDeadline) {
+  const auto client = connect();
+  auto& timeline = bed_.fakes.timeline;
+  const auto never = timeline.makeSemaphore(0);
+  bed_.urlSession().cache()->setOnLookup([&never] { never->wait(2s); });
+  const auto first = ask(client, {image("a")}, 300);
+  const auto second = ask(client, {image("b")}, 500);
+  std::vector<bool> answered;
+  std::vector<Subscription> looks;
+  for (const auto moment : {299ms, 301ms, 499ms, 501ms}) {
+    looks.push_back(timeline.global(QualityOfService::Default).after(moment, [&] {
+      answered.push_back(answered.size() < 2 ? first->answered : second->answered);
+    }));
+  }
+  timeline.advance(5s);
+  EXPECT_THAT(answered, testing::ElementsAre(false, true, false, true));
+}
+
 TEST_F(EndpointImagesTest, RefusesWhatAProcessAsksBeyondItsShare) {
   const auto client = connect();
   std::vector<DaemonBed::Answer> waiting;
