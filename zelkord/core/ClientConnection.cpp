@@ -118,6 +118,7 @@ void ClientConnection::_refuse(const ipc::Call& call, const WireFault& fault) {
 void ClientConnection::configure(ZLKSessionConfiguration configuration, const ipc::Call& call) {
   assembly_.log(Category::Connection)
       .notice("client configuration {}", configuration.description());
+  if (!_fits(configuration)) return call.reply->fail(ipc::kLimitsExceeded, "too many clients");
   configuration_.set(std::move(configuration));
   _ensureState();
   const auto state = state_.get();
@@ -125,6 +126,15 @@ void ClientConnection::configure(ZLKSessionConfiguration configuration, const ip
   state->adoptUserAgent(userAgent_.get());
   call.reply->send({clientStateManager_.endpoint()});
   bagTeller_->clientConfigured(state, userAgent_.get());
+}
+
+bool ClientConnection::_fits(const ZLKSessionConfiguration& configuration) const {
+  const auto bound = state_.get();
+  const auto userAgent =
+      createUserAgentString(configuration.userAgent, assembly_.platform().device);
+  if (configuration.identifier.empty() || !userAgent) return true;  // refused, or without effect
+  return clientStateManager_.admit(bound ? bound->identifier() : configuration.identifier,
+                                   *userAgent, peer().pid);
 }
 
 void ClientConnection::_refuseConfiguration() {

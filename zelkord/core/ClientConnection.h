@@ -34,8 +34,9 @@ class ClientStateManager;
 // bag does so on a queue of its own, and what comes meanwhile waits behind it there, in order; only
 // `Configure` goes ahead. `currentQueryId`, the configuration and the state are read from others
 // too. Ownership: the transport owns it through
-// the connection; calls under way hold it. Errors: wrong arguments are answered with a D-Bus error;
-// of an unbound connection queries are dropped.
+// the connection; calls under way hold it. Errors: wrong arguments, and a configuration for
+// which there is no room among all clients, are answered with a D-Bus error; of an unbound
+// connection queries are dropped.
 class ClientConnection final : public ipc::CallHandler,
                                public std::enable_shared_from_this<ClientConnection> {
  public:
@@ -90,6 +91,8 @@ class ClientConnection final : public ipc::CallHandler,
   void _handleReportEventData(const ipc::Call& call);
   void _handleDaemonCall(const ipc::Call& call);
   void _refuse(const ipc::Call& call, const WireFault& fault);
+  // Makes the state of that configuration, if it is to have one; false when there is no room for it.
+  bool _fits(const ZLKSessionConfiguration& configuration) const;
   void _ensureState();
   void _refuseConfiguration();
   void _fillMissing(ZLKRequest& request);

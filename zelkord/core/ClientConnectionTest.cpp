@@ -120,6 +120,48 @@ TEST_F(ClientConnectionTest, AnInvalidLaterConfigurationIsAnsweredAndKeepsTheSta
   EXPECT_EQ(client->state(), ipc::FakeClient::State::Open);
 }
 
+TEST_F(ClientConnectionTest, RefusesWhatAProcessConfiguresBeyondItsShare) {
+  const std::string longest(65'536, 'x');
+  const struct {
+    const char* counter;
+    std::size_t states;
+    std::string suffix;
+  } cases[] = {{"client_states", 1024, ""}, {"client_state_bytes", 62, longest.substr(7)}};
+  for (const auto& [counter, states, suffix] : cases) {
+    SCOPED_TRACE(counter);
+    DaemonBed bed;
+    const auto agent = suffix.empty() ? "A/1" : longest;
+    for (std::size_t i = 0; i < states; ++i) {
+      const auto client = bed.connect(1);
+      ASSERT_TRUE(bed.configure(client, std::to_string(1000 + i) + suffix, agent)->succeeded());
+      client->disconnect();
+      bed.run();
+    }
+    const auto client = bed.connect(1);
+    EXPECT_EQ(bed.configure(client, "further" + suffix, agent)->errorName, ipc::kLimitsExceeded);
+    EXPECT_EQ(bed.fakes.counters.all()[std::string("com.quenta.zelkord.limit.") + counter], 1);
+    EXPECT_FALSE(bed.daemon.assembly().clientStateManager()->configuredState("further" + suffix));
+    // The connection goes on; known clients and other processes, too.
+    EXPECT_TRUE(bed.configure(client, "1000" + suffix, agent)->succeeded());
+    EXPECT_TRUE(bed.configure(bed.connect(2), "further" + suffix, agent)->succeeded());
+    EXPECT_EQ(bed.daemon.assembly().clientStateManager()->states().size(), states + 1);
+  }
+}
+
+TEST_F(ClientConnectionTest, AUserAgentThatGrowsCountsForWhoConfiguresIt) {
+  const std::string longest(65'536, 'x');
+  std::size_t fit = 0;
+  for (int i = 0; i < 200; ++i) {
+    const auto client = bed_.connectAndConfigure("client " + std::to_string(i), 1);
+    if (bed_.configure(client, "client " + std::to_string(i), longest)->succeeded()) ++fit;
+    client->disconnect();
+    bed_.run();
+  }
+  EXPECT_GT(fit, 50u);
+  EXPECT_LT(fit, 128u);
+  EXPECT_TRUE(bed_.configure(bed_.connect(2), "client 199", longest)->succeeded());
+}
+
 TEST_F(ClientConnectionTest, AnswersOnlyTheNewestSearch) {
   bed_.installBag(kServedBag);
   const auto client = bed_.connectAndConfigure();

@@ -10,13 +10,29 @@ namespace zelkord {
 namespace {
 
 constexpr std::string_view kSessionsKey = "sessions";
+constexpr const char* kOwnHolder = "zelkord";  // who has the states that an earlier process saved
+
+constexpr std::uint64_t kMostStates = 4096;
+constexpr std::uint64_t kMostStateBytes = 128u << 20;
+constexpr std::uint64_t kMostCacheBytes = 64u << 20;
+
+// A state with its queues and observers; its texts, each kept in several places.
+std::uint64_t costOf(const std::string& identifier, std::size_t userAgentSize) {
+  constexpr std::uint64_t kFixed = 16u << 10;
+  constexpr std::uint64_t kBytesOfAByte = 4;
+  return kFixed + kBytesOfAByte * (identifier.size() + userAgentSize);
+}
 
 }  // namespace
 
 ClientStateManager::ClientStateManager(Assembly& assembly)
     : assembly_(assembly),
       stateCacheQueue_(assembly.platform().queues.makeSerialQueue("com.quenta.zelkord.stateCache")),
-      persistSessions_(boolSetting(assembly.userDefaults(), "ZLKPersistSessions")) {}
+      persistSessions_(boolSetting(assembly.userDefaults(), "ZLKPersistSessions")),
+      counts_("client_states", Budget::quartered(kMostStates), assembly.limits()),
+      bytes_("client_state_bytes", Budget::quartered(kMostStateBytes), assembly.limits()),
+      cacheBytes_(std::make_shared<Budget>("query_cache_bytes", Budget::quartered(kMostCacheBytes),
+                                           assembly.limits())) {}
 
 ClientStateManager::~ClientStateManager() = default;
 
@@ -42,11 +58,41 @@ std::shared_ptr<ClientState> ClientStateManager::stateForClientIdentifier(
   std::shared_ptr<ClientState> state;
   stateCacheQueue_->sync([&] {
     stateCacheQueue_->assertCurrent();
-    auto& place = stateCache_[identifier];
-    if (!place) place = std::make_shared<ClientState>(identifier, assembly_);
-    state = place;
+    state = _place(identifier, 0, kOwnHolder);
   });
-  assembly_.log(Category::Session).info("using client state: {}", identifier);
+  if (state) assembly_.log(Category::Session).info("using client state: {}", identifier);
+  return state;
+}
+
+bool ClientStateManager::admit(const std::string& identifier, const std::string& userAgent,
+                               std::int64_t process) {
+  bool fits = false;
+  stateCacheQueue_->sync([&] {
+    stateCacheQueue_->assertCurrent();
+    fits = _place(identifier, userAgent.size(), processHolder(process)) != nullptr;
+  });
+  return fits;
+}
+
+std::shared_ptr<ClientState> ClientStateManager::_place(const std::string& identifier,
+                                                        std::size_t userAgentSize,
+                                                        const std::string& holder) {
+  stateCacheQueue_->assertCurrent();
+  const auto found = stateCache_.find(identifier);
+  const auto cost = costOf(identifier, userAgentSize);
+  if (found != stateCache_.end() && found->second.bytes.amount() >= cost) {
+    return found->second.state;
+  }
+  auto bytes = bytes_.take(holder, cost);
+  if (!bytes) return nullptr;
+  if (found != stateCache_.end()) {
+    found->second.bytes = *std::move(bytes);
+    return found->second.state;
+  }
+  auto count = counts_.take(holder);
+  if (!count) return nullptr;
+  auto state = std::make_shared<ClientState>(identifier, assembly_, cacheBytes_);
+  stateCache_.emplace(identifier, Place{state, *std::move(count), *std::move(bytes)});
   return state;
 }
 
@@ -62,7 +108,9 @@ std::shared_ptr<ClientState> ClientStateManager::configuredState(const std::stri
   stateCacheQueue_->sync([&] {
     stateCacheQueue_->assertCurrent();
     const auto found = stateCache_.find(identifier);
-    if (found != stateCache_.end() && found->second->configuration()) state = found->second;
+    if (found != stateCache_.end() && found->second.state->configuration()) {
+      state = found->second.state;
+    }
   });
   if (state) assembly_.log(Category::Session).info("using client state: {}", identifier);
   return state;
@@ -78,9 +126,9 @@ void ClientStateManager::loadState() {
     const auto* fields = entry.if_object();
     const auto identifier = fields ? stringIn(*fields, "identifier") : std::nullopt;
     if (!identifier || identifier->empty()) continue;
-    auto state = std::make_shared<ClientState>(*identifier, assembly_);
-    state->setUserAgent(stringIn(*fields, "agent"));
-    stateCache_[*identifier] = std::move(state);
+    auto userAgent = stringIn(*fields, "agent");
+    const auto state = _place(*identifier, userAgent ? userAgent->size() : 0, kOwnHolder);
+    if (state) state->setUserAgent(std::move(userAgent));
   }
 }
 
@@ -120,8 +168,8 @@ std::vector<ipc::StringMap> ClientStateManager::sessions() {
 std::vector<ipc::StringMap> ClientStateManager::_sessions() const {
   stateCacheQueue_->assertCurrent();
   std::vector<ipc::StringMap> sessions;
-  for (const auto& [identifier, state] : stateCache_) {
-    const auto agent = state->userAgent();
+  for (const auto& [identifier, place] : stateCache_) {
+    const auto agent = place.state->userAgent();
     if (agent) sessions.push_back({{"identifier", identifier}, {"agent", *agent}});
   }
   return sessions;
@@ -131,7 +179,7 @@ std::vector<std::shared_ptr<ClientState>> ClientStateManager::states() {
   std::vector<std::shared_ptr<ClientState>> states;
   stateCacheQueue_->sync([&] {
     stateCacheQueue_->assertCurrent();
-    for (const auto& [identifier, state] : stateCache_) states.push_back(state);
+    for (const auto& [identifier, place] : stateCache_) states.push_back(place.state);
   });
   return states;
 }

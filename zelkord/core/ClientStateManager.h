@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "corezelkor/Messages.h"
+#include "platform/api/Budget.h"
 #include "platform/api/Interprocess.h"
 #include "platform/api/WorkQueues.h"
 #include "zelkord/query/ClientState.h"
@@ -19,7 +20,8 @@ class EndpointListener;
 
 // All client states by client identifier; what one is made for, it is made once and kept. With the
 // setting "ZLKPersistSessions" the clients' identifiers and user agents survive the process
-// (setting "sessions").
+// (setting "sessions"). As none is ever given up, how many a process has made, and how much they
+// hold, is bounded.
 //
 // Also owns the endpoint: a private socket through which clients ask without going through their
 // own connection.
@@ -34,7 +36,12 @@ class ClientStateManager final : public std::enable_shared_from_this<ClientState
   // Opens the endpoint and loads the known clients. Right after construction.
   void start();
 
-  // The state of that client, made when there is none; null for an empty identifier.
+  // Makes room for that user agent in the state of that client, which is made when there is none.
+  // False when there is none in that process's share: nothing has changed then. Requires texts
+  // that are not empty.
+  bool admit(const std::string& identifier, const std::string& userAgent, std::int64_t process);
+  // The state of that client, made for the daemon itself when there is none; null for an empty
+  // identifier and without room.
   std::shared_ptr<ClientState> stateForClientIdentifier(const std::string& identifier);
   // The state of that client if some connection has configured it, else null.
   std::shared_ptr<ClientState> configuredState(const std::string& identifier);
@@ -58,7 +65,17 @@ class ClientStateManager final : public std::enable_shared_from_this<ClientState
   std::shared_ptr<ImageCall> loadImages(ImageOrder order, ImageCall::Completion completion);
 
  private:
-  using States = std::map<std::string, std::shared_ptr<ClientState>>;
+  // A state and what it takes, with the longest user agent that it has had.
+  struct Place {
+    std::shared_ptr<ClientState> state;
+    Budget::Share count;
+    Budget::Share bytes;
+  };
+  using States = std::map<std::string, Place>;
+
+  // The state, made when there is none; null when there is no room for it or its user agent.
+  std::shared_ptr<ClientState> _place(const std::string& identifier, std::size_t userAgentSize,
+                                      const std::string& holder);
   // False, after a log line, for an empty identifier.
   bool _isUsable(const std::string& identifier) const;
   void loadState();
@@ -74,6 +91,9 @@ class ClientStateManager final : public std::enable_shared_from_this<ClientState
 
   // Own synchronisation.
   std::atomic<bool> saveIsDue_ = false;
+  Budget counts_;
+  Budget bytes_;
+  const std::shared_ptr<Budget> cacheBytes_;
 
   // Queue state.
   States stateCache_ ZK_ON(stateCacheQueue_);

@@ -118,6 +118,21 @@ TEST(ClientStateManagerTest, RemembersClientsOnlyWhenToldTo) {
   }
 }
 
+TEST(ClientStateManagerTest, RestoresOnlySoManyClients) {
+  FakePlatform fakes;
+  fakes.settings.set("ZLKPersistSessions", true);
+  json::array sessions;
+  for (int i = 0; i < 2000; ++i)
+    sessions.push_back(json::object{{"identifier", std::to_string(i)}});
+  fakes.settings.set("sessions", sessions);
+  Daemon daemon(fakes.platform());
+  daemon.start();
+  fakes.timeline.runUntilIdle();
+  auto& manager = *daemon.assembly().clientStateManager();
+  EXPECT_EQ(manager.states().size(), 1024u);
+  EXPECT_TRUE(manager.admit("lanthe", "Lanthe/9", 1));
+}
+
 TEST(EndpointTest, AdmitsTenAtATimeAndLetsTheNextWaitShortly) {
   DaemonBed bed;
   const auto address = bed.daemon.assembly().clientStateManager()->endpoint();

@@ -27,7 +27,8 @@ constexpr Duration kConnectionStaysWarm = 30s;
 
 }  // namespace
 
-ClientState::ClientState(std::string identifier, Assembly& assembly)
+ClientState::ClientState(std::string identifier, Assembly& assembly,
+                         std::shared_ptr<Budget> cacheBytes)
     : assembly_(assembly),
       identifier_(std::move(identifier)),
       clientShortName_(zelkord::clientShortName(identifier_)),
@@ -35,7 +36,7 @@ ClientState::ClientState(std::string identifier, Assembly& assembly)
   if (boolSetting(assembly.userDefaults(), "ZLKNoQueryCache")) {
     assembly.log(Category::Caching).info("query cache OFF for {}", identifier_);
   } else {
-    queryCache_ = std::make_shared<QueryCache>(assembly);
+    queryCache_ = std::make_shared<QueryCache>(assembly, std::move(cacheBytes));
     queryCache_->start();
     assembly.log(Category::Caching).debug("query cache ON for {}", identifier_);
   }
@@ -52,6 +53,11 @@ ClientState::ClientState(std::string identifier, Assembly& assembly)
 }
 
 ClientState::~ClientState() = default;
+
+void ClientState::setProcess(std::int64_t process) {
+  process_ = process;
+  if (queryCache_) queryCache_->setHolder(processHolder(process));
+}
 
 std::optional<std::string> ClientState::userAgent() const {
   const MutexLock lock(viewMutex_);

@@ -13,6 +13,7 @@
 #include "corezelkor/Messages.h"
 #include "corezelkor/ZLKBag.h"
 #include "halvane/Feedback.h"
+#include "platform/api/Budget.h"
 #include "platform/api/NotificationCenter.h"
 #include "platform/api/WorkQueues.h"
 #include "zelkord/network/FieldMask.h"
@@ -39,7 +40,9 @@ using BagCallback =
 // (the service's answer), or the task's error.
 class ClientState final : public std::enable_shared_from_this<ClientState> {
  public:
-  ClientState(std::string identifier, Assembly& assembly);
+  // `cacheBytes`: of all states' query caches, as there.
+  ClientState(std::string identifier, Assembly& assembly,
+              std::shared_ptr<Budget> cacheBytes = nullptr);
   ~ClientState();
 
   const std::string& identifier() const { return identifier_; }
@@ -50,7 +53,7 @@ class ClientState final : public std::enable_shared_from_this<ClientState> {
   }
   // Of whoever configured it last; 0 before.
   std::int64_t process() const { return process_.load(); }
-  void setProcess(std::int64_t process) { process_ = process; }
+  void setProcess(std::int64_t process);
   std::optional<std::string> userAgent() const;
   // For a state that has no bag yet; later ones are adopted.
   void setUserAgent(std::optional<std::string> userAgent);

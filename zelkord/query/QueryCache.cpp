@@ -52,9 +52,10 @@ bool scoresHigher(const CachedResultSet& entry, const CachedResultSet& than) {
 
 }  // namespace
 
-QueryCache::QueryCache(Assembly& assembly)
+QueryCache::QueryCache(Assembly& assembly, std::shared_ptr<Budget> bytes)
     : assembly_(assembly),
-      queue_(assembly.platform().queues.makeSerialQueue("com.quenta.zelkor.queryCache")) {}
+      queue_(assembly.platform().queues.makeSerialQueue("com.quenta.zelkor.queryCache")),
+      bytes_(std::move(bytes)) {}
 
 QueryCache::~QueryCache() = default;
 
@@ -104,10 +105,26 @@ void QueryCache::_store(const CachedResultSet::Pointer& resultSet) {
     log.info("!!! exceeded max cost, flushing cache !!!");
     _clearCache();
   }
+  if (!_takeRoom(charge)) return;
   // A replaced entry's charge stays: the total goes down only when everything goes.
   currentCost_ += charge;
   tree_.setObject(resultSet, resultSet->query());
   if (tree_.count() == 1) _didBecomeNonEmpty();
+}
+
+bool QueryCache::_takeRoom(std::uint64_t charge) {
+  queue_->assertCurrent();
+  if (!bytes_) return true;
+  const auto holder = holder_.get();
+  auto share = bytes_->take(holder, charge);
+  if (!share && !shares_.empty()) {
+    assembly_.log(Category::Caching).info("no room among all caches, flushing cache");
+    _clearCache();
+    shares_.clear();  // also when all that it held has expired
+    share = bytes_->take(holder, charge, Budget::Refusal::Silent);
+  }
+  if (share) shares_.push_back(*std::move(share));
+  return share.has_value();
 }
 
 CachedResultSet::Pointer QueryCache::get(const std::string& text) {
@@ -170,6 +187,7 @@ void QueryCache::_clearCache() {
   if (tree_.count() == 0) return;
   tree_.removeAllObjects();
   currentCost_ = 0;
+  shares_.clear();
   _didBecomeEmpty();
 }
 

@@ -19,13 +19,16 @@ class QueryCacheTest : public testing::Test {
     double scale = 0;
   };
   void store(const Entry& entry, std::string body = "[]") {
+    store(*cache_, entry, std::move(body));
+  }
+  void store(QueryCache& cache, const Entry& entry, std::string body = "[]") {
     URLRequest request;
     if (entry.scale > 0) request.headers = {{"X-Quenta-UI-Scale", std::to_string(entry.scale)}};
     const json::object resultSet = {
         {"query", entry.query}, {"completion_score", entry.score}, {"max_age", entry.maxAge}};
     const auto response = std::make_shared<const FetchedResponse>(
         entry.input, request, "uuid", Data(std::move(body)), bed_.fakes.timeline.now());
-    cache_->set(CachedResultSet::Pointer(new CachedResultSet(response, resultSet)));
+    cache.set(CachedResultSet::Pointer(new CachedResultSet(response, resultSet)));
     bed_.fakes.timeline.runUntilIdle();
   }
   std::string found(const std::string& text, double scale = 0) {
@@ -123,6 +126,37 @@ TEST_F(QueryCacheTest, AChargeThatReachesTheLimitEmptiesIt) {
     EXPECT_EQ(cache_->count(), reaches ? 1u : 2u);
   }
   EXPECT_TRUE(bed_.fakes.log.contains("!!! exceeded max cost, flushing cache !!!"));
+}
+
+TEST_F(QueryCacheTest, AllCachesTogetherKeepWithinTheirs) {
+  const auto bytes =
+      std::make_shared<Budget>("bytes", Budget::Size{3'000'000, 2'000'000}, bed_.assembly.limits());
+  std::vector<std::shared_ptr<QueryCache>> caches;
+  for (const auto* holder : {"pid 1", "pid 1", "pid 2"}) {
+    caches.push_back(std::make_shared<QueryCache>(bed_.assembly, bytes));
+    caches.back()->setHolder(holder);
+  }
+  const std::string large(900'000, 'x');
+  store(*caches[0], {"a", "abc"}, large);
+  store(*caches[0], {"b", "bcd"}, large);
+  store(*caches[1], {"a", "abc"}, large);
+  EXPECT_EQ(caches[1]->count(), 0u);  // it has nothing to give
+  store(*caches[2], {"a", "abc"}, large);
+  EXPECT_EQ(caches[2]->count(), 1u);
+  store(*caches[0], {"c", "cde"}, std::string(200'000, 'x'));
+  EXPECT_EQ(caches[0]->count(), 1u);  // emptied for the new one
+  store(*caches[1], {"a", "abc"}, large);
+  EXPECT_EQ(caches[1]->count(), 1u);
+
+  // What has expired gives its room back too.
+  caches[2]->removeAllObjects();
+  store(*caches[2], {"a", "abc", 0, 10}, large);
+  bed_.fakes.timeline.advance(11s);
+  caches[2]->get("a");
+  store(*caches[2], {"b", "bcd"}, std::string(1'500'000, 'x'));
+  EXPECT_EQ(caches[2]->count(), 1u);
+  caches.clear();
+  EXPECT_EQ(bytes->held(), 0u);
 }
 
 TEST_F(QueryCacheTest, AReplacedEntrysChargeStays) {
