@@ -91,7 +91,8 @@ class ClientConnection final : public ipc::CallHandler,
   void _handleReportEventData(const ipc::Call& call);
   void _handleDaemonCall(const ipc::Call& call);
   void _refuse(const ipc::Call& call, const WireFault& fault);
-  // Makes the state of that configuration, if it is to have one; false when there is no room for it.
+  // Makes the state of that configuration, if it is to have one; false when there is no room for
+  // it.
   bool _fits(const ZLKSessionConfiguration& configuration) const;
   void _ensureState();
   void _refuseConfiguration();
