@@ -143,7 +143,8 @@ void FileContainer::_finish(const WaitingRecord& record, bool written) {
   queue_.assertCurrent();
   if (record.fit == RecordFit::TooLarge) {
     services_->reporter.addValue(1, kFileSizeExceeded);
-    _complainOfSize(record);
+    services_->log.error("bytes written ({}) + feedback ({}) exceeds max session size ({})",
+                         record.offset, record.payload, services_->maxFileSize);
   }
   if (!written && record.kind != RecordKind::Feedback) {
     services_->log.error("{}", record.kind == RecordKind::Version ? "Could not write version string"
@@ -151,14 +152,6 @@ void FileContainer::_finish(const WaitingRecord& record, bool written) {
     _closeFile();
   }
   if (record.done) record.done();
-}
-
-// A full session may go on for hours.
-void FileContainer::_complainOfSize(const WaitingRecord& record) {
-  queue_.assertCurrent();
-  if (std::exchange(full_, true)) return;
-  services_->log.error("bytes written ({}) + feedback ({}) exceeds max session size ({})",
-                       record.offset, record.payload, services_->maxFileSize);
 }
 
 void FileContainer::close() {

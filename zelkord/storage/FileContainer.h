@@ -76,7 +76,6 @@ class FileContainer final : public SessionContainer,
   std::unique_ptr<AppendFile> _openFile();
   bool _archiveData(AppendFile* file, std::string_view framed);
   void _complain(const Error& error);
-  void _complainOfSize(const WaitingRecord& record);
   void _finish(const WaitingRecord& record, bool written);
   void _closeFile();
   std::optional<StoredSession> _read();
@@ -96,7 +95,6 @@ class FileContainer final : public SessionContainer,
   std::uint64_t length_ ZK_ON(queue_) = 0;  // of what was written
   RecordBatch writing_ ZK_ON(queue_);
   bool failed_ ZK_ON(queue_) = false;  // and that was logged
-  bool full_ ZK_ON(queue_) = false;    // likewise
 };
 
 }  // namespace zelkord
