@@ -24,7 +24,7 @@ class LockedDatabase final : public Attack {
     const int result = sqlite3_open_v2(path_.c_str(), &opened, SQLITE_OPEN_READWRITE, nullptr);
     const std::unique_ptr<sqlite3, int (*)(sqlite3*)> database(opened, sqlite3_close);
     if (result != SQLITE_OK) return 0;
-    sqlite3_busy_timeout(opened, 1000);
+    sqlite3_busy_timeout(opened, 5000);
     if (sqlite3_exec(opened, "BEGIN EXCLUSIVE", nullptr, nullptr, nullptr) != SQLITE_OK) return 0;
     std::this_thread::sleep_for(1s);
     sqlite3_exec(opened, "ROLLBACK", nullptr, nullptr, nullptr);
