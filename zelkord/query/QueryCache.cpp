@@ -123,8 +123,9 @@ bool QueryCache::_takeRoom(std::uint64_t charge) {
     shares_.clear();  // also when all that it held has expired
     share = bytes_->take(holder, charge, Budget::Refusal::Silent);
   }
-  if (share) shares_.push_back(*std::move(share));
-  return share.has_value();
+  if (!share) return false;
+  shares_.push_back(*std::move(share));
+  return true;
 }
 
 CachedResultSet::Pointer QueryCache::get(const std::string& text) {
