@@ -93,6 +93,7 @@ void BusDoor::close() {
   watch_.reset();
   timeout_.reset();
   callers_.clear();
+  gone_.clear();
   nameRequest_.reset();
   filter_.reset();
   bus_.reset();
@@ -226,8 +227,10 @@ void BusDoor::vanished(const std::string& name) {
   const auto found = callers_.find(name);
   if (found == callers_.end()) return;
   found->second->end();
-  context_.loop.soon([self = self_, key = name] {
-    if (*self) (*self)->callers_.erase(key);
+  gone_.push_back(std::move(found->second));
+  callers_.erase(found);
+  context_.loop.soon([self = self_] {
+    if (*self) (*self)->gone_.clear();
   });
 }
 

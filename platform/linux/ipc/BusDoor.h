@@ -7,6 +7,7 @@
 #include <string>
 #include <unordered_map>
 #include <variant>
+#include <vector>
 
 #include "base/Subscription.h"
 #include "platform/linux/ipc/BusCaller.h"
@@ -65,7 +66,8 @@ class BusDoor final {
   CallFlow& unidentified() { return *unidentified_; }
   void send(MessagePtr message, std::size_t bytes);
   FileHandle openPrivateConnection(Peer peer) { return openPrivate_(peer); }
-  // The name has left the bus; its caller ends once sd-bus is off the stack.
+  // The name has left the bus, or its next call begins anew: its caller ends now, and goes once
+  // sd-bus is off the stack.
   void vanished(const std::string& name);
 
  private:
@@ -97,6 +99,8 @@ class BusDoor final {
   SlotPtr nameRequest_;
   std::function<void(NameAnswer)> nameAnswered_;
   std::unordered_map<std::string, std::unique_ptr<BusCaller>> callers_;
+  // Have ended and answer nothing any more; one of them may be what sd-bus is calling.
+  std::vector<std::unique_ptr<BusCaller>> gone_;
   // For tasks that may run after the end.
   const std::shared_ptr<BusDoor*> self_ = std::make_shared<BusDoor*>(this);
 };
