@@ -85,7 +85,6 @@ TEST_P(DoorsTest, TheHandlerHearsOfEveryMessage) {
 }
 
 TEST_P(DoorsTest, NoncharactersArriveAsReplacementCharacters) {
-  auto client = this->client();
   server_.delegate->onCall = [](const Call& call, const auto&) {
     if (call.member == "Echo") {
       call.reply->send(
@@ -94,6 +93,7 @@ TEST_P(DoorsTest, NoncharactersArriveAsReplacementCharacters) {
       call.reply->fail("com.quenta.zelkord.Error.Refused", "no \xEF\xBF\xBF");
     }
   };
+  auto client = this->client();
   const std::string replaced = "\xEF\xBF\xBD";
   EXPECT_EQ(client.call(kTestInterface, "Echo", "s", ""), "");
   EXPECT_EQ(client.replyText(), "a" + replaced + " " + replaced + " " + replaced + " " + replaced +
