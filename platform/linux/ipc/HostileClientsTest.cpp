@@ -177,10 +177,11 @@ std::size_t openDescriptors() {
 }
 
 class HostileClientsTest : public testing::TestWithParam<Attack> {
- protected:
+ public:
   HostileClientsTest() { limitDescriptors(kFewDescriptors); }
   ~HostileClientsTest() override { ::setrlimit(RLIMIT_NOFILE, &before_); }
 
+ protected:
   const rlimit before_ = [] {
     rlimit limit{};
     ::getrlimit(RLIMIT_NOFILE, &limit);
