@@ -13,7 +13,7 @@ find_program(ZK_SYMBOLIZER NAMES llvm-symbolizer-14 llvm-symbolizer)
 set(ZK_TEST_ENVIRONMENT
   "ASAN_OPTIONS=halt_on_error=1:detect_stack_use_after_return=1:external_symbolizer_path=${ZK_SYMBOLIZER}"
   "UBSAN_OPTIONS=halt_on_error=1:print_stacktrace=1:external_symbolizer_path=${ZK_SYMBOLIZER}"
-  "TSAN_OPTIONS=halt_on_error=1:second_deadlock_stack=1:suppressions=${PROJECT_SOURCE_DIR}/sanitizers/tsan.supp:external_symbolizer_path=${ZK_SYMBOLIZER}")
+  "TSAN_OPTIONS=halt_on_error=1:die_after_fork=0:second_deadlock_stack=1:suppressions=${PROJECT_SOURCE_DIR}/sanitizers/tsan.supp:external_symbolizer_path=${ZK_SYMBOLIZER}")
 
 # Notes what a path links, for check_includes.py: zk_note_links(<path below the repository> <name> <deps> <test deps>)
 function(zk_note_links path name deps test_deps)

@@ -15,6 +15,14 @@ constexpr const char* kOwnHolder = "zelkord";  // who has the states that an ear
 constexpr std::uint64_t kMostStates = 4096;
 constexpr std::uint64_t kMostStateBytes = 128u << 20;
 constexpr std::uint64_t kMostCacheBytes = 64u << 20;
+// As many threads as may wait; one process never leaves the others without any.
+constexpr Budget::Size kBagWaits = {1024, 256, 960};
+
+std::shared_ptr<ClientBudgets> makeClientBudgets(LimitReports& reports) {
+  return std::make_shared<ClientBudgets>(
+      ClientBudgets{Budget("query_cache_bytes", Budget::quartered(kMostCacheBytes), reports),
+                    Budget("bag_waits", kBagWaits, reports)});
+}
 
 // A state with its queues and observers; its texts, each kept in several places.
 std::uint64_t costOf(const std::string& identifier, std::size_t userAgentSize) {
@@ -31,8 +39,7 @@ ClientStateManager::ClientStateManager(Assembly& assembly)
       persistSessions_(boolSetting(assembly.userDefaults(), "ZLKPersistSessions")),
       counts_("client_states", Budget::quartered(kMostStates), assembly.limits()),
       bytes_("client_state_bytes", Budget::quartered(kMostStateBytes), assembly.limits()),
-      cacheBytes_(std::make_shared<Budget>("query_cache_bytes", Budget::quartered(kMostCacheBytes),
-                                           assembly.limits())) {}
+      clientBudgets_(makeClientBudgets(assembly.limits())) {}
 
 ClientStateManager::~ClientStateManager() = default;
 
@@ -91,7 +98,7 @@ std::shared_ptr<ClientState> ClientStateManager::_place(const std::string& ident
   }
   auto count = counts_.take(holder);
   if (!count) return nullptr;
-  auto state = std::make_shared<ClientState>(identifier, assembly_, cacheBytes_);
+  auto state = std::make_shared<ClientState>(identifier, assembly_, clientBudgets_);
   stateCache_.emplace(identifier, Place{state, *std::move(count), *std::move(bytes)});
   return state;
 }

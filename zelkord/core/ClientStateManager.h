@@ -93,7 +93,7 @@ class ClientStateManager final : public std::enable_shared_from_this<ClientState
   std::atomic<bool> saveIsDue_ = false;
   Budget counts_;
   Budget bytes_;
-  const std::shared_ptr<Budget> cacheBytes_;
+  const std::shared_ptr<ClientBudgets> clientBudgets_;
 
   // Queue state.
   States stateCache_ ZK_ON(stateCacheQueue_);

@@ -28,15 +28,17 @@ constexpr Duration kConnectionStaysWarm = 30s;
 }  // namespace
 
 ClientState::ClientState(std::string identifier, Assembly& assembly,
-                         std::shared_ptr<Budget> cacheBytes)
+                         std::shared_ptr<ClientBudgets> budgets)
     : assembly_(assembly),
       identifier_(std::move(identifier)),
       clientShortName_(zelkord::clientShortName(identifier_)),
+      budgets_(std::move(budgets)),
       bagFetchSemaphore_(assembly.platform().queues.makeSemaphore(0)) {
   if (boolSetting(assembly.userDefaults(), "ZLKNoQueryCache")) {
     assembly.log(Category::Caching).info("query cache OFF for {}", identifier_);
   } else {
-    queryCache_ = std::make_shared<QueryCache>(assembly, std::move(cacheBytes));
+    queryCache_ = std::make_shared<QueryCache>(
+        assembly, budgets_ ? std::shared_ptr<Budget>(budgets_, &budgets_->cacheBytes) : nullptr);
     queryCache_->start();
     assembly.log(Category::Caching).debug("query cache ON for {}", identifier_);
   }
@@ -104,12 +106,19 @@ bool ClientState::_ensureBag() {
   assembly_.log(Category::Caching).info("Warming bag cache for agent: {}", *userAgent);
   if (_adoptFirstBag(assembly_.bagController()->currentBag())) return true;
   _markNetworkRequest();
+  _waitForBag();
+  return currentBag() != nullptr;
+}
+
+void ClientState::_waitForBag() {
+  const auto share = budgets_ ? budgets_->bagWaits.take(processHolder(process()))
+                              : std::make_optional<Budget::Share>();
+  if (!share) return;
   // Counted before the last look at the bag, so that a change after it raises the semaphore for
   // this thread too.
   ++bagWaiters_;
   if (!currentBag()) bagFetchSemaphore_->wait(kBagWait);
   --bagWaiters_;
-  return currentBag() != nullptr;
 }
 
 void ClientState::_observeBagChanges() {

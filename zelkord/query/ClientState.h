@@ -25,6 +25,12 @@ class QueryCache;
 class SessionManager;
 class UserGUIDSource;
 
+// What all clients' states share a bounded amount of.
+struct ClientBudgets {
+  Budget cacheBytes;  // as QueryCache
+  Budget bagWaits;    // waits for a bag, each of which keeps a thread
+};
+
 using ReplyCallback = std::function<void(std::int64_t queryId, std::optional<ZLKReply> reply,
                                          std::optional<Error> error)>;
 using BagCallback =
@@ -40,9 +46,9 @@ using BagCallback =
 // (the service's answer), or the task's error.
 class ClientState final : public std::enable_shared_from_this<ClientState> {
  public:
-  // `cacheBytes`: of all states' query caches, as there.
+  // `budgets`: of all states. Null: unbounded.
   ClientState(std::string identifier, Assembly& assembly,
-              std::shared_ptr<Budget> cacheBytes = nullptr);
+              std::shared_ptr<ClientBudgets> budgets = nullptr);
   ~ClientState();
 
   const std::string& identifier() const { return identifier_; }
@@ -86,7 +92,8 @@ class ClientState final : public std::enable_shared_from_this<ClientState> {
 
   // What the flows share.
 
-  // Whether there is a bag, waiting for one for at most a second.
+  // Whether there is a bag, waiting for one for at most a second; not at all beyond the process's
+  // share of such waits.
   bool _ensureBag();
   void _markNetworkRequest();
   void _setPerformedSearch();
@@ -106,6 +113,7 @@ class ClientState final : public std::enable_shared_from_this<ClientState> {
   void _start(std::shared_ptr<const Request> request, ReplyCallback reply);
   void _observeBagChanges();
   void _bagChangeNotification(const Notification& notification);
+  void _waitForBag();
   bool _adoptFirstBag(const std::shared_ptr<const ZLKBag>& bag);
   std::shared_ptr<const ZLKBag> _viewOf(const ZLKBag& bag) const ZK_REQUIRES(viewMutex_);
 
@@ -113,6 +121,7 @@ class ClientState final : public std::enable_shared_from_this<ClientState> {
   Assembly& assembly_;
   const std::string identifier_;
   const std::optional<std::string> clientShortName_;
+  const std::shared_ptr<ClientBudgets> budgets_;
   std::shared_ptr<QueryCache> queryCache_;
   std::shared_ptr<UserGUIDSource> ownGuidController_;  // with individual sessions only
   std::shared_ptr<SessionManager> ownSessionManager_;

@@ -60,6 +60,22 @@ TEST_F(ClientStateTest, WaitsASecondForABagAndIsWokenByOne) {
   EXPECT_EQ(bed_.fakes.timeline.now() - second, 300ms);
 }
 
+TEST_F(ClientStateTest, AProcessWaitsForBagsOnlyInItsShare) {
+  auto& limits = bed_.assembly.limits();
+  const auto budgets = std::make_shared<ClientBudgets>(
+      ClientBudgets{Budget("query_cache_bytes", {}, limits),
+                    Budget("bag_waits", {.inAll = 4, .ofOneHolder = 1}, limits)});
+  const auto state = std::make_shared<ClientState>("lanthe", bed_.assembly, budgets);
+  const auto others = budgets->bagWaits.take(processHolder(7));
+  for (const auto& [process, expected] : {std::pair(7, 0s), {8, 1s}, {8, 1s}}) {
+    state->setProcess(process);
+    const auto begin = bed_.fakes.timeline.now();
+    EXPECT_EQ(askForBag(*state, "Lanthe/1").error, zelkorError(1, "timeout"));
+    EXPECT_EQ(bed_.fakes.timeline.now() - begin, expected) << process;
+  }
+  EXPECT_EQ(bed_.fakes.counters.all()["com.quenta.zelkord.limit.bag_waits"], 1);
+}
+
 TEST_F(ClientStateTest, AFetchThatFailsEndsTheWait) {
   const auto state = bed_.makeState();
   const auto failure = bed_.fakes.timeline.global(QualityOfService::Default).after(200ms, [&] {
