@@ -43,4 +43,8 @@ constexpr Field<Record, Value> stored(std::uint32_t number, std::string_view key
   return {number, key, member, FieldUse::StoredOnly};
 }
 
+// A record's fields, made once: a message may hold many short records.
+template <typename Record>
+inline constexpr auto kFieldsOf = Record::fields();
+
 }  // namespace zelkor

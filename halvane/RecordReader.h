@@ -218,7 +218,8 @@ template <typename Record, typename... Extra>
 bool RecordReader::read(Record& record, const std::tuple<Extra...>& extra) {
   bool good = true;
   while (const auto tag = input_.ReadTag()) {
-    if (!_readField(tag, record, Record::fields(), good) && !_readField(tag, record, extra, good)) {
+    if (!_readField(tag, record, kFieldsOf<Record>, good) &&
+        !_readField(tag, record, extra, good)) {
       good = _skip(tag);
     }
     if (!good) return false;

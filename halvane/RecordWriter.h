@@ -265,13 +265,13 @@ std::uint8_t* writeFields(const Record& record, const Fields& fields, std::uint8
 
 template <typename Record, typename... Extra>
 std::size_t recordSize(const Record& record, const std::tuple<Extra...>& extra) {
-  return wire::sizeOfFields(record, extra) + wire::sizeOfFields(record, Record::fields());
+  return wire::sizeOfFields(record, extra) + wire::sizeOfFields(record, kFieldsOf<Record>);
 }
 
 template <typename Record, typename... Extra>
 std::uint8_t* writeRecord(const Record& record, const std::tuple<Extra...>& extra,
                           std::uint8_t* out) {
-  return wire::writeFields(record, Record::fields(), wire::writeFields(record, extra, out));
+  return wire::writeFields(record, kFieldsOf<Record>, wire::writeFields(record, extra, out));
 }
 
 }  // namespace zelkor

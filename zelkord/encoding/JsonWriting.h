@@ -120,10 +120,9 @@ bool appendField(const Record& record, const OneField& field, std::size_t begin,
 // The fields that are sent, as members of an object whose text began at `begin`.
 template <typename Record>
 bool appendFields(const Record& record, std::size_t begin, std::string& text) {
-  static constexpr auto kFields = Record::fields();
   return std::apply(
       [&](const auto&... field) { return (appendField(record, field, begin, text) && ...); },
-      kFields);
+      kFieldsOf<Record>);
 }
 
 template <typename Record>
