@@ -16,6 +16,9 @@ using Task = std::function<void()>;
 // Whether a delay follows the daemon's clock (and its simulation rate) or the real one.
 enum class TimeBase { Scaled, Real };
 
+// How urgent tasks are; higher ones begin first.
+enum class QualityOfService { Background, Utility, Default, High };
+
 // Where tasks run. Tasks given to `async` run later, in order, never inline; `sync` returns after
 // its task has run and runs it on the caller's own thread, without a thread switch when the queue
 // is idle.
@@ -39,7 +42,11 @@ class ZK_CAPABILITY("queue") WorkQueue {
 };
 
 // One task at a time, in order.
-class ZK_CAPABILITY("queue") SerialQueue : public WorkQueue {};
+class ZK_CAPABILITY("queue") SerialQueue : public WorkQueue {
+ public:
+  // From now on its turns are that urgent; turns of queues that have no threads are not.
+  virtual void setQuality(QualityOfService) {}
+};
 
 // Tasks run side by side, except barrier tasks: one begins after everything before it has ended,
 // and what comes later waits for it.

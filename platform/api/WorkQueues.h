@@ -7,8 +7,6 @@
 
 namespace zelkord {
 
-enum class QualityOfService { Background, Utility, Default, High };
-
 // A counting semaphore. A thread that waits is compensated by another worker, so waiting never
 // starves the rest.
 class Semaphore {
@@ -43,7 +41,8 @@ class Timer {
 class WorkQueues {
  public:
   virtual ~WorkQueues() = default;
-  virtual std::unique_ptr<SerialQueue> makeSerialQueue(std::string label) = 0;
+  virtual std::unique_ptr<SerialQueue> makeSerialQueue(
+      std::string label, QualityOfService quality = QualityOfService::Default) = 0;
   virtual std::unique_ptr<ConcurrentQueue> makeConcurrentQueue(std::string label) = 0;
   // Shared concurrent queues without barriers; a `sync` there simply runs the task.
   virtual WorkQueue& global(QualityOfService quality) = 0;

@@ -64,7 +64,7 @@ WallTime ManualTimeline::wallNow() const {
   return WallTime(now().time_since_epoch() + wallOffset_);
 }
 
-std::unique_ptr<SerialQueue> ManualTimeline::makeSerialQueue(std::string label) {
+std::unique_ptr<SerialQueue> ManualTimeline::makeSerialQueue(std::string label, QualityOfService) {
   return std::make_unique<ManualSerialQueue>(core_, std::move(label));
 }
 

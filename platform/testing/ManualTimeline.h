@@ -56,7 +56,8 @@ class ManualTimeline final : public Clock, public WorkQueues {
   SteadyTime realNow() const override { return now(); }
 
   // WorkQueues
-  std::unique_ptr<SerialQueue> makeSerialQueue(std::string label) override;
+  std::unique_ptr<SerialQueue> makeSerialQueue(
+      std::string label, QualityOfService quality = QualityOfService::Default) override;
   std::unique_ptr<ConcurrentQueue> makeConcurrentQueue(std::string label) override;
   WorkQueue& global(QualityOfService quality) override;
   SerialQueue& main() override { return *main_; }

@@ -260,9 +260,10 @@ class LabelledQueues final : public WorkQueues {
  public:
   explicit LabelledQueues(WorkQueues& queues) : queues_(queues) {}
 
-  std::unique_ptr<SerialQueue> makeSerialQueue(std::string label) override {
+  std::unique_ptr<SerialQueue> makeSerialQueue(std::string label,
+                                               QualityOfService quality) override {
     labels.push_back(label);
-    return queues_.makeSerialQueue(std::move(label));
+    return queues_.makeSerialQueue(std::move(label), quality);
   }
   std::unique_ptr<ConcurrentQueue> makeConcurrentQueue(std::string label) override {
     labels.push_back(label);

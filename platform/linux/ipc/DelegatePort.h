@@ -17,7 +17,8 @@ class DelegatePort : public std::enable_shared_from_this<DelegatePort> {
   DelegatePort(IpcContext& context, std::shared_ptr<ListenerDelegate> delegate)
       : delegate_(std::move(delegate)),
         cleaning_(context.cleaning),
-        queue_(context.queues.makeSerialQueue("com.quenta.zelkord.listener")) {}
+        queue_(context.queues.makeSerialQueue("com.quenta.zelkord.listener",
+                                              QualityOfService::High)) {}
 
   void askAdmission(Peer peer, std::function<void(std::optional<Subscription>)> decide) {
     queue_->async([self = shared_from_this(), peer, decide = std::move(decide)] {

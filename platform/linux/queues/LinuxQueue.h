@@ -68,7 +68,12 @@ class LinuxQueue : public Interface, public AlarmTarget {
   const double rate_;  // of the clock
 };
 
-using LinuxSerialQueue = LinuxQueue<SerialQueue, QueueCore::Access::Exclusive>;
+class LinuxSerialQueue final : public LinuxQueue<SerialQueue, QueueCore::Access::Exclusive> {
+ public:
+  using LinuxQueue::LinuxQueue;
+
+  void setQuality(QualityOfService quality) override { core().setQuality(quality); }
+};
 
 class LinuxConcurrentQueue final : public LinuxQueue<ConcurrentQueue, QueueCore::Access::Shared> {
  public:

@@ -15,12 +15,6 @@ namespace {
 constexpr const char* kGlobalQueueLabels[] = {"global.background", "global.utility",
                                               "global.default", "global.high"};
 
-// New connections come first: whoever begins one waits for it, and it is a matter of microseconds.
-QualityOfService serialQuality(std::string_view label) {
-  return label == "com.quenta.zelkord.listener" ? QualityOfService::High
-                                                : QualityOfService::Default;
-}
-
 std::shared_ptr<QueueCore> makeCore(std::shared_ptr<Executor> executor, std::string label,
                                     QualityOfService quality = QualityOfService::Default) {
   return std::make_shared<QueueCore>(std::move(executor), std::move(label), quality);
@@ -45,8 +39,8 @@ LinuxWorkQueues::~LinuxWorkQueues() {
   pool_->stop();
 }
 
-std::unique_ptr<SerialQueue> LinuxWorkQueues::makeSerialQueue(std::string label) {
-  const auto quality = serialQuality(label);
+std::unique_ptr<SerialQueue> LinuxWorkQueues::makeSerialQueue(std::string label,
+                                                              QualityOfService quality) {
   return std::make_unique<LinuxSerialQueue>(makeCore(pool_, std::move(label), quality), timers_,
                                             rate_);
 }

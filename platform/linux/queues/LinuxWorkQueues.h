@@ -28,7 +28,8 @@ class LinuxWorkQueues final : public WorkQueues {
   LinuxWorkQueues(const LinuxWorkQueues&) = delete;
   LinuxWorkQueues& operator=(const LinuxWorkQueues&) = delete;
 
-  std::unique_ptr<SerialQueue> makeSerialQueue(std::string label) override;
+  std::unique_ptr<SerialQueue> makeSerialQueue(
+      std::string label, QualityOfService quality = QualityOfService::Default) override;
   std::unique_ptr<ConcurrentQueue> makeConcurrentQueue(std::string label) override;
   WorkQueue& global(QualityOfService quality) override;
   SerialQueue& main() override;

@@ -155,6 +155,61 @@ TEST_F(LinuxWorkQueuesTest, HigherQualitiesGoFirstAndBackgroundStillGetsItsTurn)
   EXPECT_LT(highBeforeLow, kHigh);
 }
 
+// One of the two workers, kept from everything else until it is let go.
+class BusyWorker {
+ public:
+  explicit BusyWorker(LinuxWorkQueues& queues) {
+    queues.global(QualityOfService::High).async([this] {
+      begun_ = true;
+      while (!over_) std::this_thread::yield();
+      ended_ = true;
+    });
+    while (!begun_) std::this_thread::yield();
+  }
+  ~BusyWorker() {
+    over_ = true;
+    while (!ended_) std::this_thread::yield();
+  }
+
+ private:
+  std::atomic<bool> begun_ = false, over_ = false, ended_ = false;
+};
+
+TEST_F(LinuxWorkQueuesTest, AQueueOfLongTasksLetsOthersHaveTheirTurn) {
+  const BusyWorker other(queues_);
+  const auto slow = queues_.makeSerialQueue("slow");
+  const auto quick = queues_.makeSerialQueue("quick");
+  std::atomic<int> slowDone = 0, slowBefore = -1;
+  slow->async([&] { quick->async([&] { slowBefore = slowDone.load(); }); });
+  for (int i = 0; i < 16; ++i) {
+    slow->async([&] {
+      std::this_thread::sleep_for(1ms);
+      ++slowDone;
+    });
+  }
+  EXPECT_TRUE(eventually([&] { return slowDone == 16 && slowBefore >= 0; }));
+  EXPECT_LE(slowBefore, 2);
+}
+
+TEST_F(LinuxWorkQueuesTest, AQueueThatBecomesLessUrgentWaitsBehindOthers) {
+  const BusyWorker other(queues_);
+  const auto demoted = queues_.makeSerialQueue("demoted", QualityOfService::High);
+  const auto ordinary = queues_.makeSerialQueue("ordinary");
+  demoted->setQuality(QualityOfService::Background);
+  std::atomic<int> ordinaryDone = 0, ordinaryBefore = -1;
+  ordinary->async([&] {
+    demoted->async([&] { ordinaryBefore = ordinaryDone.load(); });
+    for (int i = 0; i < 4; ++i) {
+      ordinary->async([&] {
+        std::this_thread::sleep_for(1ms);
+        ++ordinaryDone;
+      });
+    }
+  });
+  EXPECT_TRUE(eventually([&] { return ordinaryBefore >= 0; }));
+  EXPECT_EQ(ordinaryBefore, 4);
+}
+
 TEST_F(LinuxWorkQueuesTest, LongBackgroundWorkLeavesAWorkerFree) {
   std::atomic<bool> open = false;
   std::atomic<int> ended = 0;

@@ -1,5 +1,6 @@
 #include "platform/linux/queues/QueueCore.h"
 
+#include <chrono>
 #include <utility>
 
 #include "base/Check.h"
@@ -12,8 +13,10 @@ namespace zelkord {
 namespace {
 constexpr std::uint32_t kWaiting = 1u << 31;
 constexpr std::uint32_t kExclusive = 1u << 30;
-// How many tasks of one queue a worker runs before other queues get their turn.
+// How many tasks of one queue a worker runs, and for how long it begins another one, before other
+// queues get their turn.
 constexpr int kBatch = 16;
+constexpr auto kBatchTime = std::chrono::microseconds(200);
 }  // namespace
 
 QueueCore::QueueCore(std::shared_ptr<Executor> executor, std::string label,
@@ -132,11 +135,12 @@ void QueueCore::runTicket() {
   Item item;
   if (!_takeGranted(item)) return;
   int left = kBatch;
+  const auto end = std::chrono::steady_clock::now() + kBatchTime;
   do {
     const QueueFrame frame(*this, item.access);
     item.task();
     item.task = nullptr;  // what it captured goes before the next task begins, still on this queue
-  } while (_finish(item, --left > 0));
+  } while (_finish(item, --left > 0 && std::chrono::steady_clock::now() < end));
 }
 
 bool QueueCore::_takeGranted(Item& item) {

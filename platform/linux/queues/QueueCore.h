@@ -40,7 +40,8 @@ class QueueCore final : public std::enable_shared_from_this<QueueCore> {
   QueueCore& operator=(const QueueCore&) = delete;
 
   const std::string& label() const { return label_; }
-  QualityOfService quality() const { return quality_; }
+  QualityOfService quality() const { return quality_.load(std::memory_order_relaxed); }
+  void setQuality(QualityOfService quality) { quality_.store(quality, std::memory_order_relaxed); }
 
   void async(Access access, Task task);
   void sync(Access access, FunctionRef<void()> task);
@@ -83,9 +84,10 @@ class QueueCore final : public std::enable_shared_from_this<QueueCore> {
   // Fixed after construction.
   const std::shared_ptr<Executor> executor_;
   const std::string label_;
-  const QualityOfService quality_;
 
-  // Own synchronisation. Number of shared ones inside, kExclusive, kWaiting.
+  // Own synchronisation.
+  std::atomic<QualityOfService> quality_;
+  // Number of shared ones inside, kExclusive, kWaiting.
   std::atomic<std::uint32_t> word_{0};
 
   Mutex mutex_;

@@ -40,8 +40,10 @@ std::shared_ptr<URLSession> CurlURLSessions::make(const URLSessionConfiguration&
                         .meteredIdleTime = configuration.cellularPurgeTimeout,
                         .maximumIdleConnections = services_.limits.idleConnections,
                         .isMetered = services_.isMetered};
-  auto delegateQueue =
-      std::make_shared<DelegateQueue>(queues_.makeSerialQueue("url." + configuration.name));
+  // All tasks end on this one queue. What ends goes before what begins, or those who ask much would
+  // hold up everybody's answers.
+  auto delegateQueue = std::make_shared<DelegateQueue>(
+      queues_.makeSerialQueue("url." + configuration.name, QualityOfService::High));
   auto session = std::make_shared<CurlURLSession>(
       CurlURLSession::Services{loop_, line_, services_.maximumResponseSize, services_.proxies},
       std::move(settings), configuration.identityHeader, delegateQueue);
