@@ -98,6 +98,8 @@ Subscription EventLoop::after(Duration delay, Task task) {
 
 void EventLoop::soon(Task task) { soon_.push_back(std::move(task)); }
 
+void EventLoop::inSpareTime(Task task) { inSpareTime_.push_back(std::move(task)); }
+
 void EventLoop::_run() {
   inbox_->begin();
   std::array<epoll_event, kEventsAtOnce> events;
@@ -107,11 +109,13 @@ void EventLoop::_run() {
     _runAll(inbox_->take());
     _runDueTimers();
     _runSoon();
+    _runInSpareTime();
   }
   inbox_->close();
   timers_.clear();
   watched_.clear();
   soon_.clear();
+  inSpareTime_.clear();
   inbox_->end();
 }
 
@@ -140,14 +144,24 @@ void EventLoop::runPosted(std::vector<Task> tasks) {
 
 bool EventLoop::needsOwnThread() {
   const bool isDueEarlier = !timers_.empty() && timers_.begin()->first.first < sleepsUntil_;
-  return stopping_ || !soon_.empty() || isDueEarlier;
+  return stopping_ || !soon_.empty() || !inSpareTime_.empty() || isDueEarlier;
 }
 
 void EventLoop::_runSoon() { _runAll(std::exchange(soon_, {})); }
 
+void EventLoop::_runInSpareTime() {
+  if (inSpareTime_.empty()) return;
+  const auto end = std::chrono::steady_clock::now() + kSpareTime;
+  do {
+    const auto task = std::move(inSpareTime_.front());
+    inSpareTime_.pop_front();
+    task();
+  } while (!inSpareTime_.empty() && std::chrono::steady_clock::now() < end);
+}
+
 int EventLoop::_millisecondsToWait() {
   sleepsUntil_ = timers_.empty() ? Instant::max() : timers_.begin()->first.first;
-  if (!soon_.empty()) return 0;
+  if (!soon_.empty() || !inSpareTime_.empty()) return 0;
   if (timers_.empty()) return -1;
   const auto left = timers_.begin()->first.first - std::chrono::steady_clock::now();
   const auto milliseconds = std::chrono::ceil<std::chrono::milliseconds>(left).count();

@@ -5,6 +5,7 @@
 #include <array>
 #include <chrono>
 #include <cstdint>
+#include <deque>
 #include <functional>
 #include <map>
 #include <memory>
@@ -53,9 +54,13 @@ class ZK_CAPABILITY("loop") EventLoop final : private LoopHost {
   Subscription after(Duration delay, Task task);
   // Runs the task after everything that is ready now has had its turn.
   void soon(Task task);
+  // Runs the task when the others have had their turn too: of such tasks, in their order, only as
+  // many begin between two looks at what is ready as fit into kSpareTime.
+  void inSpareTime(Task task);
 
  private:
-  static constexpr int kEventsAtOnce = 64;
+  static constexpr int kEventsAtOnce = 16;
+  static constexpr Duration kSpareTime = 1ms;
   using Instant = std::chrono::steady_clock::time_point;
   struct Watched {
     int fd;
@@ -72,6 +77,7 @@ class ZK_CAPABILITY("loop") EventLoop final : private LoopHost {
   void _dispatch(const epoll_event& event);
   void _runDueTimers();
   void _runSoon();
+  void _runInSpareTime();
   static void _runAll(std::vector<Task> tasks);
 
   const OwnedFd epoll_;
@@ -84,6 +90,7 @@ class ZK_CAPABILITY("loop") EventLoop final : private LoopHost {
   std::unordered_map<int, std::uint64_t> idOfDescriptor_;
   std::multimap<std::pair<Instant, std::uint64_t>, Task> timers_;
   std::vector<Task> soon_;
+  std::deque<Task> inSpareTime_;
   Instant sleepsUntil_ = Instant::max();
 
   std::thread thread_;

@@ -14,7 +14,8 @@
 namespace zelkord::ipc {
 namespace {
 
-constexpr int kMessagesInARow = 32;
+constexpr int kMessagesInARow = 8;
+constexpr std::size_t kLongMessage = 65'536;
 // Edge-triggered: half a header may stay in the socket.
 constexpr std::uint32_t kLinkEvents = EPOLLIN | EPOLLRDHUP | EPOLLET;
 // What stands for a message that sd-bus sent by itself.
@@ -52,12 +53,14 @@ void PrivateLink::start() {
                                  const auto self = weak.lock();
                                  if (!self) return;
                                  self->hungUp_ |= (events & ~(EPOLLIN | EPOLLOUT)) != 0;
-                                 self->_pump();
+                                 if (!self->_isInLongMessage()) return self->_pump();
+                                 self->_pumpInTurn();
                                });
 }
 
 void PrivateLink::end() {
   if (std::exchange(ended_, true)) return;
+  const bool isLong = _isInLongMessage();
   watch_.reset();
   holding_.reset();
   open_.reset();
@@ -66,11 +69,12 @@ void PrivateLink::end() {
   connection_->end();
   listener_.port().release(std::move(admission_.place));
   admission_.share.reset();
-  // sd-bus may be on the stack.
-  context_.loop.soon([self = shared_from_this()] {
+  // sd-bus may be on the stack. Giving back what it holds of a long message takes a while.
+  auto release = [self = shared_from_this()] {
     self->filter_.reset();
     self->bus_.reset();
-  });
+  };
+  isLong ? context_.loop.inSpareTime(std::move(release)) : context_.loop.soon(std::move(release));
   listener_.forget(*this);
 }
 
@@ -102,15 +106,25 @@ int PrivateLink::_onMessage(sd_bus_message* message, void* self, sd_bus_error*) 
 }
 
 void PrivateLink::_pump() {
+  if (waitsForTurn_) return;
   const auto self = shared_from_this();
   const bool readAll = _readMessages();
   if (ended_) return;
   _accountMemory(queuedBytes_, gate_.unfinishedBytes());
-  if (readAll) return;
-  context_.loop.soon([weak = weak_from_this()] {
-    if (const auto link = weak.lock()) link->_pump();
+  if (!readAll) _pumpInTurn();
+}
+
+void PrivateLink::_pumpInTurn() {
+  if (std::exchange(waitsForTurn_, true)) return;
+  context_.loop.inSpareTime([weak = weak_from_this()] {
+    const auto link = weak.lock();
+    if (!link) return;
+    link->waitsForTurn_ = false;
+    link->_pump();
   });
 }
+
+bool PrivateLink::_isInLongMessage() const { return gate_.unfinishedBytes() > kLongMessage; }
 
 bool PrivateLink::_readMessages() {
   for (int messages = 0; messages < kMessagesInARow;) {
@@ -118,6 +132,7 @@ bool PrivateLink::_readMessages() {
     const auto progress = _process();
     if (ended_ || progress == Progress::Nothing) return true;
     if (progress == Progress::Message) ++messages;
+    if (_isInLongMessage()) return false;
   }
   return false;
 }

@@ -18,8 +18,12 @@ class PrivateListener;
 // One authenticated private socket: reads and checks its messages, writes what goes to its client.
 //
 // States: open; ended by the peer, by a fault, by a client that does not read, or by us. Then
-// nothing more is read or written, and the socket closes in the same turn of the loop. Threading:
-// the loop. Ownership: its listener, until the end.
+// nothing more is read or written, and the socket closes in the same turn of the loop, or a little
+// later while there are many. Threading: the loop. Ownership: its listener, until the end.
+//
+// A few short messages are read as they come. What comes in a row after them, and the pieces of
+// long ones, wait their turn among all links' (EventLoop::inSpareTime), so that they keep nobody
+// from asking.
 class PrivateLink final : public Outlet,
                           public Caller,
                           public ClientMemory::Holder,
@@ -63,8 +67,10 @@ class PrivateLink final : public Outlet,
 
   static int _onMessage(sd_bus_message* message, void* self, sd_bus_error* error);
   void _pump();
+  void _pumpInTurn();
   // False when there is more to read.
   bool _readMessages();
+  bool _isInLongMessage() const;
   bool _mayRead();
   Progress _process();
   std::size_t _queuedMessages() const;
@@ -91,6 +97,7 @@ class PrivateLink final : public Outlet,
   bool hungUp_ = false;
   bool arrived_ = false;  // a message came during this round
   bool waitsForWriting_ = false;
+  bool waitsForTurn_ = false;
   std::deque<std::size_t> queued_;  // sizes of the messages that wait, oldest first
   std::size_t queuedBytes_ = 0;
   std::size_t unfinishedBytes_ = 0;

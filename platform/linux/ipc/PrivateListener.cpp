@@ -16,7 +16,7 @@
 namespace zelkord::ipc {
 namespace {
 
-constexpr int kAcceptsInARow = 16;
+constexpr auto kAcceptTime = 2ms;  // in a row
 constexpr auto kAcceptPause = 100ms;
 constexpr auto kTimeToAuthenticateInScarcity = 1s;
 // For a moment, besides the socket's own.
@@ -61,7 +61,8 @@ void PrivateListener::close() {
 }
 
 void PrivateListener::_accept() {
-  for (int i = 0; i < kAcceptsInARow; ++i) {
+  const auto end = std::chrono::steady_clock::now() + kAcceptTime;
+  while (std::chrono::steady_clock::now() < end) {
     auto socket = _acceptOne();
     if (!socket) return;
     const auto peer = peerOfSocket(socket.get());

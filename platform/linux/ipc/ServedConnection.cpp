@@ -4,6 +4,19 @@
 #include <utility>
 
 namespace zelkord::ipc {
+namespace {
+
+// What a process has under way when it asks for more than a person can.
+constexpr std::size_t kManyCalls = 64;
+constexpr std::size_t kManyBytes = 1u << 20;
+
+// The calls of a process that asks for much wait behind everybody else's.
+QualityOfService qualityFor(const ClientMemory::Process& process) {
+  const bool asksMuch = process.calls > kManyCalls || process.bytes() > kManyBytes;
+  return asksMuch ? QualityOfService::Utility : QualityOfService::Default;
+}
+
+}  // namespace
 
 ServedConnection::ServedConnection(IpcContext& context, Peer peer, std::weak_ptr<Outlet> outlet)
     : peer_(peer),
@@ -64,6 +77,7 @@ void ServedConnection::deliver(Call call) {
       return;
     }
   }
+  queue_->setQuality(qualityFor(flow_->process()));
   queue_->async([self = shared_from_this(), call = std::move(call)]() mutable {
     self->_handle(std::move(call));
   });
