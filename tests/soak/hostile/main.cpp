@@ -1,7 +1,8 @@
 // usage: zelkord_hostile --socket PATH --state FOLDER --hostile URL --kept URL --seconds N
+//                        [--only TEXT]
 //
-// A process that attacks the daemon in every way at once, each on a thread of its own, for that
-// long. Prints what each attack got through; status 1 when one of them did nothing at all.
+// A process that attacks the daemon in every way at once, or in those ways whose names contain
+// TEXT, each on a thread of its own, for that long. Prints what each attack got through; status 1 when one of them did nothing at all.
 
 #include <fmt/core.h>
 #include <sys/resource.h>
@@ -59,6 +60,11 @@ int run(const std::map<std::string, std::string>& options) {
   const StalledHost stalled;
   auto attacks = allAttacks({options.at("--socket"), options.at("--state"), stalled.url(),
                              options.at("--hostile"), options.at("--kept")});
+  if (const auto only = options.find("--only"); only != options.end()) {
+    std::erase_if(attacks, [&](const auto& attack) {
+      return std::string_view(attack->name()).find(only->second) == std::string_view::npos;
+    });
+  }
   const auto end = Clock::now() + std::chrono::seconds(std::stoul(options.at("--seconds")));
   std::vector<std::uint64_t> done(attacks.size());
   std::vector<std::thread> threads;
