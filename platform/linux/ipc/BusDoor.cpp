@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <chrono>
 #include <cstring>
 #include <utility>
 
@@ -20,12 +21,29 @@ constexpr pid_t kNoProcess = 0;
 constexpr std::size_t kMostBusMessagesQueued = 16'384;
 constexpr std::size_t kMostBusBytesQueued = 64u << 20;
 constexpr std::uint64_t kBusCallTimeoutMicroseconds = 10'000'000;
+// At the start, for each of connecting and the name.
+constexpr std::chrono::microseconds kPatienceAtStart = 1s;
 
 std::uint64_t monotonicMicroseconds() {
   timespec now{};
   ::clock_gettime(CLOCK_MONOTONIC, &now);
   return static_cast<std::uint64_t>(now.tv_sec) * 1'000'000 +
          static_cast<std::uint64_t>(now.tv_nsec) / 1000;
+}
+
+// Zero, or a negative errno.
+int waitUntilConnected(sd_bus* bus) {
+  const auto end = std::chrono::steady_clock::now() + kPatienceAtStart;
+  int r = 0;
+  while ((r = sd_bus_is_ready(bus)) == 0) {
+    const auto left = std::chrono::duration_cast<std::chrono::microseconds>(
+        end - std::chrono::steady_clock::now());
+    if (left.count() <= 0) return -ETIMEDOUT;
+    r = sd_bus_process(bus, nullptr);
+    if (r == 0) r = sd_bus_wait(bus, static_cast<std::uint64_t>(left.count()));
+    if (r < 0) return r;
+  }
+  return std::min(r, 0);
 }
 
 }  // namespace
@@ -52,7 +70,12 @@ int openSessionBus(const std::string& address, BusPtr& out) {
 BusName acquireBusName(const std::string& address, const std::string& name) {
   BusName result;
   int r = openSessionBus(address, result.bus);
-  if (r >= 0) r = sd_bus_request_name(result.bus.get(), name.c_str(), 0);
+  if (r >= 0) r = waitUntilConnected(result.bus.get());
+  if (r >= 0) {
+    sd_bus_set_method_call_timeout(result.bus.get(), kPatienceAtStart.count());
+    r = sd_bus_request_name(result.bus.get(), name.c_str(), 0);
+    sd_bus_set_method_call_timeout(result.bus.get(), kBusCallTimeoutMicroseconds);
+  }
   if (r >= 0) {
     result.outcome = BusName::Outcome::Owned;
     return result;

@@ -18,7 +18,8 @@
 
 namespace zelkord::ipc {
 
-// The session bus, connected and asked for a name. Blocks; made before the loop serves it.
+// The session bus, connected and asked for a name. Blocks, but for two seconds at most: one that
+// accepts and does not answer is none (ETIMEDOUT). Made before the loop serves it.
 struct BusName {
   enum class Outcome { Owned, Taken, NoBus };
   Outcome outcome = Outcome::NoBus;

@@ -239,6 +239,22 @@ TEST(BusDoorTest, ANameOrSocketThatIsTakenFailsAndLeavesTheOtherOnesAlone) {
   EXPECT_EQ(client.call(kTestInterface, "Echo", "s", ""), "");
 }
 
+// As when the bus has hung: the socket is served all the same, and soon.
+TEST(BusDoorTest, ABusThatAcceptsAndDoesNotAnswerDoesNotHoldUpTheStart) {
+  const TemporaryDirectory directory;
+  const auto deaf = ListeningSocket::make(directory / "bus");
+  ASSERT_TRUE(std::holds_alternative<ListeningSocket>(deaf));
+  IpcTestServer server(false, [&](SdBusOptions& options) {
+    options.usesSessionBus = true;
+    options.sessionBusAddress = "unix:path=" + directory / "bus";
+  });
+  const auto begin = std::chrono::steady_clock::now();
+  EXPECT_FALSE(server.listen());
+  EXPECT_LT(std::chrono::steady_clock::now() - begin, 5s);
+  auto client = server.socketClient();
+  EXPECT_EQ(client.call(kTestInterface, "Echo", "s", ""), "");
+}
+
 // Whoever waits for the name and then takes the socket must find it there.
 TEST(BusDoorTest, TheNameIsNotSeenBeforeTheSocketListens) {
   IpcTestServer server(true, [](SdBusOptions& options) {

@@ -60,7 +60,6 @@ void PrivateLink::start() {
 
 void PrivateLink::end() {
   if (std::exchange(ended_, true)) return;
-  const bool isLong = _isInLongMessage();
   watch_.reset();
   holding_.reset();
   open_.reset();
@@ -69,12 +68,11 @@ void PrivateLink::end() {
   connection_->end();
   listener_.port().release(std::move(admission_.place));
   admission_.share.reset();
-  // sd-bus may be on the stack. Giving back what it holds of a long message takes a while.
-  auto release = [self = shared_from_this()] {
+  // sd-bus may be on the stack.
+  context_.loop.soon([self = shared_from_this()] {
     self->filter_.reset();
     self->bus_.reset();
-  };
-  isLong ? context_.loop.inSpareTime(std::move(release)) : context_.loop.soon(std::move(release));
+  });
   listener_.forget(*this);
 }
 

@@ -18,8 +18,8 @@ class PrivateListener;
 // One authenticated private socket: reads and checks its messages, writes what goes to its client.
 //
 // States: open; ended by the peer, by a fault, by a client that does not read, or by us. Then
-// nothing more is read or written, and the socket closes in the same turn of the loop, or a little
-// later while there are many. Threading: the loop. Ownership: its listener, until the end.
+// nothing more is read or written, and the socket closes in the same turn of the loop. Threading:
+// the loop. Ownership: its listener, until the end.
 //
 // A few short messages are read as they come. What comes in a row after them, and the pieces of
 // long ones, wait their turn among all links' (EventLoop::inSpareTime), so that they keep nobody
