@@ -2,6 +2,8 @@
 
 #include <algorithm>
 #include <array>
+#include <cerrno>
+#include <cstring>
 #include <utility>
 
 #include "corezelkor/client/internal/Wire.h"
@@ -67,7 +69,8 @@ void TypingClient::_connect() {
   bus_.reset(bus);
   sd_bus_set_address(bus, habits_.address.c_str());
   sd_bus_set_method_call_timeout(bus, kPatience);
-  if (sd_bus_start(bus) < 0) return _fault("the daemon cannot be reached");
+  if (const int result = sd_bus_start(bus); result < 0) return _cannotConnect(-result);
+  turnedAway_.reset();
   // Answers that somebody waits for never get as far as a filter.
   sd_bus_add_filter(
       bus, nullptr,
@@ -84,6 +87,14 @@ void TypingClient::_connect() {
   zelkor::writeConfiguration(writer, {habits_.identifier, "Soak/1.0"});
   queryId_ = 0;
   _send(std::move(call), false);
+}
+
+// A place may be missing for a moment.
+void TypingClient::_cannotConnect(int problem) {
+  disconnect();
+  if (!turnedAway_) turnedAway_ = SteadyClock::now();
+  if (problem == EAGAIN && SteadyClock::now() - *turnedAway_ < std::chrono::seconds(1)) return;
+  _fault(std::string("the daemon cannot be reached: ") + std::strerror(problem));
 }
 
 void TypingClient::disconnect() {

@@ -5,6 +5,7 @@
 #include <chrono>
 #include <cstdint>
 #include <memory>
+#include <optional>
 #include <random>
 #include <set>
 #include <string>
@@ -55,6 +56,7 @@ class TypingClient {
   struct Question;
 
   void _connect();
+  void _cannotConnect(int problem);
   void _finishWord();
   void _search();
   void _ask(std::shared_ptr<zelkor::ZLKRequest> request);
@@ -74,6 +76,7 @@ class TypingClient {
   std::string word_;
   std::size_t typed_ = 0;
   SteadyClock::time_point nextAct_ = SteadyClock::now();
+  std::optional<SteadyClock::time_point> turnedAway_;  // since when there has been no place
 };
 
 }  // namespace zelkord::soak

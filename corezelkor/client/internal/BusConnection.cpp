@@ -3,8 +3,11 @@
 #include <unistd.h>
 
 #include <array>
+#include <cerrno>
+#include <chrono>
 #include <cstring>
 #include <string_view>
+#include <thread>
 #include <utility>
 
 #include "corezelkor/client/ClientError.h"
@@ -15,6 +18,10 @@ namespace {
 
 // A connection with much to read lets the others have their turn.
 constexpr int kMaximumRounds = 256;
+
+// A daemon to whom very many come at once turns some away for a moment (EAGAIN).
+constexpr std::chrono::seconds kPatienceToConnect{1};
+constexpr std::chrono::milliseconds kBetweenAttempts{10};
 
 int handleBusReply(sd_bus_message* reply, void* userdata, sd_bus_error*) {
   // Moved out: the handler may destroy the call.
@@ -28,17 +35,32 @@ int handleBusReply(sd_bus_message* reply, void* userdata, sd_bus_error*) {
   return 1;
 }
 
-// Takes a fresh sd_bus, prepares it with `prepare`, starts it.
+// Takes a fresh sd_bus, prepares it with `prepare`, starts it. Null, and a negative errno, when
+// that fails.
 template <typename Prepare>
-std::unique_ptr<BusConnection> startedConnection(const Prepare& prepare, std::string& why) {
+std::unique_ptr<BusConnection> startedConnection(const Prepare& prepare, int& problem) {
   sd_bus* raw = nullptr;
   int result = sd_bus_new(&raw);
   BusPointer bus(raw);
   if (result >= 0) result = prepare(raw);
   if (result >= 0) result = sd_bus_start(raw);
   if (result >= 0) return std::make_unique<BusConnection>(std::move(bus));
-  why = std::strerror(-result);
+  problem = result;
   return nullptr;
+}
+
+// The same, again and again while there is no place.
+template <typename Prepare>
+std::unique_ptr<BusConnection> patientConnection(const Prepare& prepare, std::string& why) {
+  const auto end = std::chrono::steady_clock::now() + kPatienceToConnect;
+  for (;;) {
+    int problem = 0;
+    auto connection = startedConnection(prepare, problem);
+    if (connection) return connection;
+    why = std::strerror(-problem);
+    if (problem != -EAGAIN || std::chrono::steady_clock::now() >= end) return nullptr;
+    std::this_thread::sleep_for(kBetweenAttempts);
+  }
 }
 
 // Nothing but the sign-on has gone out yet. Null unless the daemon's user is ours.
@@ -74,26 +96,28 @@ Error errorOfReply(const sd_bus_error& error) {
 
 std::unique_ptr<BusConnection> BusConnection::toPeer(const std::string& address, std::string& why) {
   return withOwnPeer(
-      startedConnection([&](sd_bus* bus) { return sd_bus_set_address(bus, address.c_str()); }, why),
+      patientConnection([&](sd_bus* bus) { return sd_bus_set_address(bus, address.c_str()); }, why),
       why);
 }
 
 std::unique_ptr<BusConnection> BusConnection::toPeer(int ownedDescriptor, std::string& why) {
   bool taken = false;
+  int problem = 0;
   auto connection = startedConnection(
       [&](sd_bus* bus) {
         const int result = sd_bus_set_fd(bus, ownedDescriptor, ownedDescriptor);
         taken = result >= 0;
         return result;
       },
-      why);
+      problem);
+  if (!connection) why = std::strerror(-problem);
   if (!taken) ::close(ownedDescriptor);
   return withOwnPeer(std::move(connection), why);
 }
 
 std::unique_ptr<BusConnection> BusConnection::toBus(const std::string& address, std::string& why) {
   if (!address.empty()) {
-    return startedConnection(
+    return patientConnection(
         [&](sd_bus* bus) {
           const int result = sd_bus_set_address(bus, address.c_str());
           return result < 0 ? result : sd_bus_set_bus_client(bus, 1);

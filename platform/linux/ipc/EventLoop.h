@@ -59,7 +59,7 @@ class ZK_CAPABILITY("loop") EventLoop final : private LoopHost {
   void inSpareTime(Task task);
 
  private:
-  static constexpr int kEventsAtOnce = 16;
+  static constexpr int kEventsAtOnce = 64;
   static constexpr Duration kSpareTime = 1ms;
   using Instant = std::chrono::steady_clock::time_point;
   struct Watched {

@@ -60,7 +60,9 @@ void PrivateListener::close() {
   for (const auto& link : ending) link->end();
 }
 
+// All who wait, before the backlog is full and turns others away; between turns of the rest.
 void PrivateListener::_accept() {
+  if (closed_ || acceptsOn_) return;
   const auto end = std::chrono::steady_clock::now() + kAcceptTime;
   while (std::chrono::steady_clock::now() < end) {
     auto socket = _acceptOne();
@@ -68,6 +70,13 @@ void PrivateListener::_accept() {
     const auto peer = peerOfSocket(socket.get());
     if (peer) _consider(std::move(socket), {peer->pid, peer->uid});
   }
+  acceptsOn_ = true;
+  context_.loop.soon([weak = weak_from_this()] {
+    const auto self = weak.lock();
+    if (!self) return;
+    self->acceptsOn_ = false;
+    self->_accept();
+  });
 }
 
 OwnedFd PrivateListener::_acceptOne() {

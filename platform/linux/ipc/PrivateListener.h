@@ -72,6 +72,7 @@ class PrivateListener final : public std::enable_shared_from_this<PrivateListene
   // Loop state.
   Dispatcher dispatcher_;
   bool closed_ = false;
+  bool acceptsOn_ = false;  // goes on accepting in the next turn of the loop
   std::optional<ListeningSocket> socket_;
   Subscription watch_;
   Subscription pause_;
