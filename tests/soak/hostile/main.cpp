@@ -2,7 +2,8 @@
 //                        [--only TEXT]
 //
 // A process that attacks the daemon in every way at once, or in those ways whose names contain
-// TEXT, each on a thread of its own, for that long. Prints what each attack got through; status 1 when one of them did nothing at all.
+// TEXT, each on a thread of its own, for that long. Prints what each attack got through; status 1
+// when one of them did nothing at all.
 
 #include <fmt/core.h>
 #include <sys/resource.h>
