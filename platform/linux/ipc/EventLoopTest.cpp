@@ -1,9 +1,9 @@
-#include "platform/linux/ipc/EventLoop.h"
-
 #include <gtest/gtest.h>
 
 #include <string>
 #include <thread>
+
+#include "platform/linux/ipc/EventLoop.h"
 
 namespace zelkord::ipc {
 namespace {
