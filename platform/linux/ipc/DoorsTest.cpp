@@ -1,8 +1,11 @@
 #include <fcntl.h>
 #include <gtest/gtest.h>
 
+#include <chrono>
+
 #include "platform/linux/ipc/BusPresence.h"
 #include "platform/linux/ipc/IpcTestSupport.h"
+#include "platform/linux/ipc/ListeningSocket.h"
 #include "platform/linux/watch/PathWatcher.h"
 
 namespace zelkord::ipc {
@@ -241,12 +244,12 @@ TEST(BusDoorTest, ANameOrSocketThatIsTakenFailsAndLeavesTheOtherOnesAlone) {
 
 // As when the bus has hung: the socket is served all the same, and soon.
 TEST(BusDoorTest, ABusThatAcceptsAndDoesNotAnswerDoesNotHoldUpTheStart) {
-  const TemporaryDirectory directory;
-  const auto deaf = ListeningSocket::make(directory / "bus");
+  const IpcTestDirectory directory;
+  const auto deaf = ListeningSocket::make(directory.path() + "/bus");
   ASSERT_TRUE(std::holds_alternative<ListeningSocket>(deaf));
   IpcTestServer server(false, [&](SdBusOptions& options) {
     options.usesSessionBus = true;
-    options.sessionBusAddress = "unix:path=" + directory / "bus";
+    options.sessionBusAddress = "unix:path=" + directory.path() + "/bus";
   });
   const auto begin = std::chrono::steady_clock::now();
   EXPECT_FALSE(server.listen());

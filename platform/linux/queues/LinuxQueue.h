@@ -21,16 +21,13 @@ class AlarmTarget {
 };
 
 // What all Linux queues have in common: a core and the timers. `Interface` is the kind of queue,
-// `kAccess` how its ordinary tasks run.
+// `kAccess` how its ordinary tasks run. The last class closes the queue in its destructor: a task
+// that still runs uses all of it.
 template <typename Interface, QueueCore::Access kAccess>
 class LinuxQueue : public Interface, public AlarmTarget {
  public:
   LinuxQueue(std::shared_ptr<QueueCore> core, std::shared_ptr<TimerService> timers, double rate)
       : core_(std::move(core)), timers_(std::move(timers)), rate_(rate) {}
-  ~LinuxQueue() override {
-    timers_->removeAllOf(*core_);
-    core_->close();
-  }
   LinuxQueue(const LinuxQueue&) = delete;
   LinuxQueue& operator=(const LinuxQueue&) = delete;
 
@@ -60,6 +57,10 @@ class LinuxQueue : public Interface, public AlarmTarget {
   }
 
  protected:
+  void close() {
+    timers_->removeAllOf(*core_);
+    core_->close();
+  }
   QueueCore& core() const { return *core_; }
 
  private:
@@ -71,6 +72,7 @@ class LinuxQueue : public Interface, public AlarmTarget {
 class LinuxSerialQueue final : public LinuxQueue<SerialQueue, QueueCore::Access::Exclusive> {
  public:
   using LinuxQueue::LinuxQueue;
+  ~LinuxSerialQueue() override { close(); }
 
   void setQuality(QualityOfService quality) override { core().setQuality(quality); }
 };
@@ -78,6 +80,7 @@ class LinuxSerialQueue final : public LinuxQueue<SerialQueue, QueueCore::Access:
 class LinuxConcurrentQueue final : public LinuxQueue<ConcurrentQueue, QueueCore::Access::Shared> {
  public:
   using LinuxQueue::LinuxQueue;
+  ~LinuxConcurrentQueue() override { close(); }
 
   void barrierAsync(Task task) override {
     core().async(QueueCore::Access::Exclusive, std::move(task));
@@ -92,6 +95,7 @@ class LinuxConcurrentQueue final : public LinuxQueue<ConcurrentQueue, QueueCore:
 class LinuxGlobalQueue final : public LinuxQueue<WorkQueue, QueueCore::Access::Shared> {
  public:
   using LinuxQueue::LinuxQueue;
+  ~LinuxGlobalQueue() override { close(); }
 
   void sync(FunctionRef<void()> task) override {
     const QueueFrame frame(core(), QueueCore::Access::Shared);
