@@ -12,6 +12,8 @@ namespace zelkord {
 namespace {
 
 constexpr std::size_t kTooManyConnections = 2;
+// What was under way for clients that have left goes on for a while, and then frees its memory.
+constexpr Duration kLastWorkEnds = 5s;
 
 }  // namespace
 
@@ -93,6 +95,8 @@ void ZelkorService::_remove(const std::shared_ptr<ClientConnection>& client) {
   assembly_.log(Category::Caching).debug("purging url cache");
   assembly_.urlSession().purgeMemoryCache();
   assembly_.platform().process.releaseFreeMemory();
+  lateRelease_ = queue_->after(
+      kLastWorkEnds, [&process = assembly_.platform().process] { process.releaseFreeMemory(); });
 }
 
 std::vector<std::shared_ptr<ClientConnection>> ZelkorService::getClientConnections() {

@@ -50,6 +50,7 @@ class ZelkorService final : public ipc::ListenerDelegate,
 
   // Queue state.
   std::vector<std::shared_ptr<ClientConnection>> connections_ ZK_ON(queue_);
+  Subscription lateRelease_ ZK_ON(queue_);
 };
 
 }  // namespace zelkord
