@@ -28,7 +28,8 @@ struct BusCall {
 class BusConnection {
  public:
   // Null, with the reason in `why`, when the attempt fails at once, or somebody else's process
-  // serves that socket. `ownedDescriptor` is taken over either way.
+  // serves that socket. To an address: waits for a place there for up to a second.
+  // `ownedDescriptor` is taken over either way.
   static std::unique_ptr<BusConnection> toPeer(const std::string& address, std::string& why);
   static std::unique_ptr<BusConnection> toPeer(int ownedDescriptor, std::string& why);
   // An empty address: the session bus of the user.
