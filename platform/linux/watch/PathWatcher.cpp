@@ -9,6 +9,7 @@
 #include <map>
 #include <set>
 #include <thread>
+#include <utility>
 #include <vector>
 
 #include "base/Mutex.h"
@@ -86,11 +87,19 @@ class PathWatcher::Loop final {
     }
   };
 
+  // Until the plan holds with its watches in place: what came between the look and the watches
+  // has no event.
   void place(int id, const Entry& entry) ZK_REQUIRES(mutex_) {
-    for (const auto& spot : watchPlan(entry.path)) {
-      const int watch = ::inotify_add_watch(inotify_.get(), spot.path.c_str(), kWatchedEvents);
-      if (watch >= 0) places_[watch].names.emplace(id, spot.name);
+    std::vector<WatchSpot> placed;
+    for (auto plan = watchPlan(entry.path); plan != placed; plan = watchPlan(entry.path)) {
+      for (const auto& spot : plan) place(id, spot);
+      placed = std::move(plan);
     }
+  }
+
+  void place(int id, const WatchSpot& spot) ZK_REQUIRES(mutex_) {
+    const int watch = ::inotify_add_watch(inotify_.get(), spot.path.c_str(), kWatchedEvents);
+    if (watch >= 0) places_[watch].names.emplace(id, spot.name);
   }
 
   void run() {
