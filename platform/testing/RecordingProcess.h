@@ -1,5 +1,6 @@
 #pragma once
 
+#include <atomic>
 #include <optional>
 
 #include "platform/api/Signals.h"
@@ -18,13 +19,16 @@ class RecordingProcess final : public ProcessControl {
   }
   void runMainLoop() override { timeline_.runUntilIdle(); }
 
-  void releaseFreeMemory() override {}
+  void releaseFreeMemory() override { ++releases_; }
 
   std::optional<int> exitStatus() const { return status_; }
+  // How often free memory was given back.
+  int releases() const { return releases_; }
 
  private:
   ManualTimeline& timeline_;
   std::optional<int> status_;
+  std::atomic<int> releases_ = 0;
 };
 
 }  // namespace zelkord

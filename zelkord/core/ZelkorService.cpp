@@ -13,6 +13,7 @@ namespace {
 
 constexpr std::size_t kTooManyConnections = 2;
 // What was under way for clients that have left goes on for a while, and then frees its memory.
+constexpr Duration kWorkEnds = 1s;
 constexpr Duration kLastWorkEnds = 5s;
 
 }  // namespace
@@ -91,12 +92,25 @@ void ZelkorService::_end(const std::shared_ptr<ClientConnection>& client) {
 void ZelkorService::_remove(const std::shared_ptr<ClientConnection>& client) {
   queue_->assertCurrent();
   std::erase(connections_, client);
-  if (!connections_.empty()) return;
+  if (!connections_.empty()) {
+    // One for all that leave meanwhile.
+    if (!release_) release_ = _releaseAfter(kWorkEnds);
+    return;
+  }
   assembly_.log(Category::Caching).debug("purging url cache");
   assembly_.urlSession().purgeMemoryCache();
   assembly_.platform().process.releaseFreeMemory();
-  lateRelease_ = queue_->after(
-      kLastWorkEnds, [&process = assembly_.platform().process] { process.releaseFreeMemory(); });
+  release_ = _releaseAfter(kLastWorkEnds);
+}
+
+Subscription ZelkorService::_releaseAfter(Duration delay) {
+  return queue_->after(delay, [weak = weak_from_this()] {
+    const auto self = weak.lock();
+    if (!self) return;
+    self->queue_->assertCurrent();
+    self->release_.reset();
+    self->assembly_.platform().process.releaseFreeMemory();
+  });
 }
 
 std::vector<std::shared_ptr<ClientConnection>> ZelkorService::getClientConnections() {

@@ -42,6 +42,7 @@ class ZelkorService final : public ipc::ListenerDelegate,
   void _remove(const std::shared_ptr<ClientConnection>& client);
   void _invalidated(const std::shared_ptr<ClientConnection>& client, const std::string& name);
   void _end(const std::shared_ptr<ClientConnection>& client);
+  Subscription _releaseAfter(Duration delay);
 
   // Fixed after construction.
   Assembly& assembly_;
@@ -50,7 +51,7 @@ class ZelkorService final : public ipc::ListenerDelegate,
 
   // Queue state.
   std::vector<std::shared_ptr<ClientConnection>> connections_ ZK_ON(queue_);
-  Subscription lateRelease_ ZK_ON(queue_);
+  Subscription release_ ZK_ON(queue_);  // of free memory, once after a while
 };
 
 }  // namespace zelkord

@@ -50,6 +50,26 @@ TEST(ZelkorServiceTest, PurgesTheURLCacheWhenTheLastConnectionGoes) {
               testing::Not(testing::Contains("clientConnection")));
 }
 
+TEST(ZelkorServiceTest, GivesFreeMemoryBackOnceForAllWhoLeaveWithinASecond) {
+  DaemonBed bed;
+  const auto stays = bed.connect(1);
+  for (int round = 1; round <= 2; ++round) {
+    const auto first = bed.connect(2);
+    const auto second = bed.connect(3);
+    first->disconnect();
+    second->disconnect();
+    bed.run();
+    EXPECT_EQ(bed.fakes.process.releases(), round - 1);
+    bed.fakes.timeline.advance(1s);
+    EXPECT_EQ(bed.fakes.process.releases(), round);
+  }
+  stays->disconnect();
+  bed.run();
+  EXPECT_EQ(bed.fakes.process.releases(), 3) << "at once when the last one leaves";
+  bed.fakes.timeline.advance(5s);
+  EXPECT_EQ(bed.fakes.process.releases(), 4) << "and again when its work has ended";
+}
+
 TEST(ZelkorServiceTest, TellsWhetherAClientsSessionEndedWithIt) {
   for (const bool shared : {true, false}) {
     SCOPED_TRACE(shared);
