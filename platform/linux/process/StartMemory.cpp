@@ -34,7 +34,7 @@ int releaseObject(dl_phdr_info* object, std::size_t, void*) {
 void keepHeapSmall() {
   constexpr int kLargeBlock = 1024 * 1024;
   constexpr int kKeptAtMost = 4 * 1024 * 1024;  // less costs system calls with every message
-  constexpr int kArenas = 4;  // each keeps free memory of its own; by default 8 a processor
+  constexpr int kArenas = 2;  // each keeps free memory of its own; by default 8 a processor
   ::mallopt(M_MMAP_THRESHOLD, kLargeBlock);
   ::mallopt(M_TRIM_THRESHOLD, kKeptAtMost);
   ::mallopt(M_ARENA_MAX, kArenas);
