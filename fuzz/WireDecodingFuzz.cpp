@@ -15,6 +15,7 @@
 namespace {
 
 using namespace zelkord::ipc;
+using zelkord::Descriptor;
 
 constexpr const char* kSignatures[] = {
     "a{sv}", "sa{sv}",  "sa{sv}a{sv}", "sxsay", "sxay",  "s",      "t",  "ss",
@@ -46,8 +47,8 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
 
   int pair[2];
   if (::socketpair(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0, pair) != 0) return 0;
-  OwnedFd client(pair[0]);
-  OwnedFd ours(pair[1]);
+  Descriptor client(pair[0]);
+  Descriptor ours(pair[1]);
   const auto bus = adoptSocket(ours, true);
   if (!bus) return 0;
   sd_bus_slot* slot = nullptr;

@@ -12,24 +12,29 @@
 
 namespace zelkord {
 
-// An owned file descriptor; -1 is none.
+// A file descriptor that is closed with its owner; -1 is none.
 class Descriptor final {
  public:
   Descriptor() = default;
   explicit Descriptor(int number) : number_(number) {}
-  Descriptor(Descriptor&& other) noexcept : number_(std::exchange(other.number_, -1)) {}
+  Descriptor(Descriptor&& other) noexcept : number_(other.release()) {}
   Descriptor& operator=(Descriptor&& other) noexcept {
-    std::swap(number_, other.number_);
+    if (this == &other) return *this;
+    reset();
+    number_ = other.release();
     return *this;
   }
-  ~Descriptor() {
-    if (number_ >= 0) ::close(number_);
-  }
+  ~Descriptor() { reset(); }
 
   explicit operator bool() const { return number_ >= 0; }
   int get() const { return number_; }
+  // Gives it up, open.
+  int release() { return std::exchange(number_, -1); }
+  void reset() {
+    if (number_ >= 0) ::close(release());
+  }
   // The close's own result, which is where some file systems report a failed write.
-  bool close() { return ::close(std::exchange(number_, -1)) == 0; }
+  bool close() { return ::close(release()) == 0; }
 
  private:
   int number_ = -1;

@@ -16,7 +16,7 @@ bool DescriptorReserve::spend(std::size_t needed) {
 
 void DescriptorReserve::refill() {
   while (kept_.size() < count_) {
-    OwnedFd kept(::eventfd(0, EFD_CLOEXEC));
+    Descriptor kept(::eventfd(0, EFD_CLOEXEC));
     if (!kept) return;
     kept_.push_back(std::move(kept));
   }

@@ -3,7 +3,7 @@
 #include <cstddef>
 #include <vector>
 
-#include "platform/linux/ipc/OwnedFd.h"
+#include "platform/linux/files/Descriptor.h"
 
 namespace zelkord::ipc {
 
@@ -22,7 +22,7 @@ class DescriptorReserve final {
 
  private:
   const std::size_t count_;
-  std::vector<OwnedFd> kept_;
+  std::vector<Descriptor> kept_;
 };
 
 }  // namespace zelkord::ipc

@@ -26,7 +26,7 @@ class DoorsTest : public testing::TestWithParam<Door> {
     EXPECT_EQ(opener.call("com.quenta.zelkord.Service1", "Open", ""), "");
     int handle = -1;
     EXPECT_GE(sd_bus_message_read(opener.reply(), "h", &handle), 0);
-    return IpcTestClient(OwnedFd(::fcntl(handle, F_DUPFD_CLOEXEC, 3)));
+    return IpcTestClient(Descriptor(::fcntl(handle, F_DUPFD_CLOEXEC, 3)));
   }
   bool isPrivate() const { return GetParam() != Door::Bus; }
 

@@ -17,7 +17,7 @@
 #include "base/Subscription.h"
 #include "base/Time.h"
 #include "platform/api/WorkQueue.h"
-#include "platform/linux/ipc/OwnedFd.h"
+#include "platform/linux/files/Descriptor.h"
 #include "platform/linux/queues/LoopInbox.h"
 
 namespace zelkord::ipc {
@@ -80,7 +80,7 @@ class ZK_CAPABILITY("loop") EventLoop final : private LoopHost {
   void _runInSpareTime();
   static void _runAll(std::vector<Task> tasks);
 
-  const OwnedFd epoll_;
+  const Descriptor epoll_;
   const std::shared_ptr<LoopInbox> inbox_;
 
   // Loop state.

@@ -9,7 +9,7 @@
 
 namespace zelkord::ipc {
 
-Handshake::Handshake(EventLoop& loop, OwnedFd socket, Authenticator authenticator,
+Handshake::Handshake(EventLoop& loop, Descriptor socket, Authenticator authenticator,
                      Finished finished)
     : loop_(loop),
       socket_(std::move(socket)),

@@ -4,9 +4,9 @@
 #include <string>
 
 #include "base/Subscription.h"
+#include "platform/linux/files/Descriptor.h"
 #include "platform/linux/ipc/Authenticator.h"
 #include "platform/linux/ipc/EventLoop.h"
-#include "platform/linux/ipc/OwnedFd.h"
 
 namespace zelkord::ipc {
 
@@ -20,10 +20,10 @@ class Handshake {
   // Called once, never from within `start`.
   using Finished = std::function<void(bool succeeded)>;
 
-  Handshake(EventLoop& loop, OwnedFd socket, Authenticator authenticator, Finished finished);
+  Handshake(EventLoop& loop, Descriptor socket, Authenticator authenticator, Finished finished);
   void start(Duration limit);
 
-  OwnedFd takeSocket() { return std::move(socket_); }
+  Descriptor takeSocket() { return std::move(socket_); }
   bool passesDescriptors() const { return authenticator_.passesDescriptors(); }
 
  private:
@@ -34,7 +34,7 @@ class Handshake {
   void _finish(bool succeeded);
 
   EventLoop& loop_;
-  OwnedFd socket_;
+  Descriptor socket_;
   Authenticator authenticator_;
   Finished finished_;
   Subscription watch_;

@@ -115,7 +115,7 @@ void sendUnfinishedMessages(const std::string& socket) {
 void leaveRepliesUnread(const std::string& socket) {
   static std::vector<IpcTestClient> clients;
   for (int i = 0; i < 40; ++i) {
-    auto& client = clients.emplace_back(OwnedFd(connectTo(socket)));
+    auto& client = clients.emplace_back(Descriptor(connectTo(socket)));
     for (int call = 0; call < 30; ++call) {
       auto message = client.newCall("Many");
       sd_bus_message_append(message.get(), "u", 500'000u);

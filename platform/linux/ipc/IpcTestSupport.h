@@ -25,8 +25,8 @@
 #include <utility>
 #include <vector>
 
+#include "platform/linux/files/Descriptor.h"
 #include "platform/linux/ipc/BusPointers.h"
-#include "platform/linux/ipc/OwnedFd.h"
 #include "platform/linux/ipc/SdBusInterprocess.h"
 #include "platform/linux/queues/LinuxClock.h"
 #include "platform/linux/queues/LinuxWorkQueues.h"
@@ -101,7 +101,7 @@ class IpcTestBus {
  private:
   // The socket's file is there a moment before anybody listens.
   static bool _accepts(const std::string& path) {
-    const OwnedFd socket(::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0));
+    const Descriptor socket(::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0));
     sockaddr_un address{.sun_family = AF_UNIX, .sun_path = {}};
     path.copy(address.sun_path, sizeof(address.sun_path) - 1);
     return ::connect(socket.get(), reinterpret_cast<sockaddr*>(&address), sizeof(address)) == 0;
@@ -186,7 +186,7 @@ class IpcTestClient {
     sd_bus_set_method_call_timeout(bus, 20'000'000);
     started_ = sd_bus_start(bus);
   }
-  explicit IpcTestClient(OwnedFd socket) {
+  explicit IpcTestClient(Descriptor socket) {
     sd_bus* bus = nullptr;
     sd_bus_new(&bus);
     bus_.reset(bus);
@@ -272,7 +272,7 @@ class IpcRawClient {
   }
   bool connected() const { return connected_; }
   int descriptor() const { return socket_.get(); }
-  OwnedFd take() { return std::move(socket_); }
+  Descriptor take() { return std::move(socket_); }
   bool send(std::string_view bytes) {
     while (!bytes.empty()) {
       const auto sent = ::send(socket_.get(), bytes.data(), bytes.size(), MSG_NOSIGNAL);
@@ -296,7 +296,7 @@ class IpcRawClient {
   }
 
  private:
-  OwnedFd socket_;
+  Descriptor socket_;
   bool connected_ = false;
 };
 

@@ -33,14 +33,14 @@ const sockaddr* genericAddress(const sockaddr_un& address) {
   return reinterpret_cast<const sockaddr*>(&address);
 }
 
-OwnedFd makeUnixSocket() {
-  return OwnedFd(::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0));
+Descriptor makeUnixSocket() {
+  return Descriptor(::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0));
 }
 
 // Keeps others from taking a socket that is bound and does not listen yet for a dead one. Gives up
 // when somebody keeps the lock for long.
-OwnedFd lockDirectory(const std::string& directory) {
-  OwnedFd lock(::open(directory.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+Descriptor lockDirectory(const std::string& directory) {
+  Descriptor lock(::open(directory.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
   for (int i = 0; i < kLockAttempts && ::flock(lock.get(), LOCK_EX | LOCK_NB) != 0; ++i) {
     if (errno != EWOULDBLOCK) break;
     std::this_thread::sleep_for(kLockPause);
@@ -111,12 +111,12 @@ std::optional<ListeningSocket> ListeningSocket::handedOver() {
   for (int fd = SD_LISTEN_FDS_START; fd < SD_LISTEN_FDS_START + count; ++fd) {
     if (sd_is_socket(fd, AF_UNIX, SOCK_STREAM, 1) <= 0) continue;
     ::fcntl(fd, F_SETFL, ::fcntl(fd, F_GETFL) | O_NONBLOCK);
-    return ListeningSocket(OwnedFd(fd), {});
+    return ListeningSocket(Descriptor(fd), {});
   }
   return std::nullopt;
 }
 
-ListeningSocket::ListeningSocket(OwnedFd fd, std::string path)
+ListeningSocket::ListeningSocket(Descriptor fd, std::string path)
     : fd_(std::move(fd)), path_(std::move(path)) {
   struct stat status {};
   if (::stat(path_.c_str(), &status) != 0) return;

@@ -7,7 +7,7 @@
 #include <variant>
 
 #include "base/Error.h"
-#include "platform/linux/ipc/OwnedFd.h"
+#include "platform/linux/files/Descriptor.h"
 
 namespace zelkord::ipc {
 
@@ -35,9 +35,9 @@ class ListeningSocket {
   static std::string address(const std::string& path);
 
  private:
-  ListeningSocket(OwnedFd fd, std::string path);
+  ListeningSocket(Descriptor fd, std::string path);
 
-  OwnedFd fd_;
+  Descriptor fd_;
   std::string path_;  // empty: not ours
   dev_t device_ = 0;
   ino_t inode_ = 0;

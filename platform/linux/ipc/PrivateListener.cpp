@@ -79,9 +79,9 @@ void PrivateListener::_accept() {
   });
 }
 
-OwnedFd PrivateListener::_acceptOne() {
+Descriptor PrivateListener::_acceptOne() {
   const auto accept = [this] {
-    return OwnedFd(
+    return Descriptor(
         ::accept4(socket_->descriptor(), nullptr, nullptr, SOCK_CLOEXEC | SOCK_NONBLOCK));
   };
   auto socket = accept();
@@ -107,7 +107,7 @@ void PrivateListener::_pauseAccepting() {
   });
 }
 
-bool PrivateListener::_consider(OwnedFd socket, Peer peer) {
+bool PrivateListener::_consider(Descriptor socket, Peer peer) {
   if (peer.uid != ::geteuid()) {
     context_.log.error("connection of user {} refused", peer.uid);
     return false;
@@ -192,7 +192,7 @@ FileHandle PrivateListener::openConnection(Peer peer) {
   int pair[2];
   if (closed_ || ::socketpair(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0, pair) != 0) return {};
   FileHandle client(pair[0]);
-  return _consider(OwnedFd(pair[1]), peer) ? client : FileHandle();
+  return _consider(Descriptor(pair[1]), peer) ? client : FileHandle();
 }
 
 void PrivateListener::broadcast(const std::string& interface, const std::string& member,

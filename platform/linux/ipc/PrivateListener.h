@@ -45,7 +45,7 @@ class PrivateListener final : public std::enable_shared_from_this<PrivateListene
   using Instant = std::chrono::steady_clock::time_point;
   // Accepted and not authenticated.
   struct Guest {
-    OwnedFd socket;  // until the handshake has it
+    Descriptor socket;  // until the handshake has it
     Peer peer;
     Instant accepted;
     PrivateLink::Admission admission;
@@ -54,10 +54,10 @@ class PrivateListener final : public std::enable_shared_from_this<PrivateListene
   };
 
   void _accept();
-  OwnedFd _acceptOne();
+  Descriptor _acceptOne();
   void _pauseAccepting();
   // False: there is no place for it.
-  bool _consider(OwnedFd socket, Peer peer);
+  bool _consider(Descriptor socket, Peer peer);
   void _askAdmission(std::uint64_t guest, Peer peer);
   void _admitted(std::uint64_t guest, std::optional<Subscription> place);
   void _authenticated(std::uint64_t guest, bool succeeded);

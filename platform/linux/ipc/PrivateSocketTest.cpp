@@ -245,7 +245,7 @@ TEST_F(PrivateSocketTest, DeadSocketsOfEarlierRunsAreRemoved) {
   const auto directory = server_.directory.path() + "/left/";
   std::filesystem::create_directory(directory);
   const auto bound = [&](const std::string& name) {
-    OwnedFd socket(::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0));
+    Descriptor socket(::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0));
     sockaddr_un address{.sun_family = AF_UNIX, .sun_path = {}};
     (directory + name).copy(address.sun_path, sizeof(address.sun_path) - 1);
     EXPECT_EQ(::bind(socket.get(), reinterpret_cast<sockaddr*>(&address), sizeof(address)), 0);
@@ -312,7 +312,7 @@ TEST_F(PrivateSocketTest, OnlyADeadDaemonsSocketIsReplaced) {
   sockaddr_un address{.sun_family = AF_UNIX, .sun_path = {}};
   (stale + "/socket").copy(address.sun_path, sizeof(address.sun_path) - 1);
   {
-    const OwnedFd dead(::socket(AF_UNIX, SOCK_STREAM, 0));
+    const Descriptor dead(::socket(AF_UNIX, SOCK_STREAM, 0));
     ASSERT_EQ(::bind(dead.get(), reinterpret_cast<sockaddr*>(&address), sizeof(address)), 0);
   }
   options.runtimeDirectory = stale;

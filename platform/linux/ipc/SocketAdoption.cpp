@@ -13,7 +13,7 @@ namespace {
 
 constexpr int kSocketBufferBytes = 1 << 20;  // the kernel cuts it to what it allows
 
-BusPtr startServer(OwnedFd fd, bool passesDescriptors) {
+BusPtr startServer(Descriptor fd, bool passesDescriptors) {
   sd_bus* bus = nullptr;
   sd_id128_t id{};
   if (sd_bus_new(&bus) < 0) return nullptr;
@@ -41,19 +41,19 @@ bool authenticateAsClient(sd_bus* bus, int fd, bool passesDescriptors) {
 }
 
 bool makeReadNoDescriptors(sd_bus* bus) {
-  const OwnedFd noSocket(::eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK));
+  const Descriptor noSocket(::eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK));
   return noSocket && ::dup3(noSocket.get(), sd_bus_get_fd(bus), O_CLOEXEC) >= 0 &&
          sd_bus_process(bus, nullptr) == 0;
 }
 
 }  // namespace
 
-BusPtr adoptSocket(OwnedFd& socket, bool passesDescriptors) {
+BusPtr adoptSocket(Descriptor& socket, bool passesDescriptors) {
   int pair[2];
   if (::socketpair(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0, pair) != 0)
     return nullptr;
-  OwnedFd client(pair[0]);
-  auto bus = startServer(OwnedFd(pair[1]), passesDescriptors);
+  Descriptor client(pair[0]);
+  auto bus = startServer(Descriptor(pair[1]), passesDescriptors);
   if (!bus || !authenticateAsClient(bus.get(), client.get(), passesDescriptors)) return nullptr;
   client.reset();
   if (!makeReadNoDescriptors(bus.get())) return nullptr;

@@ -1,7 +1,7 @@
 #pragma once
 
+#include "platform/linux/files/Descriptor.h"
 #include "platform/linux/ipc/BusPointers.h"
-#include "platform/linux/ipc/OwnedFd.h"
 
 namespace zelkord::ipc {
 
@@ -16,6 +16,6 @@ namespace zelkord::ipc {
 // In between it meets a descriptor that is no socket, and from then on reads in a way in which the
 // kernel hands over no descriptors: what a client attaches is closed at once. No method takes any,
 // and pieces of a message could bring as many as there are.
-BusPtr adoptSocket(OwnedFd& socket, bool passesDescriptors);
+BusPtr adoptSocket(Descriptor& socket, bool passesDescriptors);
 
 }  // namespace zelkord::ipc

@@ -19,8 +19,8 @@ class WireCodecTest : public testing::Test {
   WireCodecTest() {
     int pair[2];
     EXPECT_EQ(::socketpair(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0, pair), 0);
-    peer_ = OwnedFd(pair[0]);
-    OwnedFd ours(pair[1]);
+    peer_ = Descriptor(pair[0]);
+    Descriptor ours(pair[1]);
     bus_ = adoptSocket(ours, true);
   }
 
@@ -37,7 +37,7 @@ class WireCodecTest : public testing::Test {
     return decodeArguments(message(fill).get(), signature, {});
   }
 
-  OwnedFd peer_;
+  Descriptor peer_;
   BusPtr bus_;
 };
 
