@@ -9,8 +9,7 @@
 
 namespace zelkord::ipc {
 
-Handshake::Handshake(EventLoop& loop, Descriptor socket, Authenticator authenticator,
-                     Finished finished)
+Handshake::Handshake(Loop& loop, Descriptor socket, Authenticator authenticator, Finished finished)
     : loop_(loop),
       socket_(std::move(socket)),
       authenticator_(std::move(authenticator)),

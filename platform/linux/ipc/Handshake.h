@@ -6,7 +6,7 @@
 #include "base/Subscription.h"
 #include "platform/linux/files/Descriptor.h"
 #include "platform/linux/ipc/Authenticator.h"
-#include "platform/linux/ipc/EventLoop.h"
+#include "platform/linux/loop/Loop.h"
 
 namespace zelkord::ipc {
 
@@ -20,7 +20,7 @@ class Handshake {
   // Called once, never from within `start`.
   using Finished = std::function<void(bool succeeded)>;
 
-  Handshake(EventLoop& loop, Descriptor socket, Authenticator authenticator, Finished finished);
+  Handshake(Loop& loop, Descriptor socket, Authenticator authenticator, Finished finished);
   void start(Duration limit);
 
   Descriptor takeSocket() { return std::move(socket_); }
@@ -33,7 +33,7 @@ class Handshake {
   bool _reply(std::string_view text);
   void _finish(bool succeeded);
 
-  EventLoop& loop_;
+  Loop& loop_;
   Descriptor socket_;
   Authenticator authenticator_;
   Finished finished_;

@@ -8,15 +8,15 @@
 #include "platform/linux/ipc/ClientMemory.h"
 #include "platform/linux/ipc/ConnectionBudgets.h"
 #include "platform/linux/ipc/DescriptorReserve.h"
-#include "platform/linux/ipc/EventLoop.h"
 #include "platform/linux/ipc/SdBusOptions.h"
 #include "platform/linux/ipc/TransportCounts.h"
+#include "platform/linux/loop/Loop.h"
 
 namespace zelkord::ipc {
 
 // What all parts of the transport share; they end before it does.
 struct IpcContext {
-  EventLoop& loop;
+  Loop& loop;
   WorkQueues& queues;
   Logger log;
   LimitReports& limits;

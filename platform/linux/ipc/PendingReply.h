@@ -7,7 +7,7 @@
 #include "platform/api/Log.h"
 #include "platform/linux/ipc/CallFlow.h"
 #include "platform/linux/ipc/Outlet.h"
-#include "platform/linux/queues/LoopInbox.h"
+#include "platform/linux/loop/LoopInbox.h"
 
 namespace zelkord::ipc {
 

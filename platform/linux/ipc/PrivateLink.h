@@ -22,7 +22,7 @@ class PrivateListener;
 // the loop. Ownership: its listener, until the end.
 //
 // A few short messages are read as they come. What comes in a row after them, and the pieces of
-// long ones, wait their turn among all links' (EventLoop::inSpareTime), so that they keep nobody
+// long ones, wait their turn among all links' (Loop::inSpareTime), so that they keep nobody
 // from asking.
 class PrivateLink final : public Outlet,
                           public Caller,

@@ -46,7 +46,7 @@ std::uint64_t descriptorLimit() {
   return limit.rlim_cur;
 }
 
-IpcContext makeContext(EventLoop& loop, WorkQueues& queues, LogSink& log, LimitReports& limits,
+IpcContext makeContext(Loop& loop, WorkQueues& queues, LogSink& log, LimitReports& limits,
                        SdBusOptions options) {
   const auto descriptors = options.descriptors > 0 ? options.descriptors : descriptorLimit();
   const ClientMemory::Size memory{options.clientMemory, options.clientMemory / 4,
@@ -216,7 +216,7 @@ Statistics SdBusInterprocess::statistics() const {
 }
 
 void SdBusInterprocess::postNotification(std::string_view name) {
-  loop_.inbox()->post([weak = std::weak_ptr(doors_), posted = std::string(name)] {
+  loop_.post([weak = std::weak_ptr(doors_), posted = std::string(name)] {
     const auto doors = weak.lock();
     if (!doors || !doors->socket) return;
     const auto interface = notificationInterface(doors->name);

@@ -45,7 +45,7 @@ class SdBusInterprocess final : public Interprocess {
  private:
   struct Doors;
 
-  EventLoop loop_;
+  Loop loop_{"zelkord-ipc"};
   IpcContext context_;
   const std::shared_ptr<Doors> doors_;
 };

@@ -18,7 +18,7 @@
 
 #include "base/Check.h"
 #include "base/Mutex.h"
-#include "platform/linux/queues/ServiceThread.h"
+#include "platform/linux/loop/ServiceThread.h"
 
 namespace zelkord {
 
@@ -59,7 +59,8 @@ struct LinuxSignals::State {
     struct sigaction former {};
     ZK_CHECK(::sigaction(signal, &action, &former) == 0, "a signal that cannot be handled");
     dispositions.emplace(signal, former);
-    if (!thread.joinable()) thread = std::thread([this] { run(); });
+    if (thread.joinable()) return;
+    thread = startServiceThread("zk-signals", ThreadWork::Tasks, [this] { run(); });
   }
 
   void remove(std::uint64_t id) {
@@ -76,7 +77,6 @@ struct LinuxSignals::State {
   }
 
   void run() {
-    beginServiceThread("zk-signals");
     for (;;) {
       waitForWakeUp();
       const MutexLock lock(mutex);

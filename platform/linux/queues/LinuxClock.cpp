@@ -3,25 +3,26 @@
 #include <time.h>
 
 #include "base/Check.h"
+#include "platform/linux/loop/SteadyTimer.h"
 
 namespace zelkord {
 
 namespace {
 
-Duration readClock(clockid_t clock) {
+WallTime readWallClock() {
   timespec time{};
-  ::clock_gettime(clock, &time);
-  return std::chrono::seconds(time.tv_sec) + std::chrono::nanoseconds(time.tv_nsec);
+  ::clock_gettime(CLOCK_REALTIME, &time);
+  return WallTime(std::chrono::seconds(time.tv_sec) + std::chrono::nanoseconds(time.tv_nsec));
 }
 
 }  // namespace
 
 LinuxClock::LinuxClock(double rate)
-    : rate_(rate), start_(readClock(CLOCK_BOOTTIME)), wallStart_(readClock(CLOCK_REALTIME)) {
+    : rate_(rate), start_(steadyNow()), wallStart_(readWallClock()) {
   ZK_CHECK(rate >= 1 && rate <= 100'000, "clock rate out of range");
 }
 
-SteadyTime LinuxClock::realNow() const { return SteadyTime(readClock(CLOCK_BOOTTIME)); }
+SteadyTime LinuxClock::realNow() const { return steadyNow(); }
 
 Duration LinuxClock::_scaledElapsed() const {
   return durationOfSeconds(secondsOf(realNow() - start_) * rate_);
@@ -32,7 +33,7 @@ SteadyTime LinuxClock::now() const {
 }
 
 WallTime LinuxClock::wallNow() const {
-  return rate_ == 1 ? WallTime(readClock(CLOCK_REALTIME)) : wallStart_ + _scaledElapsed();
+  return rate_ == 1 ? readWallClock() : wallStart_ + _scaledElapsed();
 }
 
 Duration realDuration(Duration scaled, double rate) {

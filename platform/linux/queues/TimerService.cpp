@@ -1,37 +1,19 @@
 #include "platform/linux/queues/TimerService.h"
 
-#include <sys/timerfd.h>
-#include <time.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <tuple>
 
-#include "base/Check.h"
+#include "platform/linux/loop/ServiceThread.h"
 #include "platform/linux/queues/Alarm.h"
-#include "platform/linux/queues/ServiceThread.h"
 
 namespace zelkord {
 
-namespace {
-SteadyTime timerNow() {
-  timespec time{};
-  ::clock_gettime(CLOCK_BOOTTIME, &time);
-  return SteadyTime(std::chrono::seconds(time.tv_sec) + std::chrono::nanoseconds(time.tv_nsec));
-}
-}  // namespace
-
-TimerService::TimerService() : timer_(::timerfd_create(CLOCK_BOOTTIME, TFD_CLOEXEC)) {
-  ZK_CHECK(timer_ >= 0, "no timer from the kernel");
-}
-
-TimerService::~TimerService() {
-  stop();
-  ::close(timer_);
-}
+TimerService::~TimerService() { stop(); }
 
 void TimerService::arm(const std::shared_ptr<Alarm>& alarm, Duration delay, Duration leeway) {
-  const SteadyTime deadline = deadlineAfter(timerNow(), delay);
+  const SteadyTime deadline = deadlineAfter(steadyNow(), delay);
   std::shared_ptr<Alarm> released;
   const MutexLock lock(mutex_);
   if (stopped_) return;
@@ -44,7 +26,8 @@ void TimerService::arm(const std::shared_ptr<Alarm>& alarm, Duration delay, Dura
   released = _unplace(*alarm);
   _place(alarm);
   _program();
-  if (!thread_.joinable()) thread_ = std::thread([this] { _run(); });
+  if (!thread_.joinable())
+    thread_ = startServiceThread("zk-timer", ThreadWork::Tasks, [this] { _run(); });
 }
 
 void TimerService::disarm(Alarm& alarm) {
@@ -95,29 +78,18 @@ void TimerService::_program() {
   const SteadyTime first = alarms_.empty() ? SteadyTime::max() : alarms_.begin()->first.first;
   if (first >= programmed_) return;
   programmed_ = first;
-  _setTimer(first);
-}
-
-void TimerService::_setTimer(SteadyTime time) {
-  // A time of zero would switch it off.
-  const Duration sinceBoot = std::max(Duration(1), time.time_since_epoch());
-  const auto seconds = std::chrono::floor<std::chrono::seconds>(sinceBoot);
-  itimerspec setting{};
-  setting.it_value.tv_sec = seconds.count();
-  setting.it_value.tv_nsec = (sinceBoot - seconds).count();
-  ::timerfd_settime(timer_, TFD_TIMER_ABSTIME, &setting, nullptr);
+  timer_.set(first);
 }
 
 void TimerService::_run() {
-  beginServiceThread("zk-timer");
   for (;;) {
     std::uint64_t expirations = 0;
-    if (::read(timer_, &expirations, sizeof expirations) < 0) continue;
+    if (::read(timer_.descriptor(), &expirations, sizeof expirations) < 0) continue;
     {
       const MutexLock lock(mutex_);
       if (stopped_) return;
     }
-    for (const Due& due : _takeDue(timerNow())) Alarm::fire(due.alarm, due.generation);
+    for (const Due& due : _takeDue(steadyNow())) Alarm::fire(due.alarm, due.generation);
   }
 }
 
@@ -163,7 +135,7 @@ void TimerService::stop() {
     thread = std::move(thread_);
     released.swap(alarms_);
     for (const auto& [key, alarm] : released) alarm->place_.reset();
-    _setTimer(SteadyTime{});
+    timer_.set(SteadyTime{});
   }
   if (thread.joinable()) thread.join();
 }

@@ -10,6 +10,7 @@
 #include "base/Mutex.h"
 #include "base/Time.h"
 #include "platform/api/WorkQueue.h"
+#include "platform/linux/loop/SteadyTimer.h"
 
 namespace zelkord {
 
@@ -27,7 +28,7 @@ class QueueCore;
 // Threading: any thread. Ownership: shared; subscriptions hold it weakly.
 class TimerService final {
  public:
-  TimerService();
+  TimerService() = default;
   ~TimerService();
   TimerService(const TimerService&) = delete;
   TimerService& operator=(const TimerService&) = delete;
@@ -58,9 +59,8 @@ class TimerService final {
   void _place(const std::shared_ptr<Alarm>& alarm) ZK_REQUIRES(mutex_);
   std::shared_ptr<Alarm> _unplace(Alarm& alarm) ZK_REQUIRES(mutex_);
   void _program() ZK_REQUIRES(mutex_);
-  void _setTimer(SteadyTime time);
 
-  const int timer_;
+  SteadyTimer timer_{SteadyTimer::Reads::Wait};
 
   Mutex mutex_;
   Alarms alarms_ ZK_GUARDED_BY(mutex_);

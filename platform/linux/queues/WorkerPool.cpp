@@ -5,8 +5,8 @@
 #include <thread>
 #include <utility>
 
+#include "platform/linux/loop/ServiceThread.h"
 #include "platform/linux/queues/QueueCore.h"
-#include "platform/linux/queues/ServiceThread.h"
 
 namespace zelkord {
 
@@ -75,7 +75,7 @@ void WorkerPool::_perform(Start start) {
   if (start.idle) start.idle->parker_.unpark();
   if (!start.isNew) return;
   try {
-    std::thread([this] { _run(); }).detach();
+    startServiceThread("zk-worker", ThreadWork::Tasks, [this] { _run(); }).detach();
   } catch (const std::system_error&) {
     const MutexLock lock(mutex_);
     --counts_.total;
@@ -85,7 +85,6 @@ void WorkerPool::_perform(Start start) {
 }
 
 void WorkerPool::_run() {
-  beginServiceThread("zk-worker");
   PoolWorker worker(*this);
   tlsPoolWorker = &worker;
   while (const Ticket ticket = _next(worker)) ticket->runTicket();

@@ -17,8 +17,11 @@ constexpr Duration kMaximumIdleTime = 118s;
 
 }  // namespace
 
-CurlConnections::CurlConnections(IOLoop& loop, CurlSettings settings)
-    : loop_(loop), settings_(std::move(settings)), maximumIdle_(settings_.maximumIdleConnections) {}
+CurlConnections::CurlConnections(Loop& loop, CurlSettings settings)
+    : loop_(loop),
+      settings_(std::move(settings)),
+      maximumIdle_(settings_.maximumIdleConnections),
+      timer_(loop, [this] { _runDue(); }) {}
 
 CurlConnections::~CurlConnections() { ZK_CHECK(!open_, "connections are closed before their end"); }
 
@@ -67,11 +70,11 @@ std::vector<std::shared_ptr<CurlURLTask>> CurlConnections::close() {
   _closeMulti();
   idle_.clear();
   curl_share_cleanup(std::exchange(share_, nullptr));
-  loop_.remove(*this);
+  loopEnd_.reset();
   return dropped;
 }
 
-void CurlConnections::loopEnded() {
+void CurlConnections::_loopEnded() {
   while (!active_.empty()) {
     CurlTransfer& transfer = *active_.back();
     curl_multi_remove_handle(multi_, transfer.handle());
@@ -83,9 +86,9 @@ void CurlConnections::loopEnded() {
 
 void CurlConnections::_open() {
   loop_.assertCurrent();
-  purgeDue_ = kNever;
+  _setDue(purgeDue_, kNever);
   if (!std::exchange(open_, true)) {
-    loop_.add(*this);
+    loopEnd_ = loop_.atEnd([this] { _loopEnded(); });
     share_ = curl_share_init();
     curl_share_setopt(share_, CURLSHOPT_SHARE, CURL_LOCK_DATA_SSL_SESSION);
   }
@@ -104,8 +107,9 @@ void CurlConnections::_open() {
 void CurlConnections::_closeMulti() {
   curl_multi_cleanup(std::exchange(multi_, nullptr));
   loop_.assertCurrent();
-  loop_.unwatchAll(*this);
+  watches_.clear();
   curlDue_ = overdueCheck_ = purgeDue_ = kNever;
+  timer_.set(kNever);
 }
 
 std::unique_ptr<CurlTransfer> CurlConnections::_takeTransfer() {
@@ -117,25 +121,27 @@ std::unique_ptr<CurlTransfer> CurlConnections::_takeTransfer() {
 
 void CurlConnections::_start(CurlTransfer& transfer) {
   if (fastOpenFails_) transfer.disableFastOpen();
-  overdueCheck_ = std::min(overdueCheck_, transfer.deadline());
+  _setDue(overdueCheck_, std::min(overdueCheck_, transfer.deadline()));
   const CURLMcode code = curl_multi_add_handle(multi_, transfer.handle());
   if (code == CURLM_OK) return;
   _finish(transfer, {.error = urlError(URLErrorCode::Other, curl_multi_strerror(code))});
 }
 
-void CurlConnections::ready(int descriptor, unsigned events) {
+void CurlConnections::_ready(curl_socket_t socket, std::uint32_t events) {
   int bits = (events & EPOLLIN ? CURL_CSELECT_IN : 0) | (events & EPOLLOUT ? CURL_CSELECT_OUT : 0);
   if (events & (EPOLLERR | EPOLLHUP)) bits |= CURL_CSELECT_ERR;
   int running = 0;
-  curl_multi_socket_action(multi_, descriptor, bits, &running);
+  curl_multi_socket_action(multi_, socket, bits, &running);
   _collectEnded();
 }
 
-SteadyTime CurlConnections::nextDue() const {
-  return std::min({curlDue_, overdueCheck_, purgeDue_});
+void CurlConnections::_setDue(SteadyTime& which, SteadyTime time) {
+  which = time;
+  timer_.set(std::min({curlDue_, overdueCheck_, purgeDue_}));
 }
 
-void CurlConnections::runDue(SteadyTime now) {
+void CurlConnections::_runDue() {
+  const auto now = steadyNow();
   if (curlDue_ <= now) {
     curlDue_ = kNever;
     int running = 0;
@@ -143,7 +149,7 @@ void CurlConnections::runDue(SteadyTime now) {
     _collectEnded();
   }
   if (overdueCheck_ <= now) _endOverdue(now);
-  if (purgeDue_ > now) return;
+  if (purgeDue_ > now) return _setDue(purgeDue_, purgeDue_);
   retired_ ? retire() : _closeMulti();
 }
 
@@ -223,10 +229,12 @@ std::shared_ptr<CurlURLTask> CurlConnections::_release(CurlTransfer& transfer) {
   if (idle_.size() < kMaximumIdleHandles) idle_.push_back(std::move(active_.back()));
   active_.pop_back();
   if (active_.empty()) {
-    overdueCheck_ = kNever;
+    _setDue(overdueCheck_, kNever);
     // Not at once: libcurl may be at work.
-    if (retired_) purgeDue_ = IOLoop::now();
-    if (!retired_ && settings_.isMetered()) purgeDue_ = IOLoop::now() + settings_.meteredIdleTime;
+    if (retired_) _setDue(purgeDue_, steadyNow());
+    if (!retired_ && settings_.isMetered()) {
+      _setDue(purgeDue_, steadyNow() + settings_.meteredIdleTime);
+    }
   }
   return task;
 }
@@ -235,19 +243,27 @@ int CurlConnections::_onSocket(CURL*, curl_socket_t socket, int what, void* self
   auto& connections = *static_cast<CurlConnections*>(self);
   connections.loop_.assertCurrent();
   if (what == CURL_POLL_REMOVE) {
-    connections.loop_.unwatch(socket);
+    connections.watches_.erase(socket);
     return 0;
   }
   const std::uint32_t events =
       (what & CURL_POLL_IN ? EPOLLIN : 0u) | (what & CURL_POLL_OUT ? EPOLLOUT : 0u);
-  connections.loop_.watch(socket, events, connections);
+  auto& watch = connections.watches_[socket];
+  if (watch) {
+    connections.loop_.changeEvents(socket, events);
+  } else {
+    watch = connections.loop_.watch(socket, events, [&connections, socket](std::uint32_t is) {
+      connections._ready(socket, is);
+    });
+  }
   return 0;
 }
 
 int CurlConnections::_onTimer(CURLM*, long milliseconds, void* self) {
   auto& connections = *static_cast<CurlConnections*>(self);
-  connections.curlDue_ =
-      milliseconds < 0 ? kNever : IOLoop::now() + std::chrono::milliseconds(milliseconds);
+  const auto due =
+      milliseconds < 0 ? kNever : steadyNow() + std::chrono::milliseconds(milliseconds);
+  connections._setDue(connections.curlDue_, due);
   return 0;
 }
 

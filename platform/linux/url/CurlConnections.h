@@ -3,14 +3,16 @@
 #include <curl/curl.h>
 
 #include <cstddef>
+#include <cstdint>
 #include <memory>
+#include <unordered_map>
 #include <vector>
 
+#include "platform/linux/loop/Loop.h"
+#include "platform/linux/loop/LoopTimer.h"
 #include "platform/linux/url/CurlSettings.h"
 #include "platform/linux/url/CurlTransfer.h"
 #include "platform/linux/url/CurlURLTask.h"
-#include "platform/linux/url/IOLoop.h"
-#include "platform/linux/url/IOLoopClient.h"
 
 namespace zelkord {
 
@@ -21,12 +23,12 @@ namespace zelkord {
 // connections, goes when it has been idle for a while, and comes back with the next task); retired,
 // when it closes as soon as it is idle; closed.
 //
-// Threading: the I/O loop; made and, once closed, destroyed on any.
+// Threading: the loop; made and, once closed, destroyed on any.
 // Ownership: holds the tasks under way.
-class CurlConnections final : public IOLoopClient {
+class CurlConnections final {
  public:
-  CurlConnections(IOLoop& loop, CurlSettings settings);
-  ~CurlConnections() override;
+  CurlConnections(Loop& loop, CurlSettings settings);
+  ~CurlConnections();
   CurlConnections(const CurlConnections&) = delete;
   CurlConnections& operator=(const CurlConnections&) = delete;
 
@@ -40,13 +42,9 @@ class CurlConnections final : public IOLoopClient {
   // Gives up the tasks under way; the caller drops them.
   std::vector<std::shared_ptr<CurlURLTask>> close();
 
-  // IOLoopClient
-  void ready(int descriptor, unsigned events) override;
-  SteadyTime nextDue() const override;
-  void runDue(SteadyTime now) override;
-  void loopEnded() override;
-
  private:
+  static constexpr SteadyTime kNever = LoopTimer::kNever;
+
   void _open();
   void _closeMulti();
   std::unique_ptr<CurlTransfer> _takeTransfer();
@@ -56,16 +54,21 @@ class CurlConnections final : public IOLoopClient {
   bool _follow(CurlTransfer& transfer, URLResult& result);
   void _finish(CurlTransfer& transfer, URLResult result);
   std::shared_ptr<CurlURLTask> _release(CurlTransfer& transfer);
+  void _loopEnded();
+  void _ready(curl_socket_t socket, std::uint32_t events);
+  // Sets one of the times below, and with it when `_runDue` is wanted next.
+  void _setDue(SteadyTime& which, SteadyTime time);
+  void _runDue();
   void _endOverdue(SteadyTime now);
 
   static int _onSocket(CURL*, curl_socket_t socket, int what, void* self, void*);
   static int _onTimer(CURLM*, long milliseconds, void* self);
 
   // Fixed after construction.
-  IOLoop& loop_;
+  Loop& loop_;
   const CurlSettings settings_;
 
-  // The I/O loop.
+  // The loop's.
   bool open_ = false;
   bool retired_ = false;
   bool closed_ = false;
@@ -78,6 +81,9 @@ class CurlConnections final : public IOLoopClient {
   SteadyTime curlDue_ = kNever;
   SteadyTime overdueCheck_ = kNever;  // no transfer is overdue before
   SteadyTime purgeDue_ = kNever;
+  LoopTimer timer_;
+  std::unordered_map<curl_socket_t, Subscription> watches_;
+  Subscription loopEnd_;
 };
 
 }  // namespace zelkord

@@ -13,7 +13,7 @@ constexpr long kLeastIdleConnections = 2;
 
 }  // namespace
 
-CurlPartitions::CurlPartitions(IOLoop& loop, CurlSettings settings)
+CurlPartitions::CurlPartitions(Loop& loop, CurlSettings settings)
     : loop_(loop), settings_(std::move(settings)) {}
 
 void CurlPartitions::begin(std::shared_ptr<CurlURLTask> task, CurlURLTask::Order order,

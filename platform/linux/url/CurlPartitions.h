@@ -6,10 +6,10 @@
 #include <string>
 #include <vector>
 
+#include "platform/linux/loop/Loop.h"
 #include "platform/linux/url/CurlConnections.h"
 #include "platform/linux/url/CurlSettings.h"
 #include "platform/linux/url/CurlURLTask.h"
-#include "platform/linux/url/IOLoop.h"
 #include "platform/linux/url/TransferPlace.h"
 
 namespace zelkord {
@@ -22,11 +22,11 @@ namespace zelkord {
 // through. Late requests of an ended identity, and those without one that were made before an
 // ending, get connections that nobody else uses.
 //
-// Threading: the I/O loop; made and, once closed, destroyed on any. Ownership: holds the tasks
+// Threading: the loop; made and, once closed, destroyed on any. Ownership: holds the tasks
 // under way.
 class CurlPartitions final {
  public:
-  CurlPartitions(IOLoop& loop, CurlSettings settings);
+  CurlPartitions(Loop& loop, CurlSettings settings);
 
   void begin(std::shared_ptr<CurlURLTask> task, CurlURLTask::Order order, TransferPlace place);
   void cancel(CurlURLTask& task);
@@ -49,10 +49,10 @@ class CurlPartitions final {
   void _shareIdleConnections();
 
   // Fixed after construction.
-  IOLoop& loop_;
+  Loop& loop_;
   const CurlSettings settings_;
 
-  // The I/O loop.
+  // The loop's.
   bool closed_ = false;
   Partitions live_;  // the last used by an identity last
   std::vector<std::shared_ptr<CurlConnections>> retired_;

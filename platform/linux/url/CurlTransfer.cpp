@@ -7,9 +7,9 @@
 #include <utility>
 
 #include "base/Check.h"
+#include "platform/linux/loop/Loop.h"
 #include "platform/linux/url/CurlErrors.h"
 #include "platform/linux/url/CurlOptions.h"
-#include "platform/linux/url/IOLoop.h"
 #include "platform/linux/url/RequestPolicy.h"
 #include "platform/linux/url/URLParts.h"
 
@@ -89,7 +89,7 @@ void CurlTransfer::begin(std::shared_ptr<CurlURLTask> task, CurlURLTask::Order o
 
 void CurlTransfer::restart(std::shared_ptr<const URLRequest> request) {
   order_.request = std::move(request);
-  begun_ = progressed_ = IOLoop::now();
+  begun_ = progressed_ = steadyNow();
   bytesMoved_ = 0;
   requestsSent_ = 0;
   repeatRefused_ = false;
@@ -240,7 +240,7 @@ void CurlTransfer::recordTiming(bool hasResponse) {
   timing_.bytesReceived += curlLong(handle_, CURLINFO_HEADER_SIZE);
   timing_.bytesReceived += curlNumber(handle_, CURLINFO_SIZE_DOWNLOAD_T);
   timing_.retries += std::max(0, requestsSent_ - 1);
-  timing_.interface = interfaces_->nameOf(curlText(handle_, CURLINFO_LOCAL_IP), IOLoop::now());
+  timing_.interface = interfaces_->nameOf(curlText(handle_, CURLINFO_LOCAL_IP), steadyNow());
   timing_.peerAddress = endpointText(curlText(handle_, CURLINFO_PRIMARY_IP),
                                      curlLong(handle_, CURLINFO_PRIMARY_PORT));
 }
@@ -257,13 +257,13 @@ std::optional<json::object> CurlTransfer::connectionInformation() const {
 
 std::size_t CurlTransfer::_onHeader(char* bytes, std::size_t, std::size_t size, void* self) {
   auto& transfer = *static_cast<CurlTransfer*>(self);
-  transfer.progressed_ = IOLoop::now();
+  transfer.progressed_ = steadyNow();
   return transfer.response_.addHeaderLine({bytes, size}) ? size : 0;
 }
 
 std::size_t CurlTransfer::_onBody(char* bytes, std::size_t, std::size_t size, void* self) {
   auto& transfer = *static_cast<CurlTransfer*>(self);
-  transfer.progressed_ = IOLoop::now();
+  transfer.progressed_ = steadyNow();
   return transfer.response_.addBody({bytes, size}) ? size : CURL_WRITEFUNC_ERROR;
 }
 
@@ -271,7 +271,7 @@ std::size_t CurlTransfer::_onBody(char* bytes, std::size_t, std::size_t size, vo
 // connection that it had kept was closed.
 int CurlTransfer::_onRequest(void* self, char*, char*, int, int) {
   auto& transfer = *static_cast<CurlTransfer*>(self);
-  transfer.progressed_ = IOLoop::now();
+  transfer.progressed_ = steadyNow();
   const int allowed = mayBeRepeated(*transfer.order_.request) ? 2 : 1;
   if (transfer.requestsSent_ < allowed) {
     ++transfer.requestsSent_;
@@ -286,7 +286,7 @@ int CurlTransfer::_onProgress(void* self, curl_off_t, curl_off_t received, curl_
   auto& transfer = *static_cast<CurlTransfer*>(self);
   if (const auto moved = received + sent; moved != transfer.bytesMoved_) {
     transfer.bytesMoved_ = moved;
-    transfer.progressed_ = IOLoop::now();
+    transfer.progressed_ = steadyNow();
   }
   return 0;
 }

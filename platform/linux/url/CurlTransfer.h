@@ -24,7 +24,7 @@ namespace zelkord {
 // States: idle, or carrying a task (`begin` to `endTask`); between `begin` and the handle's removal
 // from the multi handle, libcurl calls back into it.
 //
-// Threading: the I/O loop. Ownership: `share` outlives it.
+// Threading: the loop. Ownership: `share` outlives it.
 class CurlTransfer final {
  public:
   CurlTransfer(const CurlSettings& settings, CURLSH* share);

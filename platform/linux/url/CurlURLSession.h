@@ -7,10 +7,10 @@
 #include <string>
 
 #include "platform/api/URLSession.h"
+#include "platform/linux/loop/Loop.h"
 #include "platform/linux/url/CurlPartitions.h"
 #include "platform/linux/url/CurlSettings.h"
 #include "platform/linux/url/DelegateQueue.h"
-#include "platform/linux/url/IOLoop.h"
 #include "platform/linux/url/ProxyConfiguration.h"
 #include "platform/linux/url/TransferLine.h"
 
@@ -25,7 +25,7 @@ class CurlURLSession final : public URLSession,
                              public std::enable_shared_from_this<CurlURLSession> {
  public:
   struct Services {
-    std::shared_ptr<IOLoop> loop;
+    std::shared_ptr<Loop> loop;
     std::shared_ptr<TransferLine> line;
     std::function<std::uint64_t()> maximumResponseSize;
     std::shared_ptr<const ProxyConfigurationSource> proxies;  // may be null

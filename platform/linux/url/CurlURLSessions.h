@@ -11,7 +11,7 @@
 #include "platform/api/Log.h"
 #include "platform/api/URLSession.h"
 #include "platform/api/WorkQueues.h"
-#include "platform/linux/url/IOLoop.h"
+#include "platform/linux/loop/Loop.h"
 #include "platform/linux/url/ProxyConfiguration.h"
 #include "platform/linux/url/TransferLimits.h"
 #include "platform/linux/url/TransferLine.h"
@@ -72,7 +72,7 @@ class CurlURLSessions final : public URLSessions {
   WorkQueues& queues_;
   const Services services_;
   const bool kernelHasFastOpen_;
-  const std::shared_ptr<IOLoop> loop_ = std::make_shared<IOLoop>();
+  const std::shared_ptr<Loop> loop_ = std::make_shared<Loop>("zelkord-url");
   const std::shared_ptr<TransferLine> line_;
 
   Mutex mutex_;

@@ -2,8 +2,8 @@
 
 #include <utility>
 
+#include "platform/linux/loop/Loop.h"
 #include "platform/linux/url/CurlURLSession.h"
-#include "platform/linux/url/IOLoop.h"
 #include "platform/linux/url/RequestPolicy.h"
 #include "platform/linux/url/URLParts.h"
 
@@ -26,7 +26,7 @@ void CurlURLTask::resume() {
     const MutexLock lock(mutex_);
     if (state_ != State::Suspended) return;
     state_ = State::Running;
-    order_.resumedAt = IOLoop::now();
+    order_.resumedAt = steadyNow();
     order_.maximumBody = maximumBody;
     request = order_.request;
   }

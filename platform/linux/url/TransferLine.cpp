@@ -23,13 +23,14 @@ bool isPatient(const CurlURLTask::Order& order) {
 
 }  // namespace
 
-TransferLine::TransferLine(std::shared_ptr<IOLoop> loop, const TransferLimits& limits,
+TransferLine::TransferLine(std::shared_ptr<Loop> loop, const TransferLimits& limits,
                            LimitReports* reports)
     : loop_(std::move(loop)),
       reports_(reports),
       transfers_("transfers", limits.transfers, reports),
       patientTransfers_("transfers", limits.patientTransfers, reports),
-      waiting_("waiting_transfers", limits.waiting, reports) {}
+      waiting_("waiting_transfers", limits.waiting, reports),
+      timer_(*loop_, [this] { _endOverdue(); }) {}
 
 void TransferLine::enter(std::shared_ptr<CurlURLTask> task,
                          const std::shared_ptr<CurlPartitions>& partitions) {
@@ -64,10 +65,9 @@ void TransferLine::_wait(const std::string& host, const CurlURLTask::Order& orde
         {.error = urlError(URLErrorCode::CannotConnect, "too many requests wait for the host")});
   }
   if (reports_) reports_->refused(transfers_.name(), host);
-  loop_->assertCurrent();
-  if (!std::exchange(added_, true)) loop_->add(*this);
+  if (!loopEnd_) loopEnd_ = loop_->atEnd([this] { _loopEnded(); });
   waiting.share = *std::move(share);
-  due_ = std::min(due_, waiting.deadline);
+  _setDue(std::min(due_, waiting.deadline));
   auto& line = hosts_[host];
   (isPatient(order) ? line.low : line.normal).push_back(std::move(waiting));
 }
@@ -141,18 +141,26 @@ std::vector<std::shared_ptr<CurlURLTask>> TransferLine::leave(const CurlPartitio
   return _takeOut([&](const Waiting& waiting) { return waiting.partitions.get() == &partitions; });
 }
 
-void TransferLine::runDue(SteadyTime now) {
-  due_ = kNever;
-  const auto overdue = _takeOut([this, now](const Waiting& waiting) {
-    if (waiting.deadline > now) due_ = std::min(due_, waiting.deadline);
+void TransferLine::_setDue(SteadyTime time) {
+  due_ = time;
+  timer_.set(due_);
+}
+
+void TransferLine::_endOverdue() {
+  const auto now = steadyNow();
+  auto next = LoopTimer::kNever;
+  const auto overdue = _takeOut([&next, now](const Waiting& waiting) {
+    if (waiting.deadline > now) next = std::min(next, waiting.deadline);
     return waiting.deadline <= now;
   });
+  _setDue(next);
   for (const auto& task : overdue) {
     task->finish({.error = urlError(URLErrorCode::TimedOut, "timed out in line for the host")});
   }
 }
 
-void TransferLine::loopEnded() {
+void TransferLine::_loopEnded() {
+  _setDue(LoopTimer::kNever);
   for (const auto& task : _takeOut([](const Waiting&) { return true; })) {
     task->finish({.error = urlError(URLErrorCode::Cancelled, "loading has ended")});
   }

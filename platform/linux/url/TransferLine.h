@@ -8,10 +8,10 @@
 #include <vector>
 
 #include "platform/api/Budget.h"
+#include "platform/linux/loop/Loop.h"
+#include "platform/linux/loop/LoopTimer.h"
 #include "platform/linux/url/CurlPartitions.h"
 #include "platform/linux/url/CurlURLTask.h"
-#include "platform/linux/url/IOLoop.h"
-#include "platform/linux/url/IOLoopClient.h"
 #include "platform/linux/url/TransferLimits.h"
 
 namespace zelkord {
@@ -20,14 +20,14 @@ namespace zelkord {
 // host. Among those to a host it is first come, first served, those of low priority after the
 // others; hosts take turns. Tasks of low priority leave a quarter of the places to the others.
 //
-// Threading: the I/O loop; made and destroyed on any. Ownership: holds the tasks that wait; the
+// Threading: the loop; made and destroyed on any. Ownership: holds the tasks that wait; the
 // reports outlive it.
 // Errors: waiting is counted and named by the reports, and is time without progress (-1001); what
 // the line has no room for ends at once (-1004).
-class TransferLine final : public IOLoopClient, public std::enable_shared_from_this<TransferLine> {
+class TransferLine final : public std::enable_shared_from_this<TransferLine> {
  public:
   // Without reports nothing is counted.
-  TransferLine(std::shared_ptr<IOLoop> loop, const TransferLimits& limits, LimitReports* reports);
+  TransferLine(std::shared_ptr<Loop> loop, const TransferLimits& limits, LimitReports* reports);
 
   // Begins the task with those partitions, at once or when it is its turn.
   void enter(std::shared_ptr<CurlURLTask> task, const std::shared_ptr<CurlPartitions>& partitions);
@@ -35,12 +35,6 @@ class TransferLine final : public IOLoopClient, public std::enable_shared_from_t
   bool cancel(const CurlURLTask& task);
   // Gives up what waits to begin with those partitions; the caller drops them.
   std::vector<std::shared_ptr<CurlURLTask>> leave(const CurlPartitions& partitions);
-
-  // IOLoopClient
-  void ready(int, unsigned) override {}
-  SteadyTime nextDue() const override { return due_; }
-  void runDue(SteadyTime now) override;
-  void loopEnded() override;
 
  private:
   struct Waiting {
@@ -62,23 +56,27 @@ class TransferLine final : public IOLoopClient, public std::enable_shared_from_t
   void _placeFreed();
   bool _beginNext();
   bool _beginOneOf(const std::string& host, Queue& queue);
+  void _endOverdue();
+  void _loopEnded();
+  void _setDue(SteadyTime time);
   // Takes out those that `isOut` names.
   template <typename Predicate>
   std::vector<std::shared_ptr<CurlURLTask>> _takeOut(Predicate isOut);
 
   // Fixed after construction.
-  const std::shared_ptr<IOLoop> loop_;
+  const std::shared_ptr<Loop> loop_;
   LimitReports* const reports_;
   Budget transfers_;
   Budget patientTransfers_;
   Budget waiting_;
 
-  // The I/O loop.
-  bool added_ = false;
+  // The loop's.
   bool turnPosted_ = false;
   std::map<std::string, Host> hosts_;  // those for which somebody waits
   std::string lastServed_;
-  SteadyTime due_ = kNever;
+  SteadyTime due_ = LoopTimer::kNever;  // nobody's time is up before
+  LoopTimer timer_;
+  Subscription loopEnd_;
 };
 
 }  // namespace zelkord

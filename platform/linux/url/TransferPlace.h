@@ -10,7 +10,7 @@ namespace zelkord {
 // The right of a transfer to be under way, from the beginning of its first request to the end of
 // its last. Move-only; whoever waits for a place hears when one is given back.
 //
-// Threading: the I/O loop.
+// Threading: the loop.
 class [[nodiscard]] TransferPlace {
  public:
   TransferPlace() = default;

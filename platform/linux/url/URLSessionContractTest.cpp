@@ -69,8 +69,8 @@ class CurlSessionHost final : public SessionHost {
   std::shared_ptr<URLSession>& session() override { return session_; }
   std::string url(const std::string& path) const override { return server_.url(path); }
   void settle(std::size_t completed) override {
-    const auto limit = IOLoop::now() + 20s;
-    while (results().size() < completed && IOLoop::now() < limit) std::this_thread::sleep_for(1ms);
+    const auto limit = steadyNow() + 20s;
+    while (results().size() < completed && steadyNow() < limit) std::this_thread::sleep_for(1ms);
     std::this_thread::sleep_for(20ms);  // for what must not come
   }
 

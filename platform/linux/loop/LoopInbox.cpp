@@ -1,12 +1,11 @@
-#include "platform/linux/queues/LoopInbox.h"
+#include "platform/linux/loop/LoopInbox.h"
 
 #include <sys/eventfd.h>
-#include <unistd.h>
 
 #include <utility>
 
 #include "base/Check.h"
-#include "platform/linux/queues/ServiceThread.h"
+#include "platform/linux/loop/ServiceThread.h"
 
 namespace zelkord {
 
@@ -18,10 +17,8 @@ constexpr int kLentRounds = 4;
 
 LoopInbox::LoopInbox(LoopHost& host)
     : host_(host), wakeUp_(::eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK)) {
-  ZK_CHECK(wakeUp_ >= 0, "no eventfd for a loop");
+  ZK_CHECK(wakeUp_, "no eventfd for a loop");
 }
-
-LoopInbox::~LoopInbox() { ::close(wakeUp_); }
 
 bool LoopInbox::post(Task task, Runner runner) {
   bool isLent = false;
@@ -31,10 +28,10 @@ bool LoopInbox::post(Task task, Runner runner) {
     tasks_.push_back(std::move(task));
     // Otherwise whoever has the loop looks here, or whoever posted before has woken its thread.
     if (state_ != State::Asleep || tasks_.size() > 1) return true;
-    isLent = runner == Runner::Anybody && isServiceThread();
+    isLent = runner == Runner::Anybody && mayBeLentLoops();
     if (isLent) state_ = State::Lent;
   }
-  isLent ? _runLent() : void(::eventfd_write(wakeUp_, 1));
+  isLent ? _runLent() : void(::eventfd_write(wakeUp_.get(), 1));
   return true;
 }
 
@@ -47,7 +44,7 @@ void LoopInbox::_runLent() {
   }
   const bool needsOwnThread = host_.needsOwnThread();
   owner_ = std::thread::id();
-  if (_endLoan() || needsOwnThread) ::eventfd_write(wakeUp_, 1);
+  if (_endLoan() || needsOwnThread) ::eventfd_write(wakeUp_.get(), 1);
 }
 
 // Whether the loop's thread is to be woken for tasks. After this the loop may be gone.

@@ -7,6 +7,7 @@
 #include "base/CondVar.h"
 #include "base/Mutex.h"
 #include "platform/api/WorkQueue.h"
+#include "platform/linux/files/Descriptor.h"
 
 namespace zelkord {
 
@@ -25,15 +26,14 @@ class LoopHost {
 //
 // States: the loop's thread is awake and will look here before it sleeps; it sleeps; it sleeps and
 // the loop is lent to a thread that has posted; closed, when tasks are dropped. Tasks run in the
-// order in which they were posted, never from within another one. Only service threads are lent
-// the loop, for a bounded number of tasks; others wake its thread.
+// order in which they were posted, never from within another one. Only service threads
+// that have no loop are lent this one, for a bounded number of tasks; others wake its thread.
 //
 // Threading: `post` and `isCurrent` on any thread, the rest on the loop's.
 // Ownership: shared with everything that may post late; the host lives until `close`.
 class LoopInbox {
  public:
   explicit LoopInbox(LoopHost& host);
-  ~LoopInbox();
   LoopInbox(const LoopInbox&) = delete;
   LoopInbox& operator=(const LoopInbox&) = delete;
 
@@ -46,7 +46,7 @@ class LoopInbox {
   bool isCurrent() const { return owner_.load() == std::this_thread::get_id(); }
 
   // An edge at each wake-up of the loop's thread; there is nothing to read.
-  int descriptor() const { return wakeUp_; }
+  int descriptor() const { return wakeUp_.get(); }
   // The calling thread is the loop's own from `begin`, awake, to `end`.
   void begin() { owner_ = std::this_thread::get_id(); }
   void end() { owner_ = std::thread::id(); }
@@ -66,7 +66,7 @@ class LoopInbox {
 
   // Fixed after construction.
   LoopHost& host_;
-  const int wakeUp_;
+  const Descriptor wakeUp_;
 
   std::atomic<std::thread::id> owner_;
   Mutex mutex_;

@@ -1,0 +1,104 @@
+#pragma once
+
+#include <cstdint>
+#include <deque>
+#include <map>
+#include <memory>
+#include <thread>
+#include <vector>
+
+#include "base/CondVar.h"
+#include "base/FunctionRef.h"
+#include "base/Mutex.h"
+#include "base/Subscription.h"
+#include "base/Time.h"
+#include "platform/api/WorkQueue.h"
+#include "platform/linux/loop/LoopInbox.h"
+#include "platform/linux/loop/LoopTimers.h"
+#include "platform/linux/loop/LoopWatches.h"
+
+namespace zelkord {
+
+// One thread that waits for descriptors, times and posted tasks, and sleeps while there are none.
+// What is posted while it sleeps runs on the posting thread, when that is a service thread without
+// a loop of its own.
+//
+// States: not started (until the first `post` or `sync`), running, ended. Tasks run in the order in
+// which they were posted; a post costs at most one wake-up, none when the thread is awake.
+//
+// Threading: `post`, `sync`, `stop`, `inbox` and `isCurrent` on any thread; everything else on the
+// one that the loop belongs to: its own, or one that runs posted tasks; before the start and after
+// the end any one at a time.
+// Ownership: outlives its subscriptions and timers; destroying it (not on its own thread) ends it.
+class ZK_CAPABILITY("loop") Loop final : private LoopHost {
+ public:
+  // `name`: the thread's, at most 15 bytes.
+  explicit Loop(const char* name);
+  ~Loop() override;
+  Loop(const Loop&) = delete;
+  Loop& operator=(const Loop&) = delete;
+
+  // False, with the task dropped, once the loop is stopped.
+  bool post(Task task);
+  // Returns after the task has run where the loop's tasks run; inline when that is the caller's
+  // thread, or the loop has ended.
+  void sync(FunctionRef<void()> task);
+  // Runs what is posted, then the tasks for the end, and ends the thread; the rest is dropped.
+  void stop();
+  // For those who may post late; nothing comes from it before the first `post` or `sync`.
+  const std::shared_ptr<LoopInbox>& inbox() const { return inbox_; }
+  bool isCurrent() const { return inbox_->isCurrent(); }
+  // Stops the process when the loop belongs to another thread than the caller's.
+  void assertCurrent() const ZK_ASSERTS(this);
+
+  // Calls `ready` with epoll's events. The descriptor stays open until the subscription is gone.
+  Subscription watch(int descriptor, std::uint32_t events, LoopWatches::Ready ready);
+  // Replaces the events of a watched descriptor.
+  void changeEvents(int descriptor, std::uint32_t events);
+  Subscription after(Duration delay, Task task);
+  // Runs the task after everything that is ready now has had its turn.
+  void soon(Task task);
+  // Runs the task when the others have had their turn too: of such tasks, in their order, only as
+  // many begin between two looks at what is ready as fit into kSpareTime.
+  void inSpareTime(Task task);
+  // Runs the task before the thread ends, what came last first.
+  Subscription atEnd(Task task);
+  LoopTimers& timers();
+
+ private:
+  static constexpr Duration kSpareTime = 1ms;
+  enum class State { NotStarted, Running, Stopping, Ended };
+
+  // LoopHost
+  void runPosted(std::vector<Task> tasks) override;
+  bool needsOwnThread() override;
+
+  bool _start();
+  bool _isRunning() const;
+  void _run();
+  void _wait() ZK_REQUIRES(this);
+  void _work(std::vector<Task> tasks) ZK_REQUIRES(this);
+  void _runInSpareTime() ZK_REQUIRES(this);
+  void _end() ZK_REQUIRES(this);
+  static void _runAll(std::vector<Task> tasks);
+
+  // Fixed after construction.
+  const char* const name_;
+  const std::shared_ptr<LoopInbox> inbox_;
+
+  mutable Mutex mutex_;
+  CondVar changed_;  // a sync task has run, or the state has changed
+  State state_ ZK_GUARDED_BY(mutex_) = State::NotStarted;
+  std::thread thread_ ZK_GUARDED_BY(mutex_);
+
+  // The loop's.
+  bool stopping_ ZK_ON(this) = false;
+  LoopWatches watches_ ZK_ON(this);
+  LoopTimers timers_ ZK_ON(this);
+  std::vector<Task> soon_ ZK_ON(this);
+  std::deque<Task> inSpareTime_ ZK_ON(this);
+  std::uint64_t lastEnding_ ZK_ON(this) = 0;
+  std::map<std::uint64_t, Task> endings_ ZK_ON(this);
+};
+
+}  // namespace zelkord
