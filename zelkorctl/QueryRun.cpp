@@ -121,9 +121,8 @@ std::shared_ptr<const ZLKRequest> QueryRun::_request(const Query& query) const {
   return request;
 }
 
-ZLKFuture<ClientAnswer> QueryRun::_ask(std::shared_ptr<const ZLKRequest> request) {
-  const bool follows = dynamic_cast<const ZLKMoreResultsRequest*>(request.get()) != nullptr ||
-                       dynamic_cast<const ZLKCardRequest*>(request.get()) != nullptr;
+ZLKFuture<ClientAnswer> QueryRun::_ask(QueryKind kind, std::shared_ptr<const ZLKRequest> request) {
+  const bool follows = kind == QueryKind::MoreResults || kind == QueryKind::Card;
   if (options_.endpoint && follows) return EndpointClient(client_).request(std::move(request));
   return client_.request(std::move(request));
 }
@@ -133,7 +132,7 @@ void QueryRun::send(const Query& query) {
   ++outstanding_;
   shared_->newest = queryId;
   const auto start = std::chrono::steady_clock::now();
-  _ask(_request(query))
+  _ask(query.kind, _request(query))
       .then([shared = shared_, client = &client_, queryId, start, name = query.name(),
              asked = query.kind](const ClientAnswer& answer) {
         const std::chrono::duration<double, std::milli> time =

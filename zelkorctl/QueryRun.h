@@ -73,7 +73,7 @@ class QueryRun {
   struct Shared;
 
   std::shared_ptr<const ZLKRequest> _request(const Query& query) const;
-  ZLKFuture<ClientAnswer> _ask(std::shared_ptr<const ZLKRequest> request);
+  ZLKFuture<ClientAnswer> _ask(QueryKind kind, std::shared_ptr<const ZLKRequest> request);
 
   Client& client_;
   const Options& options_;

@@ -134,7 +134,6 @@ void TypingClient::_ask(std::shared_ptr<zelkor::ZLKRequest> request) {
   request->queryString = word_.substr(0, typed_);
   auto call = newCall(bus_.get(), "Request");
   zelkor::MessageWriter writer(call.get());
-  writer.text(zelkor::requestKind(*request));
   zelkor::writeRequest(writer, *request);
   ++tally_.asked;
   _send(std::move(call), std::dynamic_pointer_cast<zelkor::ZLKSearchRequest>(request) != nullptr);

@@ -6,6 +6,7 @@
 #include <cmath>
 
 #include "base/Text.h"
+#include "corezelkor/internal/RequestKinds.h"
 
 namespace zelkord {
 namespace {
@@ -54,67 +55,24 @@ class DictionaryReader {
   std::optional<WireFault> fault_;
 };
 
-template <typename Request>
-MutableRequest make() {
-  return std::make_shared<Request>();
-}
-
-MutableRequest makeRequest(std::string_view kind) {
-  constexpr std::pair<std::string_view, MutableRequest (*)()> kKinds[] = {
-      {"search", make<ZLKSearchRequest>},
-      {"moreResults", make<ZLKMoreResultsRequest>},
-      {"card", make<ZLKCardRequest>},
-      {"zeroKeyword", make<ZLKZeroKeywordRequest>},
-      {"lookup", make<ZLKLookupRequest>},
-      {"flightLookup", make<ZLKFlightLookupRequest>},
-      {"flightSearch", make<ZLKFlightSearchRequest>}};
-  for (const auto& [name, makeOne] : kKinds) {
-    if (kind == name) return makeOne();
-  }
-  return nullptr;
-}
-
-void readQueryItems(DictionaryReader& reader, ZLKRequest& request) {
-  reader.read("queryItems", request.queryItems);
-  if (request.queryItems.size() > kMaximumQueryItems) {
+void checkQueryItems(DictionaryReader& reader, const std::vector<QueryItem>& items) {
+  if (items.size() > kMaximumQueryItems) {
     reader.refuse(ipc::kLimitsExceeded, "more than 256 \"queryItems\"");
   }
-  for (const auto& [name, value] : request.queryItems) {
+  for (const auto& [name, value] : items) {
     if (hasControlCharacters(name) || hasControlCharacters(value)) {
       reader.refuse(ipc::kInvalidArgs, "control characters in \"queryItems\"");
     }
   }
 }
 
-void readCommonFields(DictionaryReader& reader, ZLKRequest& request) {
-  reader.read("queryId", request.queryId);
-  reader.read("clientQueryId", request.clientQueryId);
-  reader.read("queryString", request.queryString);
-  reader.read("triggerEvent", request.triggerEvent);
-  reader.read("keyboardInputMode", request.keyboardInputMode);
-  reader.read("scale", request.scale);
-  reader.read("topics", request.topics);
-  reader.read("uuid", request.uuid);
-  reader.read("verboseReply", request.verboseReply);
-  readQueryItems(reader, request);
+void checkCommonFields(DictionaryReader& reader, const ZLKRequest& request) {
+  checkQueryItems(reader, request.queryItems);
   if (request.triggerEvent > kLastTriggerEvent) {
     reader.refuse(ipc::kInvalidArgs, "\"triggerEvent\" is above 19");
   }
   if (!std::isfinite(request.scale) || request.scale < 0) {
     reader.refuse(ipc::kInvalidArgs, "\"scale\" is not a finite number of 0 or more");
-  }
-}
-
-void readOwnFields(DictionaryReader& reader, ZLKRequest& request) {
-  if (auto* more = dynamic_cast<ZLKMoreResultsRequest*>(&request)) {
-    reader.read("moreResultsURL", more->moreResultsURL);
-  } else if (auto* card = dynamic_cast<ZLKCardRequest*>(&request)) {
-    reader.read("cardURL", card->cardURL);
-  } else if (auto* lookup = dynamic_cast<ZLKLookupRequest*>(&request)) {
-    reader.read("appBundleId", lookup->appBundleId);
-    reader.read("domain", lookup->domain);
-    reader.read("lookupSelectionType", lookup->lookupSelectionType);
-    reader.read("queryContext", lookup->queryContext);
   }
 }
 
@@ -139,11 +97,14 @@ Decoded<ZLKSessionConfiguration> decodeConfiguration(const ipc::Dictionary& dict
 }
 
 Decoded<MutableRequest> decodeRequest(const std::string& kind, const ipc::Dictionary& dictionary) {
-  auto request = makeRequest(kind);
-  if (!request) return MutableRequest();
+  const auto* known = requestKindNamed(kind);
+  if (!known) return MutableRequest();
+  auto request = known->make();
   DictionaryReader reader(dictionary);
-  readCommonFields(reader, *request);
-  readOwnFields(reader, *request);
+  const auto read = [&](std::string_view key, auto& value) { reader.read(key, value); };
+  visitFields(*request, commonRequestFields(), read);
+  checkCommonFields(reader, *request);
+  visitFields(*request, known->fields, read);
   return std::move(reader).finish(std::move(request));
 }
 

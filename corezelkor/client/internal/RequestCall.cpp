@@ -3,6 +3,7 @@
 #include <utility>
 
 #include "corezelkor/client/internal/Wire.h"
+#include "corezelkor/internal/RequestKinds.h"
 
 namespace zelkor {
 
@@ -10,7 +11,7 @@ ZLKFuture<ClientAnswer> callWithRequest(ClientCore& core, const ClientCore::Targ
                                         std::shared_ptr<const ZLKRequest> request,
                                         ClientCore::Encode encodeRest) {
   ClientAnswer unanswered;
-  if (!request || requestKind(*request).empty()) {
+  if (!request || !requestKindOf(*request)) {
     unanswered.error = clientError(ClientErrorCode::Refused, "a request of no known kind");
     return ZLKFuture<ClientAnswer>(std::move(unanswered));
   }
@@ -18,7 +19,6 @@ ZLKFuture<ClientAnswer> callWithRequest(ClientCore& core, const ClientCore::Targ
   return core.call<ClientAnswer>(
       target,
       [request = std::move(request), encodeRest = std::move(encodeRest)](MessageWriter& writer) {
-        writer.text(requestKind(*request));
         writeRequest(writer, *request);
         encodeRest(writer);
       },

@@ -2,6 +2,8 @@
 
 #include <utility>
 
+#include "corezelkor/internal/RequestKinds.h"
+
 namespace zelkor {
 namespace {
 
@@ -9,51 +11,34 @@ void textEntry(MessageWriter& writer, std::string_view key, const std::string& v
   if (!value.empty()) writer.entry(key, "s", [&] { writer.text(value); });
 }
 
-void numberEntry(MessageWriter& writer, std::string_view key, std::uint32_t value) {
-  if (value != 0) writer.entry(key, "u", [&] { writer.uint32(value); });
-}
+// Writes a field under the type that its place has.
+struct FieldWriter {
+  MessageWriter& writer;
+  std::string_view key;
 
-void writeItems(MessageWriter& writer, const std::vector<QueryItem>& items) {
-  if (items.empty()) return;
-  writer.entry("queryItems", "a(ss)", [&] {
-    writer.array("(ss)", [&] {
-      for (const auto& item : items) {
-        writer.structure("ss", [&] {
-          writer.text(item.first);
-          writer.text(item.second);
-        });
-      }
+  void operator()(bool value) const { entry("b", value, &MessageWriter::flag); }
+  void operator()(std::uint32_t value) const { entry("u", value, &MessageWriter::uint32); }
+  void operator()(std::int64_t value) const { entry("x", value, &MessageWriter::int64); }
+  void operator()(std::uint64_t value) const { entry("t", value, &MessageWriter::uint64); }
+  void operator()(double value) const { entry("d", value, &MessageWriter::real); }
+  void operator()(const std::string& value) const { textEntry(writer, key, value); }
+  void operator()(const std::vector<QueryItem>& items) const {
+    writer.entry(key, "a(ss)", [&] {
+      writer.array("(ss)", [&] {
+        for (const auto& item : items) {
+          writer.structure("ss", [&] {
+            writer.text(item.first);
+            writer.text(item.second);
+          });
+        }
+      });
     });
-  });
-}
-
-void writeCommon(MessageWriter& writer, const ZLKRequest& request) {
-  writer.entry("queryId", "x", [&] { writer.int64(request.queryId); });
-  if (request.clientQueryId != 0) {
-    writer.entry("clientQueryId", "t", [&] { writer.uint64(request.clientQueryId); });
   }
-  textEntry(writer, "queryString", request.queryString);
-  numberEntry(writer, "triggerEvent", request.triggerEvent);
-  writeItems(writer, request.queryItems);
-  textEntry(writer, "keyboardInputMode", request.keyboardInputMode);
-  if (request.scale != 0) writer.entry("scale", "d", [&] { writer.real(request.scale); });
-  textEntry(writer, "topics", request.topics);
-  textEntry(writer, "uuid", request.uuid);
-  if (request.verboseReply) writer.entry("verboseReply", "b", [&] { writer.flag(true); });
-}
-
-void writeOwnKeys(MessageWriter& writer, const ZLKRequest& request) {
-  if (const auto* more = dynamic_cast<const ZLKMoreResultsRequest*>(&request)) {
-    textEntry(writer, "moreResultsURL", more->moreResultsURL);
-  } else if (const auto* card = dynamic_cast<const ZLKCardRequest*>(&request)) {
-    textEntry(writer, "cardURL", card->cardURL);
-  } else if (const auto* lookup = dynamic_cast<const ZLKLookupRequest*>(&request)) {
-    textEntry(writer, "appBundleId", lookup->appBundleId);
-    textEntry(writer, "domain", lookup->domain);
-    numberEntry(writer, "lookupSelectionType", lookup->lookupSelectionType);
-    textEntry(writer, "queryContext", lookup->queryContext);
+  template <typename T>
+  void entry(const char* type, T value, void (MessageWriter::*append)(T)) const {
+    writer.entry(key, type, [&] { (writer.*append)(value); });
   }
-}
+};
 
 HeaderFields readHeaders(MessageReader& reader) {
   HeaderFields headers;
@@ -102,21 +87,15 @@ void readAttributes(MessageReader& reader, ResourceFile& file) {
 
 }  // namespace
 
-std::string_view requestKind(const ZLKRequest& request) {
-  if (dynamic_cast<const ZLKSearchRequest*>(&request)) return "search";
-  if (dynamic_cast<const ZLKMoreResultsRequest*>(&request)) return "moreResults";
-  if (dynamic_cast<const ZLKCardRequest*>(&request)) return "card";
-  if (dynamic_cast<const ZLKZeroKeywordRequest*>(&request)) return "zeroKeyword";
-  if (dynamic_cast<const ZLKLookupRequest*>(&request)) return "lookup";
-  if (dynamic_cast<const ZLKFlightLookupRequest*>(&request)) return "flightLookup";
-  if (dynamic_cast<const ZLKFlightSearchRequest*>(&request)) return "flightSearch";
-  return {};
-}
-
 void writeRequest(MessageWriter& writer, const ZLKRequest& request) {
+  const auto& kind = *requestKindOf(request);
+  writer.text(kind.name);
   writer.dictionary([&] {
-    writeCommon(writer, request);
-    writeOwnKeys(writer, request);
+    for (const auto fields : {commonRequestFields(), kind.fields}) {
+      visitFields(request, fields, [&]<typename T>(std::string_view key, const T& value) {
+        if (value != T()) FieldWriter{writer, key}(value);
+      });
+    }
   });
 }
 

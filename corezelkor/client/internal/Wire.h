@@ -16,9 +16,7 @@ namespace zelkor {
 // The client library's messages in the form of the D-Bus interfaces. Each reader takes the
 // arguments that are next; whether they were well-formed is the reader's `ok`.
 
-// The kind's name; empty for a request of no known class.
-std::string_view requestKind(const ZLKRequest& request);
-// a{sv}, without the keys that have their default.
+// The kind's name and a{sv}, without the keys that have their default. Requires a known class.
 void writeRequest(MessageWriter& writer, const ZLKRequest& request);
 void writeConfiguration(MessageWriter& writer, const ZLKSessionConfiguration& configuration);
 // aa{sv}

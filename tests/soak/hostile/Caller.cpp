@@ -50,10 +50,7 @@ bool Caller::call(std::string_view interface, const char* member, const Encode& 
 }
 
 bool Caller::request(const zelkor::ZLKRequest& request) {
-  return call(kDaemon, "Request", [&](auto& writer) {
-    writer.text(zelkor::requestKind(request));
-    zelkor::writeRequest(writer, request);
-  });
+  return call(kDaemon, "Request", [&](auto& writer) { zelkor::writeRequest(writer, request); });
 }
 
 bool Caller::report(std::string_view feedbackClass, std::string_view message) {
