@@ -2,6 +2,7 @@
 
 #include <unistd.h>
 
+#include <algorithm>
 #include <array>
 
 namespace zelkord::ipc {
@@ -20,6 +21,16 @@ FileHandle::FileHandle(int descriptor)
         if (*owned >= 0) ::close(*owned);
         delete owned;
       }) {}
+
+Arguments::Arguments(const char* text) {
+  for (std::string_view rest = text; !rest.empty();) {
+    const auto argument = rest.substr(0, rest.find(", "));
+    const auto type = argument.substr(0, argument.find(' '));
+    rest.remove_prefix(std::min(argument.size() + 2, rest.size()));
+    signature += type;
+    if (type != argument) names.emplace_back(argument.substr(type.size() + 1));
+  }
+}
 
 std::string signatureOf(const Value& value) {
   if (const auto* unsupported = value.get<Unsupported>()) return unsupported->signature;

@@ -81,10 +81,19 @@ struct Limits {
   std::size_t byteArrayBytes = 1u << 20;
 };
 
+// Arguments in a row, written as "s kind, a{sv} request": D-Bus types with their names. The names
+// are only for introspection; without any the text is a signature.
+struct Arguments {
+  Arguments(const char* text = "");  // NOLINT(google-explicit-constructor)
+
+  std::string signature;
+  std::vector<std::string> names;
+};
+
 struct Method {
   std::string name;
-  std::string in;   // D-Bus signature of the arguments
-  std::string out;  // of the reply
+  Arguments in;
+  Arguments out;  // of the reply
   // Delivered like any other. A caller that asks for a reply all the same gets an empty one once
   // the handler has let go of the call, or what it failed with.
   bool noReply = false;
@@ -93,8 +102,7 @@ struct Method {
 struct Interface {
   std::string name;
   std::vector<Method> methods;
-  // name, signature; only for introspection
-  std::vector<std::pair<std::string, std::string>> signals;
+  std::vector<std::pair<std::string, Arguments>> signals;  // only for introspection
 };
 
 // The way back to one caller. Answered at most once, from any thread; never answered is a legal
@@ -113,6 +121,11 @@ struct Call {
   std::string member;
   Values arguments;  // agree with the method's signature
   std::shared_ptr<Reply> reply;
+
+  template <typename T>
+  const T& argument(std::size_t index) const {
+    return *arguments.at(index).get<T>();
+  }
 };
 
 struct Peer {

@@ -12,7 +12,7 @@ class FakeReply final : public Reply {
  public:
   FakeReply(const Method& method, std::shared_ptr<FakeAnswer> answer)
       : name_(method.name),
-        out_(method.noReply ? "" : method.out),
+        out_(method.noReply ? "" : method.out.signature),
         noReply_(method.noReply),
         answer_(std::move(answer)) {}
 
@@ -66,7 +66,7 @@ const Method* FakeDoor::check(const std::string& interface, const std::string& m
   ++statistics->calls;
   const Method* method = findFakeMethod(configuration, interface, member);
   if (!method) return refuseFakeCall(answer, "org.freedesktop.DBus.Error.UnknownMethod");
-  if (signatureOf(values) != method->in) return refuseFakeCall(answer, kInvalidArgs);
+  if (signatureOf(values) != method->in.signature) return refuseFakeCall(answer, kInvalidArgs);
   return method;
 }
 

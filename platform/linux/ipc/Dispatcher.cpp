@@ -23,7 +23,8 @@ const Method* methodOf(const Interface& interface, const std::string& member) {
 std::shared_ptr<const ListenerConfiguration> withService(ListenerConfiguration configuration,
                                                          const std::string& serviceInterface) {
   if (!serviceInterface.empty()) {
-    configuration.interfaces.push_back({serviceInterface, {{.name = "Open", .out = "h"}}, {}});
+    configuration.interfaces.push_back(
+        {serviceInterface, {{.name = "Open", .out = "h connection"}}, {}});
   }
   return std::make_shared<const ListenerConfiguration>(std::move(configuration));
 }
@@ -50,7 +51,7 @@ TakenCall Dispatcher::take(sd_bus_message* message) const {
                  .member = orEmpty(sd_bus_message_get_member(message))};
   if (call.path == kObjectPath) _findMethod(call);
   if (call.method) {
-    call.arguments = decodeArguments(message, call.method->in, configuration_->limits);
+    call.arguments = decodeArguments(message, call.method->in.signature, configuration_->limits);
   }
   return call;
 }

@@ -114,17 +114,19 @@ TEST(MessageGateTest, NoticesAMessageThatNeverCame) {
 
 TEST(IntrospectionTest, LeadsToTheObjectAndDescribesIt) {
   const std::vector<Interface> interfaces{
-      {"a.B", {{"M", "sa{sv}", "x(ss)"}, {"N", "", "", true}}, {{"S", "s"}}}};
+      {"a.B", {{"M", "s kind, a{sv} request", "x(ss)"}, {"N", "", "", true}}, {{"S", "s name"}}}};
   const std::pair<const char*, const char*> cases[] = {
       {"/", "<node name=\"com\"/>"},
       {"/com/quenta", "<node name=\"zelkord\"/>"},
       {"/com/quenta/zelkord",
        " <interface name=\"a.B\">\n  <method name=\"M\">\n"
-       "   <arg type=\"s\" direction=\"in\"/>\n   <arg type=\"a{sv}\" direction=\"in\"/>\n"
+       "   <arg name=\"kind\" type=\"s\" direction=\"in\"/>\n"
+       "   <arg name=\"request\" type=\"a{sv}\" direction=\"in\"/>\n"
        "   <arg type=\"x\" direction=\"out\"/>\n   <arg type=\"(ss)\" direction=\"out\"/>\n"
        "  </method>\n  <method name=\"N\">\n"
        "   <annotation name=\"org.freedesktop.DBus.Method.NoReply\" value=\"true\"/>\n"
-       "  </method>\n  <signal name=\"S\">\n   <arg type=\"s\"/>\n  </signal>\n </interface>\n"},
+       "  </method>\n  <signal name=\"S\">\n   <arg name=\"name\" type=\"s\"/>\n  </signal>\n "
+       "</interface>\n"},
   };
   for (const auto& [path, part] : cases) {
     EXPECT_NE(introspectionDocument(path, interfaces).find(part), std::string::npos) << path;

@@ -1,5 +1,7 @@
 #include "platform/linux/ipc/Introspection.h"
 
+#include <fmt/format.h>
+
 #include "platform/linux/ipc/WireDecoding.h"
 
 namespace zelkord::ipc {
@@ -18,14 +20,20 @@ constexpr std::string_view kStandardInterfaces =
     "  <method name=\"Introspect\"><arg type=\"s\" direction=\"out\"/></method>\n"
     " </interface>\n";
 
-void appendIntrospectedArguments(std::string& xml, std::string_view signature,
+// Nothing for an empty value.
+std::string attribute(std::string_view name, std::string_view value) {
+  return value.empty() ? std::string() : fmt::format(" {}=\"{}\"", name, value);
+}
+
+void appendIntrospectedArguments(std::string& xml, const Arguments& arguments,
                                  std::string_view direction) {
-  while (!signature.empty()) {
-    const auto type = firstCompleteType(signature);
-    signature.remove_prefix(type.size());
-    xml += "   <arg type=\"" + std::string(type) + "\"";
-    if (!direction.empty()) xml += " direction=\"" + std::string(direction) + "\"";
-    xml += "/>\n";
+  std::string_view types = arguments.signature;
+  for (auto name = arguments.names.begin(); !types.empty();) {
+    const auto type = firstCompleteType(types);
+    types.remove_prefix(type.size());
+    xml += "   <arg";
+    if (name != arguments.names.end()) xml += attribute("name", *name++);
+    xml += attribute("type", type) + attribute("direction", direction) + "/>\n";
   }
 }
 
@@ -40,9 +48,9 @@ void appendIntrospectedInterface(std::string& xml, const Interface& interface) {
     }
     xml += "  </method>\n";
   }
-  for (const auto& [name, signature] : interface.signals) {
+  for (const auto& [name, arguments] : interface.signals) {
     xml += "  <signal name=\"" + name + "\">\n";
-    appendIntrospectedArguments(xml, signature, "");
+    appendIntrospectedArguments(xml, arguments, "");
     xml += "  </signal>\n";
   }
   xml += " </interface>\n";

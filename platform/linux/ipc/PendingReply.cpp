@@ -35,7 +35,8 @@ void PendingReply::send(Values values) {
        values = std::move(values)] {
         const auto open = outlet.lock();
         if (!open) return;
-        const int r = sendReply(*open, origin, method->noReply ? "" : method->out, values);
+        const int r =
+            sendReply(*open, origin, method->noReply ? "" : method->out.signature, values);
         if (r < 0) log.error("reply to {} not sent: {}", method->name, std::strerror(-r));
       },
       isLarge ? LoopInbox::Runner::OwnThread : LoopInbox::Runner::Anybody);

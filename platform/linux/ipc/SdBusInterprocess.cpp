@@ -70,7 +70,7 @@ ListenerConfiguration withNotifications(ListenerConfiguration configuration,
   const auto wanted = notificationInterface(name);
   const bool described =
       std::any_of(all.begin(), all.end(), [&](const auto& i) { return i.name == wanted; });
-  if (!described) all.push_back({wanted, {}, {{"Posted", "s"}}});
+  if (!described) all.push_back({wanted, {}, {{"Posted", "s name"}}});
   return configuration;
 }
 
