@@ -1,7 +1,7 @@
 #!/usr/bin/python3
 """Holds what is written of the D-Bus interfaces against one another.
 
-usage: interfaces.py page             docs/ipc.md names the members of com.quenta.zelkord.xml, with their signatures
+usage: interfaces.py page             docs/ipc.md names the members of com.quenta.zelkord.xml, with their arguments
        interfaces.py served ADDRESS   the daemon at ADDRESS, a bus, serves the members of the file, and no others
 
 Prints a line for each difference and ends with status 1 when there is one.
@@ -21,7 +21,7 @@ CLIENTS = {PREFIX + "Client1"}
 
 
 def members(document):
-    """{(interface, member): "in-signature -> out-signature"} of an introspection document."""
+    """{(interface, member): "s argument, u argument -> x result"} of an introspection document."""
     found = {}
     for interface in xml.etree.ElementTree.fromstring(document).iter("interface"):
         if not interface.get("name").startswith(PREFIX):
@@ -29,24 +29,11 @@ def members(document):
         for member in interface:
             if member.tag not in ("method", "signal"):
                 continue
-            sides = {"in": "", "out": ""}
+            sides = {"in": [], "out": []}
             for argument in member.iter("arg"):
-                sides[argument.get("direction", "in")] += argument.get("type")
-            found[interface.get("name"), member.get("name")] = sides["in"] + " -> " + sides["out"]
+                sides[argument.get("direction", "in")].append(f"{argument.get('type')} {argument.get('name')}")
+            found[interface.get("name"), member.get("name")] = " -> ".join(map(", ".join, sides.values()))
     return found
-
-
-def types(arguments):
-    """The signature of "a{sv} bag, s": the first word of each argument."""
-    depth, words, word = 0, [], ""
-    for character in arguments + ",":
-        if character == "," and depth == 0:
-            words.append(word.split()[0] if word.split() else "")
-            word = ""
-            continue
-        depth += {"{": 1, "(": 1, "}": -1, ")": -1}.get(character, 0)
-        word += character
-    return "".join(words)
 
 
 def page_members(text):
@@ -61,7 +48,7 @@ def page_members(text):
         if match["interface"]:
             interface = match["interface"]
         elif interface:
-            found[interface, match["member"]] = types(match["in"]) + " -> " + types(match["out"] or "")
+            found[interface, match["member"]] = f"{match['in']} -> {match['out'] or ''}"
     return found
 
 

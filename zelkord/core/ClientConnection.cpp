@@ -43,70 +43,60 @@ void ClientConnection::invalidated() {
   bagTeller_->end();
 }
 
+const ServedInterface<ClientConnection>& ClientConnection::interface() {
+  using Self = ClientConnection;
+  static const ServedInterface<Self> kInterface = {
+      kDaemonInterface,
+      {
+          {{"Configure", "a{sv} configuration", "s endpointAddress"},
+           &Self::configure,
+           CallTurn::Ahead},
+          {{"Bag", "", "a{sv} bag, a{sv} error"}, &Self::bag, CallTurn::AfterBag},
+          {{"Request", "s kind, a{sv} request", "x queryId, a{sv} reply, a{sv} error"},
+           &Self::request,
+           CallTurn::AfterBag},
+          {{"ReportEvent", "s event, x queryId, s feedbackClass, ay feedback", "", true},
+           &Self::reportEvent},
+          {{"ReportEventData", "s event, x queryId, ay payload", "", true}, &Self::reportEventData},
+          {{"Feedback", "s name", "as feedbacksAsJSON, a{sv} error"}, &Self::feedback},
+          {{"ListSessions", "", "aa{ss} sessions"}, &Self::listSessions},
+      },
+      {{"Invalidated", ""}}};
+  return kInterface;
+}
+
 void ClientConnection::handle(ipc::Call call) {
   timer_->rearm();
-  if (_mayHaveToWait(call)) {
-    _handleLater(std::move(call));
+  const auto* member = interface().find(call);
+  if (_mayHaveToWait(member)) {
+    _handleLater(member, std::move(call));
   } else {
-    _dispatchCall(std::move(call));
+    _handleNow(member, std::move(call));
   }
 }
 
-bool ClientConnection::_mayHaveToWait(const ipc::Call& call) const {
-  const bool isDaemonCall = call.interface == kDaemonInterface;
-  if (isDaemonCall && call.member == "Configure") return false;
+bool ClientConnection::_mayHaveToWait(const Member<ClientConnection>* member) const {
+  const auto turn = member ? member->turn : CallTurn::InOrder;
+  if (turn == CallTurn::Ahead) return false;
   if (waitingCalls_ > 0) return true;
-  if (!isDaemonCall || (call.member != "Bag" && call.member != "Request")) return false;
-  const auto state = state_.get();
+  const auto state = turn == CallTurn::AfterBag ? state_.get() : nullptr;
   return state && !state->currentBag();
 }
 
-void ClientConnection::_handleLater(ipc::Call call) {
+void ClientConnection::_handleLater(const Member<ClientConnection>* member, ipc::Call call) {
   ++waitingCalls_;
-  waitingQueue_->async([self = shared_from_this(), call = std::move(call)]() mutable {
-    if (!self->ended_) self->_dispatchCall(std::move(call));
+  waitingQueue_->async([self = shared_from_this(), member, call = std::move(call)]() mutable {
+    if (!self->ended_) self->_handleNow(member, std::move(call));
     --self->waitingCalls_;
   });
 }
 
-void ClientConnection::_dispatchCall(ipc::Call call) {
-  if (call.interface == kDaemonInterface) {
-    _handleDaemonCall(call);
+void ClientConnection::_handleNow(const Member<ClientConnection>* member, ipc::Call call) {
+  if (member) {
+    (this->*member->handle)(call);
   } else if (otherCalls_) {
     otherCalls_->handle(std::move(call));
   }
-}
-
-void ClientConnection::_handleDaemonCall(const ipc::Call& call) {
-  if (call.member == "Configure") return _handleConfigure(call);
-  if (call.member == "Bag") return bag(call.reply);
-  if (call.member == "Request") return _handleRequest(call);
-  if (call.member == "ReportEvent") return _handleReportEvent(call);
-  if (call.member == "ReportEventData") return _handleReportEventData(call);
-  if (call.member == "Feedback") return feedback(call.reply);
-  if (call.member == "ListSessions") return listSessions(call.reply);
-}
-
-void ClientConnection::_handleConfigure(const ipc::Call& call) {
-  auto decoded = decodeConfiguration(*call.arguments.at(0).get<ipc::Dictionary>());
-  if (const auto* fault = std::get_if<WireFault>(&decoded)) return _refuse(call, *fault);
-  configure(std::get<ZLKSessionConfiguration>(std::move(decoded)), call);
-}
-
-void ClientConnection::_handleRequest(const ipc::Call& call) {
-  auto decoded = decodeRequest(*call.arguments.at(0).get<std::string>(),
-                               *call.arguments.at(1).get<ipc::Dictionary>());
-  if (const auto* fault = std::get_if<WireFault>(&decoded)) return _refuse(call, *fault);
-  request(std::get<MutableRequest>(std::move(decoded)), call.reply);
-}
-
-void ClientConnection::_handleReportEvent(const ipc::Call& call) {
-  reportEvent(call, decodeFeedback(*call.arguments.at(2).get<std::string>(),
-                                   call.arguments.at(3).get<Data>()->view()));
-}
-
-void ClientConnection::_handleReportEventData(const ipc::Call& call) {
-  reportEvent(call, decodeFeedbackPayload(call.arguments.at(2).get<Data>()->view()));
 }
 
 void ClientConnection::_refuse(const ipc::Call& call, const WireFault& fault) {
@@ -115,7 +105,10 @@ void ClientConnection::_refuse(const ipc::Call& call, const WireFault& fault) {
   call.reply->fail(fault.errorName, fault.text);
 }
 
-void ClientConnection::configure(ZLKSessionConfiguration configuration, const ipc::Call& call) {
+void ClientConnection::configure(const ipc::Call& call) {
+  auto decoded = decodeConfiguration(call.argument<ipc::Dictionary>(0));
+  if (const auto* fault = std::get_if<WireFault>(&decoded)) return _refuse(call, *fault);
+  auto& configuration = std::get<ZLKSessionConfiguration>(decoded);
   assembly_.log(Category::Connection)
       .notice("client configuration {}", configuration.description());
   if (!_fits(configuration)) return call.reply->fail(ipc::kLimitsExceeded, "too many clients");
@@ -167,39 +160,30 @@ void ClientConnection::_ensureState() {
   }
 }
 
-void ClientConnection::bag(const std::shared_ptr<ipc::Reply>& reply) {
+void ClientConnection::bag(const ipc::Call& call) {
   _ensureState();
   const auto state = state_.get();
   if (!state) return;
   state->bag(userAgent_.get(),
-             [&reply, mark = timer_->callBegan()](const auto& bag, const auto& error) {
-               reply->send({encodeBag(bag.get()), encodeError(error)});
+             [&call, mark = timer_->callBegan()](const auto& bag, const auto& error) {
+               call.reply->send({encodeBag(bag.get()), encodeError(error)});
              });
 }
 
-void ClientConnection::request(std::shared_ptr<ZLKRequest> request,
-                               const std::shared_ptr<ipc::Reply>& reply) {
+void ClientConnection::request(const ipc::Call& call) {
+  auto decoded = decodeRequest(call.argument<std::string>(0), call.argument<ipc::Dictionary>(1));
+  if (const auto* fault = std::get_if<WireFault>(&decoded)) return _refuse(call, *fault);
   _ensureState();
+  const auto& request = std::get<MutableRequest>(decoded);
   if (!request) return;
   _fillMissing(*request);
-  const auto answer = _replyTo(reply);
-  _dispatch(request, answer, &ClientConnection::search) ||
-      _dispatch(request, answer, &ClientConnection::moreResults) ||
-      _dispatch(request, answer, &ClientConnection::card) ||
-      _dispatch(request, answer, &ClientConnection::zeroKeyword) ||
-      _dispatch(request, answer, &ClientConnection::lookup) ||
-      _dispatch(request, answer, &ClientConnection::flightLookup) ||
-      _dispatch(request, answer, &ClientConnection::flightSearch);
-}
-
-template <typename Request>
-bool ClientConnection::_dispatch(const std::shared_ptr<ZLKRequest>& request,
-                                 const ReplyCallback& reply,
-                                 void (ClientConnection::*operation)(std::shared_ptr<const Request>,
-                                                                     ReplyCallback)) {
-  const auto query = std::dynamic_pointer_cast<const Request>(request);
-  if (query) (this->*operation)(query, reply);
-  return query != nullptr;
+  const auto& kind = queryKindOf(*request);
+  auto reply = _traced(kind, _replyTo(call.reply));
+  if (kind.goesStale) {
+    if (!_accepts(request->queryId)) return reply(request->queryId, std::nullopt, std::nullopt);
+    reply = _unlessStale(request->queryId, std::move(reply));
+  }
+  if (const auto state = state_.get()) kind.start(kind, state, request, std::move(reply));
 }
 
 void ClientConnection::_fillMissing(ZLKRequest& request) {
@@ -223,78 +207,23 @@ ReplyCallback ClientConnection::_replyTo(const std::shared_ptr<ipc::Reply>& repl
   };
 }
 
-void ClientConnection::search(std::shared_ptr<const ZLKSearchRequest> request,
-                              ReplyCallback reply) {
+ReplyCallback ClientConnection::_traced(const QueryKind& kind, ReplyCallback reply) const {
   const auto& tracing = assembly_.tracing();
-  tracing.emit(TraceCode::SearchStart);
-  const auto queryId = request->queryId;
-  if (!_accepts(queryId)) {
-    tracing.emit(TraceCode::SearchEnd);
-    reply(queryId, std::nullopt, std::nullopt);
-    return;
-  }
-  const auto state = state_.get();
-  if (!state) return;
-  state->search(std::move(request), [self = shared_from_this(), queryId, reply = std::move(reply)](
-                                        std::int64_t answered, auto answer, auto error) {
-    self->assembly_.tracing().emit(TraceCode::SearchEnd);
-    if (self->currentQueryId_ > queryId) {
-      reply(answered, std::nullopt, std::nullopt);
-    } else {
-      reply(answered, std::move(answer), std::move(error));
-    }
-  });
-}
-
-template <typename Request>
-void ClientConnection::_forward(std::shared_ptr<const Request> request, ReplyCallback reply,
-                                void (ClientState::*operation)(std::shared_ptr<const Request>,
-                                                               ReplyCallback)) {
-  const auto state = state_.get();
-  if (state) ((*state).*operation)(std::move(request), std::move(reply));
-}
-
-ReplyCallback ClientConnection::_traced(TraceCode start, TraceCode end, ReplyCallback reply) const {
-  const auto& tracing = assembly_.tracing();
-  tracing.emit(start);
-  return [&tracing, end, reply = std::move(reply)](std::int64_t queryId, auto answer, auto error) {
+  if (!kind.trace || !tracing.isEnabled()) return reply;
+  tracing.emit(kind.trace->start);
+  return [&tracing, end = kind.trace->end, reply = std::move(reply)](std::int64_t queryId,
+                                                                     auto answer, auto error) {
     tracing.emit(end);
     reply(queryId, std::move(answer), std::move(error));
   };
 }
 
-void ClientConnection::moreResults(std::shared_ptr<const ZLKMoreResultsRequest> request,
-                                   ReplyCallback reply) {
-  _forward(std::move(request), std::move(reply), &ClientState::moreResults);
-}
-
-void ClientConnection::card(std::shared_ptr<const ZLKCardRequest> request, ReplyCallback reply) {
-  _forward(std::move(request), _traced(TraceCode::CardStart, TraceCode::CardEnd, std::move(reply)),
-           &ClientState::card);
-}
-
-void ClientConnection::zeroKeyword(std::shared_ptr<const ZLKZeroKeywordRequest> request,
-                                   ReplyCallback reply) {
-  _forward(std::move(request),
-           _traced(TraceCode::ZeroKeywordStart, TraceCode::ZeroKeywordEnd, std::move(reply)),
-           &ClientState::zeroKeyword);
-}
-
-void ClientConnection::lookup(std::shared_ptr<const ZLKLookupRequest> request,
-                              ReplyCallback reply) {
-  _forward(std::move(request),
-           _traced(TraceCode::LookupStart, TraceCode::LookupEnd, std::move(reply)),
-           &ClientState::lookup);
-}
-
-void ClientConnection::flightLookup(std::shared_ptr<const ZLKFlightLookupRequest> request,
-                                    ReplyCallback reply) {
-  _forward(std::move(request), std::move(reply), &ClientState::flightLookup);
-}
-
-void ClientConnection::flightSearch(std::shared_ptr<const ZLKFlightSearchRequest> request,
-                                    ReplyCallback reply) {
-  _forward(std::move(request), std::move(reply), &ClientState::flightSearch);
+ReplyCallback ClientConnection::_unlessStale(std::int64_t queryId, ReplyCallback reply) {
+  return [self = shared_from_this(), queryId, reply = std::move(reply)](std::int64_t answered,
+                                                                        auto answer, auto error) {
+    if (self->currentQueryId_ > queryId) return reply(answered, std::nullopt, std::nullopt);
+    reply(answered, std::move(answer), std::move(error));
+  };
 }
 
 // Makes `queryId` the current one when it is newer; false when it is stale, also when another
@@ -304,26 +233,34 @@ bool ClientConnection::_accepts(std::int64_t queryId) {
   return queryId > current && currentQueryId_.compare_exchange_strong(current, queryId);
 }
 
+void ClientConnection::reportEvent(const ipc::Call& call) {
+  _report(call, decodeFeedback(call.argument<std::string>(2), call.argument<Data>(3).view()));
+}
+
+void ClientConnection::reportEventData(const ipc::Call& call) {
+  _report(call, decodeFeedbackPayload(call.argument<Data>(2).view()));
+}
+
 // The event's name, the first argument, says nothing that the feedback does not. A caller that
 // waits is answered when the feedback is written.
-void ClientConnection::reportEvent(const ipc::Call& call, Decoded<MutableFeedback> feedback) {
+void ClientConnection::_report(const ipc::Call& call, Decoded<MutableFeedback> feedback) {
   if (const auto* fault = std::get_if<WireFault>(&feedback)) return _refuse(call, *fault);
   const bool fits = reports_.reportPayload(std::get<MutableFeedback>(std::move(feedback)),
-                                           *call.arguments.at(1).get<std::int64_t>(), state_.get(),
+                                           call.argument<std::int64_t>(1), state_.get(),
                                            {peer().pid, call.reply});
   if (!fits) call.reply->fail(ipc::kLimitsExceeded, "too much feedback waits to be written");
 }
 
-void ClientConnection::feedback(const std::shared_ptr<ipc::Reply>& reply) {
+void ClientConnection::feedback(const ipc::Call& call) {
   const auto state = state_.get();
   if (!state) return;
   auto records = state->sessionManager().feedbacksWithRelativeTimestamp();
   for (auto& record : records) record = withEscapedNoncharacters(std::move(record));
-  reply->send({std::move(records), ipc::Dictionary{}});
+  call.reply->send({std::move(records), ipc::Dictionary{}});
 }
 
-void ClientConnection::listSessions(const std::shared_ptr<ipc::Reply>& reply) {
-  reply->send({clientStateManager_.sessions()});
+void ClientConnection::listSessions(const ipc::Call& call) {
+  call.reply->send({clientStateManager_.sessions()});
 }
 
 void ClientConnection::flushSessionInvalidation(std::function<void(bool flushed)> callback) {

@@ -11,13 +11,14 @@
 #include "platform/api/Interprocess.h"
 #include "platform/api/ProcessTransactions.h"
 #include "platform/api/WorkQueues.h"
-#include "zelkord/ZelkorLogging/Tracing.h"
 #include "zelkord/core/BagTeller.h"
 #include "zelkord/core/FeedbackReports.h"
 #include "zelkord/core/FeedbackWire.h"
 #include "zelkord/core/IdleTimer.h"
+#include "zelkord/core/ServedInterface.h"
 #include "zelkord/core/Wire.h"
 #include "zelkord/query/ClientState.h"
+#include "zelkord/query/QueryKind.h"
 
 namespace zelkord {
 
@@ -47,6 +48,8 @@ class ClientConnection final : public ipc::CallHandler,
                    OtherCalls otherCalls);
   ~ClientConnection() override;
 
+  static const ServedInterface<ClientConnection>& interface();
+
   // Arms the idle timer. Right after construction.
   void start();
   // No call-back into the client and no time-out follows.
@@ -65,31 +68,21 @@ class ClientConnection final : public ipc::CallHandler,
   void flushSessionInvalidation(std::function<void(bool flushed)> callback);
 
  private:
-  void configure(ZLKSessionConfiguration configuration, const ipc::Call& call);
-  void bag(const std::shared_ptr<ipc::Reply>& reply);
-  void request(std::shared_ptr<ZLKRequest> request, const std::shared_ptr<ipc::Reply>& reply);
-  // The queries; `request` finds the one. Only searches go stale.
-  void search(std::shared_ptr<const ZLKSearchRequest> request, ReplyCallback reply);
-  void moreResults(std::shared_ptr<const ZLKMoreResultsRequest> request, ReplyCallback reply);
-  void card(std::shared_ptr<const ZLKCardRequest> request, ReplyCallback reply);
-  void zeroKeyword(std::shared_ptr<const ZLKZeroKeywordRequest> request, ReplyCallback reply);
-  void lookup(std::shared_ptr<const ZLKLookupRequest> request, ReplyCallback reply);
-  void flightLookup(std::shared_ptr<const ZLKFlightLookupRequest> request, ReplyCallback reply);
-  void flightSearch(std::shared_ptr<const ZLKFlightSearchRequest> request, ReplyCallback reply);
-  void reportEvent(const ipc::Call& call, Decoded<MutableFeedback> feedback);
+  // The members of the interface.
+  void configure(const ipc::Call& call);
+  void bag(const ipc::Call& call);
+  void request(const ipc::Call& call);
+  void reportEvent(const ipc::Call& call);
+  void reportEventData(const ipc::Call& call);
   // The records of the client's session, to the bound client only.
-  void feedback(const std::shared_ptr<ipc::Reply>& reply);
-  void listSessions(const std::shared_ptr<ipc::Reply>& reply);
+  void feedback(const ipc::Call& call);
+  void listSessions(const ipc::Call& call);
 
-  // Whether the call stands behind one that waits for a bag, or may wait for one itself.
-  bool _mayHaveToWait(const ipc::Call& call) const;
-  void _handleLater(ipc::Call call);
-  void _dispatchCall(ipc::Call call);
-  void _handleConfigure(const ipc::Call& call);
-  void _handleRequest(const ipc::Call& call);
-  void _handleReportEvent(const ipc::Call& call);
-  void _handleReportEventData(const ipc::Call& call);
-  void _handleDaemonCall(const ipc::Call& call);
+  // Whether the call stands behind one that waits for a bag, or may wait for one itself. Null: it
+  // is of another interface.
+  bool _mayHaveToWait(const Member<ClientConnection>* member) const;
+  void _handleLater(const Member<ClientConnection>* member, ipc::Call call);
+  void _handleNow(const Member<ClientConnection>* member, ipc::Call call);
   void _refuse(const ipc::Call& call, const WireFault& fault);
   // Makes the state of that configuration, if it is to have one; false when there is no room for
   // it.
@@ -97,19 +90,13 @@ class ClientConnection final : public ipc::CallHandler,
   void _ensureState();
   void _refuseConfiguration();
   void _fillMissing(ZLKRequest& request);
-  // Hands the request to that operation if it is of its kind.
-  template <typename Request>
-  bool _dispatch(const std::shared_ptr<ZLKRequest>& request, const ReplyCallback& reply,
-                 void (ClientConnection::*operation)(std::shared_ptr<const Request>,
-                                                     ReplyCallback));
-  // Hands the request to the state; nobody answers when there is none.
-  template <typename Request>
-  void _forward(std::shared_ptr<const Request> request, ReplyCallback reply,
-                void (ClientState::*operation)(std::shared_ptr<const Request>, ReplyCallback));
-  // Leaves the trace event `start` now and `end` ahead of the reply.
-  ReplyCallback _traced(TraceCode start, TraceCode end, ReplyCallback reply) const;
   ReplyCallback _replyTo(const std::shared_ptr<ipc::Reply>& reply);
+  // Leaves the kind's trace events, now and ahead of the reply.
+  ReplyCallback _traced(const QueryKind& kind, ReplyCallback reply) const;
+  // Replies with nothing when a newer query has been accepted by then.
+  ReplyCallback _unlessStale(std::int64_t queryId, ReplyCallback reply);
   bool _accepts(std::int64_t queryId);
+  void _report(const ipc::Call& call, Decoded<MutableFeedback> feedback);
 
   // Fixed after construction.
   Assembly& assembly_;

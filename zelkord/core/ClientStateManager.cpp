@@ -2,8 +2,8 @@
 
 #include "platform/api/RandomUUID.h"
 #include "zelkord/assembly/Assembly.h"
+#include "zelkord/core/EndpointConnection.h"
 #include "zelkord/core/EndpointListener.h"
-#include "zelkord/core/ServiceInterfaces.h"
 #include "zelkord/query/ErrorCodes.h"
 
 namespace zelkord {
@@ -46,7 +46,7 @@ ClientStateManager::~ClientStateManager() = default;
 void ClientStateManager::start() {
   endpointListener_ = std::make_shared<EndpointListener>(assembly_, weak_from_this());
   ipc::ListenerConfiguration configuration;
-  configuration.interfaces = {endpointInterface()};
+  configuration.interfaces = {EndpointConnection::interface().description()};
   configuration.connectionInterface = configuration.interfaces.front().name;
   configuration.delegateBoundsConnections = true;
   listener_ = assembly_.platform().interprocess.makeAnonymousListener(std::move(configuration),
@@ -213,10 +213,8 @@ void ClientStateManager::request(const std::shared_ptr<ZLKRequest>& request,
   if (!state) {
     reply(request->queryId, std::nullopt,
           zelkorError(kConnectionFault, "invalid configuration " + configuration.description()));
-  } else if (auto more = std::dynamic_pointer_cast<const ZLKMoreResultsRequest>(request)) {
-    state->moreResults(std::move(more), reply);
-  } else if (auto card = std::dynamic_pointer_cast<const ZLKCardRequest>(request)) {
-    state->card(std::move(card), reply);
+  } else if (const auto& kind = queryKindOf(*request); kind.isAtEndpoint) {
+    kind.start(kind, state, request, reply);
   }
 }
 

@@ -11,6 +11,7 @@
 #include "platform/api/Interprocess.h"
 #include "platform/api/WorkQueues.h"
 #include "zelkord/query/ClientState.h"
+#include "zelkord/query/QueryKind.h"
 #include "zelkord/query/ResponseImages.h"
 
 namespace zelkord {
@@ -53,7 +54,7 @@ class ClientStateManager final : public std::enable_shared_from_this<ClientState
   const std::string& endpoint() const;
   std::vector<std::shared_ptr<ClientState>> states();
 
-  // A query that came through the endpoint: more results and cards are answered as the state of the
+  // A query that came through the endpoint: a kind that is there is answered as the state of the
   // configuration's identifier, whose own configuration and user agent stay. Other kinds, and a
   // null `request` (a kind that does not exist), get no answer; an identifier that no client has
   // configured gets an error.

@@ -6,9 +6,9 @@
 #include "platform/api/KnownSettings.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/assembly/NotificationNames.h"
+#include "zelkord/core/ClientConnection.h"
 #include "zelkord/core/ClientStateManager.h"
 #include "zelkord/core/Diagnostics.h"
-#include "zelkord/core/ServiceInterfaces.h"
 #include "zelkord/core/ZelkorService.h"
 #include "zelkord/feedback/SessionManager.h"
 #include "zelkord/feedback/StoredSessions.h"
@@ -70,7 +70,8 @@ std::optional<Error> Daemon::_listen() {
   });
   service_ = std::make_shared<ZelkorService>(*assembly_, diagnostics_);
   ipc::ListenerConfiguration configuration;
-  configuration.interfaces = {daemonInterface(), diagnosticsInterface()};
+  configuration.interfaces = {ClientConnection::interface().description(),
+                              Diagnostics::interface().description()};
   configuration.connectionInterface = std::string(kDaemonInterface);
   configuration.sharedHandler = diagnostics_;
   return platform_.interprocess.listen(std::string(kServiceName), std::move(configuration),

@@ -83,15 +83,27 @@ json::object transportOf(const ipc::Statistics& statistics) {
 Diagnostics::Diagnostics(Assembly& assembly, Connections connections)
     : assembly_(assembly), connections_(std::move(connections)) {}
 
+const ServedInterface<Diagnostics>& Diagnostics::interface() {
+  static const ServedInterface<Diagnostics> kInterface = {
+      kDiagnosticsInterface,
+      {
+          {{"Status", "", "s json"}, &Diagnostics::_status},
+          {{"Metrics", "", "a{sx} counters"}, &Diagnostics::_metrics},
+          {{"ReadDefault", "s domain, s key", "s json"}, &Diagnostics::_readDefault},
+          {{"WriteDefault", "s domain, s key, s json", ""}, &Diagnostics::_writeDefault},
+      }};
+  return kInterface;
+}
+
 void Diagnostics::handle(ipc::Call call) {
-  if (call.interface != kDiagnosticsInterface) return;
-  if (call.member == "Status") return call.reply->send({status()});
-  if (call.member == "Metrics") {
-    const auto counters = assembly_.platform().counters.all();
-    return call.reply->send({ipc::IntegerMap(counters.begin(), counters.end())});
-  }
-  if (call.member == "ReadDefault") return _readDefault(call);
-  if (call.member == "WriteDefault") return _writeDefault(call);
+  if (const auto* member = interface().find(call)) (this->*member->handle)(call);
+}
+
+void Diagnostics::_status(const ipc::Call& call) { call.reply->send({status()}); }
+
+void Diagnostics::_metrics(const ipc::Call& call) {
+  const auto counters = assembly_.platform().counters.all();
+  call.reply->send({ipc::IntegerMap(counters.begin(), counters.end())});
 }
 
 std::string Diagnostics::status() const {
@@ -107,9 +119,9 @@ std::string Diagnostics::status() const {
   return jsonText(status);
 }
 
-void Diagnostics::_readDefault(const ipc::Call& call) const {
-  const auto& domain = *call.arguments.at(0).get<std::string>();
-  const auto& key = *call.arguments.at(1).get<std::string>();
+void Diagnostics::_readDefault(const ipc::Call& call) {
+  const auto& domain = call.argument<std::string>(0);
+  const auto& key = call.argument<std::string>(1);
   if (key.empty()) {
     return call.reply->send({jsonText(assembly_.userDefaults().all(domain))});
   }
@@ -117,10 +129,10 @@ void Diagnostics::_readDefault(const ipc::Call& call) const {
   call.reply->send({value ? jsonText(*value) : std::string()});
 }
 
-void Diagnostics::_writeDefault(const ipc::Call& call) const {
-  const auto& domain = *call.arguments.at(0).get<std::string>();
-  const auto& key = *call.arguments.at(1).get<std::string>();
-  const auto& text = *call.arguments.at(2).get<std::string>();
+void Diagnostics::_writeDefault(const ipc::Call& call) {
+  const auto& domain = call.argument<std::string>(0);
+  const auto& key = call.argument<std::string>(1);
+  const auto& text = call.argument<std::string>(2);
   if (key.empty()) return call.reply->fail(ipc::kInvalidArgs, "a setting needs a key");
   if (text.empty()) {
     assembly_.userDefaults().remove(key, domain);

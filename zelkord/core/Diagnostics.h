@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "platform/api/Interprocess.h"
+#include "zelkord/core/ServedInterface.h"
 
 namespace zelkord {
 
@@ -19,6 +20,7 @@ class Diagnostics final : public ipc::CallHandler {
 
   Diagnostics(Assembly& assembly, Connections connections);
 
+  static const ServedInterface<Diagnostics>& interface();
   void handle(ipc::Call call) override;
 
   // JSON: {"pid", "version", "transactions", "connections", "states", "bag", "interprocess"}.
@@ -26,8 +28,10 @@ class Diagnostics final : public ipc::CallHandler {
   std::string status() const;
 
  private:
-  void _readDefault(const ipc::Call& call) const;
-  void _writeDefault(const ipc::Call& call) const;
+  void _status(const ipc::Call& call);
+  void _metrics(const ipc::Call& call);
+  void _readDefault(const ipc::Call& call);
+  void _writeDefault(const ipc::Call& call);
 
   Assembly& assembly_;
   const Connections connections_;

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <chrono>
 
+#include "corezelkor/Constants.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/core/ClientStateManager.h"
 #include "zelkord/core/Wire.h"
@@ -47,18 +48,29 @@ void EndpointConnection::invalidated() {
   }
 }
 
+const ServedInterface<EndpointConnection>& EndpointConnection::interface() {
+  static const ServedInterface<EndpointConnection> kInterface = {
+      kEndpointInterface,
+      {
+          {{"Request", "s kind, a{sv} request, a{sv} configuration",
+            "x queryId, a{sv} reply, a{sv} error"},
+           &EndpointConnection::_request},
+          {{"LoadImages", "aa{sv} descriptors, t timeoutMilliseconds", "a{say} images"},
+           &EndpointConnection::_loadImages},
+      }};
+  return kInterface;
+}
+
 void EndpointConnection::handle(ipc::Call call) {
   timer_->rearm();
-  if (call.member == "Request") _request(call);
-  if (call.member == "LoadImages") _loadImages(call);
+  if (const auto* member = interface().find(call)) (this->*member->handle)(call);
 }
 
 void EndpointConnection::_request(const ipc::Call& call) {
   const auto manager = manager_.lock();
   if (!manager) return;
-  auto request = decodeRequest(*call.arguments.at(0).get<std::string>(),
-                               *call.arguments.at(1).get<ipc::Dictionary>());
-  auto configuration = decodeConfiguration(*call.arguments.at(2).get<ipc::Dictionary>());
+  auto request = decodeRequest(call.argument<std::string>(0), call.argument<ipc::Dictionary>(1));
+  auto configuration = decodeConfiguration(call.argument<ipc::Dictionary>(2));
   for (const auto* fault :
        {std::get_if<WireFault>(&request), std::get_if<WireFault>(&configuration)}) {
     if (!fault) continue;
@@ -75,15 +87,14 @@ void EndpointConnection::_request(const ipc::Call& call) {
 
 void EndpointConnection::_loadImages(const ipc::Call& call) {
   const auto received = assembly_.platform().clock.realNow();
-  auto descriptors =
-      decodeImageDescriptors(*call.arguments.at(0).get<std::vector<ipc::Dictionary>>());
+  auto descriptors = decodeImageDescriptors(call.argument<std::vector<ipc::Dictionary>>(0));
   if (const auto* fault = std::get_if<WireFault>(&descriptors)) {
     assembly_.log(Category::Connection).error("endpoint {} refused: {}", call.member, fault->text);
     return call.reply->fail(fault->errorName, fault->text);
   }
   auto share = imageCalls_->take(holder_);
   if (!share) return call.reply->fail(ipc::kLimitsExceeded, "too many calls for images");
-  const auto timeout = durationOfMilliseconds(*call.arguments.at(1).get<std::uint64_t>());
+  const auto timeout = durationOfMilliseconds(call.argument<std::uint64_t>(1));
   _beginImages({.descriptors = std::get<std::vector<ImageDescriptor>>(std::move(descriptors)),
                 .deadline = deadlineAfter(received, timeout),
                 .holder = holder_},

@@ -9,6 +9,7 @@
 #include "platform/api/Interprocess.h"
 #include "platform/api/WorkQueues.h"
 #include "zelkord/core/IdleTimer.h"
+#include "zelkord/core/ServedInterface.h"
 #include "zelkord/query/ImageCall.h"
 
 namespace zelkord {
@@ -30,6 +31,8 @@ class EndpointConnection final : public ipc::CallHandler,
   // `imageCalls`: how many calls for images may be under way.
   EndpointConnection(Assembly& assembly, std::weak_ptr<ClientStateManager> manager,
                      std::shared_ptr<Budget> imageCalls);
+
+  static const ServedInterface<EndpointConnection>& interface();
 
   void start(const std::shared_ptr<ipc::Connection>& connection);
   void invalidated();

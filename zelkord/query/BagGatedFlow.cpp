@@ -15,8 +15,8 @@ bool BagGatedFlow::_passesGates() {
     return false;
   }
   if (!state_->currentBag()->isEnabled()) {
-    assembly_.log(traits_.disabledCategory.value_or(traits_.category))
-        .debug("no {}, bag disabled", traits_.name);
+    assembly_.log(kind_.disabledCategory.value_or(kind_.category))
+        .debug("no {}, bag disabled", kind_.logName);
     _skip(SkipReason::BagDisabled);
     return false;
   }
@@ -24,20 +24,20 @@ bool BagGatedFlow::_passesGates() {
 }
 
 void BagGatedFlow::_logStart() const {
-  _log().notice("session {} performing {} query, reply {}", state_->identifier(), traits_.name,
+  _log().notice("session {} performing {} query, reply {}", state_->identifier(), kind_.logName,
                 kCallbackText);
 }
 
 void BagGatedFlow::_logNoBag() const {
-  _log().error("Bag fetch failed, can't complete non-cached {} query.", traits_.name);
+  _log().error("Bag fetch failed, can't complete non-cached {} query.", kind_.logName);
 }
 
 void BagGatedFlow::_logDispatch() const {
-  _log().debug("Dispatching network request for {} query", traits_.name);
+  _log().debug("Dispatching network request for {} query", kind_.logName);
 }
 
 void BagGatedFlow::_logAnswer() const {
-  _log().notice("Got network response for {} query", traits_.name);
+  _log().notice("Got network response for {} query", kind_.logName);
 }
 
 std::optional<QueryFlow::Refusal> BagGatedFlow::_refusalOfAnswer(const URLResult& result) const {

@@ -7,12 +7,13 @@
 namespace zelkord {
 
 // A query that needs an enabled bag, for which it waits a second at most, and whose answer goes to
-// the client as it came whatever its status and whether or not it is JSON: search, zero keyword,
-// lookup.
+// the client as it came whatever its status and whether or not it is JSON: search, lookup, and, as
+// it is, zero keyword.
 class BagGatedFlow : public QueryFlow {
- protected:
+ public:
   using QueryFlow::QueryFlow;
 
+ protected:
   // Why a query is not sent; the numbers are recorded.
   enum class SkipReason : std::int32_t { TooShort = 1, BagDisabled = 2, NoBag = 3 };
 

@@ -10,14 +10,9 @@
 #include "zelkord/network/ZLKNetworkRequestFactory.h"
 #include "zelkord/network/ZelkorBagController.h"
 #include "zelkord/network/ZelkorUserGUIDController.h"
-#include "zelkord/query/CardFlow.h"
 #include "zelkord/query/ErrorCodes.h"
-#include "zelkord/query/LookupFlow.h"
-#include "zelkord/query/MoreResultsFlow.h"
 #include "zelkord/query/QueryCache.h"
-#include "zelkord/query/SearchFlow.h"
 #include "zelkord/query/WarmUp.h"
-#include "zelkord/query/ZeroKeywordFlow.h"
 
 namespace zelkord {
 namespace {
@@ -166,43 +161,6 @@ void ClientState::warm() {
   }
   sendWarmRequest(assembly_, *url);
   _markNetworkRequest();
-}
-
-template <typename Flow, typename Request>
-void ClientState::_start(std::shared_ptr<const Request> request, ReplyCallback reply) {
-  std::make_shared<Flow>(shared_from_this(), std::move(request), std::move(reply))->start();
-}
-
-void ClientState::search(std::shared_ptr<const ZLKSearchRequest> request, ReplyCallback reply) {
-  _start<SearchFlow>(std::move(request), std::move(reply));
-}
-
-void ClientState::zeroKeyword(std::shared_ptr<const ZLKZeroKeywordRequest> request,
-                              ReplyCallback reply) {
-  _start<ZeroKeywordFlow>(std::move(request), std::move(reply));
-}
-
-void ClientState::moreResults(std::shared_ptr<const ZLKMoreResultsRequest> request,
-                              ReplyCallback reply) {
-  _start<MoreResultsFlow>(std::move(request), std::move(reply));
-}
-
-void ClientState::card(std::shared_ptr<const ZLKCardRequest> request, ReplyCallback reply) {
-  _start<CardFlow>(std::move(request), std::move(reply));
-}
-
-void ClientState::lookup(std::shared_ptr<const ZLKLookupRequest> request, ReplyCallback reply) {
-  _start<LookupFlow>(std::move(request), std::move(reply));
-}
-
-void ClientState::flightSearch(std::shared_ptr<const ZLKFlightSearchRequest> request,
-                               ReplyCallback reply) {
-  reply(request->queryId, std::nullopt, std::nullopt);
-}
-
-void ClientState::flightLookup(std::shared_ptr<const ZLKFlightLookupRequest> request,
-                               ReplyCallback reply) {
-  reply(request->queryId, std::nullopt, std::nullopt);
 }
 
 void ClientState::_markNetworkRequest() {

@@ -31,8 +31,6 @@ struct ClientBudgets {
   Budget bagWaits;    // waits for a bag, each of which keeps a thread
 };
 
-using ReplyCallback = std::function<void(std::int64_t queryId, std::optional<ZLKReply> reply,
-                                         std::optional<Error> error)>;
 using BagCallback =
     std::function<void(std::shared_ptr<const ZLKBag> bag, std::optional<Error> error)>;
 
@@ -81,16 +79,7 @@ class ClientState final : public std::enable_shared_from_this<ClientState> {
   // Opens a connection to the service ahead of the first query, unless one is still warm.
   void warm();
 
-  // The queries. Each is answered once, those about flights at once and with nothing.
-  void search(std::shared_ptr<const ZLKSearchRequest> request, ReplyCallback reply);
-  void zeroKeyword(std::shared_ptr<const ZLKZeroKeywordRequest> request, ReplyCallback reply);
-  void moreResults(std::shared_ptr<const ZLKMoreResultsRequest> request, ReplyCallback reply);
-  void card(std::shared_ptr<const ZLKCardRequest> request, ReplyCallback reply);
-  void lookup(std::shared_ptr<const ZLKLookupRequest> request, ReplyCallback reply);
-  void flightSearch(std::shared_ptr<const ZLKFlightSearchRequest> request, ReplyCallback reply);
-  void flightLookup(std::shared_ptr<const ZLKFlightLookupRequest> request, ReplyCallback reply);
-
-  // What the flows share.
+  // What the flows of its queries (QueryKind) share.
 
   // Whether there is a bag, waiting for one for at most a second; not at all beyond the process's
   // share of such waits.
@@ -109,8 +98,6 @@ class ClientState final : public std::enable_shared_from_this<ClientState> {
               std::optional<UUID> userGuid) const;
 
  private:
-  template <typename Flow, typename Request>
-  void _start(std::shared_ptr<const Request> request, ReplyCallback reply);
   void _observeBagChanges();
   void _bagChangeNotification(const Notification& notification);
   void _waitForBag();

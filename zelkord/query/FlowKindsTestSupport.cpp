@@ -7,18 +7,17 @@ namespace zelkord {
 namespace {
 
 template <typename Request>
-auto asking(void (ClientState::*operation)(std::shared_ptr<const Request>, ReplyCallback),
-            Request request = {}) {
+auto asking(Request request = {}) {
   request.queryId = 7;
   request.clientQueryId = 70;
   request.queryString = "snow";
   request.uuid = "uuid of snow";
   request.triggerEvent = 5;
   request.scale = 2;
-  return [operation, request](QueryBed& bed, ClientState& state, bool verbose) {
+  return [request](QueryBed& bed, ClientState& state, bool verbose) {
     auto asked = request;
     asked.verboseReply = verbose;
-    return bed.ask(state, operation, std::move(asked));
+    return bed.ask(state, std::move(asked));
   };
 }
 
@@ -44,7 +43,7 @@ constexpr const char* kSearchResponse =
 const std::vector<FlowKind>& flowKinds() {
   static const std::vector<FlowKind> kKinds = {
       {.name = "search",
-       .ask = asking(&ClientState::search),
+       .ask = asking<ZLKSearchRequest>(),
        .category = "Zelkor_Search",
        .input = "snow",
        .gated = true,
@@ -58,7 +57,7 @@ const std::vector<FlowKind>& flowKinds() {
        .noBag = "error Zelkor_Search Bag fetch failed, can't complete non-cached query <private>.",
        .disabled = "debug Zelkor_Search no search, bag disabled"},
       {.name = "zero keyword",
-       .ask = asking(&ClientState::zeroKeyword),
+       .ask = asking<ZLKZeroKeywordRequest>(),
        .category = "Zelkor_ZeroKeyword",
        .gated = true,
        .masked = true,
@@ -69,8 +68,7 @@ const std::vector<FlowKind>& flowKinds() {
        .noBag = "error Zelkor_ZeroKeyword Bag fetch failed, can't complete non-cached zkw query.",
        .disabled = "debug Zelkor_Search no zkw, bag disabled"},
       {.name = "more results",
-       .ask = asking(&ClientState::moreResults,
-                     moreResultsAt("https://m.example/more?page=2&q=snow%20man&q=late")),
+       .ask = asking(moreResultsAt("https://m.example/more?page=2&q=snow%20man&q=late")),
        .category = "Zelkor_MoreResults",
        .input = "snow man",
        .strict = "More results",
@@ -78,12 +76,12 @@ const std::vector<FlowKind>& flowKinds() {
        .sent = {"debug * request: https://m.example/more?<private> header: <private>"},
        .answered = {R"(debug * resp: {"url":"https://m.example/more?<private>","status":200})"}},
       {.name = "card",
-       .ask = asking(&ClientState::card, cardAt("https://c.example/own?q=snow")),
+       .ask = asking(cardAt("https://c.example/own?q=snow")),
        .category = "Zelkor_Card",
        .endpoint = 11,
        .strict = "Card"},
       {.name = "lookup",
-       .ask = asking(&ClientState::lookup),
+       .ask = asking<ZLKLookupRequest>(),
        .category = "Zelkor_LookUp",
        .startClass = "ZLKLookupStartNetworkSearchFeedback",
        .input = "snow",

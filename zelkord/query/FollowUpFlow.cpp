@@ -13,7 +13,7 @@ constexpr Private kNoText = {"(null)", true};
 
 std::optional<QueryFlow::Refusal> FollowUpFlow::_refusalOfAnswer(const URLResult& result) const {
   if (result.status() == kOK && !result.error) return std::nullopt;
-  _log().error("{} fetch failed with HTTP status code {} error {}", traits_.name, result.status(),
+  _log().error("{} fetch failed with HTTP status code {} error {}", kind_.logName, result.status(),
                result.error ? result.error->description() : "(null)");
   return Refusal{result.error};
 }

@@ -4,34 +4,21 @@
 
 #include "halvane/DaemonFeedback.h"
 #include "zelkord/assembly/Assembly.h"
-#include "zelkord/network/ZLKNetworkRequestFactory.h"
 #include "zelkord/query/NetworkRecords.h"
 
 namespace zelkord {
 namespace {
 
-constexpr QueryTraits kLookupTraits = {
-    .name = "lookup", .category = Category::LookUp, .transport = QueryTransport::Retryable};
 constexpr std::uint32_t kLookupTrigger = 11;
 constexpr std::uint32_t kLastSelectionType = 2;
 constexpr Duration kRenderingTime = 500ms;
 
 }  // namespace
 
-LookupFlow::LookupFlow(std::shared_ptr<ClientState> state,
-                       std::shared_ptr<const ZLKLookupRequest> request, ReplyCallback reply)
-    : BagGatedFlow(kLookupTraits, std::move(state), request, std::move(reply)),
-      lookup_(std::move(request)) {}
-
-std::optional<URLRequest> LookupFlow::_makeRequest(const ZLKBag* bag,
-                                                   const std::optional<UUID>& userGuid) {
-  return assembly_.requestFactory()->lookupRequest(*lookup_, bag, userGuid);
-}
-
 std::shared_ptr<const HVFeedback> LookupFlow::_makeStart(const URLRequest& request) const {
   auto start = std::make_shared<ZLKLookupStartNetworkSearchFeedback>();
   fillStart(*start, request, _origin(kLookupTrigger));
-  const auto type = lookup_->lookupSelectionType;
+  const auto type = _as<ZLKLookupRequest>().lookupSelectionType;
   start->lookupSelectionType = type > kLastSelectionType ? 0 : static_cast<std::int32_t>(type);
   return start;
 }

@@ -8,18 +8,13 @@ namespace zelkord {
 // be shown.
 class LookupFlow final : public BagGatedFlow {
  public:
-  LookupFlow(std::shared_ptr<ClientState> state, std::shared_ptr<const ZLKLookupRequest> request,
-             ReplyCallback reply);
+  using BagGatedFlow::BagGatedFlow;
 
  private:
-  std::optional<URLRequest> _makeRequest(const ZLKBag* bag,
-                                         const std::optional<UUID>& userGuid) override;
-  std::string _input() const override { return lookup_->queryString; }
+  std::string _input() const override { return request_->queryString; }
   std::shared_ptr<const HVFeedback> _makeStart(const URLRequest& request) const override;
   std::optional<SteadyTime> _deadline(const ZLKBag* bag) const override;
   void _didSend() override { state_->_setPerformedSearch(); }
-
-  const std::shared_ptr<const ZLKLookupRequest> lookup_;
 };
 
 // The moment after which a lookup sent `now` is not repeated: half a second before the client gives

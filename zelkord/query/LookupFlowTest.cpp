@@ -15,7 +15,7 @@ TEST(LookupFlowTest, RecordsTheWayTheTextWasSelected) {
     bed.installBag(kTestBag);
     ZLKLookupRequest request;
     request.lookupSelectionType = type;
-    bed.ask(*bed.makeState(), &ClientState::lookup, request);
+    bed.ask(*bed.makeState(), request);
     const auto records = bed.records();
     const auto& start =
         dynamic_cast<const ZLKLookupStartNetworkSearchFeedback&>(*records[0].feedback);
@@ -38,7 +38,7 @@ TEST(LookupFlowTest, IsRepeatedUntilHalfASecondBeforeItsRendering) {
     QueryBed bed;
     bed.installBag(R"({"search_url":"https://s.example/s","search_render_timeout":)" +
                    json::serialize(renderTimeout) + "}");
-    const auto answer = bed.ask(*bed.makeState(), &ClientState::lookup, ZLKLookupRequest());
+    const auto answer = bed.ask(*bed.makeState(), ZLKLookupRequest());
     bed.fakes.timeline.advance(failsAfter);
     bed.urlSession().tasks().back()->fail(urlError(URLErrorCode::TimedOut));
     bed.fakes.timeline.runUntilIdle();

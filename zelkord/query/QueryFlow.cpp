@@ -19,9 +19,9 @@ constexpr unsigned kRetries = 3;
 
 }  // namespace
 
-QueryFlow::QueryFlow(const QueryTraits& traits, std::shared_ptr<ClientState> state,
+QueryFlow::QueryFlow(const QueryKind& kind, std::shared_ptr<ClientState> state,
                      std::shared_ptr<const ZLKRequest> request, ReplyCallback reply)
-    : traits_(traits),
+    : kind_(kind),
       state_(std::move(state)),
       request_(std::move(request)),
       assembly_(state_->assembly()),
@@ -35,22 +35,23 @@ void QueryFlow::_send() {
   _logDispatch();
   const auto bag = state_->currentBag();
   userGuid_ = state_->guidController().currentUserGUID();
-  auto request = _makeRequest(bag.get(), userGuid_);
+  auto request = kind_.makeRequest(
+      {*assembly_.requestFactory(), *request_, bag.get(), userGuid_, state_->fieldMask()});
   if (!request) return _reply(std::nullopt, zelkorError(kBagFault, "no URL"));
   httpRequest_ = *std::move(request);
   // What people type goes before what they follow up.
-  if (traits_.transport != QueryTransport::Plain) httpRequest_.priority = TransferPriority::Low;
+  if (kind_.transport != QueryTransport::Plain) httpRequest_.priority = TransferPriority::Low;
   _logRequest();
   state_->record(_makeStart(httpRequest_), *request_, userGuid_);
   const auto task = _makeTask(bag.get());
-  if (traits_.routing == QueryRouting::ThroughProxy) useRoutingProxy(assembly_, *task);
+  if (kind_.routing == QueryRouting::ThroughProxy) useRoutingProxy(assembly_, *task);
   task->resume();
   _didSend();
   state_->_markNetworkRequest();
 }
 
 void QueryFlow::_logRequest() const {
-  if (traits_.exchangeLog == ExchangeLog::Silent || !_log().isEnabled(LogLevel::Debug)) return;
+  if (kind_.exchangeLog == ExchangeLog::Silent || !_log().isEnabled(LogLevel::Debug)) return;
   const bool show = assembly_.platform().log.showsPrivateData();
   _log().debug("request: {} header: {}", urlForLog(httpRequest_.url, show),
                priv(headersForLog(httpRequest_.headers)));
@@ -62,7 +63,7 @@ std::shared_ptr<const HVFeedback> QueryFlow::_makeStart(const URLRequest& reques
 
 NetworkSearchOrigin QueryFlow::_origin(std::uint32_t triggerEvent) const {
   return {.triggerEvent = static_cast<std::int32_t>(triggerEvent),
-          .endpointType = traits_.endpoint,
+          .endpointType = kind_.endpoint,
           .input = _input(),
           .uuid = request_->uuid};
 }
@@ -72,7 +73,7 @@ std::shared_ptr<URLTask> QueryFlow::_makeTask(const ZLKBag* bag) {
     self->_finish(task, result);
   };
   auto& session = assembly_.urlSession();
-  if (traits_.transport == QueryTransport::Plain) {
+  if (kind_.transport == QueryTransport::Plain) {
     return session.dataTask(httpRequest_, std::move(completion));
   }
   const auto retryable = std::make_shared<const ZLKRetryableNetworkRequest>(
@@ -85,7 +86,7 @@ std::shared_ptr<URLTask> QueryFlow::_makeTask(const ZLKBag* bag) {
 void QueryFlow::_finish(const std::shared_ptr<URLTask>& task, const URLResult& result) {
   if (result.response && result.response->status) state_->recordSearchResult(result.status());
   _logAnswer();
-  if (traits_.exchangeLog != ExchangeLog::Silent && _log().isEnabled(LogLevel::Debug)) {
+  if (kind_.exchangeLog != ExchangeLog::Silent && _log().isEnabled(LogLevel::Debug)) {
     _log().debug("resp: {}", _responseForLog(result));
   }
   if (const auto refusal = _refusalOfAnswer(result)) {
@@ -133,7 +134,7 @@ void QueryFlow::_reply(std::optional<ZLKReply> reply, std::optional<Error> error
   reply_(request_->queryId, std::move(reply), std::move(error));
 }
 
-const Logger& QueryFlow::_log() const { return assembly_.log(traits_.category); }
+const Logger& QueryFlow::_log() const { return assembly_.log(kind_.category); }
 
 std::string QueryFlow::_responseForLog(const URLResult& result) const {
   return responseForLog(result.response, assembly_.platform().log.showsPrivateData());

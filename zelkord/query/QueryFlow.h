@@ -6,47 +6,26 @@
 #include <string_view>
 
 #include "platform/api/URLSession.h"
-#include "zelkord/ZelkorLogging/ZelkorLogging.h"
 #include "zelkord/network/NetworkSearchRecords.h"
 #include "zelkord/query/ClientState.h"
+#include "zelkord/query/QueryKind.h"
 
 namespace zelkord {
-
-// How the requests of a kind of query travel.
-enum class QueryTransport {
-  Plain,      // one task
-  Retryable,  // repeated up to three times before the flow's deadline, if it has one
-};
-
-enum class QueryRouting { Direct, ThroughProxy };
-
-enum class ExchangeLog { Silent, RequestAndResponse };
-
-// What differs between the kinds of query as a value; what differs in behaviour are the steps
-// below.
-struct QueryTraits {
-  std::string_view name;  // in log lines
-  Category category;      // of log lines
-  // Of the line about a bag that is disabled, where that differs.
-  std::optional<Category> disabledCategory = std::nullopt;
-  std::int32_t endpoint = 6;  // as recorded
-  QueryTransport transport = QueryTransport::Plain;
-  QueryRouting routing = QueryRouting::ThroughProxy;
-  ExchangeLog exchangeLog = ExchangeLog::RequestAndResponse;
-};
 
 // One query, from its first log line to the reply.
 //
 //   gates -> request -> start record -> task -> checks of the answer -> end record -> reply
 //
 // Each step either replies and ends the flow or goes on to the next one; the client is answered
-// exactly once. The kinds of query are the subclasses.
+// exactly once. A kind of query is its row (QueryKind) and the steps that its subclass overrides.
 //
 // Threading: `start` on the client connection's queue, which it may hold for the second that a bag
 // may take; the rest on the URL session's delegate queue. Ownership: kept alive by the task under
 // way; keeps the state alive. Errors: to the client, as of ClientState.
 class QueryFlow : public std::enable_shared_from_this<QueryFlow> {
  public:
+  QueryFlow(const QueryKind& kind, std::shared_ptr<ClientState> state,
+            std::shared_ptr<const ZLKRequest> request, ReplyCallback reply);
   virtual ~QueryFlow() = default;
   QueryFlow(const QueryFlow&) = delete;
   QueryFlow& operator=(const QueryFlow&) = delete;
@@ -65,17 +44,11 @@ class QueryFlow : public std::enable_shared_from_this<QueryFlow> {
     std::string problem;                // why not; one line
   };
 
-  QueryFlow(const QueryTraits& traits, std::shared_ptr<ClientState> state,
-            std::shared_ptr<const ZLKRequest> request, ReplyCallback reply);
-
   // Steps, in their order.
 
   // Whether to send the query; otherwise it has replied.
   virtual bool _passesGates() { return true; }
   virtual void _logDispatch() const {}
-  // None: there is no URL for it.
-  virtual std::optional<URLRequest> _makeRequest(const ZLKBag* bag,
-                                                 const std::optional<UUID>& userGuid) = 0;
   // The text that the records show as the query's.
   virtual std::string _input() const { return {}; }
   virtual std::shared_ptr<const HVFeedback> _makeStart(const URLRequest& request) const;
@@ -89,6 +62,11 @@ class QueryFlow : public std::enable_shared_from_this<QueryFlow> {
   virtual void _didParse(const json::value&, const Data&) {}
   virtual void _willReply(const URLResponse&) {}
 
+  // The request as its own class, which is the kind's.
+  template <typename Request>
+  const Request& _as() const {
+    return static_cast<const Request&>(*request_);
+  }
   NetworkSearchOrigin _origin(std::uint32_t triggerEvent) const;
   void _reply(std::optional<ZLKReply> reply, std::optional<Error> error);
   ZLKReply _makeReply(Data data) const;
@@ -96,7 +74,7 @@ class QueryFlow : public std::enable_shared_from_this<QueryFlow> {
   std::string _responseForLog(const URLResult& result) const;
 
   // Fixed after construction.
-  const QueryTraits& traits_;
+  const QueryKind& kind_;
   const std::shared_ptr<ClientState> state_;
   const std::shared_ptr<const ZLKRequest> request_;
   Assembly& assembly_;

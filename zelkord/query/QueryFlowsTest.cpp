@@ -375,12 +375,12 @@ TEST(QueryFlowsTest, WithoutAURLThereIsNoRequestAndNoRecord) {
   ZLKCardRequest unusable;
   unusable.cardURL = "card";
   const std::vector<Answered> answers = {
-      bed.ask(*state, &ClientState::search, ZLKSearchRequest()),
-      bed.ask(*state, &ClientState::zeroKeyword, ZLKZeroKeywordRequest()),
-      bed.ask(*state, &ClientState::moreResults, ZLKMoreResultsRequest()),
-      bed.ask(*state, &ClientState::card, ZLKCardRequest()),
-      bed.ask(*state, &ClientState::card, unusable),
-      bed.ask(*state, &ClientState::lookup, ZLKLookupRequest()),
+      bed.ask(*state, ZLKSearchRequest()),
+      bed.ask(*state, ZLKZeroKeywordRequest()),
+      bed.ask(*state, ZLKMoreResultsRequest()),
+      bed.ask(*state, ZLKCardRequest()),
+      bed.ask(*state, unusable),
+      bed.ask(*state, ZLKLookupRequest()),
   };
   for (const auto& answer : answers) {
     EXPECT_EQ(answer->count, 1);
@@ -395,8 +395,8 @@ TEST(QueryFlowsTest, FollowUpsGoToTheBagsURLWhenTheyHaveNone) {
   bed.installBag(kFlowBag);
   const auto state = bed.makeState();
   state->_ensureBag();
-  bed.ask(*state, &ClientState::moreResults, ZLKMoreResultsRequest());
-  bed.ask(*state, &ClientState::card, ZLKCardRequest());
+  bed.ask(*state, ZLKMoreResultsRequest());
+  bed.ask(*state, ZLKCardRequest());
   const auto tasks = bed.urlSession().tasks();
   ASSERT_EQ(tasks.size(), 2u);
   EXPECT_THAT(tasks[0]->request().url, HasSubstr("https://m.example/bag?"));
@@ -410,8 +410,7 @@ TEST(QueryFlowsTest, FlightsAreAnsweredAtOnceWithNothing) {
   search.queryId = 8;
   ZLKFlightLookupRequest lookup;
   lookup.queryId = 8;
-  for (const auto& answer : {bed.ask(*state, &ClientState::flightSearch, search),
-                             bed.ask(*state, &ClientState::flightLookup, lookup)}) {
+  for (const auto& answer : {bed.ask(*state, search), bed.ask(*state, lookup)}) {
     EXPECT_EQ(answer->count, 1);
     EXPECT_EQ(answer->queryId, 8);
     EXPECT_FALSE(answer->reply || answer->error);

@@ -46,16 +46,22 @@ std::shared_ptr<QueryBed::Answer> QueryBed::search(ClientState& state, const std
 }
 
 std::shared_ptr<QueryBed::Answer> QueryBed::search(ClientState& state, ZLKSearchRequest request) {
-  return ask(state, &ClientState::search, std::move(request));
+  return ask(state, std::move(request));
 }
 
-ReplyCallback QueryBed::_into(std::shared_ptr<Answer> answer) {
-  return [answer = std::move(answer)](std::int64_t queryId, auto reply, auto error) {
-    ++answer->count;
-    answer->queryId = queryId;
-    answer->reply = std::move(reply);
-    answer->error = std::move(error);
-  };
+std::shared_ptr<QueryBed::Answer> QueryBed::_ask(ClientState& state,
+                                                 std::shared_ptr<const ZLKRequest> request) {
+  auto answer = std::make_shared<Answer>();
+  const auto& kind = queryKindOf(*request);
+  kind.start(kind, state.shared_from_this(), std::move(request),
+             [answer](std::int64_t queryId, auto reply, auto error) {
+               ++answer->count;
+               answer->queryId = queryId;
+               answer->reply = std::move(reply);
+               answer->error = std::move(error);
+             });
+  fakes.timeline.runUntilIdle();
+  return answer;
 }
 
 std::vector<ZelkorFeedback> QueryBed::records() const { return sessions->records().all(); }

@@ -11,6 +11,7 @@
 #include "zelkord/network/ZLKNetworkRequestFactory.h"
 #include "zelkord/network/ZelkorBagController.h"
 #include "zelkord/query/ClientState.h"
+#include "zelkord/query/QueryKind.h"
 
 namespace zelkord {
 
@@ -37,14 +38,8 @@ class QueryBed {
   std::shared_ptr<Answer> search(ClientState& state, ZLKSearchRequest request);
   // The same for any kind of query.
   template <typename Request>
-  std::shared_ptr<Answer> ask(ClientState& state,
-                              void (ClientState::*operation)(std::shared_ptr<const Request>,
-                                                             ReplyCallback),
-                              Request request) {
-    auto answer = std::make_shared<Answer>();
-    (state.*operation)(std::make_shared<const Request>(std::move(request)), _into(answer));
-    fakes.timeline.runUntilIdle();
-    return answer;
+  std::shared_ptr<Answer> ask(ClientState& state, Request request) {
+    return _ask(state, std::make_shared<const Request>(std::move(request)));
   }
 
   FakeURLSession& urlSession() { return *fakes.urlSessions.find("urlSession"); }
@@ -58,7 +53,7 @@ class QueryBed {
   std::shared_ptr<RecordingSessionManager> sessions;
 
  private:
-  static ReplyCallback _into(std::shared_ptr<Answer> answer);
+  std::shared_ptr<Answer> _ask(ClientState& state, std::shared_ptr<const ZLKRequest> request);
 };
 
 // A bag under which searches go out.

@@ -6,14 +6,12 @@
 #include "halvane/DaemonFeedback.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/feedback/UserGUIDSource.h"
-#include "zelkord/network/ZLKNetworkRequestFactory.h"
 #include "zelkord/network/ZelkorBagController.h"
 #include "zelkord/query/QueryCache.h"
 
 namespace zelkord {
 namespace {
 
-constexpr QueryTraits kSearchTraits = {.name = "search", .category = Category::Search};
 constexpr std::int32_t kCacheHitTrigger = 4;
 // Of one response, handed to the cache together. Each carries the typed text, so that a long list
 // is not built as a whole.
@@ -27,10 +25,6 @@ bool mayBeCached(const json::object& resultSet) {
 }
 
 }  // namespace
-
-SearchFlow::SearchFlow(std::shared_ptr<ClientState> state,
-                       std::shared_ptr<const ZLKSearchRequest> request, ReplyCallback reply)
-    : BagGatedFlow(kSearchTraits, std::move(state), std::move(request), std::move(reply)) {}
 
 bool SearchFlow::_passesGates() {
   state_->count("keystrokes");
@@ -59,11 +53,6 @@ bool SearchFlow::_answersFromCache() {
                  *request_, userGuid_);
   _reply(std::move(reply), std::nullopt);
   return true;
-}
-
-std::optional<URLRequest> SearchFlow::_makeRequest(const ZLKBag* bag,
-                                                   const std::optional<UUID>& userGuid) {
-  return assembly_.requestFactory()->searchRequest(*request_, bag, userGuid, state_->fieldMask());
 }
 
 void SearchFlow::_didSend() {

@@ -8,8 +8,7 @@ namespace zelkord {
 // an earlier answer that covers it spares the request. Answers are cached.
 class SearchFlow final : public BagGatedFlow {
  public:
-  SearchFlow(std::shared_ptr<ClientState> state, std::shared_ptr<const ZLKSearchRequest> request,
-             ReplyCallback reply);
+  using BagGatedFlow::BagGatedFlow;
 
  private:
   bool _passesGates() override;
@@ -17,8 +16,6 @@ class SearchFlow final : public BagGatedFlow {
   void _logNoBag() const override;
   void _logDispatch() const override;
   void _logAnswer() const override;
-  std::optional<URLRequest> _makeRequest(const ZLKBag* bag,
-                                         const std::optional<UUID>& userGuid) override;
   std::string _input() const override { return request_->queryString; }
   void _didSend() override;
   void _didParse(const json::value& rawResponse, const Data& data) override;
