@@ -1,6 +1,7 @@
 #include "zelkord/network/BagCacheURL.h"
 
 #include "zelkord/assembly/Assembly.h"
+#include "zelkord/network/BagFetchURL.h"
 #include "zelkord/network/BagRequests.h"
 
 namespace zelkord {
@@ -9,7 +10,8 @@ std::shared_ptr<const std::string> BagCacheURL::get(const ZelkorBagController& c
                                                     const std::optional<std::string>& userAgent) {
   // Read before the URL is made: a change in between makes the next look miss.
   const Inputs inputs{requests_.contextGeneration(),
-                      stringSetting(assembly_.userDefaults(), "ZLKBagURL"), assembly_.useMorvane()};
+                      stringSetting(assembly_.userDefaults(), kBagURLSetting),
+                      assembly_.useMorvane()};
   {
     const MutexLock lock(mutex_);
     if (url_ && inputs_ == inputs) return url_;

@@ -9,18 +9,17 @@
 #include "zelkord/assembly/UserAgent.h"
 #include "zelkord/network/BagFailureReason.h"
 #include "zelkord/network/BagFetchFeedback.h"
+#include "zelkord/network/BagFetchURL.h"
 #include "zelkord/network/BagRefreshRule.h"
 #include "zelkord/network/BagRequests.h"
 #include "zelkord/network/BagResponse.h"
 #include "zelkord/network/RequestLogText.h"
-#include "zelkord/network/URLComponents.h"
 #include "zelkord/network/ZLKRetryableNetworkRequest.h"
 
 namespace zelkord {
 namespace {
 
 constexpr unsigned kBagFetchRetries = 5;
-constexpr std::string_view kBagURLSetting = "ZLKBagURL";
 
 // How the news application sees a bag; the numbers are what the log says.
 enum class NewsState : unsigned { Disabled = 0, Enabled = 1, Unknown = 2 };
@@ -74,13 +73,12 @@ void ZelkorBagController::start() {
 }
 
 std::string ZelkorBagController::bagFetchURLWithCountry(std::string_view country) const {
-  auto chosen = stringSetting(assembly_.userDefaults(), kBagURLSetting);
-  if (!chosen.empty()) {
-    if (URLComponents::parse(chosen)) return chosen;
+  auto chosen = bagFetchURL(assembly_.userDefaults(), country);
+  if (chosen.settingIsMalformed) {
     assembly_.log(Category::Bag)
         .error("Malformed zelkor bag URL in user defaults key {}", kBagURLSetting);
   }
-  return uppercased(country) == "CN" ? ZK_BAG_URL_CN : ZK_BAG_URL;
+  return std::move(chosen.url);
 }
 
 BagPointer ZelkorBagController::currentBag() {

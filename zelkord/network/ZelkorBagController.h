@@ -51,7 +51,7 @@ class ZelkorBagController final : public std::enable_shared_from_this<ZelkorBagC
   // Loads the bag on disk and listens to the request factory; once, right after construction.
   void start();
 
-  // Where a device in that country (ISO code, any case) gets the bag from.
+  // `bagFetchURL` by the settings; a malformed one is logged.
   std::string bagFetchURLWithCountry(std::string_view country) const;
 
   // Null while there is none; a fetch is then under way.
