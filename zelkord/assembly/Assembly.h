@@ -7,6 +7,7 @@
 #include "platform/api/Platform.h"
 #include "zelkord/ZelkorLogging/Tracing.h"
 #include "zelkord/ZelkorLogging/ZelkorLogging.h"
+#include "zelkord/assembly/InstalledBag.h"
 #include "zelkord/assembly/MapsSessions.h"
 #include "zelkord/assembly/ServiceSessions.h"
 #include "zelkord/assembly/ZelkorDiagnosticDataReporter.h"
@@ -43,7 +44,8 @@ class Assembly final {
         reporter_(platform.counters),
         limits_(platform.clock, platform.counters, logging_[Category::Zelkor]),
         sessions_(platform.urlSessions, platform.settings),
-        mapsSessions_(platform.maps) {}
+        mapsSessions_(platform.maps),
+        installedBag_(platform.queues, platform.notificationCenter) {}
 
   Platform& platform() const { return platform_; }
   SettingsStore& userDefaults() const { return platform_.settings; }
@@ -58,6 +60,7 @@ class Assembly final {
   URLSession& urlSession() { return sessions_.urlSession(); }
   URLSession& bagSession() { return sessions_.bagSession(); }
   MapsSessions& mapsSessions() const { return mapsSessions_; }
+  InstalledBag& installedBag() { return installedBag_; }
   // Nothing that the service saw under a user identifier is used any more.
   void endIdentity(const UUID& identifier) {
     mapsSessions_.endIdentity(identifier);
@@ -157,6 +160,7 @@ class Assembly final {
   LimitReports limits_;
   ServiceSessions sessions_;
   mutable MapsSessions mapsSessions_;
+  InstalledBag installedBag_;
   // In the order in which they are made; released in the reverse one.
   Slot<SessionStorage> persistentStorage_;
   Slot<FeedbackStreams> flusherXPCListener_;

@@ -10,8 +10,9 @@ namespace zelkord {
 // unless said.
 
 // A bag was installed: user info "bag", a std::shared_ptr<const ZLKBag>. Or a fetch failed:
-// "bagError", an Error. Posted while the controller installs the bag: observers use the bag in the
-// user info, ask the controller nothing, and wait for no queue whose tasks may ask it.
+// "bagError", an Error. Services of the daemon observe InstalledBag instead, which posts this in
+// its exclusive task: observers use the bag in the user info, ask neither it nor the controller
+// anything, and wait for no queue whose tasks may ask them.
 inline constexpr std::string_view kZLKBagChangeNotification = "ZLKBagChangeNotification";
 // Something that the bag depends on changed. Object: the request factory, as a BagRequests.
 inline constexpr std::string_view kZLKBagRefreshRequired = "ZLKBagRefreshRequired";

@@ -314,8 +314,8 @@ TEST(DaemonTest, MakesItsServicesInTheRequiredOrder) {
   EXPECT_FALSE(daemon.start());
   std::size_t last = 0;
   for (const char* label :
-       {"com.quenta.zelkord.contextaccess", "com.quenta.zelkord.persistentStorageQueue",
-        "com.quenta.zelkord.bagcontroller.cacheaccess", "com.quenta.zelkord.stateCache",
+       {"com.quenta.zelkord.bagcontroller.cacheaccess", "com.quenta.zelkord.contextaccess",
+        "com.quenta.zelkord.persistentStorageQueue", "com.quenta.zelkord.stateCache",
         "com.quenta.zelkor.serviceQueue", "com.quenta.zelkord.clientSessionManagerQueue",
         "com.quenta.zelkord.xpc_event"}) {
     const auto found = std::find(queues.labels.begin(), queues.labels.end(), label);

@@ -53,8 +53,6 @@ ZelkorBagController::ZelkorBagController(Assembly& assembly, BagRequests& reques
       requests_(requests),
       disk_(assembly),
       userAgent_(zelkordUserAgent(assembly.platform().device)),
-      inMemoryBagCacheAccessQueue_(assembly.platform().queues.makeConcurrentQueue(
-          "com.quenta.zelkord.bagcontroller.cacheaccess")),
       cacheURL_(assembly, requests) {}
 
 ZelkorBagController::~ZelkorBagController() = default;
@@ -98,14 +96,7 @@ BagPointer ZelkorBagController::cachedBagState() {
   return bag;
 }
 
-BagPointer ZelkorBagController::inMemoryBag() const {
-  BagPointer bag;
-  inMemoryBagCacheAccessQueue_->sync([this, &bag] {
-    inMemoryBagCacheAccessQueue_->assertReading();
-    bag = inMemoryBag_;
-  });
-  return bag;
-}
+BagPointer ZelkorBagController::inMemoryBag() const { return assembly_.installedBag().get(); }
 
 std::optional<std::string> ZelkorBagController::warmURL() {
   const auto bag = currentBag();
@@ -139,19 +130,15 @@ void ZelkorBagController::forceFetchBag(const json::object& response) {
 
 void ZelkorBagController::cacheBagState(BagPointer bag, BagOrigin origin) {
   if (!bag) return;
-  inMemoryBagCacheAccessQueue_->barrierSync([this, &bag, origin] { _install(bag, origin); });
+  assembly_.installedBag().install(bag, origin, [&](const BagPointer& before) {
+    if (origin == BagOrigin::Network) _tellNewsAvailability(before, bag);
+  });
 }
 
-void ZelkorBagController::_install(const BagPointer& bag, BagOrigin origin) {
-  inMemoryBagCacheAccessQueue_->assertBarrier();
-  // The fetch that a due file begins may be faster than its own installation.
-  if (origin == BagOrigin::Disk && inMemoryBag_) return;
-  const auto oldState = newsState(inMemoryBag_);
+void ZelkorBagController::_tellNewsAvailability(const BagPointer& before,
+                                                const BagPointer& bag) const {
   const auto newState = newsState(bag);
-  inMemoryBag_ = bag;
-  assembly_.notificationCenter().post(
-      {std::string(kZLKBagChangeNotification), nullptr, {{"bag", bag}}});
-  if (oldState == newState || origin == BagOrigin::Disk) return;
+  if (newsState(before) == newState) return;
   assembly_.log(Category::Bag)
       .info("setting Zelkor News Available status to {}", static_cast<unsigned>(newState));
   assembly_.platform().systemNotifications.post(
@@ -298,8 +285,7 @@ void ZelkorBagController::_endFetch(const Fetch& fetch, bool succeeded) {
 void ZelkorBagController::_failFetch(Fetch& fetch, const Error& error) {
   fetch.feedback.recordError(error);
   lastFailure_.set({{assembly_.platform().clock.wallNow(), bagFailureReason(error)}});
-  assembly_.notificationCenter().post(
-      {std::string(kZLKBagChangeNotification), nullptr, {{"bagError", error}}});
+  assembly_.installedBag().tellFailure(error);
   assembly_.reporter().addValue(1, "com.quenta.zelkord.bag.fetchesfailed");
 }
 

@@ -10,9 +10,8 @@
 #include "base/Error.h"
 #include "base/Guarded.h"
 #include "base/Json.h"
-#include "corezelkor/ZLKBag.h"
 #include "platform/api/URLSession.h"
-#include "platform/api/WorkQueue.h"
+#include "zelkord/assembly/InstalledBag.h"
 #include "zelkord/network/BagCacheURL.h"
 #include "zelkord/network/BagDiskCache.h"
 #include "zelkord/network/BagFetchStatus.h"
@@ -23,11 +22,7 @@ class Assembly;
 class BagFetchFeedback;
 class BagRequests;
 
-using BagPointer = std::shared_ptr<const ZLKBag>;
-
-enum class BagOrigin { Network, Disk };
-
-// Owns the bag: fetches it, keeps it on disk, and has it fetched anew when it nears its end, when
+// Fetches the bag, keeps it on disk, and has it fetched anew when it nears its end, when
 // its URL changes, when the device's context does, or when the service reports a newer version.
 //
 // No bag, a bag, or a bag that is due (the next read begins a fetch). At most one fetch is under
@@ -36,11 +31,11 @@ enum class BagOrigin { Network, Disk };
 // that ends when the bag's URL is no longer the one that it began with is followed by another one:
 // whoever asked for it meanwhile was dropped, and its bag may be that of another country.
 //
-// Each install posts "ZLKBagChangeNotification" with "bag", each failed fetch one with "bagError".
-// A bag from the network that changes whether news is available posts that system-wide.
+// What it installs and what fails is told by the assembly's InstalledBag. A bag from the network
+// that changes whether news is available posts that system-wide.
 //
-// Threading: every operation on any thread but the request factory's queue. Observers of an install
-// run in its exclusive task: they ask this controller nothing, and wait for nobody who might.
+// Threading: every operation on any thread but the request factory's queue; none by observers of
+// the bag.
 // Ownership: the assembly and the request factory outlive it. A fetch holds it weakly.
 // Errors: logged; a fetch's also counted, posted and recorded as feedback.
 class ZelkorBagController final : public std::enable_shared_from_this<ZelkorBagController> {
@@ -92,7 +87,7 @@ class ZelkorBagController final : public std::enable_shared_from_this<ZelkorBagC
   void _finishFetch(Fetch& fetch, const URLTask& task, const URLResult& result);
   void _failFetch(Fetch& fetch, const Error& error);
   void _endFetch(const Fetch& fetch, bool succeeded);
-  void _install(const BagPointer& bag, BagOrigin origin);
+  void _tellNewsAvailability(const BagPointer& before, const BagPointer& bag) const;
   void _logRequest(const URLRequest& request) const;
   void _logResponse(const URLResult& result) const;
 
@@ -101,7 +96,6 @@ class ZelkorBagController final : public std::enable_shared_from_this<ZelkorBagC
   BagRequests& requests_;
   const BagDiskCache disk_;
   const std::optional<std::string> userAgent_;
-  const std::unique_ptr<ConcurrentQueue> inMemoryBagCacheAccessQueue_;
   Subscription refreshRequired_;  // set by `start`
 
   // Own synchronisation.
@@ -110,9 +104,6 @@ class ZelkorBagController final : public std::enable_shared_from_this<ZelkorBagC
   std::atomic<bool> urlChangedMeanwhile_ = false;
   BagCacheURL cacheURL_;
   Guarded<std::optional<BagFetchStatus::Failure>> lastFailure_;
-
-  // Queue state: replaced in exclusive tasks only.
-  BagPointer inMemoryBag_ ZK_ON(inMemoryBagCacheAccessQueue_);
 };
 
 }  // namespace zelkord
