@@ -2,11 +2,9 @@
 
 #include "corezelkor/Constants.h"
 #include "zelkord/assembly/Assembly.h"
-#include "zelkord/assembly/NotificationNames.h"
 #include "zelkord/core/ClientStateManager.h"
 #include "zelkord/core/Wire.h"
 #include "zelkord/network/RequestLogText.h"
-#include "zelkord/network/ZelkorBagController.h"
 
 namespace zelkord {
 BagTeller::BagTeller(Assembly& assembly, std::shared_ptr<ipc::Connection> connection)
@@ -36,6 +34,11 @@ bool BagTeller::_hasEnded() const {
   return ended_;
 }
 
+bool BagTeller::_isObserving() const {
+  const MutexLock lock(mutex_);
+  return static_cast<bool>(observation_);
+}
+
 void BagTeller::_deliverAsOftenAsWanted() {
   for (unsigned wanted = deliveriesWanted_; wanted > 0 && !_hasEnded();) {
     _deliver();
@@ -45,15 +48,16 @@ void BagTeller::_deliverAsOftenAsWanted() {
 
 void BagTeller::_deliver() {
   const auto state = state_.get();
-  state->bag(userAgent_.get(), [this, &state](const auto& bag, const auto& error) {
-    if (_hasEnded()) return;
-    _logDelivery(*state, bag.get(), error);
+  state->bag(userAgent_.get(), [this, &state](const BagPointer& bag, const auto& error) {
     const MutexLock lock(mutex_);
-    _tell(bag.get(), error);
+    if (ended_) return;
+    // What has been told is in force, since changes are told; what the state had may be older.
+    const auto view = told_ ? assembly_.installedBag().seenBy(told_, state->userAgent()) : bag;
+    _logDelivery(*state, view.get(), view ? std::nullopt : error);
+    _tell(view, view ? std::nullopt : error);
   });
   if (_hasEnded()) return;
-  _observeChanges();
-  _catchUp();
+  _observeBag();
   assembly_.clientStateManager()->saveState();
 }
 
@@ -69,51 +73,39 @@ void BagTeller::_logDelivery(const ClientState& state, const ZLKBag* bag,
             error ? error->description() : "(null)");
 }
 
-void BagTeller::_observeChanges() {
-  const MutexLock lock(mutex_);
-  if (observation_ || ended_) return;
-  observation_ =
-      assembly_.notificationCenter().observe(std::string(kZLKBagChangeNotification),
-                                             [weak = weak_from_this()](const Notification& posted) {
-                                               if (const auto self = weak.lock())
-                                                 self->_bagChangeNotification(posted);
-                                             });
-}
-
-// Tells the bag that was installed after the one at hand was read, when no notification has told
-// it: the first comes before the observation, a later one may be overtaken by the delivery.
-void BagTeller::_catchUp() {
-  unsigned changes = 0;
-  {
-    const MutexLock lock(mutex_);
-    changes = changes_;
-  }
+// Deliveries, which begin it, come one after the other.
+void BagTeller::_observeBag() {
+  if (_isObserving()) return;
   // Without the lock: it waits for an installation under way, and that tells under the lock.
-  const auto bag = assembly_.bagController()->inMemoryBag();
+  auto observation = assembly_.installedBag().observe(
+      [weak = weak_from_this()](BagNews news, const BagPointer& bag) {
+        if (const auto self = weak.lock()) self->_bagChangeNotification(news, bag);
+      });
   const MutexLock lock(mutex_);
-  if (bag && changes_ == changes && bag->rawBag() != told_) _tell(bag.get(), std::nullopt);
+  if (!ended_) observation_ = std::move(observation);
 }
 
-void BagTeller::_bagChangeNotification(const Notification& notification) {
-  const auto* posted = notification.value<std::shared_ptr<const ZLKBag>>("bag");
-  const auto* bag = posted ? posted->get() : nullptr;
-  const auto& log = assembly_.log(Category::Bag);
-  if (log.isEnabled(LogLevel::Info)) {
-    const bool show = assembly_.platform().log.showsPrivateData();
-    log.info("bag change notification: {}", bag ? bagForLog(*bag->rawBag(), show) : "(null)");
-  }
+void BagTeller::_bagChangeNotification(BagNews news, const BagPointer& bag) {
+  if (news != BagNews::Present) _logChange(bag.get());
   if (!bag) return;
   const MutexLock lock(mutex_);
-  ++changes_;
+  if (news == BagNews::Present && told_ && told_->rawBag() == bag->rawBag()) return;
   _tell(bag, std::nullopt);
 }
 
-void BagTeller::_tell(const ZLKBag* bag, const std::optional<Error>& error) {
+void BagTeller::_logChange(const ZLKBag* bag) const {
+  const auto& log = assembly_.log(Category::Bag);
+  if (!log.isEnabled(LogLevel::Info)) return;
+  const bool show = assembly_.platform().log.showsPrivateData();
+  log.info("bag change notification: {}", bag ? bagForLog(*bag->rawBag(), show) : "(null)");
+}
+
+void BagTeller::_tell(const BagPointer& bag, const std::optional<Error>& error) {
   if (ended_) return;
-  told_ = bag ? bag->rawBag() : nullptr;
+  told_ = bag;
   connection_->callClient(
       kClientObjectPath, kClientInterface, "BagDidLoad", "a{sv}a{sv}",
-      {encodeBag(bag), encodeError(error)},
+      {encodeBag(bag.get()), encodeError(error)},
       [&assembly = assembly_, pid = connection_->peer().pid](const Error& failure) {
         assembly.log(Category::Connection)
             .error("(pid:{}) remote proxy error: {}", pid, failure.description());

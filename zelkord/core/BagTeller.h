@@ -7,7 +7,7 @@
 
 #include "base/Guarded.h"
 #include "platform/api/Interprocess.h"
-#include "platform/api/NotificationCenter.h"
+#include "zelkord/assembly/InstalledBag.h"
 #include "zelkord/query/ClientState.h"
 
 namespace zelkord {
@@ -34,14 +34,15 @@ class BagTeller final : public std::enable_shared_from_this<BagTeller> {
 
  private:
   bool _hasEnded() const;
+  bool _isObserving() const;
   void _deliverAsOftenAsWanted();
   void _deliver();
   void _logDelivery(const ClientState& state, const ZLKBag* bag,
                     const std::optional<Error>& error) const;
-  void _observeChanges();
-  void _catchUp();
-  void _bagChangeNotification(const Notification& notification);
-  void _tell(const ZLKBag* bag, const std::optional<Error>& error) ZK_REQUIRES(mutex_);
+  void _observeBag();
+  void _bagChangeNotification(BagNews news, const BagPointer& bag);
+  void _logChange(const ZLKBag* bag) const;
+  void _tell(const BagPointer& bag, const std::optional<Error>& error) ZK_REQUIRES(mutex_);
 
   // Fixed after construction.
   Assembly& assembly_;
@@ -53,8 +54,7 @@ class BagTeller final : public std::enable_shared_from_this<BagTeller> {
   std::atomic<unsigned> deliveriesWanted_ = 0;
   mutable Mutex mutex_;
   Subscription observation_ ZK_GUARDED_BY(mutex_);
-  std::shared_ptr<const json::object> told_ ZK_GUARDED_BY(mutex_);  // null: none, or an error
-  unsigned changes_ ZK_GUARDED_BY(mutex_) = 0;
+  BagPointer told_ ZK_GUARDED_BY(mutex_);  // last; null: none, or an error
   bool ended_ ZK_GUARDED_BY(mutex_) = false;
 };
 

@@ -3,7 +3,6 @@
 #include <utility>
 
 #include "zelkord/assembly/Assembly.h"
-#include "zelkord/assembly/NotificationNames.h"
 #include "zelkord/network/LocationController.h"
 #include "zelkord/network/VisibilityRestrictions.h"
 
@@ -19,16 +18,14 @@ BagFollower::BagFollower(Assembly& assembly, std::shared_ptr<RequestContextStore
 BagFollower::~BagFollower() = default;
 
 void BagFollower::start() {
-  observer_ = assembly_.notificationCenter().observe(
-      std::string(kZLKBagChangeNotification),
-      [weak = weak_from_this()](const Notification& notification) {
+  observation_ =
+      assembly_.installedBag().observe([weak = weak_from_this()](BagNews, const BagPointer& bag) {
         const auto self = weak.lock();
-        const auto* bag = notification.value<std::shared_ptr<const ZLKBag>>("bag");
-        if (self && bag && *bag) self->_didGetBag(*bag);
+        if (self && bag) self->_didGetBag(bag);
       });
 }
 
-void BagFollower::_didGetBag(const std::shared_ptr<const ZLKBag>& bag) {
+void BagFollower::_didGetBag(const BagPointer& bag) {
   const auto sources = bag->supportedGeoLocationSources();
   context_->update(
       [sources](RequestContext& context) { context.location.supportedSources = sources; });

@@ -4,7 +4,7 @@
 #include <memory>
 
 #include "base/Subscription.h"
-#include "corezelkor/ZLKBag.h"
+#include "zelkord/assembly/InstalledBag.h"
 #include "zelkord/network/RequestContextStore.h"
 
 namespace zelkord {
@@ -13,10 +13,10 @@ class Assembly;
 class LocationController;
 class VisibilityRestrictions;
 
-// Carries what a new bag says into the request context and to the host: the sources of location it
-// allows, visibility restrictions, the routing proxy's configuration.
+// Carries what the bag in force says into the request context and to the host: the sources of
+// location it allows, visibility restrictions, the routing proxy's configuration.
 //
-// Threading: `start` once, on any thread; bags come on the thread of whoever posts them.
+// Threading: `start` once, on any thread; bags come on the thread of whoever installs them.
 // Ownership: the assembly outlives it.
 class BagFollower final : public std::enable_shared_from_this<BagFollower> {
  public:
@@ -27,14 +27,14 @@ class BagFollower final : public std::enable_shared_from_this<BagFollower> {
   void start();
 
  private:
-  void _didGetBag(const std::shared_ptr<const ZLKBag>& bag);
+  void _didGetBag(const BagPointer& bag);
 
-  // Fixed after construction; the observer after start.
+  // Fixed after construction; the observation after start.
   Assembly& assembly_;
   const std::shared_ptr<RequestContextStore> context_;
   const std::shared_ptr<LocationController> location_;
   const std::shared_ptr<VisibilityRestrictions> restrictions_;
-  Subscription observer_;
+  Subscription observation_;
 
   // Own synchronisation.
   std::atomic<bool> locationIsSetUp_ = false;

@@ -5,7 +5,6 @@
 #include "base/Text.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/assembly/ClientShortName.h"
-#include "zelkord/assembly/NotificationNames.h"
 #include "zelkord/feedback/SessionManager.h"
 #include "zelkord/network/ZLKNetworkRequestFactory.h"
 #include "zelkord/network/ZelkorBagController.h"
@@ -66,7 +65,7 @@ void ClientState::setUserAgent(std::optional<std::string> userAgent) {
   userAgent_ = std::move(userAgent);
 }
 
-std::shared_ptr<const ZLKBag> ClientState::currentBag() const {
+BagPointer ClientState::currentBag() const {
   const MutexLock lock(viewMutex_);
   return bag_;
 }
@@ -77,7 +76,7 @@ void ClientState::adoptUserAgent(const std::optional<std::string>& userAgent) {
     const MutexLock lock(viewMutex_);
     if (userAgent == userAgent_) return;
     userAgent_ = userAgent;
-    if (bag_) bag_ = _viewOf(*bag_);
+    bag_ = assembly_.installedBag().seenBy(bag_, userAgent_);
   }
   if (queryCache_) queryCache_->removeAllObjects();
 }
@@ -97,9 +96,10 @@ bool ClientState::_ensureBag() {
   const auto userAgent = this->userAgent();
   if (!userAgent) return false;
   if (currentBag()) return true;
-  _observeBagChanges();
+  _observeBag();
   assembly_.log(Category::Caching).info("Warming bag cache for agent: {}", *userAgent);
-  if (_adoptFirstBag(assembly_.bagController()->currentBag())) return true;
+  // What the controller has, the observation has told.
+  if (assembly_.bagController()->currentBag()) return true;
   _markNetworkRequest();
   _waitForBag();
   return currentBag() != nullptr;
@@ -116,35 +116,21 @@ void ClientState::_waitForBag() {
   --bagWaiters_;
 }
 
-void ClientState::_observeBagChanges() {
+void ClientState::_observeBag() {
   const MutexLock lock(observationMutex_);
   if (bagObservation_) return;
-  bagObservation_ = assembly_.notificationCenter().observe(
-      std::string(kZLKBagChangeNotification),
-      [weak = weak_from_this()](const Notification& notification) {
-        if (const auto self = weak.lock()) self->_bagChangeNotification(notification);
+  bagObservation_ = assembly_.installedBag().observe(
+      [weak = weak_from_this()](BagNews news, const BagPointer& bag) {
+        if (const auto self = weak.lock()) self->_bagChangeNotification(news, bag);
       });
 }
 
-void ClientState::_bagChangeNotification(const Notification& notification) {
-  const auto* bag = notification.value<std::shared_ptr<const ZLKBag>>("bag");
-  if (bag && *bag) {
+void ClientState::_bagChangeNotification(BagNews news, const BagPointer& bag) {
+  if (bag) {
     const MutexLock lock(viewMutex_);
-    bag_ = _viewOf(**bag);
+    bag_ = assembly_.installedBag().seenBy(bag, userAgent_);
   }
-  bagFetchSemaphore_->signal(std::max(1u, bagWaiters_.load()));
-}
-
-// Takes the bag over unless a change, which is newer, has brought one meanwhile.
-bool ClientState::_adoptFirstBag(const std::shared_ptr<const ZLKBag>& bag) {
-  if (!bag) return false;
-  const MutexLock lock(viewMutex_);
-  if (!bag_) bag_ = _viewOf(*bag);
-  return true;
-}
-
-std::shared_ptr<const ZLKBag> ClientState::_viewOf(const ZLKBag& bag) const {
-  return std::make_shared<const ZLKBag>(bag.rawBag(), userAgent_);
+  if (news != BagNews::Present) bagFetchSemaphore_->signal(std::max(1u, bagWaiters_.load()));
 }
 
 void ClientState::warm() {

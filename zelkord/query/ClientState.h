@@ -11,11 +11,10 @@
 #include "base/Subscription.h"
 #include "base/UUID.h"
 #include "corezelkor/Messages.h"
-#include "corezelkor/ZLKBag.h"
 #include "halvane/Feedback.h"
 #include "platform/api/Budget.h"
-#include "platform/api/NotificationCenter.h"
 #include "platform/api/WorkQueues.h"
+#include "zelkord/assembly/InstalledBag.h"
 #include "zelkord/network/FieldMask.h"
 
 namespace zelkord {
@@ -31,8 +30,7 @@ struct ClientBudgets {
   Budget bagWaits;    // waits for a bag, each of which keeps a thread
 };
 
-using BagCallback =
-    std::function<void(std::shared_ptr<const ZLKBag> bag, std::optional<Error> error)>;
+using BagCallback = std::function<void(BagPointer bag, std::optional<Error> error)>;
 
 // Everything that the daemon keeps for one client identifier, shared by all connections of that
 // client: its configuration and user agent, the bag as that user agent sees it, its query cache,
@@ -62,7 +60,7 @@ class ClientState final : public std::enable_shared_from_this<ClientState> {
   // For a state that has no bag yet; later ones are adopted.
   void setUserAgent(std::optional<std::string> userAgent);
   // The bag as the user agent of the moment sees it; null before there is one.
-  std::shared_ptr<const ZLKBag> currentBag() const;
+  BagPointer currentBag() const;
   SessionManager& sessionManager() const { return *sessionManager_; }
   UserGUIDSource& guidController() const { return *guidController_; }
   QueryCache* queryCache() const {
@@ -98,11 +96,9 @@ class ClientState final : public std::enable_shared_from_this<ClientState> {
               std::optional<UUID> userGuid) const;
 
  private:
-  void _observeBagChanges();
-  void _bagChangeNotification(const Notification& notification);
+  void _observeBag();
+  void _bagChangeNotification(BagNews news, const BagPointer& bag);
   void _waitForBag();
-  bool _adoptFirstBag(const std::shared_ptr<const ZLKBag>& bag);
-  std::shared_ptr<const ZLKBag> _viewOf(const ZLKBag& bag) const ZK_REQUIRES(viewMutex_);
 
   // Fixed after construction.
   Assembly& assembly_;
@@ -119,7 +115,7 @@ class ClientState final : public std::enable_shared_from_this<ClientState> {
   Guarded<std::optional<ZLKSessionConfiguration>> configuration_;
   mutable Mutex viewMutex_;
   std::optional<std::string> userAgent_ ZK_GUARDED_BY(viewMutex_);
-  std::shared_ptr<const ZLKBag> bag_ ZK_GUARDED_BY(viewMutex_);  // as userAgent_ sees it
+  BagPointer bag_ ZK_GUARDED_BY(viewMutex_);  // as userAgent_ sees it
   Guarded<std::optional<SteadyTime>> lastNetworkRequest_;
   const std::unique_ptr<Semaphore> bagFetchSemaphore_;
   std::atomic<unsigned> bagWaiters_ = 0;
