@@ -1,55 +1,43 @@
 #include "platform/api/KnownSettings.h"
 
+#include <fmt/core.h>
+
 #include <algorithm>
+#include <cmath>
 
 namespace zelkord {
 namespace {
 
-constexpr KnownSetting kKnownSettings[] = {
-    {"TraceEnabled", SettingKind::Boolean, "",
-     "operations leave trace events in the kernel's `trace_marker`; read at the start"},
-    {"ZLKBagURL", SettingKind::Text, "",
-     "where the bag is fetched from, instead of the address that the build was given; a change "
-     "counts from the next fetch"},
-    {"ZLKDebugParameters", SettingKind::Text, "",
-     "`name=value&name=value`: query items that most requests get besides their own; read at the "
-     "start"},
-    {"ZLKLocationAuthorization", SettingKind::Authorization, "",
-     "the user's answer about location; read before the device profile's, save that 1 or 2 (no) "
-     "from either wins; counts at once"},
-    {"ZLKLogPrivateData", SettingKind::Boolean, "false",
-     "texts that people typed, headers, identifiers and coordinates show in the log instead of "
-     "`<private>`; counts at once"},
-    {"ZLKMaximumBagSize", SettingKind::Bytes, "1048576",
-     "a larger bag is an error (-1103) and the old one stays"},
-    {"ZLKMaximumResourceSize", SettingKind::Bytes, "268435456",
-     "for downloads of resources; nothing reads it yet"},
-    {"ZLKMaximumResponseSize", SettingKind::Bytes, "8388608",
-     "a larger response is an error (-1103)"},
-    {"ZLKNoParallax", SettingKind::Boolean, "",
-     "no TCP fast open and no TLS session tickets; read at the start"},
-    {"ZLKNoQueryCache", SettingKind::Boolean, "",
-     "no answers out of the query cache; read for each client identifier when it first comes"},
-    {"ZLKPersistSessions", SettingKind::Boolean, "",
-     "client identifiers and user agents are kept over restarts; read at the start"},
-    {"ZLKSessionMaxAge", SettingKind::Seconds, "172800",
-     "a stored feedback session that is older goes; read at the start"},
-    {"ZLKSessionSizeLimit", SettingKind::Bytes, "2097152",
-     "no file of a feedback session reaches it; read at the start"},
-    {"ZLKSharedSession", SettingKind::Boolean, "true",
-     "all clients share one feedback session and one user identifier; read at the start"},
-    {"ZLKUseMorvane", SettingKind::Boolean, "true",
-     "requests may go through the bag's routing proxy where the device profile switches it on; "
-     "counts at once"},
-    {"ZelkorFirstUseOfTheDay_", SettingKind::Date, "",
-     "when that client was last used for the first time of a day; the daemon's own", true},
-    {"sessions", SettingKind::List, "",
-     "the clients that `ZLKPersistSessions` keeps; the daemon's own"},
-};
+bool isWithin(const KnownSetting& setting, const json::value& value) {
+  const auto number = asNumber(value);
+  return number && *number >= static_cast<double>(setting.range.least) &&
+         *number <= static_cast<double>(setting.range.most);
+}
+
+bool isWholeWithin(const KnownSetting& setting, const json::value& value) {
+  return isWithin(setting, value) && std::floor(*asNumber(value)) == *asNumber(value);
+}
+
+bool fits(const KnownSetting& setting, const json::value& value) {
+  switch (setting.kind) {
+    case SettingKind::Boolean:
+      return value.is_bool() || asNumber(value).has_value();
+    case SettingKind::Text:
+      return value.is_string();
+    case SettingKind::Seconds:
+      return isWithin(setting, value);
+    case SettingKind::Bytes:
+    case SettingKind::Choice:
+      return isWholeWithin(setting, value);
+    case SettingKind::Date:
+      return value.is_object() && numberIn(value.get_object(), "$date").has_value();
+    case SettingKind::List:
+      return value.is_array();
+  }
+  return false;
+}
 
 }  // namespace
-
-std::span<const KnownSetting> knownSettings() { return kKnownSettings; }
 
 const KnownSetting* knownSetting(std::string_view key) {
   const auto* found = std::ranges::find_if(kKnownSettings, [key](const KnownSetting& setting) {
@@ -61,13 +49,16 @@ const KnownSetting* knownSetting(std::string_view key) {
 json::object registeredSettings() {
   json::object values;
   for (const auto& setting : kKnownSettings) {
-    if (!setting.registered.empty()) values[setting.key] = *parseJson(setting.registered);
+    if (const auto* flag = std::get_if<bool>(&setting.registered)) values[setting.key] = *flag;
+    if (const auto* number = std::get_if<std::uint64_t>(&setting.registered)) {
+      values[setting.key] = *number;
+    }
   }
   return values;
 }
 
-std::string_view nameOf(SettingKind kind) {
-  switch (kind) {
+std::string kindText(const KnownSetting& setting) {
+  switch (setting.kind) {
     case SettingKind::Boolean:
       return "boolean";
     case SettingKind::Text:
@@ -76,14 +67,21 @@ std::string_view nameOf(SettingKind kind) {
       return "bytes";
     case SettingKind::Seconds:
       return "seconds";
-    case SettingKind::Authorization:
-      return "0 to 4";
+    case SettingKind::Choice:
+      return fmt::format("{} to {}", setting.range.least, setting.range.most);
     case SettingKind::Date:
       return "date";
     case SettingKind::List:
       return "list";
   }
   return "";
+}
+
+std::optional<std::string> settingRefusal(std::string_view key, const json::value* value) {
+  const auto* setting = knownSetting(key);
+  if (!setting) return "the daemon reads no such setting";
+  if (!value || fits(*setting, *value)) return std::nullopt;
+  return fmt::format("this setting's value is of the kind: {}", kindText(*setting));
 }
 
 }  // namespace zelkord

@@ -8,6 +8,7 @@
 
 #include "base/Json.h"
 #include "base/Subscription.h"
+#include "platform/api/KnownSettings.h"
 
 namespace zelkord {
 
@@ -40,11 +41,15 @@ class SettingsStore {
 // The name of a setting among those of all domains: what stores announce a change under.
 std::string settingName(std::string_view key, std::string_view domain);
 
-// The value when it has the type (numbers: non-zero is true for boolSetting; negative or fractional
-// values are clamped and truncated for unsignedSetting), else the fallback.
-bool boolSetting(const SettingsStore& settings, std::string_view key, bool fallback = false);
-std::string stringSetting(const SettingsStore& settings, std::string_view key);
-std::uint64_t unsignedSetting(const SettingsStore& settings, std::string_view key,
-                              std::uint64_t fallback = 0);
+// What a setting of the daemon's own domain says: its value when that is of its kind, else what is
+// registered, without that false or an empty text. Bytes beyond the range are its nearest, and
+// without their fraction; a choice beyond it is none.
+bool boolSetting(const SettingsStore& settings, SettingKey<SettingKind::Boolean> key);
+std::string stringSetting(const SettingsStore& settings, SettingKey<SettingKind::Text> key);
+std::uint64_t bytesSetting(const SettingsStore& settings, SettingKey<SettingKind::Bytes> key);
+double secondsSetting(const SettingsStore& settings, SettingKey<SettingKind::Seconds> key);
+std::optional<std::uint64_t> choiceSetting(const SettingsStore& settings,
+                                           SettingKey<SettingKind::Choice> key);
+json::array listSetting(const SettingsStore& settings, SettingKey<SettingKind::List> key);
 
 }  // namespace zelkord

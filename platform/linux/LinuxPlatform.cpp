@@ -80,7 +80,7 @@ CurlURLSessions::Services urlServices(const std::shared_ptr<LinuxSettings>& sett
   CurlURLSessions::Services services;
   services.isMetered = [&network] { return network.isMetered(); };
   services.maximumResponseSize = [settings] {
-    return unsignedSetting(*settings, "ZLKMaximumResponseSize", 8'388'608);
+    return bytesSetting(*settings, "ZLKMaximumResponseSize");
   };
   services.proxies = std::move(proxies);
   services.rootsFile = CurlURLSessions::rootsFileOfEnvironment();

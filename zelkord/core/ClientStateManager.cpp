@@ -126,10 +126,7 @@ std::shared_ptr<ClientState> ClientStateManager::configuredState(const std::stri
 void ClientStateManager::loadState() {
   stateCacheQueue_->assertCurrent();
   if (!persistSessions_) return;
-  const auto stored = assembly_.userDefaults().value(kSessionsKey);
-  const auto* entries = stored ? stored->if_array() : nullptr;
-  if (!entries) return;
-  for (const auto& entry : *entries) {
+  for (const auto& entry : listSetting(assembly_.userDefaults(), kSessionsKey)) {
     const auto* fields = entry.if_object();
     const auto identifier = fields ? stringIn(*fields, "identifier") : std::nullopt;
     if (!identifier || identifier->empty()) continue;

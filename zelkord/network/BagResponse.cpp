@@ -40,7 +40,7 @@ BagResponse readBagBody(std::string_view body, const Logger& log, bool showsPriv
 }  // namespace
 
 std::uint64_t maximumBagSize(const SettingsStore& settings) {
-  return unsignedSetting(settings, "ZLKMaximumBagSize", kDefaultMaximumBagSize);
+  return bytesSetting(settings, kMaximumBagSizeSetting);
 }
 
 BagResponse readBagResponse(const URLResult& result, std::uint64_t maximumSize, const Logger& log,

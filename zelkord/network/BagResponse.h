@@ -11,9 +11,10 @@
 
 namespace zelkord {
 
-inline constexpr std::uint64_t kDefaultMaximumBagSize = 1'048'576;
+inline constexpr std::string_view kMaximumBagSizeSetting = "ZLKMaximumBagSize";
+inline constexpr std::uint64_t kDefaultMaximumBagSize = registeredBytes(kMaximumBagSizeSetting);
 
-// The setting "ZLKMaximumBagSize", in bytes.
+// The setting, in bytes.
 std::uint64_t maximumBagSize(const SettingsStore& settings);
 
 // What the answer to a bag fetch amounts to: a dictionary, or the error.

@@ -15,14 +15,7 @@ namespace {
 
 constexpr std::string_view kFileTooOld = "com.quenta.zelkord.filetooold";
 constexpr std::string_view kNamePrefix = "session.";
-constexpr std::uint64_t kDefaultSizeLimit = 2'097'152;
-constexpr double kDefaultMaxAge = 172'800;
 constexpr std::uint32_t kHandles = 1u << 31;
-
-double maxAgeIn(const SettingsStore& settings) {
-  const auto value = settings.value("ZLKSessionMaxAge");
-  return value && value->is_number() ? value->to_number<double>() : kDefaultMaxAge;
-}
 
 // None for other names.
 std::optional<std::int64_t> handleNumber(std::string_view name) {
@@ -49,7 +42,7 @@ FileContainer::Services makeServices(Assembly& assembly) {
       .room = std::make_shared<ContainerRoom>(platform.files, assembly.limits(),
                                               assembly.log(Category::FeedbackStorage)),
       .version = zelkordUserAgent(platform.device).value_or(std::string()),
-      .maxFileSize = unsignedSetting(platform.settings, "ZLKSessionSizeLimit", kDefaultSizeLimit)});
+      .maxFileSize = bytesSetting(platform.settings, "ZLKSessionSizeLimit")});
 }
 
 }  // namespace
@@ -58,7 +51,7 @@ ZelkorPersistentStorage::ZelkorPersistentStorage(Assembly& assembly)
     : assembly_(assembly),
       log_(assembly.log(Category::FeedbackStorage)),
       cachesUrl_(assembly.fileManager().directories().caches),
-      maxFileAge_(maxAgeIn(assembly.userDefaults())),
+      maxFileAge_(secondsSetting(assembly.userDefaults(), "ZLKSessionMaxAge")),
       services_(makeServices(assembly)),
       queue_(*services_->queue) {}
 

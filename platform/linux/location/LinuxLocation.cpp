@@ -1,7 +1,5 @@
 #include "platform/linux/location/LinuxLocation.h"
 
-#include <cmath>
-
 #include "platform/linux/location/LocationClient.h"
 
 namespace zelkord {
@@ -12,10 +10,8 @@ constexpr std::string_view kLocationAuthorizationKey = "ZLKLocationAuthorization
 bool isRefusal(LocationAuthorization status) { return status == 1 || status == 2; }
 
 std::optional<LocationAuthorization> authorizationSetting(const SettingsStore& settings) {
-  const auto value = settings.value(kLocationAuthorizationKey);
-  const auto number = value ? asNumber(*value) : std::nullopt;
-  if (!number || *number < 0 || *number > 4 || std::floor(*number) != *number) return std::nullopt;
-  return static_cast<LocationAuthorization>(*number);
+  const auto choice = choiceSetting(settings, kLocationAuthorizationKey);
+  return choice ? std::optional(static_cast<LocationAuthorization>(*choice)) : std::nullopt;
 }
 
 LocationAuthorization authorizationOf(const SettingsStore& settings, const DeviceProfile& profile) {
