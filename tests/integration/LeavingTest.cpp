@@ -223,7 +223,7 @@ TEST_F(LeavingTest, LockedDatabasesDelayNeitherClientsNorTheEnd) {
     writers.push_back(connectTo(DaemonProcess::socketOf(root_)));
     sd_bus_call_method_async(writers.back().get(), nullptr, "com.quenta.zelkord",
                              "/com/quenta/zelkord", "com.quenta.zelkord.Diagnostics1",
-                             "WriteDefault", nullptr, nullptr, "sss", "", "key", "1");
+                             "WriteDefault", nullptr, nullptr, "sss", "", "ZLKNoParallax", "1");
     sd_bus_flush(writers.back().get());
   }
   const auto begin = Steady::now();

@@ -133,15 +133,19 @@ void Diagnostics::_writeDefault(const ipc::Call& call) {
   const auto& domain = call.argument<std::string>(0);
   const auto& key = call.argument<std::string>(1);
   const auto& text = call.argument<std::string>(2);
+  auto& settings = assembly_.userDefaults();
   if (key.empty()) return call.reply->fail(ipc::kInvalidArgs, "a setting needs a key");
-  if (text.empty()) {
-    assembly_.userDefaults().remove(key, domain);
-  } else if (auto value = parseJson(text)) {
-    assembly_.userDefaults().set(key, *std::move(value), domain);
+  auto value = parseJson(text);
+  if (!value && !text.empty()) return call.reply->fail(ipc::kInvalidArgs, "the value is not JSON");
+  const bool isOwn = domain.empty() || domain == kSettingsDomain;
+  const auto refusal = isOwn ? settingRefusal(key, value ? &*value : nullptr) : std::nullopt;
+  if (refusal) return call.reply->fail(ipc::kInvalidArgs, *refusal);
+  if (value) {
+    settings.set(key, *std::move(value), domain);
   } else {
-    return call.reply->fail(ipc::kInvalidArgs, "the value is not JSON");
+    settings.remove(key, domain);
   }
-  assembly_.userDefaults().flush();
+  settings.flush();
   call.reply->send({});
 }
 

@@ -450,6 +450,15 @@ TEST(DiagnosticsTest, ReadsAndWritesSettingsAndTellsTheStatus) {
   EXPECT_TRUE(ask("WriteDefault", {"", "ZLKNoParallax", ""})->succeeded());
   EXPECT_EQ(*ask("ReadDefault", {"", "ZLKNoParallax"})->values[0].get<std::string>(), "");
   EXPECT_EQ(ask("WriteDefault", {"", "key", "{"})->errorName, ipc::kInvalidArgs);
+  for (const char* own : {"", "com.quenta.zelkord"}) {
+    for (const char* value : {"true", ""}) {
+      const auto refused = ask("WriteDefault", {own, "ZLKNoParalax", value});
+      EXPECT_EQ(refused->errorName, ipc::kInvalidArgs) << own << value;
+    }
+    EXPECT_EQ(ask("WriteDefault", {own, "ZLKNoParallax", "\"yes\""})->errorName, ipc::kInvalidArgs);
+  }
+  EXPECT_EQ(*ask("ReadDefault", {"", "ZLKNoParallax"})->values[0].get<std::string>(), "");
+  EXPECT_TRUE(ask("WriteDefault", {"com.example", "any", "\"yes\""})->succeeded());
   EXPECT_EQ(ask("Metrics", {})->values[0].get<ipc::IntegerMap>()->at("com.quenta.zelkord.launch"),
             1);
   const auto status = parseJson(*ask("Status", {})->values[0].get<std::string>())->as_object();
