@@ -1,23 +1,28 @@
 #pragma once
 
 #include <sys/eventfd.h>
-#include <systemd/sd-bus.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <condition_variable>
+#include <iterator>
 #include <mutex>
 #include <thread>
 #include <utility>
 #include <vector>
 
+#include "corezelkor/client/internal/BusPointers.h"
+
 namespace zelkord::bench {
 
 // The thread that "answers": a call goes to it and comes back by a wake-up of the loop.
 //
-// Threading: give and take on the loop's thread. The worker never touches a message, which belong
-// to the loop. Lives as long as the program.
+// Threading: give and take on the loop's thread. The worker never looks into a message, which
+// belong to the loop. Lives as long as the program.
 class FloorWorker {
  public:
+  using Calls = std::vector<zelkor::MessagePointer>;
+
   FloorWorker() : wakeUp_(::eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK)) {
     std::thread([this] { _run(); }).detach();
   }
@@ -27,15 +32,15 @@ class FloorWorker {
   // Readable when there is something to take.
   int wakeUp() const { return wakeUp_; }
 
-  void give(sd_bus_message* call) {
+  void give(zelkor::MessagePointer call) {
     {
       const std::lock_guard lock(mutex_);
-      given_.push_back(call);
+      given_.push_back(std::move(call));
     }
     arrived_.notify_one();
   }
 
-  std::vector<sd_bus_message*> take() {
+  Calls take() {
     eventfd_t count = 0;
     ::eventfd_read(wakeUp_, &count);
     const std::lock_guard lock(mutex_);
@@ -47,7 +52,7 @@ class FloorWorker {
     std::unique_lock lock(mutex_);
     while (true) {
       arrived_.wait(lock, [this] { return !given_.empty(); });
-      done_.insert(done_.end(), given_.begin(), given_.end());
+      std::move(given_.begin(), given_.end(), std::back_inserter(done_));
       given_.clear();
       lock.unlock();
       ::eventfd_write(wakeUp_, 1);
@@ -58,8 +63,8 @@ class FloorWorker {
   const int wakeUp_;
   std::mutex mutex_;
   std::condition_variable arrived_;
-  std::vector<sd_bus_message*> given_;
-  std::vector<sd_bus_message*> done_;
+  Calls given_;
+  Calls done_;
 };
 
 }  // namespace zelkord::bench

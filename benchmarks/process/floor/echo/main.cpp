@@ -5,7 +5,7 @@
 #include <cstdio>
 #include <cstdlib>
 
-#include "benchmarks/process/floor/FloorService.h"
+#include "benchmarks/process/floor/echo/FloorEcho.h"
 
 int main(int count, char** arguments) {
   if (count != 4) return 2;
@@ -14,5 +14,5 @@ int main(int count, char** arguments) {
     std::fputs("no name on the bus\n", stderr);
     return EXIT_FAILURE;
   }
-  zelkord::bench::FloorService(arguments[1], bus, std::strtoul(arguments[3], nullptr, 10)).run();
+  zelkord::bench::FloorEcho(arguments[1], bus, std::strtoul(arguments[3], nullptr, 10)).run();
 }
