@@ -1,5 +1,6 @@
 #include <fmt/format.h>
 
+#include <algorithm>
 #include <array>
 #include <chrono>
 #include <stdexcept>
@@ -21,10 +22,16 @@ constexpr int kHits = 3'000;
 // By then the daemon has given back what only its start needed.
 constexpr std::chrono::seconds kStart{3};
 
-// An answer's size, and how many such fit: a cache takes less than 2 MiB, 1,024 bytes more for
-// each.
+// An answer's size; a cache counts 1,024 bytes more for each. One takes less than 2 MiB, all of a
+// process, and ours are one's, at most 16 MiB.
 constexpr std::size_t kBody = 20'480;
-constexpr std::size_t kFits = 2'097'151 / (kBody + 1'024);
+constexpr std::size_t kCache = 2'097'151;
+constexpr std::size_t kProcess = 16'777'216;
+
+// How many answers fit into each cache.
+std::size_t roomFor(std::size_t states) {
+  return std::min(kCache, kProcess / states) / (kBody + 1'024);
+}
 
 std::string textOf(std::size_t number) {
   return {static_cast<char>('a' + number % 26), static_cast<char>('a' + number / 26)};
@@ -47,7 +54,7 @@ std::string quoted(const std::string& text) {
 }
 
 void fill(std::vector<BusClient>& clients, const SandboxProcess& sandbox) {
-  for (std::size_t i = 0; i < kFits; ++i) {
+  for (std::size_t i = 0; i < roomFor(clients.size()); ++i) {
     const auto text = textOf(i);
     sandbox.control("misbehave",
                     R"({"path": "/search", "count": 0, "body": )" + quoted(answerTo(text)) + "}");
@@ -59,9 +66,10 @@ void fill(std::vector<BusClient>& clients, const SandboxProcess& sandbox) {
 // From call to answer, in microseconds, of searches that all clients ask in turn.
 Samples hits(std::vector<BusClient>& clients) {
   Samples samples;
+  const auto texts = roomFor(clients.size());
   for (std::size_t i = 0; i < kHits; ++i) {
     auto& client = clients[i % clients.size()];
-    const Search search{.queryString = textOf(i / clients.size() % kFits)};
+    const Search search{.queryString = textOf(i / clients.size() % texts)};
     const auto start = Clock::now();
     const auto answer = client.search(search);
     samples.add(microsecondsSince(start));
