@@ -44,6 +44,26 @@ int forEachEntry(sd_bus_message* message, const Entry& entry) {
   return count;
 }
 
+bool readText(sd_bus_message* message, std::string& text) {
+  const char* read = "";
+  check(sd_bus_message_read(message, "v", "s", &read), "reading a text");
+  text = read;
+  return true;
+}
+
+bool readItems(sd_bus_message* message, Search& search) {
+  check(sd_bus_message_enter_container(message, 'v', "a(ss)"), "reading items");
+  check(sd_bus_message_enter_container(message, 'a', "(ss)"), "reading items");
+  const char* name = "";
+  const char* value = "";
+  while (sd_bus_message_read(message, "(ss)", &name, &value) > 0) {
+    search.queryItems.emplace_back(name, value);
+  }
+  check(sd_bus_message_exit_container(message), "reading items");
+  check(sd_bus_message_exit_container(message), "reading items");
+  return true;
+}
+
 bool readSize(sd_bus_message* message, SearchAnswer& answer) {
   const void* bytes = nullptr;
   check(sd_bus_message_enter_container(message, 'v', "ay"), "reading data");
@@ -69,11 +89,7 @@ bool readRequest(sd_bus_message* message, SearchAnswer& answer) {
   check(sd_bus_message_enter_container(message, 'v', "a{sv}"), "reading the request");
   forEachEntry(message, [&](const std::string& key) {
     if (key == "headers") return readHeaders(message, answer);
-    if (key != "url") return false;
-    const char* url = "";
-    check(sd_bus_message_read(message, "v", "s", &url), "reading the address");
-    answer.url = url;
-    return true;
+    return key == "url" && readText(message, answer.url);
   });
   check(sd_bus_message_exit_container(message), "reading the request");
   return true;
@@ -104,6 +120,19 @@ zelkor::MessagePointer searchCall(sd_bus* bus, const std::string& destination,
   if (!search.queryItems.empty()) appendItems(message, search);
   check(sd_bus_message_close_container(message), "writing");
   return call;
+}
+
+Search searchIn(sd_bus_message* call) {
+  Search search;
+  check(sd_bus_message_skip(call, "s"), "reading the kind");
+  forEachEntry(call, [&](const std::string& key) {
+    if (key == "queryItems") return readItems(call, search);
+    if (key == "queryString") return readText(call, search.queryString);
+    if (key != "queryId") return false;
+    check(sd_bus_message_read(call, "v", "x", &search.queryId), "reading the query's number");
+    return true;
+  });
+  return search;
 }
 
 SearchAnswer searchAnswer(sd_bus_message* reply) {

@@ -31,7 +31,9 @@ zelkor::MessagePointer configureCall(sd_bus* bus, const std::string& destination
                                      const std::string& identifier);
 zelkor::MessagePointer searchCall(sd_bus* bus, const std::string& destination,
                                   const Search& search);
-// Throws std::runtime_error when the message has another form; a D-Bus error is a failed answer.
+// Both throw std::runtime_error when the message has another form; a D-Bus error is a failed
+// answer. Of a call only what the service is asked for is read.
+Search searchIn(sd_bus_message* call);
 SearchAnswer searchAnswer(sd_bus_message* reply);
 
 }  // namespace zelkord::bench

@@ -41,4 +41,11 @@ zelkor::MessagePointer answerWith(std::string_view body, std::int64_t queryId,
   return owned;
 }
 
+zelkor::MessagePointer failure(sd_bus_message* call) {
+  const sd_bus_error error{SD_BUS_ERROR_FAILED, "the service does not answer", 0};
+  sd_bus_message* reply = nullptr;
+  sd_bus_message_new_method_error(call, &reply, &error);
+  return zelkor::MessagePointer(reply);
+}
+
 }  // namespace zelkord::bench

@@ -14,5 +14,6 @@ zelkor::MessagePointer configuration(sd_bus_message* call);
 // An empty body is none: "nothing".
 zelkor::MessagePointer answerWith(std::string_view body, std::int64_t queryId,
                                   sd_bus_message* call);
+zelkor::MessagePointer failure(sd_bus_message* call);
 
 }  // namespace zelkord::bench
