@@ -24,7 +24,12 @@ void Race::report(Report& report, const std::string& name, double limit,
   const auto fastest =
       std::min_element(runners_.begin() + 1, runners_.end(),
                        [](const auto& a, const auto& b) { return a.best < b.best; });
-  report.ratio(name, ours.best, fastest->best, ours.best / fastest->best, limit, unit);
+  report.add({.name = name,
+              .unit = unit,
+              .ours = ours.best,
+              .floor = Row::Other{fastest->name, fastest->best, ours.best / fastest->best},
+              .target = limit > 0 ? Row::Target::Ratio : Row::Target::None,
+              .limit = limit});
   for (auto runner = runners_.begin() + 1; runner != runners_.end(); ++runner) {
     report.plain(name + ", " + runner->name, runner->best, unit);
   }

@@ -1,5 +1,5 @@
 // Measures the crit-bit tree against other ordered maps, with names that people look for. Prints
-// lines of tab-separated figures.
+// lines for benchmarks/table.py.
 //
 // usage: zelkord_map_bench [ROUNDS [KEYS]...]
 

@@ -4,18 +4,17 @@
 #include "benchmarks/process/Comparison.h"
 #include "benchmarks/process/Measurements.h"
 #include "benchmarks/process/ProcessBed.h"
-#include "benchmarks/process/ProcessFacts.h"
 
 namespace zelkord::bench {
 namespace {
 
-constexpr Comparison::Limits kLimits{.median = 1.5, .tail = 0, .processor = 0};
+constexpr Comparison::Limits kLimits{.median = 1.5, .processor = 2, .wakeUps = 1};
 constexpr std::size_t kBody = 20'480;
 constexpr const char* kText = "snow";
 
 void expectBody(const SearchAnswer& answer, const std::string& whose) {
   if (answer.dataSize != kBody)
-    throw std::runtime_error(whose + " body has " + std::to_string(answer.dataSize) + " bytes");
+    throw std::runtime_error(whose + ": a body of " + std::to_string(answer.dataSize) + " bytes");
 }
 
 }  // namespace
@@ -30,12 +29,12 @@ void measureCacheHits(const Plan& plan, const SandboxProcess& sandbox, Report& r
   ours.firstSearch(
       {.queryString = kText, .queryItems = {{"pad", std::to_string(kBody)}}, .verbose = true});
   const Search search{.queryString = kText};
-  const auto contender = [&search](BusClient& client, const char* whose, pid_t process) {
-    return Contender{[&client, &search, whose] { expectBody(client.search(search), whose); },
-                     [process] { return processorTimeOf(process); }};
+  const auto contender = [&search](const char* whose, BusClient& client, pid_t process) {
+    return Contender::process(
+        whose, process, [&client, &search, whose] { expectBody(client.search(search), whose); });
   };
-  Comparison::run({plan.rounds, plan.roundTrips}, contender(ours, "our", bed.daemon().pid()),
-                  contender(floor, "the floor's", bed.floor().pid()))
+  Comparison::run({plan.rounds, plan.roundTrips}, contender("ours", ours, bed.daemon().pid()),
+                  contender("echo", floor, bed.floor().pid()))
       .report(report, "cache hit, 20 KiB, private door", kLimits);
 }
 

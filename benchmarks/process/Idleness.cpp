@@ -25,15 +25,13 @@ struct IdleFigures {
 };
 
 double wakeUpsDuring(std::chrono::seconds time, pid_t process) {
-  auto before = voluntarySwitchesOf(process);
+  const auto before = sleepsOf(process);
   std::this_thread::sleep_for(time);
-  std::int64_t sum = 0;
-  for (const auto& [thread, count] : voluntarySwitchesOf(process)) {
-    const auto more = count - before[thread];
-    if (more > 0) std::cerr << "woke up " << more << " times: thread " << thread << "\n";
-    sum += more;
+  const auto sleeps = sleepsBetween(before, sleepsOf(process));
+  for (const auto& [thread, count] : sleeps) {
+    std::cerr << "woke up " << count << " times: thread " << thread << "\n";
   }
-  return static_cast<double>(sum) * 60 / static_cast<double>(time.count());
+  return static_cast<double>(sumOf(sleeps)) * 60 / static_cast<double>(time.count());
 }
 
 IdleFigures measure(const Plan& plan, ProcessBed& bed) {

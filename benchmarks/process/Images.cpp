@@ -7,7 +7,6 @@
 #include "benchmarks/process/ImageCall.h"
 #include "benchmarks/process/Measurements.h"
 #include "benchmarks/process/ProcessBed.h"
-#include "benchmarks/process/ProcessFacts.h"
 #include "benchmarks/process/Waiting.h"
 
 namespace zelkord::bench {
@@ -15,7 +14,7 @@ namespace {
 
 constexpr std::size_t kImages = 50;
 constexpr std::size_t kImageSize = 20'480;
-constexpr Comparison::Limits kLimits{.median = 1.3, .tail = 0, .processor = 0};
+constexpr Comparison::Limits kLimits{.median = 1.3};
 constexpr double kCachedLimit = 2;  // milliseconds
 
 void expectAll(std::size_t size) {
@@ -68,10 +67,10 @@ void measureImages(const Plan& plan, const SandboxProcess& sandbox, Report& repo
   const auto endpoint = connectToPeer(client.endpointAddress());
   CurlImages bare(sandbox.certificate(), kImages);
   FreshImages images(sandbox.url() + "/image/flags/fr.png?n=");
-  const Contender ours{[&] { expectAll(loadImages(endpoint.get(), images.next())); },
-                       [process] { return processorTimeOf(process); }};
-  const Contender floor{[&] { expectAll(bare.fetch(images.next())); },
-                        [] { return processorTimeOfThisThread(); }};
+  const auto ours = Contender::process(
+      "ours", process, [&] { expectAll(loadImages(endpoint.get(), images.next())); });
+  const auto floor =
+      Contender::thisThread("50 handles", [&] { expectAll(bare.fetch(images.next())); });
   Comparison::run({plan.rounds, plan.fetches / 15}, ours, floor)
       .report(report, "50 images of 20 KiB", kLimits);
   measureCached(plan, endpoint.get(), images.next(), report);

@@ -13,7 +13,7 @@ constexpr std::size_t kWaiting = 64;
 constexpr double kBurstLimit = 1200;  // milliseconds
 constexpr std::size_t kTyping = 200;
 constexpr int kKeysASecond = 5;
-constexpr double kTypingLimit = 50;  // milliseconds
+constexpr double kTypingLimit = 5;  // milliseconds
 // Each client holds a thread for up to a second until the bag is there; threads without work stay
 // for five.
 constexpr double kTypingThreadLimit = kTyping + 16;

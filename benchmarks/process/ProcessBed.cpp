@@ -106,6 +106,18 @@ ChildProcess& ProcessBed::daemon() {
 ChildProcess& ProcessBed::floor(std::size_t bodySize) {
   if (floor_) return *floor_;
   floor_ = _startFloor(bodySize);
+  return _floorThatServes();
+}
+
+ChildProcess& ProcessBed::broker(const std::string& url, const std::vector<std::string>& headers) {
+  if (floor_) return *floor_;
+  std::vector<std::string> command = {ZK_FLOOR_BROKER_BINARY, _floorSocket(), url};
+  command.insert(command.end(), headers.begin(), headers.end());
+  floor_ = std::make_unique<ChildProcess>(command, environment_, folder_.path() / "floor.output");
+  return _floorThatServes();
+}
+
+ChildProcess& ProcessBed::_floorThatServes() {
   waitFor("the floor", kPatience, [this] { return accepts(floorAddress()); });
   return *floor_;
 }

@@ -4,6 +4,7 @@
 #include <filesystem>
 #include <memory>
 #include <string>
+#include <vector>
 
 #include "benchmarks/process/ChildProcess.h"
 #include "benchmarks/process/SandboxProcess.h"
@@ -28,8 +29,10 @@ class ProcessBed {
 
   // Both start if need be and return when the socket and the name on the bus are there.
   ChildProcess& daemon();
-  // The floor's answers have a body of that size, the one it was started with.
+  // A bed has one floor, the one that is asked for first: an echo, whose answers have a body of
+  // that size, or a broker, which asks the sandbox at that URL with these header lines.
   ChildProcess& floor(std::size_t bodySize = 0);
+  ChildProcess& broker(const std::string& url, const std::vector<std::string>& headers);
   // Microseconds from the start of a new process to the name, which then is stopped.
   double timeDaemonStart();
   double timeFloorStart();
@@ -45,6 +48,7 @@ class ProcessBed {
   void _startBus();
   std::unique_ptr<ChildProcess> _startDaemon() const;
   std::unique_ptr<ChildProcess> _startFloor(std::size_t bodySize) const;
+  ChildProcess& _floorThatServes();
   void _showLog() const;
 
   const ScratchFolder folder_;

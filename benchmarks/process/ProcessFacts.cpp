@@ -1,5 +1,6 @@
 #include "benchmarks/process/ProcessFacts.h"
 
+#include <sys/resource.h>
 #include <time.h>
 
 #include <filesystem>
@@ -42,23 +43,45 @@ double processorTimeOf(pid_t process) {
   return ::clock_getcpuclockid(process, &clock) == 0 ? microsecondsOf(clock) : 0;
 }
 
-double processorTimeOfThisThread() { return microsecondsOf(CLOCK_THREAD_CPUTIME_ID); }
-
 std::int64_t threadsOf(pid_t process) { return statusNumber(folderOf(process), "Threads"); }
 
 double residentMiBOf(pid_t process) {
   return static_cast<double>(statusNumber(folderOf(process), "VmRSS")) / 1024;
 }
 
-std::map<std::string, std::int64_t> voluntarySwitchesOf(pid_t process) {
-  std::map<std::string, std::int64_t> switches;
+Sleeps sleepsOf(pid_t process) {
+  Sleeps sleeps;
   std::error_code problem;
   for (const auto& thread :
        std::filesystem::directory_iterator(folderOf(process) / "task", problem)) {
     const auto name = thread.path().filename().string() + " " + statusValue(thread.path(), "Name");
-    switches[name] = statusNumber(thread.path(), "voluntary_ctxt_switches");
+    sleeps[name] = statusNumber(thread.path(), "voluntary_ctxt_switches");
   }
-  return switches;
+  return sleeps;
+}
+
+Sleeps sleepsBetween(const Sleeps& before, const Sleeps& after) {
+  Sleeps between;
+  for (const auto& [thread, count] : after) {
+    const auto known = before.find(thread);
+    const auto more = known == before.end() ? count : count - known->second;
+    if (more > 0) between[thread] = more;
+  }
+  return between;
+}
+
+std::int64_t sumOf(const Sleeps& sleeps) {
+  std::int64_t sum = 0;
+  for (const auto& [thread, count] : sleeps) sum += count;
+  return sum;
+}
+
+Usage usageOf(pid_t process) { return {processorTimeOf(process), sleepsOf(process)}; }
+
+Usage usageOfThisThread() {
+  rusage usage{};
+  ::getrusage(RUSAGE_THREAD, &usage);
+  return {microsecondsOf(CLOCK_THREAD_CPUTIME_ID), {{"this thread", usage.ru_nvcsw}}};
 }
 
 }  // namespace zelkord::bench

@@ -7,40 +7,39 @@
 namespace zelkord::bench {
 namespace {
 
-std::string shown(double value, const std::string& unit) {
-  return fmt::format("{:.4g} {}", value, unit);
+std::string fieldsOf(const std::optional<Row::Other>& other) {
+  return other ? fmt::format("{}\t{:.6g}\t{:.6g}", other->name, other->value, other->ratio)
+               : "-\t-\t-";
 }
 
-void line(const std::string& name, const std::string& ours, const std::string& floor,
-          const std::string& ratio, const std::string& target, const std::string& verdict) {
-  fmt::print("{}\t{}\t{}\t{}\t{}\t{}\n", name, ours, floor, ratio, target, verdict);
-  std::fflush(stdout);
+std::string targetOf(const Row& row) {
+  switch (row.target) {
+    case Row::Target::None:
+      return "-";
+    case Row::Target::Value:
+      return fmt::format("<= {:g}", row.limit);
+    case Row::Target::Ratio:
+      return fmt::format("<= {:g} x", row.limit);
+    case Row::Target::Excess:
+      return fmt::format("<= floor + {:g}", row.limit);
+  }
+  return "-";
 }
-
-std::string verdictOf(bool holds) { return holds ? "ok" : "over"; }
 
 }  // namespace
 
-void Report::ratio(const std::string& name, double ours, double floor, double ratio, double limit,
-                   const std::string& unit) {
-  line(name, shown(ours, unit), shown(floor, unit), fmt::format("{:.2f}", ratio),
-       limit > 0 ? fmt::format("<= {:.2f} x", limit) : "-",
-       limit > 0 ? verdictOf(ratio <= limit) : "-");
+void Report::add(const Row& row) {
+  fmt::print("{}\t{}\t{}\t{:.6g}\t{}\t{}\t{}\n", row.name, row.figure.empty() ? "-" : row.figure,
+             row.unit, row.ours, targetOf(row), fieldsOf(row.floor), fieldsOf(row.second));
+  std::fflush(stdout);
 }
 
 void Report::bound(const std::string& name, double ours, double limit, const std::string& unit) {
-  line(name, shown(ours, unit), "-", "-", fmt::format("<= {:g} {}", limit, unit),
-       verdictOf(ours <= limit));
-}
-
-void Report::excess(const std::string& name, double ours, double floor, double limit,
-                    const std::string& unit) {
-  line(name, shown(ours, unit), shown(floor, unit), fmt::format("{:.2f}", ours / floor),
-       fmt::format("<= floor + {:g} {}", limit, unit), verdictOf(ours - floor <= limit));
+  add({.name = name, .unit = unit, .ours = ours, .target = Row::Target::Value, .limit = limit});
 }
 
 void Report::plain(const std::string& name, double ours, const std::string& unit) {
-  line(name, shown(ours, unit), "-", "-", "-", "-");
+  add({.name = name, .unit = unit, .ours = ours});
 }
 
 }  // namespace zelkord::bench

@@ -2,25 +2,24 @@
 #include "benchmarks/process/Comparison.h"
 #include "benchmarks/process/Measurements.h"
 #include "benchmarks/process/ProcessBed.h"
-#include "benchmarks/process/ProcessFacts.h"
 
 namespace zelkord::bench {
 namespace {
 
-constexpr Comparison::Limits kLimits{.median = 1.5, .tail = 2, .processor = 0};
+constexpr Comparison::Limits kPrivateDoor{.median = 1.5, .tail = 2, .processor = 2, .wakeUps = 1};
+constexpr Comparison::Limits kBusDoor{.median = 1.3, .tail = 2};
 
 // One client of each service; both ask the same.
 void compare(const Plan& plan, ProcessBed& bed, BusClient ours, BusClient floor, Report& report,
-             const std::string& name) {
+             const std::string& name, const Comparison::Limits& limits) {
   const Search tooShort{.queryString = "a"};
   ours.firstSearch(tooShort);
-  const auto contender = [&tooShort](BusClient& client, pid_t process) {
-    return Contender{[&client, &tooShort] { client.search(tooShort); },
-                     [process] { return processorTimeOf(process); }};
+  const auto contender = [&tooShort](const char* whose, BusClient& client, pid_t process) {
+    return Contender::process(whose, process, [&client, &tooShort] { client.search(tooShort); });
   };
-  const Comparison::Size size{plan.rounds, plan.roundTrips};
-  Comparison::run(size, contender(ours, bed.daemon().pid()), contender(floor, bed.floor().pid()))
-      .report(report, name, kLimits);
+  Comparison::run({plan.rounds, plan.roundTrips}, contender("ours", ours, bed.daemon().pid()),
+                  contender("echo", floor, bed.floor().pid()))
+      .report(report, name, limits);
 }
 
 }  // namespace
@@ -31,10 +30,10 @@ void measureRoundTrips(const Plan& plan, const SandboxProcess& sandbox, Report& 
   bed.daemon();
   bed.floor();
   compare(plan, bed, BusClient::ofPeer(bed.daemonAddress()), BusClient::ofPeer(bed.floorAddress()),
-          report, "round trip, private door");
+          report, "round trip, private door", kPrivateDoor);
   compare(plan, bed, BusClient::onBus(bed.busAddress(), ProcessBed::kDaemonName),
           BusClient::onBus(bed.busAddress(), ProcessBed::kFloorName), report,
-          "round trip, bus door");
+          "round trip, bus door", kBusDoor);
   sandbox.control("reset");
 }
 

@@ -1,5 +1,5 @@
 // Measures whole processes: the daemon, the sandbox service and bare programs beside it, each on
-// directories and a bus of its own. Prints lines of tab-separated figures.
+// directories and a bus of its own. Prints lines for benchmarks/table.py.
 
 #include <curl/curl.h>
 
