@@ -26,6 +26,7 @@ BusCaller::BusCaller(BusDoor& door, IpcContext& context, sd_bus* bus, std::strin
 BusCaller::~BusCaller() { end(); }
 
 void BusCaller::start() {
+  context_.loop.assertCurrent();
   sd_bus_slot* slot = nullptr;
   const auto rule =
       "type='signal',sender='org.freedesktop.DBus',interface='org.freedesktop.DBus',"
@@ -56,7 +57,9 @@ int BusCaller::_onOwnerChanged(sd_bus_message* message, void* self, sd_bus_error
 }
 
 int BusCaller::_onCredentials(sd_bus_message* message, void* self, sd_bus_error*) {
-  static_cast<BusCaller*>(self)->_identified(message);
+  auto& caller = *static_cast<BusCaller*>(self);
+  caller.context_.loop.assertCurrent();
+  caller._identified(message);
   return 1;
 }
 
@@ -90,6 +93,7 @@ std::optional<BusCaller::Refusal> BusCaller::_admit(std::optional<std::uint32_t>
 }
 
 void BusCaller::take(sd_bus_message* message) {
+  context_.loop.assertCurrent();
   auto call = door_.dispatcher().take(message);
   state_ == State::Checking ? _wait(std::move(call)) : _serve(std::move(call));
 }
@@ -109,6 +113,7 @@ void BusCaller::_serve(TakenCall call) {
 }
 
 Receiver BusCaller::receiver(const std::string& interface) {
+  context_.loop.assertCurrent();
   const auto& configuration = door_.dispatcher().configuration();
   if (connection_.connection) return {connection_.connection, {}};
   if (interface == configuration.connectionInterface) return _beginConnection();
@@ -126,7 +131,7 @@ Receiver BusCaller::_beginConnection() {
   connection_ = _makeSession();
   connection_.share = *std::move(share);
   connection_.holding = context_.memory->add(*this);
-  connection_.open = context_.connections->holdOpen(peer_.pid, [this] { _invalidateConnection(); });
+  connection_.open = context_.connections->holdOpen(peer_.pid, [this] { cutOffForMemory(); });
   ++context_.counts->connections;
   door_.port().announce(connection_.connection);
   return {connection_.connection, {}};
@@ -136,9 +141,24 @@ BusCaller::Session BusCaller::_makeSession() {
   auto outlet = std::make_shared<BusOutlet>(
       bus_, name_,
       [this](MessagePtr message, std::size_t bytes) { door_.send(std::move(message), bytes); },
-      [this] { _invalidateConnection(); });
+      [this] { cutOffForMemory(); });
   auto connection = std::make_shared<ServedConnection>(context_, peer_, outlet);
   return {std::move(outlet), std::move(connection), {}, {}, {}};
+}
+
+ServedConnection* BusCaller::connection() {
+  context_.loop.assertCurrent();
+  return connection_.connection.get();
+}
+
+const std::shared_ptr<CallFlow>& BusCaller::calls() const {
+  context_.loop.assertCurrent();
+  return connection_.connection->flow();
+}
+
+void BusCaller::cutOffForMemory() {
+  context_.loop.assertCurrent();
+  _invalidateConnection();
 }
 
 void BusCaller::_invalidateConnection() {
@@ -157,6 +177,7 @@ void BusCaller::_endConnection() {
 }
 
 void BusCaller::end() {
+  context_.loop.assertCurrent();
   _endConnection();
   plain_->end();
   if (const auto session = std::exchange(shared_, {}); session.connection) {
@@ -165,7 +186,10 @@ void BusCaller::end() {
   }
 }
 
-FileHandle BusCaller::openPrivateConnection() { return door_.openPrivateConnection(peer_); }
+FileHandle BusCaller::openPrivateConnection() {
+  context_.loop.assertCurrent();
+  return door_.openPrivateConnection(peer_);
+}
 
 // Its connection to the bus is not ours to close.
 void BusCaller::cutOff(const std::string& reason) {

@@ -37,13 +37,13 @@ class BusCaller final : public Caller, public ClientMemory::Holder {
   FileHandle openPrivateConnection() override;
   void cutOff(const std::string& reason) override;
   bool isPrivate() const override { return false; }
-  ServedConnection* connection() override { return connection_.connection.get(); }
+  ServedConnection* connection() override;
 
   // ClientMemory::Holder, while there is a connection
-  const std::shared_ptr<CallFlow>& calls() const override { return connection_.connection->flow(); }
+  const std::shared_ptr<CallFlow>& calls() const override;
   std::size_t messageBytes() const override { return 0; }
   std::size_t largestMessage() const override { return 0; }
-  void cutOffForMemory() override { _invalidateConnection(); }
+  void cutOffForMemory() override;
 
  private:
   enum class State { Checking, Known, Refused };
@@ -68,14 +68,15 @@ class BusCaller final : public Caller, public ClientMemory::Holder {
   static int _onOwnerChanged(sd_bus_message* message, void* self, sd_bus_error* error);
   static int _onCredentials(sd_bus_message* message, void* self, sd_bus_error* error);
   static int _onMatched(sd_bus_message* message, void* self, sd_bus_error* error);
-  void _identified(sd_bus_message* answer);
-  void _wait(TakenCall call);
-  void _serve(TakenCall call);
-  std::optional<Refusal> _admit(std::optional<std::uint32_t> uid, std::optional<std::uint32_t> pid);
-  Receiver _beginConnection();
-  Session _makeSession();
-  void _invalidateConnection();
-  void _endConnection();
+  void _identified(sd_bus_message* answer) ZK_REQUIRES(context_.loop);
+  void _wait(TakenCall call) ZK_REQUIRES(context_.loop);
+  void _serve(TakenCall call) ZK_REQUIRES(context_.loop);
+  std::optional<Refusal> _admit(std::optional<std::uint32_t> uid, std::optional<std::uint32_t> pid)
+      ZK_REQUIRES(context_.loop);
+  Receiver _beginConnection() ZK_REQUIRES(context_.loop);
+  Session _makeSession() ZK_REQUIRES(context_.loop);
+  void _invalidateConnection() ZK_REQUIRES(context_.loop);
+  void _endConnection() ZK_REQUIRES(context_.loop);
 
   // Fixed after construction.
   BusDoor& door_;
@@ -85,15 +86,15 @@ class BusCaller final : public Caller, public ClientMemory::Holder {
   const std::shared_ptr<BusOutlet> plain_;  // for what belongs to no connection
 
   // Loop state.
-  State state_ = State::Checking;
-  Refusal refusal_;
-  Peer peer_;
-  Budget::Share share_;
-  std::vector<Waiting> waiting_;
-  Session connection_;
-  Session shared_;  // serves the shared handler
-  SlotPtr match_;
-  SlotPtr query_;
+  State state_ ZK_ON(context_.loop) = State::Checking;
+  Refusal refusal_ ZK_ON(context_.loop);
+  Peer peer_ ZK_ON(context_.loop);
+  Budget::Share share_ ZK_ON(context_.loop);
+  std::vector<Waiting> waiting_ ZK_ON(context_.loop);
+  Session connection_ ZK_ON(context_.loop);
+  Session shared_ ZK_ON(context_.loop);  // serves the shared handler
+  SlotPtr match_ ZK_ON(context_.loop);
+  SlotPtr query_ ZK_ON(context_.loop);
 };
 
 }  // namespace zelkord::ipc

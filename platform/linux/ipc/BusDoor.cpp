@@ -102,16 +102,20 @@ BusDoor::BusDoor(IpcContext& context, BusPtr bus, ListenerConfiguration configur
 BusDoor::~BusDoor() { close(); }
 
 void BusDoor::start() {
+  context_.loop.assertCurrent();
   sd_bus_slot* slot = nullptr;
   sd_bus_add_filter(bus_.get(), &slot, &BusDoor::_onMessage, this);
   filter_.reset(slot);
   waitsFor_ = EPOLLIN;
-  watch_ =
-      context_.loop.watch(sd_bus_get_fd(bus_.get()), waitsFor_, [this](std::uint32_t) { _pump(); });
+  watch_ = context_.loop.watch(sd_bus_get_fd(bus_.get()), waitsFor_, [this](std::uint32_t) {
+    context_.loop.assertCurrent();
+    _pump();
+  });
   _pump();
 }
 
 void BusDoor::close() {
+  context_.loop.assertCurrent();
   *self_ = nullptr;
   watch_.reset();
   timeout_.reset();
@@ -123,6 +127,7 @@ void BusDoor::close() {
 }
 
 void BusDoor::requestName(const std::string& name, std::function<void(NameAnswer)> answered) {
+  context_.loop.assertCurrent();
   nameAnswered_ = std::move(answered);
   sd_bus_slot* slot = nullptr;
   const int r = sd_bus_request_name_async(bus_.get(), &slot, name.c_str(), SD_BUS_NAME_QUEUE,
@@ -143,7 +148,9 @@ int BusDoor::_onNameAnswer(sd_bus_message* message, void* self, sd_bus_error*) {
   auto answer = NameAnswer::Failed;
   if (code == kPrimaryOwner || code == kAlreadyOwner) answer = NameAnswer::Owned;
   if (code == kInQueue) answer = NameAnswer::Queued;
-  static_cast<BusDoor*>(self)->nameAnswered_(answer);
+  auto& door = *static_cast<BusDoor*>(self);
+  door.context_.loop.assertCurrent();
+  door.nameAnswered_(answer);
   return 1;
 }
 
@@ -155,7 +162,9 @@ void BusDoor::_takeDriverSignal(sd_bus_message* signal) {
 }
 
 int BusDoor::_onMessage(sd_bus_message* message, void* self, sd_bus_error*) {
-  return static_cast<BusDoor*>(self)->_take(message);
+  auto& door = *static_cast<BusDoor*>(self);
+  door.context_.loop.assertCurrent();
+  return door._take(message);
 }
 
 int BusDoor::_take(sd_bus_message* message) {
@@ -195,9 +204,11 @@ void BusDoor::_pump() {
   _updateWaiting();
   if (std::exchange(pumpsSoon_, true)) return;
   context_.loop.soon([self = self_] {
-    if (!*self) return;
-    (*self)->pumpsSoon_ = false;
-    (*self)->_pump();
+    auto* door = *self;
+    if (!door) return;
+    door->context_.loop.assertCurrent();
+    door->pumpsSoon_ = false;
+    door->_pump();
   });
 }
 
@@ -212,11 +223,14 @@ void BusDoor::_updateWaiting() {
   std::uint64_t due = UINT64_MAX;
   if (sd_bus_get_timeout(bus_.get(), &due) < 0 || due == UINT64_MAX) return timeout_.reset();
   const auto now = monotonicMicroseconds();
-  timeout_ = context_.loop.after(std::chrono::microseconds(due > now ? due - now : 0),
-                                 [this] { _pump(); });
+  timeout_ = context_.loop.after(std::chrono::microseconds(due > now ? due - now : 0), [this] {
+    context_.loop.assertCurrent();
+    _pump();
+  });
 }
 
 void BusDoor::send(MessagePtr message, std::size_t bytes) {
+  context_.loop.assertCurrent();
   if (!_hasRoomToSend()) return context_.limits.refused("bus_messages", "the session bus");
   const int r = sd_bus_send(bus_.get(), message.get(), nullptr);
   if (r < 0) context_.log.error("message not sent on the bus: {}", std::strerror(-r));
@@ -235,6 +249,7 @@ bool BusDoor::_hasRoomToSend() {
 
 void BusDoor::signal(const std::string& destination, const std::string& interface,
                      const std::string& member, std::optional<std::string> text) {
+  context_.loop.assertCurrent();
   sd_bus_message* message = nullptr;
   if (!bus_ || sd_bus_message_new_signal(bus_.get(), &message, kObjectPath.data(),
                                          interface.c_str(), member.c_str()) < 0) {
@@ -247,17 +262,22 @@ void BusDoor::signal(const std::string& destination, const std::string& interfac
 }
 
 void BusDoor::vanished(const std::string& name) {
+  context_.loop.assertCurrent();
   const auto found = callers_.find(name);
   if (found == callers_.end()) return;
   found->second->end();
   gone_.push_back(std::move(found->second));
   callers_.erase(found);
   context_.loop.soon([self = self_] {
-    if (*self) (*self)->gone_.clear();
+    auto* door = *self;
+    if (!door) return;
+    door->context_.loop.assertCurrent();
+    door->gone_.clear();
   });
 }
 
 void BusDoor::lose() {
+  context_.loop.assertCurrent();
   if (!watch_) return;
   watch_.reset();
   timeout_.reset();

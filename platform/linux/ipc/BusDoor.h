@@ -73,10 +73,10 @@ class BusDoor final {
 
  private:
   static int _onMessage(sd_bus_message* message, void* self, sd_bus_error* error);
-  int _take(sd_bus_message* message);
-  void _pump();
-  void _updateWaiting();
-  bool _hasRoomToSend();
+  int _take(sd_bus_message* message) ZK_REQUIRES(context_.loop);
+  void _pump() ZK_REQUIRES(context_.loop);
+  void _updateWaiting() ZK_REQUIRES(context_.loop);
+  bool _hasRoomToSend() ZK_REQUIRES(context_.loop);
   void _takeDriverSignal(sd_bus_message* signal);
   static int _onNameAnswer(sd_bus_message* message, void* self, sd_bus_error* error);
 
@@ -89,19 +89,20 @@ class BusDoor final {
 
   // Loop state.
   Dispatcher dispatcher_;
-  BusPtr bus_;
-  SlotPtr filter_;
-  Subscription watch_;
-  Subscription timeout_;
-  bool pumpsSoon_ = false;
-  std::uint32_t waitsFor_ = 0;
-  std::deque<std::size_t> queued_;  // sizes of the messages that wait, oldest first
-  std::size_t queuedBytes_ = 0;
-  SlotPtr nameRequest_;
-  std::function<void(NameAnswer)> nameAnswered_;
-  std::unordered_map<std::string, std::unique_ptr<BusCaller>> callers_;
+  BusPtr bus_ ZK_ON(context_.loop);
+  SlotPtr filter_ ZK_ON(context_.loop);
+  Subscription watch_ ZK_ON(context_.loop);
+  Subscription timeout_ ZK_ON(context_.loop);
+  bool pumpsSoon_ ZK_ON(context_.loop) = false;
+  std::uint32_t waitsFor_ ZK_ON(context_.loop) = 0;
+  std::deque<std::size_t> queued_
+      ZK_ON(context_.loop);  // sizes of the messages that wait, oldest first
+  std::size_t queuedBytes_ ZK_ON(context_.loop) = 0;
+  SlotPtr nameRequest_ ZK_ON(context_.loop);
+  std::function<void(NameAnswer)> nameAnswered_ ZK_ON(context_.loop);
+  std::unordered_map<std::string, std::unique_ptr<BusCaller>> callers_ ZK_ON(context_.loop);
   // Have ended and answer nothing any more; one of them may be what sd-bus is calling.
-  std::vector<std::unique_ptr<BusCaller>> gone_;
+  std::vector<std::unique_ptr<BusCaller>> gone_ ZK_ON(context_.loop);
   // For tasks that may run after the end.
   const std::shared_ptr<BusDoor*> self_ = std::make_shared<BusDoor*>(this);
 };

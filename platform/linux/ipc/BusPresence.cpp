@@ -60,12 +60,14 @@ BusPresence::BusPresence(IpcContext& context, std::string name, MakeDoor makeDoo
 BusPresence::~BusPresence() { close(); }
 
 void BusPresence::begin(BusPtr bus) {
+  context_.loop.assertCurrent();
   if (!bus) return _waitForTheBus();
   state_ = State::Present;
   _openDoor(std::move(bus));
 }
 
 void BusPresence::close() {
+  context_.loop.assertCurrent();
   *self_ = nullptr;
   watch_.reset();
   nextAttempt_.reset();
@@ -73,10 +75,22 @@ void BusPresence::close() {
   door_.reset();
 }
 
+BusDoor* BusPresence::door() {
+  context_.loop.assertCurrent();
+  return state_ == State::Present ? door_.get() : nullptr;
+}
+
 void BusPresence::_openDoor(BusPtr bus) {
-  door_ = makeDoor_(std::move(bus),
-                    {.lost = [this] { _lost(); },
-                     .nameAcquired = [this](const std::string& name) { _nameAcquired(name); }});
+  door_ = makeDoor_(std::move(bus), {.lost =
+                                         [this] {
+                                           context_.loop.assertCurrent();
+                                           _lost();
+                                         },
+                                     .nameAcquired =
+                                         [this](const std::string& name) {
+                                           context_.loop.assertCurrent();
+                                           _nameAcquired(name);
+                                         }});
   door_->start();
 }
 
@@ -86,9 +100,11 @@ void BusPresence::_lost() {
   }
   // The door is on the stack.
   context_.loop.soon([self = self_] {
-    if (!*self) return;
-    (*self)->door_.reset();
-    (*self)->_waitForTheBus();
+    auto* presence = *self;
+    if (!presence) return;
+    presence->context_.loop.assertCurrent();
+    presence->door_.reset();
+    presence->_waitForTheBus();
   });
 }
 
@@ -99,13 +115,19 @@ void BusPresence::_waitForTheBus() {
   if (!watch_ && context_.options.watcher && !path.empty()) {
     watch_ = context_.options.watcher->watch(path, [self = self_, inbox = context_.loop.inbox()] {
       inbox->post([self] {
-        if (*self) (*self)->_mayBeThere();
+        auto* presence = *self;
+        if (!presence) return;
+        presence->context_.loop.assertCurrent();
+        presence->_mayBeThere();
       });
     });
   }
   const auto delay = rejoinDelay(attempts_++);
   if (watch_ && delay >= kLongestRejoinDelay) return;
-  nextAttempt_ = context_.loop.after(delay, [this] { _join(); });
+  nextAttempt_ = context_.loop.after(delay, [this] {
+    context_.loop.assertCurrent();
+    _join();
+  });
 }
 
 void BusPresence::_mayBeThere() {
@@ -119,7 +141,10 @@ void BusPresence::_join() {
   state_ = State::Joining;
   _openDoor(std::move(bus));
   if (state_ == State::Joining) {
-    door_->requestName(name_, [this](BusDoor::NameAnswer answer) { _nameAnswered(answer); });
+    door_->requestName(name_, [this](BusDoor::NameAnswer answer) {
+      context_.loop.assertCurrent();
+      _nameAnswered(answer);
+    });
   }
 }
 

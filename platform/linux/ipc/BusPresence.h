@@ -29,19 +29,19 @@ class BusPresence final {
   void begin(BusPtr bus);
   void close();
   // Null while the name is not ours.
-  BusDoor* door() { return state_ == State::Present ? door_.get() : nullptr; }
+  BusDoor* door();
 
  private:
   enum class State { Absent, Joining, Queued, Present };
 
-  void _openDoor(BusPtr bus);
-  void _lost();
-  void _waitForTheBus();
-  void _mayBeThere();
-  void _join();
-  void _nameAnswered(BusDoor::NameAnswer answer);
-  void _nameAcquired(const std::string& name);
-  void _becomePresent();
+  void _openDoor(BusPtr bus) ZK_REQUIRES(context_.loop);
+  void _lost() ZK_REQUIRES(context_.loop);
+  void _waitForTheBus() ZK_REQUIRES(context_.loop);
+  void _mayBeThere() ZK_REQUIRES(context_.loop);
+  void _join() ZK_REQUIRES(context_.loop);
+  void _nameAnswered(BusDoor::NameAnswer answer) ZK_REQUIRES(context_.loop);
+  void _nameAcquired(const std::string& name) ZK_REQUIRES(context_.loop);
+  void _becomePresent() ZK_REQUIRES(context_.loop);
 
   // Fixed after construction.
   IpcContext& context_;
@@ -49,11 +49,11 @@ class BusPresence final {
   const MakeDoor makeDoor_;
 
   // Loop state.
-  State state_ = State::Absent;
-  std::unique_ptr<BusDoor> door_;
-  int attempts_ = 0;
-  Subscription nextAttempt_;
-  Subscription watch_;
+  State state_ ZK_ON(context_.loop) = State::Absent;
+  std::unique_ptr<BusDoor> door_ ZK_ON(context_.loop);
+  int attempts_ ZK_ON(context_.loop) = 0;
+  Subscription nextAttempt_ ZK_ON(context_.loop);
+  Subscription watch_ ZK_ON(context_.loop);
   // For tasks that may run after the end.
   const std::shared_ptr<BusPresence*> self_ = std::make_shared<BusPresence*>(this);
 };

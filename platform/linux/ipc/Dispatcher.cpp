@@ -45,6 +45,7 @@ void Dispatcher::dispatch(sd_bus_message* message, Caller& caller) {
 }
 
 TakenCall Dispatcher::take(sd_bus_message* message) const {
+  context_.loop.assertCurrent();
   TakenCall call{.origin = originOf(message),
                  .path = orEmpty(sd_bus_message_get_path(message)),
                  .interface = orEmpty(sd_bus_message_get_interface(message)),
@@ -66,6 +67,7 @@ void Dispatcher::_findMethod(TakenCall& call) const {
 }
 
 void Dispatcher::dispatch(TakenCall call, Caller& caller) {
+  context_.loop.assertCurrent();
   if (!_dispatchCall(call, caller)) noteMessage(caller);
 }
 
@@ -84,6 +86,7 @@ bool Dispatcher::_dispatchCall(TakenCall& call, Caller& caller) {
 
 void Dispatcher::refuse(Outlet& outlet, const CallOrigin& origin, std::string_view error,
                         std::string_view text) {
+  context_.loop.assertCurrent();
   ++context_.counts->refused;
   sendError(outlet, origin, error, text);
 }

@@ -82,8 +82,8 @@ class Dispatcher {
  private:
   void _findMethod(TakenCall& call) const;
   // True when the call is on its way to a handler.
-  bool _dispatchCall(TakenCall& call, Caller& caller);
-  bool _answerBusDriver(const TakenCall& call, Caller& caller);
+  bool _dispatchCall(TakenCall& call, Caller& caller) ZK_REQUIRES(context_.loop);
+  bool _answerBusDriver(const TakenCall& call, Caller& caller) ZK_REQUIRES(context_.loop);
   bool _answerStandard(const TakenCall& call, Caller& caller);
   void _answerProperties(const TakenCall& call, Caller& caller);
   bool _callObject(TakenCall& call, Caller& caller);
@@ -97,7 +97,7 @@ class Dispatcher {
   IpcContext& context_;
   const std::string serviceInterface_;
   const std::shared_ptr<const ListenerConfiguration> configuration_;
-  unsigned hellos_ = 0;
+  unsigned hellos_ ZK_ON(context_.loop) = 0;
 };
 
 }  // namespace zelkord::ipc

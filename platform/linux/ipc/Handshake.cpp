@@ -16,10 +16,26 @@ Handshake::Handshake(Loop& loop, Descriptor socket, Authenticator authenticator,
       finished_(std::move(finished)) {}
 
 void Handshake::start(Duration limit) {
+  loop_.assertCurrent();
   // Edge-triggered: half a line stays in the socket until the rest has come.
-  watch_ = loop_.watch(socket_.get(), EPOLLIN | EPOLLRDHUP | EPOLLET,
-                       [this](std::uint32_t events) { _ready(events); });
-  timer_ = loop_.after(limit, [this] { _finish(false); });
+  watch_ = loop_.watch(socket_.get(), EPOLLIN | EPOLLRDHUP | EPOLLET, [this](std::uint32_t events) {
+    loop_.assertCurrent();
+    _ready(events);
+  });
+  timer_ = loop_.after(limit, [this] {
+    loop_.assertCurrent();
+    _finish(false);
+  });
+}
+
+Descriptor Handshake::takeSocket() {
+  loop_.assertCurrent();
+  return std::move(socket_);
+}
+
+bool Handshake::passesDescriptors() const {
+  loop_.assertCurrent();
+  return authenticator_.passesDescriptors();
 }
 
 void Handshake::_ready(std::uint32_t events) {

@@ -23,22 +23,24 @@ class Handshake {
   Handshake(Loop& loop, Descriptor socket, Authenticator authenticator, Finished finished);
   void start(Duration limit);
 
-  Descriptor takeSocket() { return std::move(socket_); }
-  bool passesDescriptors() const { return authenticator_.passesDescriptors(); }
+  Descriptor takeSocket();
+  bool passesDescriptors() const;
 
  private:
-  void _ready(std::uint32_t events);
+  void _ready(std::uint32_t events) ZK_REQUIRES(loop_);
   // False when the peer has to send more first.
-  bool _step();
-  bool _reply(std::string_view text);
-  void _finish(bool succeeded);
+  bool _step() ZK_REQUIRES(loop_);
+  bool _reply(std::string_view text) ZK_REQUIRES(loop_);
+  void _finish(bool succeeded) ZK_REQUIRES(loop_);
 
   Loop& loop_;
-  Descriptor socket_;
-  Authenticator authenticator_;
-  Finished finished_;
-  Subscription watch_;
-  Subscription timer_;
+
+  // Loop state.
+  Descriptor socket_ ZK_ON(loop_);
+  Authenticator authenticator_ ZK_ON(loop_);
+  Finished finished_ ZK_ON(loop_);
+  Subscription watch_ ZK_ON(loop_);
+  Subscription timer_ ZK_ON(loop_);
 };
 
 }  // namespace zelkord::ipc

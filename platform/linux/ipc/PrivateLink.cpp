@@ -38,6 +38,7 @@ PrivateLink::PrivateLink(PrivateListener& listener, IpcContext& context, BusPtr 
       gate_(context.options.messageBytes) {}
 
 void PrivateLink::start() {
+  context_.loop.assertCurrent();
   sd_bus_slot* slot = nullptr;
   sd_bus_add_filter(bus_.get(), &slot, &PrivateLink::_onMessage, this);
   filter_.reset(slot);
@@ -52,6 +53,7 @@ void PrivateLink::start() {
                                [weak = weak_from_this()](std::uint32_t events) {
                                  const auto self = weak.lock();
                                  if (!self) return;
+                                 self->context_.loop.assertCurrent();
                                  self->hungUp_ |= (events & ~(EPOLLIN | EPOLLOUT)) != 0;
                                  if (!self->_isInLongMessage()) return self->_pump();
                                  self->_pumpInTurn();
@@ -59,6 +61,7 @@ void PrivateLink::start() {
 }
 
 void PrivateLink::end() {
+  context_.loop.assertCurrent();
   if (std::exchange(ended_, true)) return;
   watch_.reset();
   holding_.reset();
@@ -70,6 +73,7 @@ void PrivateLink::end() {
   admission_.share.reset();
   // sd-bus may be on the stack.
   context_.loop.soon([self = shared_from_this()] {
+    self->context_.loop.assertCurrent();
     self->filter_.reset();
     self->bus_.reset();
   });
@@ -77,6 +81,7 @@ void PrivateLink::end() {
 }
 
 void PrivateLink::cutOff(const std::string& reason) {
+  context_.loop.assertCurrent();
   if (ended_) return;
   context_.log.error("connection of {} cut off: {}", peer_.pid, reason);
   end();
@@ -86,6 +91,7 @@ FileHandle PrivateLink::openPrivateConnection() { return listener_.openConnectio
 
 int PrivateLink::_onMessage(sd_bus_message* message, void* self, sd_bus_error*) {
   auto& link = *static_cast<PrivateLink*>(self);
+  link.context_.loop.assertCurrent();
   link.gate_.arrived();
   link.arrived_ = true;
   if (link.ended_) return 1;
@@ -117,6 +123,7 @@ void PrivateLink::_pumpInTurn() {
   context_.loop.inSpareTime([weak = weak_from_this()] {
     const auto link = weak.lock();
     if (!link) return;
+    link->context_.loop.assertCurrent();
     link->waitsForTurn_ = false;
     link->_pump();
   });
@@ -175,6 +182,7 @@ PrivateLink::Progress PrivateLink::_process() {
 }
 
 void PrivateLink::send(MessagePtr message, std::size_t bytes) {
+  context_.loop.assertCurrent();
   if (ended_) return;
   const int r = sd_bus_send(bus_.get(), message.get(), nullptr);
   if (r < 0) return end();
@@ -192,12 +200,13 @@ void PrivateLink::_accountWrites(std::size_t newestBytes) {
   const auto count = _queuedMessages();
   if (count == 0 && queued_.empty()) return;
   auto bytes = queuedBytes_;
-  const auto append = [&](std::size_t size) {
-    queued_.push_back(size);
-    bytes += size;
-  };
-  if (newestBytes > 0 && count > 0) append(newestBytes);
-  while (queued_.size() < count) append(kUnknownMessageBytes);
+  if (newestBytes > 0 && count > 0) {
+    queued_.push_back(newestBytes);
+    bytes += newestBytes;
+  }
+  for (; queued_.size() < count; bytes += kUnknownMessageBytes) {
+    queued_.push_back(kUnknownMessageBytes);
+  }
   for (; queued_.size() > count; queued_.pop_front()) bytes -= queued_.front();
   if (waitsForWriting_ != (count > 0)) {
     waitsForWriting_ = count > 0;
@@ -221,7 +230,23 @@ void PrivateLink::_accountMemory(std::size_t queuedBytes, std::size_t unfinished
   context_.memory->grew(process);
 }
 
+sd_bus* PrivateLink::bus() {
+  context_.loop.assertCurrent();
+  return ended_ ? nullptr : bus_.get();
+}
+
+const std::shared_ptr<ServedConnection>& PrivateLink::served() const {
+  context_.loop.assertCurrent();
+  return connection_;
+}
+
+std::size_t PrivateLink::messageBytes() const {
+  context_.loop.assertCurrent();
+  return queuedBytes_ + unfinishedBytes_;
+}
+
 std::size_t PrivateLink::largestMessage() const {
+  context_.loop.assertCurrent();
   const auto queued = std::max_element(queued_.begin(), queued_.end());
   return std::max(unfinishedBytes_, queued == queued_.end() ? 0 : *queued);
 }

@@ -40,25 +40,25 @@ class PrivateLink final : public Outlet,
 
   void start();
   void end();
-  const std::shared_ptr<ServedConnection>& served() const { return connection_; }
+  const std::shared_ptr<ServedConnection>& served() const;
 
   // Outlet
-  sd_bus* bus() override { return ended_ ? nullptr : bus_.get(); }
+  sd_bus* bus() override;
   const std::string& destination() const override { return destination_; }
   void send(MessagePtr message, std::size_t bytes) override;
   void invalidate() override { end(); }
 
   // Caller
   Outlet& outlet() override { return *this; }
-  Receiver receiver(const std::string&) override { return {connection_, {}}; }
+  Receiver receiver(const std::string&) override { return {served(), {}}; }
   FileHandle openPrivateConnection() override;
   void cutOff(const std::string& reason) override;
   bool isPrivate() const override { return true; }
-  ServedConnection* connection() override { return connection_.get(); }
+  ServedConnection* connection() override { return served().get(); }
 
   // ClientMemory::Holder
-  const std::shared_ptr<CallFlow>& calls() const override { return connection_->flow(); }
-  std::size_t messageBytes() const override { return queuedBytes_ + unfinishedBytes_; }
+  const std::shared_ptr<CallFlow>& calls() const override { return served()->flow(); }
+  std::size_t messageBytes() const override;
   std::size_t largestMessage() const override;
   void cutOffForMemory() override { cutOff("too much memory is held for its process"); }
 
@@ -66,17 +66,18 @@ class PrivateLink final : public Outlet,
   enum class Progress { Message, Nothing, Some };
 
   static int _onMessage(sd_bus_message* message, void* self, sd_bus_error* error);
-  void _pump();
-  void _pumpInTurn();
+  void _pump() ZK_REQUIRES(context_.loop);
+  void _pumpInTurn() ZK_REQUIRES(context_.loop);
   // False when there is more to read.
-  bool _readMessages();
-  bool _isInLongMessage() const;
-  bool _mayRead();
-  Progress _process();
-  std::size_t _queuedMessages() const;
-  void _accountWrites(std::size_t newestBytes);
-  void _accountMemory(std::size_t queuedBytes, std::size_t unfinishedBytes);
-  std::size_t _piledUpBytes() const;
+  bool _readMessages() ZK_REQUIRES(context_.loop);
+  bool _isInLongMessage() const ZK_REQUIRES(context_.loop);
+  bool _mayRead() ZK_REQUIRES(context_.loop);
+  Progress _process() ZK_REQUIRES(context_.loop);
+  std::size_t _queuedMessages() const ZK_REQUIRES(context_.loop);
+  void _accountWrites(std::size_t newestBytes) ZK_REQUIRES(context_.loop);
+  void _accountMemory(std::size_t queuedBytes, std::size_t unfinishedBytes)
+      ZK_REQUIRES(context_.loop);
+  std::size_t _piledUpBytes() const ZK_REQUIRES(context_.loop);
 
   // Fixed after construction.
   PrivateListener& listener_;
@@ -85,22 +86,23 @@ class PrivateLink final : public Outlet,
   const std::string destination_;
 
   // Loop state.
-  BusPtr bus_;
-  SlotPtr filter_;
-  std::shared_ptr<ServedConnection> connection_;
-  Admission admission_;
-  Subscription holding_;
-  Subscription open_;
-  Subscription watch_;
-  MessageGate gate_;
-  bool ended_ = false;
-  bool hungUp_ = false;
-  bool arrived_ = false;  // a message came during this round
-  bool waitsForWriting_ = false;
-  bool waitsForTurn_ = false;
-  std::deque<std::size_t> queued_;  // sizes of the messages that wait, oldest first
-  std::size_t queuedBytes_ = 0;
-  std::size_t unfinishedBytes_ = 0;
+  BusPtr bus_ ZK_ON(context_.loop);
+  SlotPtr filter_ ZK_ON(context_.loop);
+  std::shared_ptr<ServedConnection> connection_ ZK_ON(context_.loop);
+  Admission admission_ ZK_ON(context_.loop);
+  Subscription holding_ ZK_ON(context_.loop);
+  Subscription open_ ZK_ON(context_.loop);
+  Subscription watch_ ZK_ON(context_.loop);
+  MessageGate gate_ ZK_ON(context_.loop);
+  bool ended_ ZK_ON(context_.loop) = false;
+  bool hungUp_ ZK_ON(context_.loop) = false;
+  bool arrived_ ZK_ON(context_.loop) = false;  // a message came during this round
+  bool waitsForWriting_ ZK_ON(context_.loop) = false;
+  bool waitsForTurn_ ZK_ON(context_.loop) = false;
+  std::deque<std::size_t> queued_
+      ZK_ON(context_.loop);  // sizes of the messages that wait, oldest first
+  std::size_t queuedBytes_ ZK_ON(context_.loop) = 0;
+  std::size_t unfinishedBytes_ ZK_ON(context_.loop) = 0;
 };
 
 }  // namespace zelkord::ipc

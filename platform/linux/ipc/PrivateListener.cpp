@@ -44,12 +44,16 @@ PrivateListener::PrivateListener(IpcContext& context, ListenerConfiguration conf
       dispatcher_(context, std::move(configuration), std::move(serviceInterface)) {}
 
 void PrivateListener::serve(ListeningSocket socket) {
+  context_.loop.assertCurrent();
   socket_.emplace(std::move(socket));
-  watch_ =
-      context_.loop.watch(socket_->descriptor(), EPOLLIN, [this](std::uint32_t) { _accept(); });
+  watch_ = context_.loop.watch(socket_->descriptor(), EPOLLIN, [this](std::uint32_t) {
+    context_.loop.assertCurrent();
+    _accept();
+  });
 }
 
 void PrivateListener::close() {
+  context_.loop.assertCurrent();
   closed_ = true;
   watch_.reset();
   pause_.reset();
@@ -80,9 +84,8 @@ void PrivateListener::_accept() {
 }
 
 Descriptor PrivateListener::_acceptOne() {
-  const auto accept = [this] {
-    return Descriptor(
-        ::accept4(socket_->descriptor(), nullptr, nullptr, SOCK_CLOEXEC | SOCK_NONBLOCK));
+  const auto accept = [from = socket_->descriptor()] {
+    return Descriptor(::accept4(from, nullptr, nullptr, SOCK_CLOEXEC | SOCK_NONBLOCK));
   };
   auto socket = accept();
   if (!socket && isScarcity(errno)) {
@@ -102,6 +105,7 @@ void PrivateListener::_pauseAccepting() {
   context_.limits.refused("descriptors", "all connections");
   context_.loop.changeEvents(socket_->descriptor(), 0);
   pause_ = context_.loop.after(kAcceptPause, [this] {
+    context_.loop.assertCurrent();
     context_.reserve->refill();
     context_.loop.changeEvents(socket_->descriptor(), EPOLLIN);
   });
@@ -120,7 +124,10 @@ bool PrivateListener::_consider(Descriptor socket, Peer peer) {
   guest.admission.share = *std::move(share);
   const auto key = ++lastGuest_;
   if (!delegateBounds) {
-    guest.waiting = budgets.awaitAuthentication(peer.pid, [this, key] { _dismiss(key); });
+    guest.waiting = budgets.awaitAuthentication(peer.pid, [this, key] {
+      context_.loop.assertCurrent();
+      _dismiss(key);
+    });
   }
   guests_.emplace(key, std::move(guest));
   _askAdmission(key, peer);
@@ -132,7 +139,10 @@ void PrivateListener::_askAdmission(std::uint64_t guest, Peer peer) {
                              guest](std::optional<Subscription> place) {
     auto held = std::make_shared<std::optional<Subscription>>(std::move(place));
     inbox->post([weak, guest, held] {
-      if (const auto self = weak.lock()) self->_admitted(guest, std::move(*held));
+      const auto self = weak.lock();
+      if (!self) return;
+      self->context_.loop.assertCurrent();
+      self->_admitted(guest, std::move(*held));
     });
   });
 }
@@ -150,8 +160,10 @@ void PrivateListener::_admitted(std::uint64_t key, std::optional<Subscription> p
   guest.handshake = std::make_unique<Handshake>(context_.loop, std::move(guest.socket),
                                                 Authenticator(guest.peer.uid, serverId_),
                                                 [weak = weak_from_this(), key](bool succeeded) {
-                                                  if (const auto self = weak.lock())
-                                                    self->_authenticated(key, succeeded);
+                                                  const auto self = weak.lock();
+                                                  if (!self) return;
+                                                  self->context_.loop.assertCurrent();
+                                                  self->_authenticated(key, succeeded);
                                                 });
   const auto elapsed = std::chrono::steady_clock::now() - guest.accepted;
   guest.handshake->start(context_.options.authenticationTimeout - elapsed);
@@ -189,14 +201,21 @@ BusPtr PrivateListener::_adopt(Handshake& handshake) {
 }
 
 FileHandle PrivateListener::openConnection(Peer peer) {
+  context_.loop.assertCurrent();
   int pair[2];
   if (closed_ || ::socketpair(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0, pair) != 0) return {};
   FileHandle client(pair[0]);
   return _consider(Descriptor(pair[1]), peer) ? client : FileHandle();
 }
 
+void PrivateListener::forget(PrivateLink& link) {
+  context_.loop.assertCurrent();
+  links_.erase(&link);
+}
+
 void PrivateListener::broadcast(const std::string& interface, const std::string& member,
                                 const std::string& text) {
+  context_.loop.assertCurrent();
   const auto links = links_;  // sending may end one
   const auto valid = wireText(text);
   for (const auto& [key, link] : links) {

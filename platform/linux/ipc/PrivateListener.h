@@ -39,7 +39,7 @@ class PrivateListener final : public std::enable_shared_from_this<PrivateListene
   // For its links.
   Dispatcher& dispatcher() { return dispatcher_; }
   DelegatePort& port() { return *port_; }
-  void forget(PrivateLink& link) { links_.erase(&link); }
+  void forget(PrivateLink& link);
 
  private:
   using Instant = std::chrono::steady_clock::time_point;
@@ -53,16 +53,16 @@ class PrivateListener final : public std::enable_shared_from_this<PrivateListene
     std::unique_ptr<Handshake> handshake;
   };
 
-  void _accept();
-  Descriptor _acceptOne();
-  void _pauseAccepting();
+  void _accept() ZK_REQUIRES(context_.loop);
+  Descriptor _acceptOne() ZK_REQUIRES(context_.loop);
+  void _pauseAccepting() ZK_REQUIRES(context_.loop);
   // False: there is no place for it.
-  bool _consider(Descriptor socket, Peer peer);
-  void _askAdmission(std::uint64_t guest, Peer peer);
-  void _admitted(std::uint64_t guest, std::optional<Subscription> place);
-  void _authenticated(std::uint64_t guest, bool succeeded);
-  void _dismiss(std::uint64_t guest);
-  BusPtr _adopt(Handshake& handshake);
+  bool _consider(Descriptor socket, Peer peer) ZK_REQUIRES(context_.loop);
+  void _askAdmission(std::uint64_t guest, Peer peer) ZK_REQUIRES(context_.loop);
+  void _admitted(std::uint64_t guest, std::optional<Subscription> place) ZK_REQUIRES(context_.loop);
+  void _authenticated(std::uint64_t guest, bool succeeded) ZK_REQUIRES(context_.loop);
+  void _dismiss(std::uint64_t guest) ZK_REQUIRES(context_.loop);
+  BusPtr _adopt(Handshake& handshake) ZK_REQUIRES(context_.loop);
 
   // Fixed after construction.
   IpcContext& context_;
@@ -71,14 +71,15 @@ class PrivateListener final : public std::enable_shared_from_this<PrivateListene
 
   // Loop state.
   Dispatcher dispatcher_;
-  bool closed_ = false;
-  bool acceptsOn_ = false;  // goes on accepting in the next turn of the loop
-  std::optional<ListeningSocket> socket_;
-  Subscription watch_;
-  Subscription pause_;
-  std::uint64_t lastGuest_ = 0;
-  std::unordered_map<std::uint64_t, Guest> guests_;
-  std::unordered_map<PrivateLink*, std::shared_ptr<PrivateLink>> links_;
+  bool closed_ ZK_ON(context_.loop) = false;
+  // Goes on accepting in the next turn of the loop.
+  bool acceptsOn_ ZK_ON(context_.loop) = false;
+  std::optional<ListeningSocket> socket_ ZK_ON(context_.loop);
+  Subscription watch_ ZK_ON(context_.loop);
+  Subscription pause_ ZK_ON(context_.loop);
+  std::uint64_t lastGuest_ ZK_ON(context_.loop) = 0;
+  std::unordered_map<std::uint64_t, Guest> guests_ ZK_ON(context_.loop);
+  std::unordered_map<PrivateLink*, std::shared_ptr<PrivateLink>> links_ ZK_ON(context_.loop);
 };
 
 }  // namespace zelkord::ipc

@@ -21,12 +21,16 @@ CurlConnections::CurlConnections(Loop& loop, CurlSettings settings)
     : loop_(loop),
       settings_(std::move(settings)),
       maximumIdle_(settings_.maximumIdleConnections),
-      timer_(loop, [this] { _runDue(); }) {}
+      timer_(loop, [this] {
+        loop_.assertCurrent();
+        _runDue();
+      }) {}
 
 CurlConnections::~CurlConnections() { ZK_CHECK(!open_, "connections are closed before their end"); }
 
 void CurlConnections::begin(std::shared_ptr<CurlURLTask> task, CurlURLTask::Order order,
                             TransferPlace place) {
+  loop_.assertCurrent();
   ZK_CHECK(!retired_ && !closed_, "retired connections take no more tasks");
   _open();
   active_.push_back(_takeTransfer());
@@ -39,6 +43,7 @@ void CurlConnections::begin(std::shared_ptr<CurlURLTask> task, CurlURLTask::Orde
 }
 
 bool CurlConnections::cancel(CurlURLTask& task) {
+  loop_.assertCurrent();
   if (!task.transfer) return false;
   CurlTransfer& transfer = *task.transfer;
   if (transfer.place >= active_.size() || active_[transfer.place].get() != &transfer) return false;
@@ -48,21 +53,28 @@ bool CurlConnections::cancel(CurlURLTask& task) {
   return true;
 }
 
+bool CurlConnections::isClosed() const {
+  loop_.assertCurrent();
+  return closed_;
+}
+
 void CurlConnections::setMaximumIdle(long count) {
+  loop_.assertCurrent();
   maximumIdle_ = count;
   if (multi_) curl_multi_setopt(multi_, CURLMOPT_MAXCONNECTS, maximumIdle_);
 }
 
 void CurlConnections::retire() {
+  loop_.assertCurrent();
   retired_ = true;
   if (active_.empty()) close();
 }
 
 std::vector<std::shared_ptr<CurlURLTask>> CurlConnections::close() {
+  loop_.assertCurrent();
   std::vector<std::shared_ptr<CurlURLTask>> dropped;
   closed_ = true;
   if (!std::exchange(open_, false)) return dropped;
-  loop_.assertCurrent();
   while (!active_.empty()) {
     curl_multi_remove_handle(multi_, active_.back()->handle());
     dropped.push_back(_release(*active_.back()));
@@ -85,10 +97,12 @@ void CurlConnections::_loopEnded() {
 }
 
 void CurlConnections::_open() {
-  loop_.assertCurrent();
   _setDue(purgeDue_, kNever);
   if (!std::exchange(open_, true)) {
-    loopEnd_ = loop_.atEnd([this] { _loopEnded(); });
+    loopEnd_ = loop_.atEnd([this] {
+      loop_.assertCurrent();
+      _loopEnded();
+    });
     share_ = curl_share_init();
     curl_share_setopt(share_, CURLSHOPT_SHARE, CURL_LOCK_DATA_SSL_SESSION);
   }
@@ -106,14 +120,13 @@ void CurlConnections::_open() {
 
 void CurlConnections::_closeMulti() {
   curl_multi_cleanup(std::exchange(multi_, nullptr));
-  loop_.assertCurrent();
   watches_.clear();
   curlDue_ = overdueCheck_ = purgeDue_ = kNever;
   timer_.set(kNever);
 }
 
 std::unique_ptr<CurlTransfer> CurlConnections::_takeTransfer() {
-  if (idle_.empty()) return std::make_unique<CurlTransfer>(settings_, share_);
+  if (idle_.empty()) return std::make_unique<CurlTransfer>(loop_, settings_, share_);
   auto transfer = std::move(idle_.back());
   idle_.pop_back();
   return transfer;
@@ -239,6 +252,15 @@ std::shared_ptr<CurlURLTask> CurlConnections::_release(CurlTransfer& transfer) {
   return task;
 }
 
+void CurlConnections::_watch(curl_socket_t socket, std::uint32_t events) {
+  auto& watch = watches_[socket];
+  if (watch) return loop_.changeEvents(socket, events);
+  watch = loop_.watch(socket, events, [this, socket](std::uint32_t arrived) {
+    loop_.assertCurrent();
+    _ready(socket, arrived);
+  });
+}
+
 int CurlConnections::_onSocket(CURL*, curl_socket_t socket, int what, void* self, void*) {
   auto& connections = *static_cast<CurlConnections*>(self);
   connections.loop_.assertCurrent();
@@ -248,19 +270,13 @@ int CurlConnections::_onSocket(CURL*, curl_socket_t socket, int what, void* self
   }
   const std::uint32_t events =
       (what & CURL_POLL_IN ? EPOLLIN : 0u) | (what & CURL_POLL_OUT ? EPOLLOUT : 0u);
-  auto& watch = connections.watches_[socket];
-  if (watch) {
-    connections.loop_.changeEvents(socket, events);
-  } else {
-    watch = connections.loop_.watch(socket, events, [&connections, socket](std::uint32_t is) {
-      connections._ready(socket, is);
-    });
-  }
+  connections._watch(socket, events);
   return 0;
 }
 
 int CurlConnections::_onTimer(CURLM*, long milliseconds, void* self) {
   auto& connections = *static_cast<CurlConnections*>(self);
+  connections.loop_.assertCurrent();
   const auto due =
       milliseconds < 0 ? kNever : steadyNow() + std::chrono::milliseconds(milliseconds);
   connections._setDue(connections.curlDue_, due);

@@ -38,28 +38,29 @@ class CurlConnections final {
   // How many connections may be kept for later.
   void setMaximumIdle(long count);
   void retire();
-  bool isClosed() const { return closed_; }
+  bool isClosed() const;
   // Gives up the tasks under way; the caller drops them.
   std::vector<std::shared_ptr<CurlURLTask>> close();
 
  private:
   static constexpr SteadyTime kNever = LoopTimer::kNever;
 
-  void _open();
-  void _closeMulti();
-  std::unique_ptr<CurlTransfer> _takeTransfer();
-  void _start(CurlTransfer& transfer);
-  void _collectEnded();
-  void _ended(CurlTransfer& transfer, CURLcode code);
-  bool _follow(CurlTransfer& transfer, URLResult& result);
-  void _finish(CurlTransfer& transfer, URLResult result);
-  std::shared_ptr<CurlURLTask> _release(CurlTransfer& transfer);
-  void _loopEnded();
-  void _ready(curl_socket_t socket, std::uint32_t events);
+  void _open() ZK_REQUIRES(loop_);
+  void _closeMulti() ZK_REQUIRES(loop_);
+  std::unique_ptr<CurlTransfer> _takeTransfer() ZK_REQUIRES(loop_);
+  void _start(CurlTransfer& transfer) ZK_REQUIRES(loop_);
+  void _collectEnded() ZK_REQUIRES(loop_);
+  void _ended(CurlTransfer& transfer, CURLcode code) ZK_REQUIRES(loop_);
+  bool _follow(CurlTransfer& transfer, URLResult& result) ZK_REQUIRES(loop_);
+  void _finish(CurlTransfer& transfer, URLResult result) ZK_REQUIRES(loop_);
+  std::shared_ptr<CurlURLTask> _release(CurlTransfer& transfer) ZK_REQUIRES(loop_);
+  void _loopEnded() ZK_REQUIRES(loop_);
+  void _watch(curl_socket_t socket, std::uint32_t events) ZK_REQUIRES(loop_);
+  void _ready(curl_socket_t socket, std::uint32_t events) ZK_REQUIRES(loop_);
   // Sets one of the times below, and with it when `_runDue` is wanted next.
-  void _setDue(SteadyTime& which, SteadyTime time);
-  void _runDue();
-  void _endOverdue(SteadyTime now);
+  void _setDue(SteadyTime& which, SteadyTime time) ZK_REQUIRES(loop_);
+  void _runDue() ZK_REQUIRES(loop_);
+  void _endOverdue(SteadyTime now) ZK_REQUIRES(loop_);
 
   static int _onSocket(CURL*, curl_socket_t socket, int what, void* self, void*);
   static int _onTimer(CURLM*, long milliseconds, void* self);
@@ -69,21 +70,21 @@ class CurlConnections final {
   const CurlSettings settings_;
 
   // The loop's.
-  bool open_ = false;
-  bool retired_ = false;
-  bool closed_ = false;
-  long maximumIdle_;
-  CURLSH* share_ = nullptr;
-  CURLM* multi_ = nullptr;
-  std::vector<std::unique_ptr<CurlTransfer>> active_;
-  std::vector<std::unique_ptr<CurlTransfer>> idle_;
-  bool fastOpenFails_ = false;
-  SteadyTime curlDue_ = kNever;
-  SteadyTime overdueCheck_ = kNever;  // no transfer is overdue before
-  SteadyTime purgeDue_ = kNever;
+  bool open_ ZK_ON(loop_) = false;
+  bool retired_ ZK_ON(loop_) = false;
+  bool closed_ ZK_ON(loop_) = false;
+  long maximumIdle_ ZK_ON(loop_);
+  CURLSH* share_ ZK_ON(loop_) = nullptr;
+  CURLM* multi_ ZK_ON(loop_) = nullptr;
+  std::vector<std::unique_ptr<CurlTransfer>> active_ ZK_ON(loop_);
+  std::vector<std::unique_ptr<CurlTransfer>> idle_ ZK_ON(loop_);
+  bool fastOpenFails_ ZK_ON(loop_) = false;
+  SteadyTime curlDue_ ZK_ON(loop_) = kNever;
+  SteadyTime overdueCheck_ ZK_ON(loop_) = kNever;  // no transfer is overdue before
+  SteadyTime purgeDue_ ZK_ON(loop_) = kNever;
   LoopTimer timer_;
-  std::unordered_map<curl_socket_t, Subscription> watches_;
-  Subscription loopEnd_;
+  std::unordered_map<curl_socket_t, Subscription> watches_ ZK_ON(loop_);
+  Subscription loopEnd_ ZK_ON(loop_);
 };
 
 }  // namespace zelkord

@@ -18,6 +18,7 @@ CurlPartitions::CurlPartitions(Loop& loop, CurlSettings settings)
 
 void CurlPartitions::begin(std::shared_ptr<CurlURLTask> task, CurlURLTask::Order order,
                            TransferPlace place) {
+  loop_.assertCurrent();
   if (closed_) return;
   std::erase_if(retired_, [](const auto& connections) { return connections->isClosed(); });
   if (_isPast(order)) {
@@ -72,6 +73,7 @@ void CurlPartitions::_retire(Partitions::iterator partition) {
 }
 
 void CurlPartitions::endIdentity(const std::string& identity) {
+  loop_.assertCurrent();
   ++endings_;
   ended_.push_back(identity);
   if (ended_.size() > kMaximumEnded) ended_.pop_front();
@@ -82,12 +84,14 @@ void CurlPartitions::endIdentity(const std::string& identity) {
 }
 
 void CurlPartitions::cancel(CurlURLTask& task) {
+  loop_.assertCurrent();
   const auto cancels = [&task](const auto& connections) { return connections->cancel(task); };
   if (std::ranges::any_of(live_, cancels, &Partition::connections)) return;
   (void)std::ranges::any_of(retired_, cancels);
 }
 
 std::vector<std::shared_ptr<CurlURLTask>> CurlPartitions::close() {
+  loop_.assertCurrent();
   closed_ = true;
   for (auto& partition : live_) retired_.push_back(std::move(partition.connections));
   live_.clear();

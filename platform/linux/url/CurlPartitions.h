@@ -41,23 +41,23 @@ class CurlPartitions final {
   };
   using Partitions = std::vector<Partition>;
 
-  CurlConnections& _connectionsFor(const CurlURLTask::Order& order);
-  bool _isPast(const CurlURLTask::Order& order) const;
-  CurlConnections& _add(const std::string& identity);
+  CurlConnections& _connectionsFor(const CurlURLTask::Order& order) ZK_REQUIRES(loop_);
+  bool _isPast(const CurlURLTask::Order& order) const ZK_REQUIRES(loop_);
+  CurlConnections& _add(const std::string& identity) ZK_REQUIRES(loop_);
   std::shared_ptr<CurlConnections> _make() const;
-  void _retire(Partitions::iterator partition);
-  void _shareIdleConnections();
+  void _retire(Partitions::iterator partition) ZK_REQUIRES(loop_);
+  void _shareIdleConnections() ZK_REQUIRES(loop_);
 
   // Fixed after construction.
   Loop& loop_;
   const CurlSettings settings_;
 
   // The loop's.
-  bool closed_ = false;
-  Partitions live_;  // the last used by an identity last
-  std::vector<std::shared_ptr<CurlConnections>> retired_;
-  std::deque<std::string> ended_;  // the latest last
-  std::uint64_t endings_ = 0;
+  bool closed_ ZK_ON(loop_) = false;
+  Partitions live_ ZK_ON(loop_);  // the last used by an identity last
+  std::vector<std::shared_ptr<CurlConnections>> retired_ ZK_ON(loop_);
+  std::deque<std::string> ended_ ZK_ON(loop_);  // the latest last
+  std::uint64_t endings_ ZK_ON(loop_) = 0;
 };
 
 }  // namespace zelkord

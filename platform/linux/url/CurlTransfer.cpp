@@ -44,8 +44,9 @@ std::string endpointText(const std::string& address, long port) {
 
 }  // namespace
 
-CurlTransfer::CurlTransfer(const CurlSettings& settings, CURLSH* share)
-    : handle_(curl_easy_init()),
+CurlTransfer::CurlTransfer(const Loop& loop, const CurlSettings& settings, CURLSH* share)
+    : loop_(loop),
+      handle_(curl_easy_init()),
       hasFastOpen_(settings.fastOpen),
       multiplexes_(settings.multiplexes),
       interfaces_(settings.interfaces) {
@@ -77,6 +78,7 @@ void CurlTransfer::_setCallbacks() {
 
 void CurlTransfer::begin(std::shared_ptr<CurlURLTask> task, CurlURLTask::Order order,
                          TransferPlace taken) {
+  loop_.assertCurrent();
   task_ = std::move(task);
   task_->transfer = this;
   order_ = std::move(order);
@@ -88,6 +90,7 @@ void CurlTransfer::begin(std::shared_ptr<CurlURLTask> task, CurlURLTask::Order o
 }
 
 void CurlTransfer::restart(std::shared_ptr<const URLRequest> request) {
+  loop_.assertCurrent();
   order_.request = std::move(request);
   begun_ = progressed_ = steadyNow();
   bytesMoved_ = 0;
@@ -114,6 +117,7 @@ void CurlTransfer::restart(std::shared_ptr<const URLRequest> request) {
 }
 
 std::shared_ptr<CurlURLTask> CurlTransfer::endTask() {
+  loop_.assertCurrent();
   task_->transfer = nullptr;
   curl_easy_setopt(handle_, CURLOPT_POSTFIELDS, nullptr);
   order_ = {};
@@ -198,6 +202,7 @@ SteadyTime CurlTransfer::deadline() const {
 }
 
 URLResult CurlTransfer::takeResult(CURLcode code) {
+  loop_.assertCurrent();
   URLResult result;
   result.response = response_.takeResponse(order_.request->url);
   if (response_.isTooLarge()) {
@@ -226,6 +231,7 @@ double CurlTransfer::_milliseconds(CURLINFO time) const {
 }
 
 void CurlTransfer::recordTiming(bool hasResponse) {
+  loop_.assertCurrent();
   timing_.reused = requestsSent_ > 0 && curlLong(handle_, CURLINFO_NUM_CONNECTS) == 0;
   const bool connected = !timing_.reused;
   timing_.domainLookup = connected ? _milliseconds(CURLINFO_NAMELOOKUP_TIME_T) : -1;
@@ -257,12 +263,14 @@ std::optional<json::object> CurlTransfer::connectionInformation() const {
 
 std::size_t CurlTransfer::_onHeader(char* bytes, std::size_t, std::size_t size, void* self) {
   auto& transfer = *static_cast<CurlTransfer*>(self);
+  transfer.loop_.assertCurrent();
   transfer.progressed_ = steadyNow();
   return transfer.response_.addHeaderLine({bytes, size}) ? size : 0;
 }
 
 std::size_t CurlTransfer::_onBody(char* bytes, std::size_t, std::size_t size, void* self) {
   auto& transfer = *static_cast<CurlTransfer*>(self);
+  transfer.loop_.assertCurrent();
   transfer.progressed_ = steadyNow();
   return transfer.response_.addBody({bytes, size}) ? size : CURL_WRITEFUNC_ERROR;
 }
@@ -271,6 +279,7 @@ std::size_t CurlTransfer::_onBody(char* bytes, std::size_t, std::size_t size, vo
 // connection that it had kept was closed.
 int CurlTransfer::_onRequest(void* self, char*, char*, int, int) {
   auto& transfer = *static_cast<CurlTransfer*>(self);
+  transfer.loop_.assertCurrent();
   transfer.progressed_ = steadyNow();
   const int allowed = mayBeRepeated(*transfer.order_.request) ? 2 : 1;
   if (transfer.requestsSent_ < allowed) {
@@ -284,6 +293,7 @@ int CurlTransfer::_onRequest(void* self, char*, char*, int, int) {
 int CurlTransfer::_onProgress(void* self, curl_off_t, curl_off_t received, curl_off_t,
                               curl_off_t sent) {
   auto& transfer = *static_cast<CurlTransfer*>(self);
+  transfer.loop_.assertCurrent();
   if (const auto moved = received + sent; moved != transfer.bytesMoved_) {
     transfer.bytesMoved_ = moved;
     transfer.progressed_ = steadyNow();

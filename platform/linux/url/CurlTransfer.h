@@ -9,6 +9,7 @@
 #include <string>
 
 #include "platform/api/URLRequest.h"
+#include "platform/linux/loop/Loop.h"
 #include "platform/linux/url/CurlSettings.h"
 #include "platform/linux/url/CurlURLTask.h"
 #include "platform/linux/url/HeaderLines.h"
@@ -24,10 +25,10 @@ namespace zelkord {
 // States: idle, or carrying a task (`begin` to `endTask`); between `begin` and the handle's removal
 // from the multi handle, libcurl calls back into it.
 //
-// Threading: the loop. Ownership: `share` outlives it.
+// Threading: the loop; destroyed on any. Ownership: the loop and `share` outlive it.
 class CurlTransfer final {
  public:
-  CurlTransfer(const CurlSettings& settings, CURLSH* share);
+  CurlTransfer(const Loop& loop, const CurlSettings& settings, CURLSH* share);
   ~CurlTransfer();
   CurlTransfer(const CurlTransfer&) = delete;
   CurlTransfer& operator=(const CurlTransfer&) = delete;
@@ -79,6 +80,7 @@ class CurlTransfer final {
   static int _onProgress(void* self, curl_off_t, curl_off_t received, curl_off_t, curl_off_t sent);
 
   // Fixed after construction.
+  const Loop& loop_;
   CURL* const handle_;
   const bool hasFastOpen_;
   const bool multiplexes_;

@@ -30,10 +30,14 @@ TransferLine::TransferLine(std::shared_ptr<Loop> loop, const TransferLimits& lim
       transfers_("transfers", limits.transfers, reports),
       patientTransfers_("transfers", limits.patientTransfers, reports),
       waiting_("waiting_transfers", limits.waiting, reports),
-      timer_(*loop_, [this] { _endOverdue(); }) {}
+      timer_(*loop_, [this] {
+        loop_->assertCurrent();
+        _endOverdue();
+      }) {}
 
 void TransferLine::enter(std::shared_ptr<CurlURLTask> task,
                          const std::shared_ptr<CurlPartitions>& partitions) {
+  loop_->assertCurrent();
   auto order = task->order();
   if (!order) return task->finish({});
   const auto host = hostOfRequest(*order->request);
@@ -65,7 +69,12 @@ void TransferLine::_wait(const std::string& host, const CurlURLTask::Order& orde
         {.error = urlError(URLErrorCode::CannotConnect, "too many requests wait for the host")});
   }
   if (reports_) reports_->refused(transfers_.name(), host);
-  if (!loopEnd_) loopEnd_ = loop_->atEnd([this] { _loopEnded(); });
+  if (!loopEnd_) {
+    loopEnd_ = loop_->atEnd([this] {
+      loop_->assertCurrent();
+      _loopEnded();
+    });
+  }
   waiting.share = *std::move(share);
   _setDue(std::min(due_, waiting.deadline));
   auto& line = hosts_[host];
@@ -74,8 +83,10 @@ void TransferLine::_wait(const std::string& host, const CurlURLTask::Order& orde
 
 // In a task of its own: places are given back while libcurl is at work.
 void TransferLine::_placeFreed() {
+  loop_->assertCurrent();
   if (hosts_.empty() || std::exchange(turnPosted_, true)) return;
   loop_->post([self = shared_from_this()] {
+    self->loop_->assertCurrent();
     self->turnPosted_ = false;
     while (self->_beginNext()) {
     }
@@ -130,6 +141,7 @@ std::vector<std::shared_ptr<CurlURLTask>> TransferLine::_takeOut(Predicate isOut
 }
 
 bool TransferLine::cancel(const CurlURLTask& task) {
+  loop_->assertCurrent();
   if (hosts_.empty()) return false;
   const auto found =
       _takeOut([&task](const Waiting& waiting) { return waiting.task.get() == &task; });
@@ -138,6 +150,7 @@ bool TransferLine::cancel(const CurlURLTask& task) {
 }
 
 std::vector<std::shared_ptr<CurlURLTask>> TransferLine::leave(const CurlPartitions& partitions) {
+  loop_->assertCurrent();
   return _takeOut([&](const Waiting& waiting) { return waiting.partitions.get() == &partitions; });
 }
 

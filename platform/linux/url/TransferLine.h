@@ -51,17 +51,19 @@ class TransferLine final : public std::enable_shared_from_this<TransferLine> {
     bool isEmpty() const { return normal.empty() && low.empty(); }
   };
 
-  std::optional<TransferPlace> _takePlace(const std::string& host, const CurlURLTask::Order& order);
-  void _wait(const std::string& host, const CurlURLTask::Order& order, Waiting waiting);
+  std::optional<TransferPlace> _takePlace(const std::string& host, const CurlURLTask::Order& order)
+      ZK_REQUIRES(*loop_);
+  void _wait(const std::string& host, const CurlURLTask::Order& order, Waiting waiting)
+      ZK_REQUIRES(*loop_);
   void _placeFreed();
-  bool _beginNext();
-  bool _beginOneOf(const std::string& host, Queue& queue);
-  void _endOverdue();
-  void _loopEnded();
-  void _setDue(SteadyTime time);
+  bool _beginNext() ZK_REQUIRES(*loop_);
+  bool _beginOneOf(const std::string& host, Queue& queue) ZK_REQUIRES(*loop_);
+  void _endOverdue() ZK_REQUIRES(*loop_);
+  void _loopEnded() ZK_REQUIRES(*loop_);
+  void _setDue(SteadyTime time) ZK_REQUIRES(*loop_);
   // Takes out those that `isOut` names.
   template <typename Predicate>
-  std::vector<std::shared_ptr<CurlURLTask>> _takeOut(Predicate isOut);
+  std::vector<std::shared_ptr<CurlURLTask>> _takeOut(Predicate isOut) ZK_REQUIRES(*loop_);
 
   // Fixed after construction.
   const std::shared_ptr<Loop> loop_;
@@ -71,12 +73,12 @@ class TransferLine final : public std::enable_shared_from_this<TransferLine> {
   Budget waiting_;
 
   // The loop's.
-  bool turnPosted_ = false;
-  std::map<std::string, Host> hosts_;  // those for which somebody waits
-  std::string lastServed_;
-  SteadyTime due_ = LoopTimer::kNever;  // nobody's time is up before
+  bool turnPosted_ ZK_ON(*loop_) = false;
+  std::map<std::string, Host> hosts_ ZK_ON(*loop_);  // those for which somebody waits
+  std::string lastServed_ ZK_ON(*loop_);
+  SteadyTime due_ ZK_ON(*loop_) = LoopTimer::kNever;  // nobody's time is up before
   LoopTimer timer_;
-  Subscription loopEnd_;
+  Subscription loopEnd_ ZK_ON(*loop_);
 };
 
 }  // namespace zelkord
