@@ -25,6 +25,7 @@
 #include "platform/linux/location/LinuxLocation.h"
 #include "platform/linux/log/FileLog.h"
 #include "platform/linux/log/LinuxLog.h"
+#include "platform/linux/loop/Loop.h"
 #include "platform/linux/management/LinuxManagement.h"
 #include "platform/linux/maps/LinuxMaps.h"
 #include "platform/linux/memory_pressure/LinuxMemoryPressure.h"
@@ -204,8 +205,9 @@ struct LinuxPlatform::Services {
   BinaryPropertyLists propertyLists;
   SystemRandom random;
   LinuxTagger tagger;
-  LinuxMemoryPressure memoryPressure{log};
-  PathWatcher watcher{log};
+  Loop host{"zelkord-host"};  // what the services below wait for
+  LinuxMemoryPressure memoryPressure{host, log};
+  PathWatcher watcher{host, log};
 
   const HostLocaleSources localeSources = HostLocaleSources::ofProcess();
   const HostLocale hostLocale = readHostLocale(localeSources);
@@ -214,12 +216,14 @@ struct LinuxPlatform::Services {
       std::in_place, profileCandidates(configuration), profile, files, queues, &watcher, log};
   LinuxDevice device{*profile.current(), hostDevice(), files};
   LinuxLocale locale{profile, hostLocale, notificationCenter};
-  std::optional<HostLocaleWatcher> localeWatcher{std::in_place,
-                                                 localeSources,
-                                                 [this](HostLocale host) { locale.hostChanged(std::move(host)); },
-                                                 queues,
-                                                 watcher,
-                                                 log};
+  std::optional<HostLocaleWatcher> localeWatcher{
+      std::in_place,
+      localeSources,
+      [this](HostLocale changed) { locale.hostChanged(std::move(changed)); },
+      queues,
+      host,
+      watcher,
+      log};
   LinuxMaps maps{profile, locale, random};
   LinuxAccounts accounts{profile};
   LinuxManagement management{profile, files, log};
@@ -236,7 +240,7 @@ struct LinuxPlatform::Services {
                                    return true;
                                  },
                                  log};
-  MeteredNetwork meteredNetwork;
+  MeteredNetwork meteredNetwork{host};
   CurlURLSessions urlSessions;
   std::optional<ExitWhenIdle> exitWhenIdle;
 

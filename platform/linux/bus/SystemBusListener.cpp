@@ -1,57 +1,64 @@
 #include "platform/linux/bus/SystemBusListener.h"
 
-#include <poll.h>
-#include <sys/eventfd.h>
-
 #include <algorithm>
 #include <utility>
 
 namespace zelkord {
 
-SystemBusListener::SystemBusListener(Events events)
-    : events_(std::move(events)), stop_(::eventfd(0, EFD_CLOEXEC)), pause_(kShortestBusRetry) {}
+SystemBusListener::SystemBusListener(Loop& loop, Events events)
+    : loop_(loop), events_(std::move(events)), pause_(kShortestBusRetry) {}
 
 SystemBusListener::~SystemBusListener() { stop(); }
 
 void SystemBusListener::start() {
-  if (stop_) thread_ = std::thread([this] { _run(); });
+  started_ = true;
+  loop_.post(
+      [this] {
+        loop_.assertCurrent();
+        _connect();
+      },
+      LoopInbox::Runner::OwnThread);
 }
 
 void SystemBusListener::stop() {
-  const std::uint64_t one = 1;
-  if (thread_.joinable() && ::write(stop_.get(), &one, sizeof one) > 0) thread_.join();
+  if (!std::exchange(started_, false)) return;
+  loop_.sync([this] {
+    loop_.assertCurrent();
+    retry_.reset();
+    bus_.reset();
+  });
 }
 
-void SystemBusListener::_run() {
-  while (_listen() == BusEnd::Lost && _pause()) {
-  }
-}
-
-BusEnd SystemBusListener::_listen() {
-  std::string problem = "it has gone";
+void SystemBusListener::_connect() {
+  std::string problem;
   auto bus = openSystemBus(&problem);
-  auto end = BusEnd::Lost;
-  if (bus) {
-    events_.connected(bus.get());
-    end = dispatchBus(bus.get(), stop_.get(), [this] {
-      isAway_ = false;
-      pause_ = kShortestBusRetry;
-    });
-    bus.reset();
-  }
-  if (end == BusEnd::Lost) _tellAway(problem);
-  return end;
+  if (!bus) return _lost(problem);
+  events_.connected(bus.get());
+  bus_ = std::make_unique<BusWatch>(loop_, std::move(bus),
+                                    BusWatch::Events{[this] {
+                                                       loop_.assertCurrent();
+                                                       _ready();
+                                                     },
+                                                     [this] {
+                                                       loop_.assertCurrent();
+                                                       bus_.reset();
+                                                       _lost("it has gone");
+                                                     }});
+  bus_->start();
 }
 
-void SystemBusListener::_tellAway(const std::string& problem) {
+void SystemBusListener::_ready() {
+  isAway_ = false;
+  pause_ = kShortestBusRetry;
+}
+
+void SystemBusListener::_lost(const std::string& problem) {
   if (!std::exchange(isAway_, true)) events_.away(problem);
-}
-
-bool SystemBusListener::_pause() {
   const auto pause = std::exchange(pause_, std::min<Duration>(pause_ * 2, kLongestBusRetry));
-  pollfd polled = {stop_.get(), POLLIN, 0};
-  const auto milliseconds = std::chrono::ceil<std::chrono::milliseconds>(pause).count();
-  return ::poll(&polled, 1, static_cast<int>(milliseconds)) <= 0;
+  retry_ = loop_.after(pause, [this] {
+    loop_.assertCurrent();
+    _connect();
+  });
 }
 
 }  // namespace zelkord

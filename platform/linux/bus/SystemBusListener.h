@@ -1,11 +1,11 @@
 #pragma once
 
 #include <functional>
+#include <memory>
 #include <string>
-#include <thread>
 
 #include "base/Time.h"
-#include "platform/linux/bus/SystemBus.h"
+#include "platform/linux/bus/BusWatch.h"
 
 namespace zelkord {
 
@@ -14,9 +14,9 @@ namespace zelkord {
 // States: connected; away, after a connection was lost or none could be had: it tries again, first
 // after `kShortestBusRetry`, then after twice the time before, at most after `kLongestBusRetry`.
 //
-// Threading: events, and every call-back registered on the connection, run on the listener's own
-// thread and must not wait. Stopping or destroying this waits for the one that runs; not on the
-// thread itself.
+// Threading: events, and every call-back registered on the connection, run on the loop and must not
+// wait. Stopping or destroying this waits for the one that runs; not on the loop itself.
+// Ownership: the loop outlives it.
 class SystemBusListener final {
  public:
   struct Events {
@@ -26,7 +26,7 @@ class SystemBusListener final {
     std::function<void(const std::string& problem)> away;
   };
 
-  explicit SystemBusListener(Events events);
+  SystemBusListener(Loop& loop, Events events);
   ~SystemBusListener();
   SystemBusListener(const SystemBusListener&) = delete;
   SystemBusListener& operator=(const SystemBusListener&) = delete;
@@ -37,19 +37,22 @@ class SystemBusListener final {
   void stop();
 
  private:
-  void _run();
-  BusEnd _listen();
-  void _tellAway(const std::string& problem);
-  // False when this was stopped meanwhile.
-  bool _pause();
+  void _connect() ZK_REQUIRES(loop_);
+  void _ready() ZK_REQUIRES(loop_);
+  void _lost(const std::string& problem) ZK_REQUIRES(loop_);
 
+  // Fixed after construction.
+  Loop& loop_;
   const Events events_;
-  const Descriptor stop_;
-  std::thread thread_;
 
-  // Of the thread.
-  bool isAway_ = false;
-  Duration pause_;
+  // The owner's.
+  bool started_ = false;
+
+  // The loop's.
+  std::unique_ptr<BusWatch> bus_ ZK_ON(loop_);
+  bool isAway_ ZK_ON(loop_) = false;
+  Duration pause_ ZK_ON(loop_);
+  Subscription retry_ ZK_ON(loop_);
 };
 
 inline constexpr Duration kShortestBusRetry = 250ms;

@@ -7,6 +7,7 @@
 #include "platform/linux/device_profile/LinuxDevice.h"
 #include "platform/linux/device_profile/OsRelease.h"
 #include "platform/linux/files/LinuxFileManager.h"
+#include "platform/linux/loop/Loop.h"
 #include "platform/linux/queues/LinuxWorkQueues.h"
 #include "platform/testing/FakeFileManager.h"
 #include "platform/testing/ManualTimeline.h"
@@ -115,7 +116,8 @@ class WatchedProfileTest : public testing::Test {
 };
 
 TEST_F(WatchedProfileTest, SeesEveryWayInWhichAFileChanges) {
-  PathWatcher watcher(log_);
+  Loop host("test-host");
+  PathWatcher watcher(host, log_);
   DeviceProfileLoader loader({root_ / "config/zelkord/device.json"}, store_, files_, queues_,
                              &watcher, log_);
   root_.write("config/zelkord/device.json", R"({"country": "AA"})");

@@ -309,7 +309,8 @@ TEST(BusDoorTest, ABusThatComesBackIsJoinedAgain) {
   for (const bool watches : {true, false}) {
     SCOPED_TRACE(watches);
     RecordingLog log;
-    PathWatcher watcher(log);
+    Loop host("test-host");
+    PathWatcher watcher(host, log);
     IpcTestServer server(true, [&](SdBusOptions& options) {
       if (watches) options.watcher = &watcher;
     });
@@ -333,7 +334,8 @@ TEST(BusDoorTest, ABusThatComesBackIsJoinedAgain) {
 
 TEST(BusDoorTest, ABusThatComesLateIsJoinedAndItsNameTakenWhenItIsFree) {
   RecordingLog log;
-  PathWatcher watcher(log);
+  Loop host("test-host");
+  PathWatcher watcher(host, log);
   IpcTestDirectory directory;
   IpcTestBus bus(directory.path());
   const auto alias = directory.path() + "/alias";

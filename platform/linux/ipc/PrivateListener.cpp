@@ -78,6 +78,7 @@ void PrivateListener::_accept() {
   context_.loop.soon([weak = weak_from_this()] {
     const auto self = weak.lock();
     if (!self) return;
+    self->context_.loop.assertCurrent();
     self->acceptsOn_ = false;
     self->_accept();
   });

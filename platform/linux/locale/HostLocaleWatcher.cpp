@@ -56,13 +56,13 @@ std::map<std::string, std::string> localeVariables(const std::vector<std::string
 
 HostLocaleWatcher::HostLocaleWatcher(HostLocaleSources sources,
                                      std::function<void(HostLocale)> changed, WorkQueues& queues,
-                                     PathWatcher& watcher, LogSink& log)
+                                     Loop& host, PathWatcher& watcher, LogSink& log)
     : sources_(std::move(sources)),
       changed_(std::move(changed)),
       log_(log, ""),
       queue_(queues.makeSerialQueue("com.quenta.zelkord.hostlocale")),
-      bus_({[this](sd_bus* bus) { connected(bus); },
-            [this](const std::string& problem) { away(problem); }}) {
+      bus_(host, {[this](sd_bus* bus) { connected(bus); },
+                  [this](const std::string& problem) { away(problem); }}) {
   for (const auto& path : {sources_.localtimePath, sources_.timezonePath}) {
     watches_.push_back(watcher.watch(path, [this] { noteChange(); }));
   }

@@ -25,7 +25,7 @@ namespace zelkord {
 class HostLocaleWatcher final {
  public:
   HostLocaleWatcher(HostLocaleSources sources, std::function<void(HostLocale)> changed,
-                    WorkQueues& queues, PathWatcher& watcher, LogSink& log);
+                    WorkQueues& queues, Loop& host, PathWatcher& watcher, LogSink& log);
   ~HostLocaleWatcher();
 
  private:
@@ -47,7 +47,7 @@ class HostLocaleWatcher final {
   // What locale1 said last; empty until it says something.
   std::map<std::string, std::string> variables_ ZK_ON(queue_);
 
-  // State of the bus listener's thread.
+  // The host loop's.
   bool complained_ = false;
   bool wasConnected_ = false;
 

@@ -4,7 +4,7 @@
 
 #include "platform/api/Clock.h"
 #include "platform/api/Log.h"
-#include "platform/linux/bus/SystemBus.h"
+#include "platform/linux/bus/BusThread.h"
 #include "platform/linux/location/LocationSource.h"
 
 namespace zelkord {

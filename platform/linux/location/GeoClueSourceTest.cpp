@@ -6,6 +6,7 @@
 #include <mutex>
 #include <optional>
 
+#include "platform/linux/bus/BusThread.h"
 #include "platform/linux/ipc/IpcTestSupport.h"
 #include "platform/linux/locale/HostLocaleWatcher.h"
 #include "platform/linux/location/GeoClueSource.h"
@@ -268,12 +269,14 @@ TEST(HostLocaleWatcherTest, HearsOfTheSystemsLocaleAlsoAfterTheBusHasRestarted) 
   const LinuxClock clock;
   LinuxWorkQueues queues(clock, 2);
   RecordingLog log;
-  PathWatcher files(log);
+  Loop host("test-host");
+  PathWatcher files(host, log);
   HeardEvents heard;
   HostLocaleSources sources;
   sources.environment = [](const std::string&) { return "de_DE"; };
   HostLocaleWatcher watcher(
-      sources, [&](const HostLocale& host) { heard.note(host.locale); }, queues, files, log);
+      sources, [&](const HostLocale& changed) { heard.note(changed.locale); }, queues, host, files,
+      log);
   for (const auto& [language, locale] :
        {std::pair{"LANG=fr_FR.UTF-8", "fr_FR"}, {"LANG=it_IT.UTF-8", "it_IT"}}) {
     SCOPED_TRACE(locale);
@@ -298,13 +301,14 @@ TEST(HostLocaleWatcherTest, ReadsWhatTheSystemSaidWhileTheBusWasAway) {
   const LinuxClock clock;
   LinuxWorkQueues queues(clock, 2);
   RecordingLog log;
-  PathWatcher files(log);
+  Loop host("test-host");
+  PathWatcher files(host, log);
   HeardEvents heard;
   HostLocaleSources sources;
   sources.environment = [](const std::string&) { return "de_DE"; };
   std::optional<HostLocaleWatcher> watcher(
-      std::in_place, sources, [&](const HostLocale& host) { heard.note(host.locale); }, queues,
-      files, log);
+      std::in_place, sources, [&](const HostLocale& changed) { heard.note(changed.locale); },
+      queues, host, files, log);
   const auto announcer = openSystemBus(nullptr);
   EXPECT_TRUE(ipc::eventually([&] {
     ::sd_bus_emit_signal(announcer.get(), "/org/freedesktop/timedate1",

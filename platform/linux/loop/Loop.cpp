@@ -19,7 +19,9 @@ void Loop::assertCurrent() const {
   ZK_CHECK(isCurrent() || !_isRunning(), "the loop belongs to another thread");
 }
 
-bool Loop::post(Task task) { return _start() && inbox_->post(std::move(task)); }
+bool Loop::post(Task task, LoopInbox::Runner runner) {
+  return _start() && inbox_->post(std::move(task), runner);
+}
 
 // False once the loop is stopped.
 bool Loop::_start() {

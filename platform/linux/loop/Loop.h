@@ -39,7 +39,7 @@ class ZK_CAPABILITY("loop") Loop final : private LoopHost {
   Loop& operator=(const Loop&) = delete;
 
   // False, with the task dropped, once the loop is stopped.
-  bool post(Task task);
+  bool post(Task task, LoopInbox::Runner runner = LoopInbox::Runner::Anybody);
   // Returns after the task has run where the loop's tasks run; inline when that is the caller's
   // thread, or the loop has ended.
   void sync(FunctionRef<void()> task);

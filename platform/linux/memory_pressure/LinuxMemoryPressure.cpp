@@ -4,7 +4,7 @@
 
 namespace zelkord {
 
-// Shared with the watch's thread and with subscriptions.
+// Shared with the watch and with subscriptions.
 struct LinuxMemoryPressure::Listeners {
   struct Listener {
     WorkQueue* queue;
@@ -36,8 +36,9 @@ struct LinuxMemoryPressure::Listeners {
   }
 };
 
-LinuxMemoryPressure::LinuxMemoryPressure(LogSink& log, std::string pressureFile)
-    : log_(log, "default"),
+LinuxMemoryPressure::LinuxMemoryPressure(Loop& host, LogSink& log, std::string pressureFile)
+    : host_(host),
+      log_(log, "default"),
       pressureFile_(std::move(pressureFile)),
       listeners_(std::make_shared<Listeners>()) {}
 
@@ -62,12 +63,13 @@ void LinuxMemoryPressure::_watch() ZK_NO_ANALYSIS {
   const auto critical = [weak = std::weak_ptr(listeners_)] {
     if (const auto listeners = weak.lock()) listeners->tellAll();
   };
-  listeners_->watch = watchKernelPressure(pressureFile_.c_str(), critical);
+  listeners_->watch = watchKernelPressure(host_, pressureFile_.c_str(), critical);
   if (listeners_->watch) return;
-  listeners_->watch = watchLowMemoryMonitor(critical, [log = log_, wasLogged = false]() mutable {
-    if (!std::exchange(wasLogged, true))
-      log.info("this system does not tell about memory pressure");
-  });
+  listeners_->watch =
+      watchLowMemoryMonitor(host_, critical, [log = log_, wasLogged = false]() mutable {
+        if (!std::exchange(wasLogged, true))
+          log.info("this system does not tell about memory pressure");
+      });
 }
 
 }  // namespace zelkord

@@ -13,12 +13,12 @@ namespace zelkord {
 
 // Critical memory pressure: the kernel's pressure-stall information, else the system bus's
 // LowMemoryMonitor, else none until there is a bus, which is logged once. Watches from the first
-// listener on, asleep in between; nothing polls.
+// listener on, on the host's loop; nothing polls.
 //
-// Threading: any thread. Ownership: subscriptions may outlive it.
+// Threading: any thread. Ownership: the loop outlives it; subscriptions may outlive it.
 class LinuxMemoryPressure final : public MemoryPressure {
  public:
-  explicit LinuxMemoryPressure(LogSink& log, std::string pressureFile = "/proc/pressure/memory");
+  LinuxMemoryPressure(Loop& host, LogSink& log, std::string pressureFile = "/proc/pressure/memory");
   ~LinuxMemoryPressure() override;
 
   Subscription onCritical(WorkQueue& queue, Task task) override;
@@ -27,6 +27,7 @@ class LinuxMemoryPressure final : public MemoryPressure {
   struct Listeners;
   void _watch();
 
+  Loop& host_;
   const Logger log_;
   const std::string pressureFile_;
   const std::shared_ptr<Listeners> listeners_;

@@ -18,7 +18,8 @@ TEST(LinuxMemoryPressureTest, SaysOnceThatNothingTellsAboutPressure) {
   RecordingLog log;
   ManualTimeline timeline;
   const auto queue = timeline.makeSerialQueue("test");
-  LinuxMemoryPressure pressure(log, "/nonexistent/pressure");
+  Loop host("test-host");
+  LinuxMemoryPressure pressure(host, log, "/nonexistent/pressure");
   for (int i = 0; i < 3; ++i) {
     auto subscription = pressure.onCritical(*queue, [] {});
     EXPECT_TRUE(subscription);
@@ -46,7 +47,9 @@ TEST(LinuxMemoryPressureTest, HearsAMonitorOfABusThatRestarts) {
   ::setenv("DBUS_SYSTEM_BUS_ADDRESS", bus->address().c_str(), 1);
   std::atomic<int> warnings = 0;
   std::atomic<int> missing = 0;
-  const auto watch = watchLowMemoryMonitor([&] { ++warnings; }, [&] { ++missing; });
+  Loop host("test-host");
+  const auto watch = watchLowMemoryMonitor(
+      host, [&] { ++warnings; }, [&] { ++missing; });
   EXPECT_TRUE(isHeard(warnings));
   bus->stop();
   EXPECT_TRUE(ipc::eventually([&] { return missing == 1; }));
@@ -59,7 +62,8 @@ TEST(LinuxMemoryPressureTest, ASubscriptionMayOutliveTheService) {
   RecordingLog log;
   ManualTimeline timeline;
   const auto queue = timeline.makeSerialQueue("test");
-  auto pressure = std::make_unique<LinuxMemoryPressure>(log);
+  Loop host("test-host");
+  auto pressure = std::make_unique<LinuxMemoryPressure>(host, log);
   auto subscription = pressure->onCritical(*queue, [] {});
   pressure.reset();
   subscription.reset();

@@ -1,11 +1,12 @@
 #include "platform/linux/memory_pressure/PressureWatch.h"
 
 #include <fcntl.h>
-#include <poll.h>
-#include <sys/eventfd.h>
 #include <systemd/sd-bus.h>
 
 #include <cstring>
+#include <utility>
+
+#include "platform/linux/files/Descriptor.h"
 
 namespace zelkord {
 namespace {
@@ -15,39 +16,44 @@ constexpr unsigned char kCriticalLevel = 255;
 
 class KernelPressureWatch final : public PressureWatch {
  public:
-  KernelPressureWatch(Descriptor pressure, std::function<void()> critical)
-      : pressure_(std::move(pressure)),
-        stop_(::eventfd(0, EFD_CLOEXEC)),
-        critical_(std::move(critical)),
-        thread_([this] { run(); }) {}
+  KernelPressureWatch(Loop& loop, Descriptor pressure, std::function<void()> critical)
+      : loop_(loop), pressure_(std::move(pressure)), critical_(std::move(critical)) {
+    loop_.post([this] { _begin(); }, LoopInbox::Runner::OwnThread);
+  }
 
   ~KernelPressureWatch() override {
-    ::eventfd_write(stop_.get(), 1);
-    thread_.join();
+    loop_.sync([this] {
+      loop_.assertCurrent();
+      watch_.reset();
+    });
   }
 
  private:
-  void run() {
-    pollfd waited[] = {{pressure_.get(), POLLPRI, 0}, {stop_.get(), POLLIN, 0}};
-    for (;;) {
-      if (::poll(waited, 2, -1) < 0 && errno != EINTR) return;
-      if (waited[1].revents || (waited[0].revents & POLLERR)) return;
-      if (waited[0].revents & POLLPRI) critical_();
-    }
+  void _begin() {
+    loop_.assertCurrent();
+    watch_ = loop_.watch(pressure_.get(), EPOLLPRI, [this](std::uint32_t events) {
+      loop_.assertCurrent();
+      _ready(events);
+    });
   }
 
+  void _ready(std::uint32_t events) ZK_REQUIRES(loop_) {
+    if (events & EPOLLERR) return watch_.reset();
+    if (events & EPOLLPRI) critical_();
+  }
+
+  Loop& loop_;
   const Descriptor pressure_;
-  const Descriptor stop_;
   const std::function<void()> critical_;
-  std::thread thread_;
+  Subscription watch_ ZK_ON(loop_);
 };
 
 class LowMemoryWatch final : public PressureWatch {
  public:
-  LowMemoryWatch(std::function<void()> critical, std::function<void()> missing)
+  LowMemoryWatch(Loop& loop, std::function<void()> critical, std::function<void()> missing)
       : critical_(std::move(critical)),
-        bus_({[this](sd_bus* bus) { connected(bus); },
-              [missing = std::move(missing)](const std::string&) { missing(); }}) {
+        bus_(loop, {[this](sd_bus* bus) { connected(bus); },
+                    [missing = std::move(missing)](const std::string&) { missing(); }}) {
     bus_.start();
   }
 
@@ -66,23 +72,23 @@ class LowMemoryWatch final : public PressureWatch {
   }
 
   const std::function<void()> critical_;
-  SystemBusListener bus_;  // last: its thread ends before the call-back goes
+  SystemBusListener bus_;  // last: it ends before the call-back goes
 };
 
 }  // namespace
 
-std::unique_ptr<PressureWatch> watchKernelPressure(const char* path,
+std::unique_ptr<PressureWatch> watchKernelPressure(Loop& loop, const char* path,
                                                    std::function<void()> critical) {
   Descriptor pressure(::open(path, O_RDWR | O_NONBLOCK | O_CLOEXEC));
   if (!pressure) return nullptr;
   const auto length = std::strlen(kPressureTrigger) + 1;
   if (::write(pressure.get(), kPressureTrigger, length) < 0) return nullptr;
-  return std::make_unique<KernelPressureWatch>(std::move(pressure), std::move(critical));
+  return std::make_unique<KernelPressureWatch>(loop, std::move(pressure), std::move(critical));
 }
 
-std::unique_ptr<PressureWatch> watchLowMemoryMonitor(std::function<void()> critical,
+std::unique_ptr<PressureWatch> watchLowMemoryMonitor(Loop& loop, std::function<void()> critical,
                                                      std::function<void()> missing) {
-  return std::make_unique<LowMemoryWatch>(std::move(critical), std::move(missing));
+  return std::make_unique<LowMemoryWatch>(loop, std::move(critical), std::move(missing));
 }
 
 }  // namespace zelkord

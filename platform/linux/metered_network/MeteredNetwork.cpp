@@ -34,9 +34,9 @@ struct MeteredNetwork::BusCallbacks {
   }
 };
 
-MeteredNetwork::MeteredNetwork()
-    : bus_({[this](sd_bus* bus) { _connected(bus); },
-            [this](const std::string&) { metered_ = false; }}) {
+MeteredNetwork::MeteredNetwork(Loop& host)
+    : bus_(host, {[this](sd_bus* bus) { _connected(bus); },
+                  [this](const std::string&) { metered_ = false; }}) {
   bus_.start();
 }
 

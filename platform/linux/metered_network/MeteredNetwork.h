@@ -9,12 +9,12 @@ namespace zelkord {
 // Whether the network costs its user money, as NetworkManager on the system bus says; not, where
 // there is none.
 //
-// Threading: any thread. Follows changes on a thread of its own, which sleeps in between.
+// Threading: any thread. Follows changes on the host's loop. Ownership: that outlives it.
 // Errors: none; what cannot be read counts as not metered, and is read again when NetworkManager or
 // the bus come back.
 class MeteredNetwork final {
  public:
-  MeteredNetwork();
+  explicit MeteredNetwork(Loop& host);
 
   bool isMetered() const { return metered_; }
 
@@ -24,7 +24,7 @@ class MeteredNetwork final {
   void _read(sd_bus* bus);
 
   std::atomic<bool> metered_ = false;
-  SystemBusListener bus_;  // last: its thread ends first
+  SystemBusListener bus_;  // last: it ends first
 };
 
 }  // namespace zelkord

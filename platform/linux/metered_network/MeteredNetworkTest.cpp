@@ -5,6 +5,7 @@
 #include <optional>
 #include <thread>
 
+#include "platform/linux/bus/BusThread.h"
 #include "platform/linux/ipc/IpcTestSupport.h"
 #include "platform/linux/metered_network/MeteredNetwork.h"
 
@@ -47,7 +48,8 @@ TEST(MeteredNetworkTest, FollowsABusThatRestarts) {
   std::optional<ipc::IpcTestBus> bus(directory.path());
   ::setenv("DBUS_SYSTEM_BUS_ADDRESS", bus->address().c_str(), 1);
   std::optional<NetworkManagerDouble> manager(1);
-  const MeteredNetwork network;
+  Loop host("test-host");
+  const MeteredNetwork network(host);
   EXPECT_TRUE(becomesMetered(network, ipc::kTestPatience));
   bus->stop();
   EXPECT_TRUE(ipc::eventually([&] { return !network.isMetered(); }));
@@ -63,14 +65,15 @@ TEST(MeteredNetworkTest, BelievesNetworkManager) {
   const ipc::IpcTestDirectory directory;
   const ipc::IpcTestBus bus{directory.path()};
   ::setenv("DBUS_SYSTEM_BUS_ADDRESS", bus.address().c_str(), 1);
+  Loop host("test-host");
   for (const auto& [value, expected] : {std::pair{1u, true}, {3u, true}, {4u, false}}) {
     SCOPED_TRACE(value);
     const NetworkManagerDouble manager(value);
-    const MeteredNetwork network;
+    const MeteredNetwork network(host);
     EXPECT_EQ(becomesMetered(network, expected ? Duration(ipc::kTestPatience) : 200ms), expected);
   }
   ::setenv("DBUS_SYSTEM_BUS_ADDRESS", "unix:path=/nonexistent/bus", 1);
-  EXPECT_FALSE(MeteredNetwork().isMetered());
+  EXPECT_FALSE(MeteredNetwork(host).isMetered());
   ::unsetenv("DBUS_SYSTEM_BUS_ADDRESS");
 }
 

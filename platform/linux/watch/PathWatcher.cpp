@@ -1,45 +1,42 @@
 #include "platform/linux/watch/PathWatcher.h"
 
-#include <poll.h>
-#include <sys/eventfd.h>
 #include <sys/inotify.h>
 
 #include <cerrno>
 #include <cstring>
 #include <map>
 #include <set>
-#include <thread>
 #include <utility>
 #include <vector>
 
 #include "base/Mutex.h"
 #include "platform/linux/files/Descriptor.h"
+#include "platform/linux/loop/Loop.h"
 #include "platform/linux/watch/WatchPlan.h"
 
 namespace zelkord {
 
-// What the thread and the subscriptions share.
+// What the loop and the subscriptions share.
 //
 // Each watched path has places: inotify watches on itself, on its directory, and on what stands
 // above it. An event in one of them makes the plan anew, since directories may have come or gone,
 // and runs the handler.
-class PathWatcher::Loop final {
+class PathWatcher::Inotify final : public std::enable_shared_from_this<Inotify> {
  public:
-  explicit Loop(LogSink& log)
-      : log_(log, ""),
-        inotify_(::inotify_init1(IN_NONBLOCK | IN_CLOEXEC)),
-        stop_(::eventfd(0, EFD_CLOEXEC)) {
+  Inotify(Loop& loop, LogSink& log)
+      : loop_(loop), log_(log, ""), inotify_(::inotify_init1(IN_NONBLOCK | IN_CLOEXEC)) {
     if (!inotify_) log_.error("files are not watched: {}", std::strerror(errno));
   }
 
-  void start() {
-    if (inotify_ && stop_) thread_ = std::thread([this] { run(); });
-  }
-
-  void stop() {
-    const std::uint64_t one = 1;
-    if (stop_ && ::write(stop_.get(), &one, sizeof one) < 0) return;
-    if (thread_.joinable()) thread_.join();
+  void end() {
+    {
+      const MutexLock lock(mutex_);
+      if (!isWatched_) return;
+    }
+    loop_.sync([this] {
+      loop_.assertCurrent();
+      watch_.reset();
+    });
   }
 
   int add(const std::string& path, std::function<void()> handler) {
@@ -49,17 +46,25 @@ class PathWatcher::Loop final {
     entry.path = path;
     entry.handler = std::make_shared<const std::function<void()>>(std::move(handler));
     place(id, entry);
+    if (inotify_ && !std::exchange(isWatched_, true)) {
+      loop_.post([self = shared_from_this()] { self->begin(); }, LoopInbox::Runner::OwnThread);
+    }
     return id;
   }
 
   void remove(int id) {
     forget(id);
     // Whoever cancels may go now: a handler that was already taken has ended.
-    if (std::this_thread::get_id() == thread_.get_id()) return;
+    if (loop_.isCurrent()) return;
     const MutexLock turn(handling_);
   }
 
  private:
+  void begin() {
+    loop_.assertCurrent();
+    watch_ = loop_.watch(inotify_.get(), EPOLLIN, [this](std::uint32_t) { tellChanged(); });
+  }
+
   void forget(int id) {
     const MutexLock lock(mutex_);
     entries_.erase(id);
@@ -102,15 +107,9 @@ class PathWatcher::Loop final {
     if (watch >= 0) places_[watch].names.emplace(id, spot.name);
   }
 
-  void run() {
-    pollfd polled[] = {{inotify_.get(), POLLIN, 0}, {stop_.get(), POLLIN, 0}};
-    while (true) {
-      const int ready = ::poll(polled, 2, -1);
-      if (ready < 0 && errno == EINTR) continue;
-      if (ready < 0 || polled[1].revents) return;
-      const MutexLock turn(handling_);
-      for (const auto& handler : takeChanged()) (*handler)();
-    }
+  void tellChanged() {
+    const MutexLock turn(handling_);
+    for (const auto& handler : takeChanged()) (*handler)();
   }
 
   std::vector<Handler> takeChanged() {
@@ -147,25 +146,31 @@ class PathWatcher::Loop final {
       places_.erase(place);  // the kernel dropped it; its number is not used again
   }
 
+  // Fixed after construction.
+  Loop& loop_;
   const Logger log_;
   const Descriptor inotify_;
-  const Descriptor stop_;
+
+  // The loop's.
+  Subscription watch_ ZK_ON(loop_);
+
   Mutex handling_;  // held while handlers run; before mutex_
   Mutex mutex_;
+  bool isWatched_ ZK_GUARDED_BY(mutex_) = false;
   int nextId_ ZK_GUARDED_BY(mutex_) = 1;
   std::map<int, Entry> entries_ ZK_GUARDED_BY(mutex_);
   std::map<int, Place> places_ ZK_GUARDED_BY(mutex_);  // by inotify watch
-  std::thread thread_;
 };
 
-PathWatcher::PathWatcher(LogSink& log) : loop_(std::make_shared<Loop>(log)) { loop_->start(); }
+PathWatcher::PathWatcher(Loop& loop, LogSink& log)
+    : inotify_(std::make_shared<Inotify>(loop, log)) {}
 
-PathWatcher::~PathWatcher() { loop_->stop(); }
+PathWatcher::~PathWatcher() { inotify_->end(); }
 
 Subscription PathWatcher::watch(const std::string& path, std::function<void()> handler) {
-  const int id = loop_->add(path, std::move(handler));
-  return Subscription([weak = std::weak_ptr(loop_), id] {
-    if (const auto loop = weak.lock()) loop->remove(id);
+  const int id = inotify_->add(path, std::move(handler));
+  return Subscription([weak = std::weak_ptr(inotify_), id] {
+    if (const auto inotify = weak.lock()) inotify->remove(id);
   });
 }
 

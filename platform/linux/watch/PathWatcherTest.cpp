@@ -5,6 +5,7 @@
 #include <filesystem>
 #include <thread>
 
+#include "platform/linux/loop/Loop.h"
 #include "platform/linux/watch/PathWatcher.h"
 #include "platform/testing/RecordingLog.h"
 #include "platform/testing/TemporaryDirectory.h"
@@ -27,7 +28,8 @@ bool soon(const std::function<bool()>& condition) {
 TEST(PathWatcherTest, SeesAFileWhateverItsDirectoriesDoMeanwhile) {
   const TemporaryDirectory root;
   RecordingLog log;
-  PathWatcher watcher(log);
+  Loop loop("zk-test");
+  PathWatcher watcher(loop, log);
   for (int round = 0; round < 100; ++round) {
     SCOPED_TRACE(round);
     const std::string file = "at" + std::to_string(round) + "/b/c/d/e/f/file";
