@@ -7,8 +7,8 @@
 
 namespace zelkord {
 
-// A counting semaphore. A thread that waits is compensated by another worker, so waiting never
-// starves the rest.
+// A counting semaphore. A thread that waits is compensated by another one, so waiting never starves
+// the rest.
 class Semaphore {
  public:
   virtual ~Semaphore() = default;

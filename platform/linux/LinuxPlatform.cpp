@@ -65,8 +65,9 @@ std::vector<std::string> profileCandidates(const ConfigurationDirectories& confi
 }
 
 ipc::SdBusOptions busOptions(const LinuxPlatformOptions& options, const LinuxFileManager& files,
-                             PathWatcher& watcher) {
+                             PathWatcher& watcher, LoopCrew& crew) {
   ipc::SdBusOptions bus;
+  bus.crew = &crew;
   bus.watcher = &watcher;
   bus.runtimeDirectory = files.directories().runtime;
   bus.usesSessionBus = options.usesSessionBus;
@@ -75,10 +76,11 @@ ipc::SdBusOptions busOptions(const LinuxPlatformOptions& options, const LinuxFil
 
 CurlURLSessions::Services urlServices(const std::shared_ptr<LinuxSettings>& settings,
                                       std::shared_ptr<const ProxyConfigurationSource> proxies,
-                                      const MeteredNetwork& network,
+                                      const MeteredNetwork& network, LoopCrew& crew,
                                       CurlURLSessions::Services::CacheHost cache,
                                       LimitReports& limits) {
   CurlURLSessions::Services services;
+  services.crew = &crew;
   services.isMetered = [&network] { return network.isMetered(); };
   services.maximumResponseSize = [settings] {
     return bytesSetting(*settings, "ZLKMaximumResponseSize");
@@ -158,9 +160,9 @@ struct LinuxPlatform::Services {
         settings(std::make_shared<LinuxSettings>(settingsOptions(files, configuration), files,
                                                  queues, log)),
         knowledge(hostDataHome(options.environment), files, queues, clock, log),
-        interprocess(queues, log, limits, busOptions(options, files, watcher)),
+        interprocess(queues, log, limits, busOptions(options, files, watcher, queues.crew())),
         urlSessions(queues,
-                    urlServices(settings, networkProxy, meteredNetwork,
+                    urlServices(settings, networkProxy, meteredNetwork, queues.crew(),
                                 {clock, log, files.directories().state + "/urlcache"}, limits)) {
     log.showPrivateDataWhen([weak = std::weak_ptr(settings)] {
       const auto alive = weak.lock();

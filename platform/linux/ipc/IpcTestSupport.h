@@ -354,6 +354,7 @@ class IpcTestServer {
     options.runtimeDirectory = directory.path() + "/run";
     options.usesHandedOverSocket = false;
     options.usesSessionBus = withBus;
+    options.crew = &queues.crew();
     if (withBus) {
       bus.emplace(directory.path());
       options.sessionBusAddress = bus->address();

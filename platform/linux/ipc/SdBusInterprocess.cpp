@@ -117,7 +117,8 @@ struct SdBusInterprocess::Doors {
 
 SdBusInterprocess::SdBusInterprocess(WorkQueues& queues, LogSink& log, LimitReports& limits,
                                      SdBusOptions options)
-    : context_(makeContext(loop_, queues, log, limits, std::move(options))),
+    : loop_("zelkord-ipc", options.crew),
+      context_(makeContext(loop_, queues, log, limits, std::move(options))),
       doors_(std::make_shared<Doors>()) {}
 
 SdBusInterprocess::~SdBusInterprocess() {

@@ -18,14 +18,14 @@ namespace zelkord::ipc {
 // without a bus. Both behave alike; the docs say what clients see.
 //
 // One loop has every sd-bus object and only frames, checks and dispatches; calls are handled on a
-// queue of their connection, and answers come back through the loop's inbox: to its thread, many a
-// wake-up, or, while that sleeps, sent by the worker itself. It sleeps while nobody calls.
+// queue of their connection, by who read them or by a worker, and answers come back through the
+// loop's inbox: to its leader, many a wake-up, or, while it sleeps, sent by who handled the call.
+// It sleeps while nobody calls.
 //
 // Threading: any thread, except the constructor, `listen` (once) and the destructor: one thread.
-// Ownership: log, limits, queues and the options' watcher outlive it; anonymous listeners may
-// outlive it, closed.
-// Errors: without a bus one error line, the socket alone is served until there is one; a name or a
-// socket that is taken fails `listen`.
+// Ownership: log, limits, queues and the options' watcher and crew outlive it; anonymous listeners
+// may outlive it, closed. Errors: without a bus one error line, the socket alone is served until
+// there is one; a name or a socket that is taken fails `listen`.
 class SdBusInterprocess final : public Interprocess {
  public:
   SdBusInterprocess(WorkQueues& queues, LogSink& log, LimitReports& limits, SdBusOptions options);
@@ -45,7 +45,7 @@ class SdBusInterprocess final : public Interprocess {
  private:
   struct Doors;
 
-  Loop loop_{"zelkord-ipc"};
+  Loop loop_;
   IpcContext context_;
   const std::shared_ptr<Doors> doors_;
 };

@@ -7,8 +7,9 @@
 #include "base/Time.h"
 
 namespace zelkord {
+class LoopCrew;
 class PathWatcher;
-}
+}  // namespace zelkord
 
 namespace zelkord::ipc {
 
@@ -22,6 +23,9 @@ struct SdBusOptions {
   std::string sessionBusAddress;
   // Tells when a session bus that was not there may be; null: it is looked for now and then.
   PathWatcher* watcher = nullptr;
+  // Who leads the loop and carries calls to their end; null: a thread of its own, and calls go to
+  // workers.
+  LoopCrew* crew = nullptr;
   // Takes the first listening Unix socket that the service manager handed over, instead of making
   // one.
   bool usesHandedOverSocket = true;

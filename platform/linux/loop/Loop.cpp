@@ -7,8 +7,13 @@
 
 namespace zelkord {
 
-Loop::Loop(const char* name)
-    : name_(name), inbox_(std::make_shared<LoopInbox>(static_cast<LoopHost&>(*this))) {
+Loop::Loop(const char* name, LoopCrew* crew)
+    : name_(name),
+      inbox_(std::make_shared<LoopInbox>(static_cast<LoopHost&>(*this))),
+      crew_(crew),
+      helm_(crew ? std::make_shared<LoopHelm>(*crew, static_cast<LedLoop&>(*this),
+                                              watches_.descriptor())
+                 : nullptr) {
   watches_.addWaker(inbox_->descriptor());
   watches_.addWaker(timers_.descriptor());
 }
@@ -27,8 +32,12 @@ bool Loop::post(Task task, LoopInbox::Runner runner) {
 bool Loop::_start() {
   const MutexLock lock(mutex_);
   if (state_ == State::NotStarted) {
+    if (crew_) {
+      crew_->begin(helm_);
+    } else {
+      thread_ = startServiceThread(name_, ThreadWork::Loop, [this] { lead(); });
+    }
     state_ = State::Running;
-    thread_ = startServiceThread(name_, ThreadWork::Loop, [this] { _run(); });
   }
   return state_ == State::Running;
 }
@@ -62,15 +71,17 @@ void Loop::stop() {
     const MutexLock lock(mutex_);
     if (state_ == State::NotStarted) dropped = inbox_->close();
     if (state_ == State::NotStarted) state_ = State::Ended;
-    if (state_ == State::Running) state_ = State::Stopping;
+    if (state_ != State::Running) return;
+    state_ = State::Stopping;
     thread = std::move(thread_);
   }
-  if (!thread.joinable()) return;
   inbox_->post([this] {
     assertCurrent();
     stopping_ = true;
   });
-  thread.join();
+  if (thread.joinable()) return thread.join();
+  const MutexLock lock(mutex_);
+  while (state_ != State::Ended) changed_.wait(mutex_);
 }
 
 Subscription Loop::watch(int descriptor, std::uint32_t events, LoopWatches::Ready ready) {
@@ -119,16 +130,40 @@ Subscription Loop::atEnd(Task task) {
   });
 }
 
-void Loop::_run() {
-  inbox_->begin();
+LedLoop::Left Loop::lead() {
+  inbox_->endSleep();
   assertCurrent();
+  WorkCarrier carrier(helm_);
   while (!stopping_) {
     _wait();
-    watches_.dispatch();
+    // What was read first does not wait for the rest.
+    watches_.dispatch([&carrier] { carrier.passOn(); });
     _work(inbox_->take());
+    if (!inSpareTime_.empty()) carrier.passOn();
     _runInSpareTime();
+    if (carrier.isLoaded() && !_carry(carrier)) return Left::TakenOver;
   }
+  carrier.close();
   _end();
+  return Left::Ended;
+}
+
+// False when somebody else leads the loop now: then nothing of it may be touched.
+bool Loop::_carry(WorkCarrier& carrier) {
+  if (!_goesAway()) {
+    carrier.passOn();
+    return true;
+  }
+  if (!carrier.carry()) return false;
+  inbox_->endSleep();
+  return true;
+}
+
+// Whether all is done that only the leader can do, so that the loop is asleep now.
+bool Loop::_goesAway() {
+  _work(inbox_->take());
+  timers_.setAlarm();
+  return !stopping_ && soon_.empty() && inSpareTime_.empty() && inbox_->beginSleep();
 }
 
 // Waits for events, or only looks for them when there is something else to do.
@@ -167,6 +202,7 @@ void Loop::_runInSpareTime() {
 }
 
 void Loop::_end() {
+  if (helm_) helm_->end();
   _work(inbox_->close());
   while (!endings_.empty()) {
     const auto last = endings_.extract(std::prev(endings_.end()));

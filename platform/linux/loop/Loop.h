@@ -13,6 +13,8 @@
 #include "base/Subscription.h"
 #include "base/Time.h"
 #include "platform/api/WorkQueue.h"
+#include "platform/linux/loop/CarriedWork.h"
+#include "platform/linux/loop/LoopCrew.h"
 #include "platform/linux/loop/LoopInbox.h"
 #include "platform/linux/loop/LoopTimers.h"
 #include "platform/linux/loop/LoopWatches.h"
@@ -24,16 +26,20 @@ namespace zelkord {
 // a loop of its own.
 //
 // States: not started (until the first `post` or `sync`), running, ended. Tasks run in the order in
-// which they were posted; a post costs at most one wake-up, none when the thread is awake.
+// which they were posted; a post costs at most one wake-up, none when somebody has the loop.
+//
+// With a crew it has no thread of its own: whoever leads it may carry what was read to its end
+// himself, see CarriedWork.
 //
 // Threading: `post`, `sync`, `stop`, `inbox` and `isCurrent` on any thread; everything else on the
 // one that the loop belongs to: its own, or one that runs posted tasks; before the start and after
 // the end any one at a time.
-// Ownership: outlives its subscriptions and timers; destroying it (not on its own thread) ends it.
-class ZK_CAPABILITY("loop") Loop final : private LoopHost {
+// Ownership: outlives its subscriptions and timers; destroying it (not from its tasks) ends it.
+// The crew outlives it.
+class ZK_CAPABILITY("loop") Loop final : private LoopHost, private LedLoop {
  public:
-  // `name`: the thread's, at most 15 bytes.
-  explicit Loop(const char* name);
+  // `name`: the thread's, at most 15 bytes. Without a crew the loop has a thread of its own.
+  explicit Loop(const char* name, LoopCrew* crew = nullptr);
   ~Loop() override;
   Loop(const Loop&) = delete;
   Loop& operator=(const Loop&) = delete;
@@ -43,7 +49,7 @@ class ZK_CAPABILITY("loop") Loop final : private LoopHost {
   // Returns after the task has run where the loop's tasks run; inline when that is the caller's
   // thread, or the loop has ended.
   void sync(FunctionRef<void()> task);
-  // Runs what is posted, then the tasks for the end, and ends the thread; the rest is dropped.
+  // Runs what is posted, then the tasks for the end, and ends the loop; the rest is dropped.
   void stop();
   // For those who may post late; nothing comes from it before the first `post` or `sync`.
   const std::shared_ptr<LoopInbox>& inbox() const { return inbox_; }
@@ -61,7 +67,7 @@ class ZK_CAPABILITY("loop") Loop final : private LoopHost {
   // Runs the task when the others have had their turn too: of such tasks, in their order, only as
   // many begin between two looks at what is ready as fit into kSpareTime.
   void inSpareTime(Task task);
-  // Runs the task before the thread ends, what came last first.
+  // Runs the task before the loop ends, what came last first.
   Subscription atEnd(Task task);
   LoopTimers& timers();
 
@@ -73,9 +79,14 @@ class ZK_CAPABILITY("loop") Loop final : private LoopHost {
   void runPosted(std::vector<Task> tasks) override;
   bool needsOwnThread() override;
 
+  // LedLoop
+  const char* name() const override { return name_; }
+  Left lead() override;
+
   bool _start();
   bool _isRunning() const;
-  void _run();
+  bool _carry(WorkCarrier& carrier) ZK_REQUIRES(this);
+  bool _goesAway() ZK_REQUIRES(this);
   void _wait() ZK_REQUIRES(this);
   void _work(std::vector<Task> tasks) ZK_REQUIRES(this);
   void _runInSpareTime() ZK_REQUIRES(this);
@@ -85,6 +96,7 @@ class ZK_CAPABILITY("loop") Loop final : private LoopHost {
   // Fixed after construction.
   const char* const name_;
   const std::shared_ptr<LoopInbox> inbox_;
+  LoopCrew* const crew_;
 
   mutable Mutex mutex_;
   CondVar changed_;  // a sync task has run, or the state has changed
@@ -99,6 +111,8 @@ class ZK_CAPABILITY("loop") Loop final : private LoopHost {
   std::deque<Task> inSpareTime_ ZK_ON(this);
   std::uint64_t lastEnding_ ZK_ON(this) = 0;
   std::map<std::uint64_t, Task> endings_ ZK_ON(this);
+
+  const std::shared_ptr<LoopHelm> helm_;  // null without a crew
 };
 
 }  // namespace zelkord

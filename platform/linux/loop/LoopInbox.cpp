@@ -5,6 +5,7 @@
 #include <utility>
 
 #include "base/Check.h"
+#include "platform/linux/loop/CarriedWork.h"
 #include "platform/linux/loop/ServiceThread.h"
 
 namespace zelkord {
@@ -36,6 +37,8 @@ bool LoopInbox::post(Task task, Runner runner) {
 }
 
 void LoopInbox::_runLent() {
+  // Others' tasks: what they bring does not wait for what the calling thread does besides.
+  const WorkCarrier::Pause pause;
   owner_ = std::this_thread::get_id();
   for (int round = 0; round < kLentRounds; ++round) {
     auto tasks = take();

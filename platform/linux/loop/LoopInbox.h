@@ -18,16 +18,16 @@ class LoopHost {
   virtual ~LoopHost() = default;
   // Runs the tasks, and what they leave to be done at once.
   virtual void runPosted(std::vector<Task> tasks) = 0;
-  // Whether the loop's own thread must wake up: for what only it can do, or to sleep less long.
+  // Whether its leader must wake up: for what only he can do, or to sleep less long.
   virtual bool needsOwnThread() = 0;
 };
 
-// Tasks on their way to a loop, and the loop itself while its thread sleeps.
+// Tasks on their way to a loop, and the loop itself while its leader sleeps or is away.
 //
 // States: the loop's thread is awake and will look here before it sleeps; it sleeps; it sleeps and
 // the loop is lent to a thread that has posted; closed, when tasks are dropped. Tasks run in the
 // order in which they were posted, never from within another one. Only service threads
-// that have no loop are lent this one, for a bounded number of tasks; others wake its thread.
+// that have no loop are lent this one, for a bounded number of tasks; others wake its leader.
 //
 // Threading: `post` and `isCurrent` on any thread, the rest on the loop's.
 // Ownership: shared with everything that may post late; the host lives until `close`.
@@ -37,7 +37,7 @@ class LoopInbox {
   LoopInbox(const LoopInbox&) = delete;
   LoopInbox& operator=(const LoopInbox&) = delete;
 
-  // Who may run a task. What takes long goes on beside the poster's work on the loop's own thread.
+  // Who may run a task. What takes long goes on beside the poster's work, with the loop's leader.
   enum class Runner { Anybody, OwnThread };
 
   // False, with the task dropped, once closed. It may have run when this returns.
@@ -47,13 +47,12 @@ class LoopInbox {
 
   // An edge at each wake-up of the loop's thread; there is nothing to read.
   int descriptor() const { return wakeUp_.get(); }
-  // The calling thread is the loop's own from `begin`, awake, to `end`.
-  void begin() { owner_ = std::this_thread::get_id(); }
+  // The calling thread is the loop's own no more.
   void end() { owner_ = std::thread::id(); }
   std::vector<Task> take();
   // From here to `endSleep` nothing of the loop's may be touched. False when there are tasks.
   bool beginSleep();
-  // Waits for the end of a loan.
+  // The calling thread is the loop's own from now on. Waits for the end of a loan.
   void endSleep();
   // What has come too late to be run by anybody else than the caller.
   std::vector<Task> close();

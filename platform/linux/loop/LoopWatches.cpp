@@ -59,13 +59,14 @@ void LoopWatches::wait(Wait wait) {
   count_ = ::epoll_wait(epoll_.get(), events_.data(), kEventsAtOnce, wait == Wait::Yes ? -1 : 0);
 }
 
-void LoopWatches::dispatch() {
+void LoopWatches::dispatch(FunctionRef<void()> before) {
   for (int i = 0; i < count_; ++i) {
     const auto& event = events_[static_cast<std::size_t>(i)];
     const std::uint64_t key = event.data.u64;  // the event is packed: no reference to its member
     const auto found = watched_.find(static_cast<int>(key & UINT32_MAX));
     if (found == watched_.end() || found->second->serial != key >> 32) continue;
     const auto watched = found->second;  // may be unwatched by its own call
+    before();
     watched->ready(event.events);
   }
 }

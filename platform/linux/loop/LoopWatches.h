@@ -8,14 +8,14 @@
 #include <memory>
 #include <unordered_map>
 
-#include "base/Namespace.h"
+#include "base/FunctionRef.h"
 #include "platform/linux/files/Descriptor.h"
 
 namespace zelkord {
 
 // The descriptors that a loop waits for.
 //
-// Threading: the loop; `wait` and `dispatch` on its own thread, `wait` also while somebody else has
+// Threading: the loop; `wait` and `dispatch` on its leader, `wait` also while somebody else has
 // the loop.
 class LoopWatches final {
  public:
@@ -24,6 +24,8 @@ class LoopWatches final {
 
   LoopWatches();
 
+  // Can be read while there are events that have not been waited for.
+  int descriptor() const { return epoll_.get(); }
   // Each edge of the descriptor ends a wait, and that is all.
   void addWaker(int descriptor);
   // The number by which it is removed: the descriptor's may soon be another one's.
@@ -35,8 +37,8 @@ class LoopWatches final {
 
   // Until there are events, unless some are left; or only looks for them.
   void wait(Wait wait);
-  // Tells whoever watches.
-  void dispatch();
+  // Tells whoever watches; `before` each of them.
+  void dispatch(FunctionRef<void()> before);
 
  private:
   static constexpr int kEventsAtOnce = 64;
@@ -50,7 +52,7 @@ class LoopWatches final {
 
   const Descriptor epoll_;
 
-  // Of the loop's own thread.
+  // The leader's.
   std::array<epoll_event, kEventsAtOnce> events_;
   int count_ = 0;
 

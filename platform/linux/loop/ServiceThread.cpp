@@ -42,4 +42,11 @@ std::thread startServiceThread(const char* name, ThreadWork work, std::function<
 
 bool mayBeLentLoops() { return tlsMayBeLentLoops; }
 
+ThreadWork setThreadWork(ThreadWork work) {
+  const bool did = std::exchange(tlsMayBeLentLoops, work == ThreadWork::Tasks);
+  return did ? ThreadWork::Tasks : ThreadWork::Loop;
+}
+
+void nameThread(const char* name) { ::pthread_setname_np(::pthread_self(), name); }
+
 }  // namespace zelkord

@@ -16,5 +16,9 @@ enum class ThreadWork { Tasks, Loop };
 std::thread startServiceThread(const char* name, ThreadWork work, std::function<void()> body);
 // Whether the calling thread was started so, for tasks.
 bool mayBeLentLoops();
+// Changes what the calling thread, started so, is there for; returns what it was.
+ThreadWork setThreadWork(ThreadWork work);
+// Of the calling thread, started so.
+void nameThread(const char* name);
 
 }  // namespace zelkord

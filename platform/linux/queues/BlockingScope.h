@@ -1,14 +1,15 @@
 #pragma once
 
-#include "base/Namespace.h"
+#include "platform/linux/loop/CarriedWork.h"
 
 namespace zelkord {
 
 class PoolWorker;
 
 // Around anything for which a thread may have to wait long (another process, the network, a disk, a
-// lock held across such): if the thread is a pool worker, another worker takes its turn meanwhile.
-// Costs nothing on other threads, two short locks on workers; nests.
+// lock held across such): if the thread is a pool worker, another worker takes its turn meanwhile;
+// what a leader of a loop has not begun is passed on. Costs nothing on other threads, two short
+// locks on workers; nests.
 class BlockingScope {
  public:
   BlockingScope();
@@ -23,6 +24,7 @@ class BlockingScope {
   bool isRefused() const { return isRefused_; }
 
  private:
+  const WorkCarrier::Pause pause_;
   bool isRefused_ = false;
   PoolWorker* const worker_;  // null when this scope changes nothing
 };

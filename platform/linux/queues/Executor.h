@@ -8,7 +8,7 @@ namespace zelkord {
 
 class QueueCore;
 
-// Who runs a queue's tasks: the worker pool or the main loop. Each submission is one call of
+// Who has a queue's tasks run: the worker pool or the main loop. Each submission is one call of
 // `runTicket` later. Threading: any thread.
 class Executor {
  public:

@@ -6,6 +6,7 @@
 #include <string>
 
 #include "platform/api/WorkQueues.h"
+#include "platform/linux/loop/LoopCrew.h"
 #include "platform/linux/queues/LinuxClock.h"
 #include "platform/linux/queues/WorkerPool.h"
 
@@ -42,6 +43,8 @@ class LinuxWorkQueues final : public WorkQueues {
   void runMainLoop();
   void stopMainLoop();
 
+  // For loops whose work goes to these queues. They end before this.
+  LoopCrew& crew() { return crew_; }
   WorkerPool::Counts workers() const { return pool_->counts(); }
   // See WorkerPool.
   void onRefusedWait(std::function<void()> report) { pool_->onRefusedWait(std::move(report)); }
@@ -53,6 +56,7 @@ class LinuxWorkQueues final : public WorkQueues {
   const std::shared_ptr<TimerService> timers_;
   const std::unique_ptr<SerialQueue> main_;
   std::array<std::unique_ptr<WorkQueue>, 4> globals_;
+  LoopCrew crew_;
 };
 
 }  // namespace zelkord

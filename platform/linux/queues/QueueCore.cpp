@@ -4,6 +4,7 @@
 #include <utility>
 
 #include "base/Check.h"
+#include "platform/linux/loop/CarriedWork.h"
 #include "platform/linux/queues/BlockingScope.h"
 #include "platform/linux/queues/Parker.h"
 #include "platform/linux/queues/QueueFrame.h"
@@ -169,6 +170,7 @@ bool QueueCore::_finish(Item& item, bool mayGoOn) {
     }
   }
   _perform(std::move(grants));
+  if (goesOn) WorkCarrier::passOnAll();
   return goesOn;
 }
 

@@ -5,6 +5,7 @@
 #include <thread>
 #include <utility>
 
+#include "platform/linux/loop/CarriedWork.h"
 #include "platform/linux/loop/ServiceThread.h"
 #include "platform/linux/queues/QueueCore.h"
 
@@ -27,7 +28,53 @@ WorkerPool::WorkerPool(unsigned limit, Duration idleLife)
 
 WorkerPool::~WorkerPool() { stop(); }
 
+// A ticket that the leader of a loop has: it counts until he has used it or passed it on.
+class WorkerPool::CarriedTicket final : public CarriedWork {
+ public:
+  CarriedTicket(WorkerPool& pool, Ticket ticket) : pool_(pool), ticket_(std::move(ticket)) {}
+
+  void run() override {
+    ticket_->runTicket();
+    ticket_.reset();
+    pool_._endCarrying();
+  }
+  void passOn() override {
+    pool_._place(std::move(ticket_));
+    pool_._endCarrying();
+  }
+
+ private:
+  WorkerPool& pool_;
+  Ticket ticket_;
+};
+
 void WorkerPool::submit(Ticket core) {
+  const int rank = static_cast<int>(core->quality());
+  if (WorkCarrier::takesWork(rank) && _letCarry(core)) {
+    WorkCarrier::give(std::make_shared<CarriedTicket>(*this, std::move(core)), rank);
+  } else {
+    _place(std::move(core));
+  }
+}
+
+bool WorkerPool::_letCarry(const Ticket& ticket) {
+  const auto quality = ticket->quality();
+  if (isLowQuality(quality)) return false;
+  const MutexLock lock(mutex_);
+  if (stopped_) return false;
+  for (auto better = static_cast<std::size_t>(quality); better < ready_.size(); ++better) {
+    if (!ready_[better].empty()) return false;
+  }
+  ++carried_;
+  return true;
+}
+
+void WorkerPool::_endCarrying() {
+  const MutexLock lock(mutex_);
+  if (--carried_ == 0 && stopped_) gone_.notifyAll();
+}
+
+void WorkerPool::_place(Ticket core) {
   Start start;
   {
     const MutexLock lock(mutex_);
@@ -149,6 +196,7 @@ void WorkerPool::_count(const PoolWorker& worker, int change) {
 
 PoolWorker* WorkerPool::beginBlocking(bool* isRefused) {
   PoolWorker* const worker = tlsPoolWorker;
+  if (!worker) WorkCarrier::passOnAll();
   if (!worker || worker->blocking_) return nullptr;
   WorkerPool& pool = worker->pool_;
   if (pool._tryBlock(*worker, isRefused != nullptr)) return worker;
@@ -208,7 +256,7 @@ void WorkerPool::stop() {
     worker->parker_.unpark();
   }
   idle_.clear();
-  while (counts_.total > 0) gone_.wait(mutex_);
+  while (counts_.total > 0 || carried_ > 0) gone_.wait(mutex_);
 }
 
 }  // namespace zelkord

@@ -33,7 +33,7 @@ class PoolWorker {
   bool blocking_ = false;                    // the worker's own
 };
 
-// The threads that run all queues' tasks.
+// The threads that run the queues' tasks.
 //
 // A worker is running, blocked (inside a BlockingScope) or idle. At most `limit` run; a blocked one
 // does not count, and its turn goes to another worker, made when none is idle. When it comes back
@@ -47,7 +47,11 @@ class PoolWorker {
 // The highest quality that waits goes first, but every 16th turn goes to the lowest. Utility and
 // Background together get at most `limit` - 1 workers, so that one is always free for the rest.
 //
-// Threading: any thread. `stop` returns when the workers are gone; it must not run on one.
+// Work of Default or High that the leader of a loop has submitted, and nobody else waits before, he
+// carries out himself (see CarriedWork), beside the workers and without a place among them.
+//
+// Threading: any thread. `stop` returns when the workers are gone and nothing is carried any more;
+// it must not run on one.
 // Errors: when no thread can be made, the work waits for a worker that becomes free.
 class WorkerPool final : public Executor {
  public:
@@ -80,12 +84,16 @@ class WorkerPool final : public Executor {
 
  private:
   using Ticket = std::shared_ptr<QueueCore>;
+  class CarriedTicket;
   // Who is to be started once the mutex is free: an idle worker, a new one, or nobody.
   struct Start {
     PoolWorker* idle = nullptr;
     bool isNew = false;
   };
 
+  bool _letCarry(const Ticket& ticket);
+  void _endCarrying();
+  void _place(Ticket ticket);
   void _run();
   Ticket _next(PoolWorker& worker);
   Ticket _tryTake(PoolWorker& worker, Start& start) ZK_REQUIRES(mutex_);
@@ -109,6 +117,7 @@ class WorkerPool final : public Executor {
   std::vector<PoolWorker*> idle_ ZK_GUARDED_BY(mutex_);            // the last one idles shortest
   Counts counts_ ZK_GUARDED_BY(mutex_);
   unsigned runningLow_ ZK_GUARDED_BY(mutex_) = 0;  // of those, with Utility or Background
+  unsigned carried_ ZK_GUARDED_BY(mutex_) = 0;     // tickets that leaders of loops have
   std::uint64_t turn_ ZK_GUARDED_BY(mutex_) = 0;
   bool stopped_ ZK_GUARDED_BY(mutex_) = false;
   std::function<void()> reportRefusedWait_ ZK_GUARDED_BY(mutex_);

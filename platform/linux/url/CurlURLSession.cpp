@@ -18,7 +18,7 @@ CurlURLSession::CurlURLSession(Services services, CurlSettings settings, std::st
 
 CurlURLSession::~CurlURLSession() {
   delegateQueue_->close();
-  // What the completions hold ends here, not on the I/O thread.
+  // What the completions hold ends here, not on the loop.
   std::vector<std::shared_ptr<CurlURLTask>> dropped;
   std::vector<std::shared_ptr<CurlURLTask>> droppedInLine;
   services_.loop->sync([&] {

@@ -26,6 +26,7 @@ CurlURLSessions::CurlURLSessions(WorkQueues& queues, Services services)
     : queues_(queues),
       services_(std::move(services)),
       kernelHasFastOpen_(readFastOpenOfKernel()),
+      loop_(std::make_shared<Loop>("zelkord-url", services_.crew)),
       line_(std::make_shared<TransferLine>(loop_, services_.limits, services_.reports)) {
   ZK_CHECK(curl_global_init(CURL_GLOBAL_DEFAULT) == CURLE_OK, "libcurl initialises");
 }

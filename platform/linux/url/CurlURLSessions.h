@@ -20,7 +20,7 @@ namespace zelkord {
 
 class LinuxURLCache;
 
-// URL loading with libcurl: HTTP/1.1 and HTTP/2, all sessions on one I/O thread that starts with
+// URL loading with libcurl: HTTP/1.1 and HTTP/2, all sessions on one loop that starts with
 // the first task. A session's connections are its own and stay open for the next request.
 //
 // Each request is sent with what it says and nothing more than Host, Accept, Accept-Encoding: gzip
@@ -39,6 +39,9 @@ class CurlURLSessions final : public URLSessions {
     // Whether data costs money at the moment. Any thread, cheap.
     std::function<bool()> isMetered = [] { return false; };
     std::shared_ptr<const ProxyConfigurationSource> proxies;  // null: there is no such service
+    // Who leads the loop and carries answers to their end; null: a thread of its own, and answers
+    // go to workers.
+    LoopCrew* crew = nullptr;
     TransferLimits limits = TransferLimits::ofProcess();
     LimitReports* reports = nullptr;  // outlives the sessions; null: refusals are not counted
     // PEM file with the trusted roots; empty: the system's.
@@ -72,7 +75,7 @@ class CurlURLSessions final : public URLSessions {
   WorkQueues& queues_;
   const Services services_;
   const bool kernelHasFastOpen_;
-  const std::shared_ptr<Loop> loop_ = std::make_shared<Loop>("zelkord-url");
+  const std::shared_ptr<Loop> loop_;
   const std::shared_ptr<TransferLine> line_;
 
   Mutex mutex_;

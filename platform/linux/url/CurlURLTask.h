@@ -18,12 +18,12 @@ class CurlURLSession;
 
 // A task of a CurlURLSession.
 //
-// States: suspended, running (with the I/O thread), finished (its result waits on the delegate
+// States: suspended, running (with the loop), finished (its result waits on the delegate
 // queue), completed. A `cancel` that returns before the completion begins makes its result -999,
-// whatever the I/O thread has found meanwhile.
+// whatever the loop has found meanwhile.
 //
 // Threading: any thread, except for the operations marked otherwise.
-// Ownership: the I/O thread holds a running task, the delegate queue a finished one. A task whose
+// Ownership: the loop holds a running task, the delegate queue a finished one. A task whose
 // session is gone never completes.
 class CurlURLTask final : public URLTask, public std::enable_shared_from_this<CurlURLTask> {
  public:
@@ -47,13 +47,13 @@ class CurlURLTask final : public URLTask, public std::enable_shared_from_this<Cu
   bool enableProxy(Error* error) override;
   void connectionInformation(std::function<void(std::optional<json::object>)> completion) override;
 
-  // For the I/O thread: what to do; none for a task that was cancelled.
+  // For the loop: what to do; none for a task that was cancelled.
   std::optional<Order> order() const;
   void setRequest(std::shared_ptr<const URLRequest> request);
   // The end; the first one counts.
   void finish(URLResult result, TimingData timing = {},
               std::optional<json::object> connectionInformation = {});
-  // The I/O thread's own: what carries the task.
+  // The loop's own: what carries the task.
   CurlTransfer* transfer = nullptr;
 
  private:

@@ -29,10 +29,15 @@ class URLResults {
 // The real sessions on the real queues.
 struct URLSessionTestBed {
   explicit URLSessionTestBed(CurlURLSessions::Services services = {})
-      : sessions(queues, std::move(services)) {}
+      : sessions(queues, withCrew(std::move(services), queues.crew())) {}
 
   std::shared_ptr<URLSession> make(URLSessionConfiguration configuration = {.name = "test"}) {
     return sessions.make(configuration);
+  }
+
+  static CurlURLSessions::Services withCrew(CurlURLSessions::Services services, LoopCrew& crew) {
+    services.crew = &crew;
+    return services;
   }
 
   LinuxClock clock;
