@@ -42,6 +42,7 @@ class DaemonProcess final {
     return root / "XDG_STATE_HOME/com.quenta.zelkord";
   }
 
+  pid_t pid() const { return child_; }
   void send(int signal) const { ::kill(child_, signal); }
   // The status with which it left by itself; none when it did not within `limit`.
   std::optional<int> waitForEnd(std::chrono::milliseconds limit) {
