@@ -37,6 +37,12 @@ bool fits(const KnownSetting& setting, const json::value& value) {
   return false;
 }
 
+std::string rangeText(const KnownSetting& setting) {
+  if (setting.kind != SettingKind::Bytes && setting.kind != SettingKind::Seconds) return "";
+  return fmt::format(", {}from {} to {}", setting.kind == SettingKind::Bytes ? "whole, " : "",
+                     setting.range.least, setting.range.most);
+}
+
 }  // namespace
 
 const KnownSetting* knownSetting(std::string_view key) {
@@ -81,7 +87,8 @@ std::optional<std::string> settingRefusal(std::string_view key, const json::valu
   const auto* setting = knownSetting(key);
   if (!setting) return "the daemon reads no such setting";
   if (!value || fits(*setting, *value)) return std::nullopt;
-  return fmt::format("this setting's value is of the kind: {}", kindText(*setting));
+  return fmt::format("this setting's value is of the kind: {}{}", kindText(*setting),
+                     rangeText(*setting));
 }
 
 }  // namespace zelkord

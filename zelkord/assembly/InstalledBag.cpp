@@ -23,13 +23,12 @@ BagPointer InstalledBag::seenBy(const BagPointer& bag,
                                 const std::optional<std::string>& userAgent) const {
   if (!bag || bag->userAgent() == userAgent) return bag;
   const MutexLock lock(viewsMutex_);
-  if (viewed_ != bag->rawBag() || views_.size() >= kViewsKept) {
-    viewed_ = bag->rawBag();
-    views_.clear();
-  }
-  auto& view = views_[userAgent];
-  if (!view) view = std::make_shared<const ZLKBag>(bag->rawBag(), userAgent);
-  return view;
+  if (viewed_ != bag->rawBag()) views_.clear();
+  viewed_ = bag->rawBag();
+  const auto known = views_.find(userAgent);
+  if (known != views_.end()) return known->second;
+  if (views_.size() >= kViewsKept) views_.clear();
+  return views_[userAgent] = std::make_shared<const ZLKBag>(bag->rawBag(), userAgent);
 }
 
 // No installation runs between the present and the registration.
