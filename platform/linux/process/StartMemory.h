@@ -5,8 +5,8 @@
 namespace zelkord {
 
 // Has the heap give large blocks back as soon as they are free, whatever was freed before. By
-// itself it would keep ever larger ones, and with them the size of the largest response. The threads
-// share few arenas: what one leaves free serves the others.
+// itself it would keep ever larger ones, and with them the size of the largest response. The
+// threads share few arenas: what one leaves free serves the others.
 //
 // Threading: before there are others.
 void keepHeapSmall();
