@@ -39,11 +39,6 @@ class Moment {
 // A loop with one descriptor, whose events go to a serial queue.
 class CarriedTicketsTest : public testing::Test {
  protected:
-  ~CarriedTicketsTest() override {
-    for (const auto& moment : toCome_) moment.comes();
-    loop_.sync([this] { watch_.reset(); });
-    loop_.stop();
-  }
   void SetUp() override {
     loop_.sync([this] {
       watch_ = loop_.watch(event_.get(), EPOLLIN, [this](std::uint32_t) { _read(); });
@@ -56,6 +51,11 @@ class CarriedTicketsTest : public testing::Test {
       isCarried = reader == runner;
     }
     ASSERT_TRUE(isCarried);
+  }
+  void TearDown() override {
+    for (const auto& moment : toCome_) moment.comes();
+    loop_.sync([this] { watch_.reset(); });
+    loop_.stop();
   }
 
   // Has the loop read an event and submit the task.
