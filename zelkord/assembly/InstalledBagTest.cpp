@@ -8,7 +8,6 @@ namespace zelkord {
 namespace {
 
 using testing::ElementsAre;
-using testing::ElementsAreArray;
 
 class InstalledBagTest : public testing::Test {
  protected:
