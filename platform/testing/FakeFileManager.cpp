@@ -158,6 +158,12 @@ class FakeFileManager::Appending final : public AppendFile {
 
   std::uint64_t length() const override { return length_; }
 
+  bool isIntact() const override {
+    const MutexLock lock(state_->mutex);
+    const auto found = state_->files.find(path_);
+    return found != state_->files.end() && found->second.bytes.size() == length_;
+  }
+
   std::optional<Error> append(std::string_view bytes) override {
     const MutexLock lock(state_->mutex);
     if (auto error = state_->injected(Operation::Append)) return error;

@@ -90,12 +90,12 @@ void FileContainer::_writeBatch() {
   const auto transaction = services_->transactions.open("archiveObject");
   std::string_view rest = writing_.bytes;
   const auto file = isOpen_ && !rest.empty() ? _openFile() : nullptr;
-  const bool whole = rest.empty() || _archiveData(file.get(), rest);
+  const bool whole = rest.empty() || _archiveData(file, rest);
   const bool single = writing_.records.size() == 1;
   for (auto& record : writing_.records) {
     const bool fits = record.fit == RecordFit::Fits;
     const bool written =
-        fits && (whole || (!single && _archiveData(file.get(), rest.substr(0, record.size()))));
+        fits && (whole || (!single && _archiveData(file, rest.substr(0, record.size()))));
     rest.remove_prefix(record.size());
     if (!isOpen_ && record.kind == RecordKind::Feedback) continue;
     if (fits && !written) waiting_.giveBack(record.size());
@@ -103,9 +103,16 @@ void FileContainer::_writeBatch() {
   }
 }
 
+AppendFile* FileContainer::_openFile() {
+  queue_.assertCurrent();
+  auto& last = *services_->lastFile;
+  if (auto* const file = last.of(*place_)) return file;
+  return last.keep(*place_, _openForAppending());
+}
+
 // What stands behind the records that were written is half a record, which could not be cut off
 // when it was.
-std::unique_ptr<AppendFile> FileContainer::_openFile() {
+std::unique_ptr<AppendFile> FileContainer::_openForAppending() {
   queue_.assertCurrent();
   Error error;
   auto& files = services_->containerFiles;
@@ -163,6 +170,7 @@ void FileContainer::_closeFile() {
   queue_.assertCurrent();
   waiting_.close();
   if (!std::exchange(isOpen_, false)) return;
+  services_->lastFile->letGo(*place_);
   services_->log.info("close file url {}", fileUrl_);
 }
 

@@ -13,6 +13,7 @@
 #include "zelkord/feedback/SessionStorage.h"
 #include "zelkord/feedback/StoredSession.h"
 #include "zelkord/storage/ContainerRoom.h"
+#include "zelkord/storage/LastFile.h"
 #include "zelkord/storage/WaitingRecords.h"
 
 namespace zelkord {
@@ -26,6 +27,7 @@ struct ContainerServices {
   const Logger& log;
   const ZelkorDiagnosticDataReporter& reporter;
   std::shared_ptr<ContainerRoom> room;
+  std::shared_ptr<LastFile> lastFile;  // of the queue
   std::string version;
   std::uint64_t maxFileSize = 0;  // no container reaches it
 };
@@ -37,8 +39,8 @@ struct ContainerServices {
 //
 // A record is laid out by whoever hands it over and waits in memory, bounded by the file's limit,
 // for the storage's queue, which writes everything that waits with one call. So a process that is
-// killed leaves at most its last records out, and one cut short. The file itself is open only
-// during that call: there may be hundreds of containers.
+// killed leaves at most its last records out, and one cut short. Of the hundreds of containers that
+// there may be, only the one that wrote last has its file open.
 //
 // Threading: any thread. Ownership: tasks on the queue keep a container until its records are
 // written. Errors: logged; a record that is too large, or for which the disk has no room, is
@@ -73,7 +75,8 @@ class FileContainer final : public SessionContainer,
             std::shared_ptr<const void> held);
   void _writeWaiting();
   void _writeBatch();
-  std::unique_ptr<AppendFile> _openFile();
+  AppendFile* _openFile();
+  std::unique_ptr<AppendFile> _openForAppending();
   bool _archiveData(AppendFile* file, std::string_view framed);
   void _complain(const Error& error);
   void _finish(const WaitingRecord& record, bool written);

@@ -48,6 +48,7 @@ class FileContainerTest : public testing::Test {
         .reporter = assembly_.reporter(),
         .room = std::make_shared<ContainerRoom>(platform.files, assembly_.limits(),
                                                 assembly_.log(Category::FeedbackStorage)),
+        .lastFile = std::make_shared<LastFile>(),
         .version = kVersion,
         .maxFileSize = limit});
   }
@@ -154,14 +155,32 @@ TEST_F(FileContainerTest, KeepsWhatFitsOnAFullDisk) {
   EXPECT_THAT(queryIds(container->read()), ElementsAre(1, 2, 3, 6));
 }
 
-TEST_F(FileContainerTest, TheFileIsOpenOnlyWhileItIsWritten) {
+TEST_F(FileContainerTest, OfAllFilesOnlyTheLastWrittenStaysOpen) {
+  const auto shared = services(100'000);
+  std::vector<std::shared_ptr<FileContainer>> containers;
+  for (const char* path : {"/caches/session.1", "/caches/session.2"}) {
+    fakes_.files.put(path, "");
+    const auto place = shared->room->open(SessionKind::Managed, {});
+    containers.push_back(std::make_shared<FileContainer>(shared, path, *place));
+    containers.back()->writeSessionHeader(testHeader());
+  }
+  for (int number = 1; number <= 5; ++number) {
+    write(*containers[number / 2 % 2], {number});
+    EXPECT_EQ(fakes_.files.openForAppend(), 1);
+  }
+  EXPECT_THAT(queryIds(containers[0]->read()), ElementsAre(1, 4, 5));
+  EXPECT_EQ(fakes_.files.openForAppend(), 0);
+  EXPECT_THAT(queryIds(containers[1]->read()), ElementsAre(2, 3));
+}
+
+TEST_F(FileContainerTest, TellsWhenItsFileIsGoneOnceItHasWritten) {
   const auto container = forWriting();
   container->writeSessionHeader(testHeader());
-  for (int number = 1; number <= 3; ++number) {
-    write(*container, {number});
-    EXPECT_EQ(fakes_.files.openForAppend(), 0);
-  }
-  EXPECT_THAT(queryIds(container->read()), ElementsAre(1, 2, 3));
+  write(*container, {1});
+  fakes_.files.remove(kPath);
+  write(*container, {2});
+  EXPECT_EQ(fakes_.log.count("could not write to /caches/session.0"), 1);
+  EXPECT_EQ(fakes_.files.openForAppend(), 0);
 }
 
 TEST_F(FileContainerTest, CutsOffWhatAFailedWriteLeft) {

@@ -41,6 +41,7 @@ FileContainer::Services makeServices(Assembly& assembly) {
       .reporter = assembly.reporter(),
       .room = std::make_shared<ContainerRoom>(platform.files, assembly.limits(),
                                               assembly.log(Category::FeedbackStorage)),
+      .lastFile = std::make_shared<LastFile>(),
       .version = zelkordUserAgent(platform.device).value_or(std::string()),
       .maxFileSize = bytesSetting(platform.settings, "ZLKSessionSizeLimit")});
 }

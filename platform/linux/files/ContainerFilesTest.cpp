@@ -7,6 +7,7 @@
 
 #include <atomic>
 #include <cerrno>
+#include <filesystem>
 #include <functional>
 #include <string>
 
@@ -33,6 +34,10 @@ class ContainerFilesContractTest : public testing::TestWithParam<bool> {
     std::filesystem::create_directory(root_ / "folder");
   }
   ContainerFiles& files() { return GetParam() ? static_cast<ContainerFiles&>(real_) : *fake_; }
+  void remove(const std::string& path) {
+    if (GetParam()) std::filesystem::remove(path);
+    fake_->remove(path);
+  }
   std::uint64_t sizeOf(const std::string& path) { return files().attributes(path, nullptr)->size; }
 
   const TemporaryDirectory root_;
@@ -52,10 +57,26 @@ TEST_P(ContainerFilesContractTest, GrowsAndCutsAFile) {
   EXPECT_EQ(file->append(" second"), std::nullopt);
   EXPECT_EQ(file->length(), 12u);
   EXPECT_EQ(files().openForAppending(path, nullptr)->length(), 12u);
+  EXPECT_TRUE(file->isIntact());
 
   EXPECT_EQ(files().cut(path, 5), std::nullopt);
   EXPECT_EQ(sizeOf(path), 5u);
+  EXPECT_FALSE(file->isIntact());
   EXPECT_THAT(*files().list(root_.path(), nullptr), UnorderedElementsAre("file", "folder"));
+}
+
+TEST_P(ContainerFilesContractTest, AFileThatOthersTouchedIsNotIntact) {
+  const auto path = root_ / "file";
+  ASSERT_EQ(files().createExclusively(path), std::nullopt);
+  const auto file = files().openForAppending(path, nullptr);
+  EXPECT_TRUE(file->isIntact());
+  EXPECT_EQ(files().openForAppending(path, nullptr)->append("of others"), std::nullopt);
+  EXPECT_FALSE(file->isIntact());
+
+  const auto removed = files().openForAppending(path, nullptr);
+  EXPECT_TRUE(removed->isIntact());
+  remove(path);
+  EXPECT_FALSE(removed->isIntact());
 }
 
 TEST_P(ContainerFilesContractTest, TellsWhatIsThere) {

@@ -20,6 +20,12 @@ class LinuxAppendFile final : public AppendFile {
 
   std::uint64_t length() const override { return length_; }
 
+  bool isIntact() const override {
+    struct stat status {};
+    return !broken_ && ::fstat(file_.get(), &status) == 0 && status.st_nlink > 0 &&
+           static_cast<std::uint64_t>(status.st_size) == length_;
+  }
+
   std::optional<Error> append(std::string_view bytes) override {
     if (broken_) return posixError(EIO);
     const BlockingScope blocking;
