@@ -5,10 +5,15 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <array>
+#include <cstdint>
 #include <cstdio>
 #include <cstdlib>
 #include <fstream>
+#include <functional>
 #include <iterator>
+#include <set>
+#include <thread>
 
 #include "platform/linux/process/LinuxProcess.h"
 #include "platform/linux/process/ProcessStart.h"
@@ -105,6 +110,25 @@ TEST(SystemRandomTest, FillsEveryByte) {
     for (std::size_t j = 0; j < seen.size(); ++j) seen[j] = static_cast<char>(seen[j] | bytes[j]);
   }
   EXPECT_EQ(seen.find('\0'), std::string::npos);
+}
+
+TEST(SystemRandomTest, NothingComesTwice) {
+  SystemRandom random;
+  std::array<std::set<std::uint64_t>, 2> seen;
+  const auto draw = [&random](std::set<std::uint64_t>& into) {
+    for (std::size_t i = 0; i < 500; ++i) {
+      std::array<std::uint64_t, 9> numbers{};
+      const auto count = 1 + i % numbers.size();  // on both sides of what counts as small
+      random.fill(numbers.data(), count * sizeof numbers[0]);
+      into.insert(numbers.begin(), numbers.begin() + static_cast<std::ptrdiff_t>(count));
+    }
+  };
+  draw(seen[0]);
+  std::thread(draw, std::ref(seen[1])).join();
+  const auto each = seen[0].size();
+  seen[0].merge(seen[1]);
+  EXPECT_EQ(each, 2490u);
+  EXPECT_TRUE(seen[1].empty());
 }
 
 }  // namespace
