@@ -38,7 +38,7 @@ namespace zelkord {
 // The crew outlives it.
 class ZK_CAPABILITY("loop") Loop final : private LoopHost, private LedLoop {
  public:
-  // `name`: the thread's, at most 15 bytes. Without a crew the loop has a thread of its own.
+  // Without a crew the loop has a thread of its own, which has the name, at most 15 bytes.
   explicit Loop(const char* name, LoopCrew* crew = nullptr);
   ~Loop() override;
   Loop(const Loop&) = delete;
@@ -80,7 +80,6 @@ class ZK_CAPABILITY("loop") Loop final : private LoopHost, private LedLoop {
   bool needsOwnThread() override;
 
   // LedLoop
-  const char* name() const override { return name_; }
   Left lead() override;
 
   bool _start();

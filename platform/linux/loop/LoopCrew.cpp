@@ -12,8 +12,8 @@
 namespace zelkord {
 namespace {
 
-constexpr const char* kFollowing = "zelkord-next";
-constexpr std::uint64_t kLeaving = 0;  // no helm's number
+constexpr const char* kThreadName = "zelkord-loops";  // each of them leads any of the loops
+constexpr std::uint64_t kLeaving = 0;                 // no helm's number
 
 }  // namespace
 
@@ -77,7 +77,7 @@ void LoopCrew::begin(const std::shared_ptr<LoopHelm>& helm) {
            "a loop cannot be taken over");
   helms_.emplace(helm->number_, helm);
   try {
-    _startThread(helm->loop_.name(), helm);
+    _startThread(helm);
   } catch (const std::system_error&) {
     helms_.erase(helm->number_);
     helm->end();
@@ -86,14 +86,15 @@ void LoopCrew::begin(const std::shared_ptr<LoopHelm>& helm) {
   _startFollower();
 }
 
-void LoopCrew::_startThread(const char* name, std::shared_ptr<LoopHelm> helm) {
-  threads_.push_back(startServiceThread(
-      name, ThreadWork::Loop, [this, helm = std::move(helm)]() mutable { _run(std::move(helm)); }));
+void LoopCrew::_startThread(std::shared_ptr<LoopHelm> helm) {
+  threads_.push_back(
+      startServiceThread(kThreadName, ThreadWork::Loop,
+                         [this, helm = std::move(helm)]() mutable { _run(std::move(helm)); }));
 }
 
 void LoopCrew::_startFollower() {
   try {
-    _startThread(kFollowing, nullptr);
+    _startThread(nullptr);
   } catch (const std::system_error&) {
     --tooMany_;  // there is one less to leave
   }
@@ -116,7 +117,6 @@ void LoopCrew::_run(std::shared_ptr<LoopHelm> helm) {
 
 // Null when this one is too many.
 std::shared_ptr<LoopHelm> LoopCrew::_follow() {
-  nameThread(kFollowing);
   _releaseFollower();
   while (!_leaves()) {
     epoll_event event{};
@@ -128,7 +128,6 @@ std::shared_ptr<LoopHelm> LoopCrew::_follow() {
     }
     auto helm = _find(event.data.u64);
     if (!helm || !helm->_takeOver()) continue;
-    nameThread(helm->loop_.name());
     return helm;
   }
   return nullptr;

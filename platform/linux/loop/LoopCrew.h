@@ -20,8 +20,6 @@ class LedLoop {
   enum class Left { Ended, TakenOver };
 
   virtual ~LedLoop() = default;
-  // The calling thread's name while it leads, at most 15 bytes.
-  virtual const char* name() const = 0;
   // The calling thread waits for the loop's events and serves them until the loop has ended, or
   // somebody else leads it.
   virtual Left lead() = 0;
@@ -98,7 +96,7 @@ class LoopCrew final {
   bool _leaves();
   std::shared_ptr<LoopHelm> _follow();
   std::shared_ptr<LoopHelm> _find(std::uint64_t number);
-  void _startThread(const char* name, std::shared_ptr<LoopHelm> helm) ZK_REQUIRES(mutex_);
+  void _startThread(std::shared_ptr<LoopHelm> helm) ZK_REQUIRES(mutex_);
   void _startFollower() ZK_REQUIRES(mutex_);
 
   // Fixed after construction.

@@ -47,6 +47,4 @@ ThreadWork setThreadWork(ThreadWork work) {
   return did ? ThreadWork::Tasks : ThreadWork::Loop;
 }
 
-void nameThread(const char* name) { ::pthread_setname_np(::pthread_self(), name); }
-
 }  // namespace zelkord

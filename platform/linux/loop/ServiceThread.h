@@ -18,7 +18,5 @@ std::thread startServiceThread(const char* name, ThreadWork work, std::function<
 bool mayBeLentLoops();
 // Changes what the calling thread, started so, is there for; returns what it was.
 ThreadWork setThreadWork(ThreadWork work);
-// Of the calling thread, started so.
-void nameThread(const char* name);
 
 }  // namespace zelkord
