@@ -135,7 +135,7 @@ bool PrivateLink::_readMessages() {
   for (int messages = 0; messages < kMessagesInARow;) {
     if (ended_ || !_mayRead()) return true;
     const auto progress = _process();
-    if (ended_ || progress == Progress::Nothing) return true;
+    if (ended_ || progress == Progress::Nothing || progress == Progress::LastMessage) return true;
     if (progress == Progress::Message) ++messages;
     if (_isInLongMessage()) return false;
   }
@@ -163,6 +163,7 @@ bool PrivateLink::_mayRead() {
 
 PrivateLink::Progress PrivateLink::_process() {
   const bool writesFirst = _queuedMessages() > 0;
+  const auto expected = gate_.unfinishedBytes();
   const auto bytes = bytesToRead(sd_bus_get_fd(bus_.get()));
   arrived_ = false;
   const int r = sd_bus_process(bus_.get(), nullptr);
@@ -172,7 +173,9 @@ PrivateLink::Progress PrivateLink::_process() {
     cutOff(std::strerror(-r));
     return Progress::Nothing;
   }
-  if (arrived_) return Progress::Message;
+  // Of what came after `bytes` were counted there is an event.
+  const bool isLast = bytes == expected && !hungUp_ && !waitsForWriting_;
+  if (arrived_) return isLast ? Progress::LastMessage : Progress::Message;
   if (r == 0) {
     if (hungUp_ && bytes == 0) end();
     return Progress::Nothing;

@@ -63,7 +63,7 @@ class PrivateLink final : public Outlet,
   void cutOffForMemory() override { cutOff("too much memory is held for its process"); }
 
  private:
-  enum class Progress { Message, Nothing, Some };
+  enum class Progress { Message, LastMessage, Nothing, Some };
 
   static int _onMessage(sd_bus_message* message, void* self, sd_bus_error* error);
   void _pump() ZK_REQUIRES(context_.loop);
