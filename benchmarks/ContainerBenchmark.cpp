@@ -18,7 +18,7 @@
 
 #include "benchmarks/ContainerStore.h"
 #include "corezelkor/proto/Feedback.pb.h"
-#include "platform/linux/files/Descriptor.h"
+#include "platform/linux/system/Descriptor.h"
 #include "platform/testing/TemporaryDirectory.h"
 #include "zelkord/assembly/UserAgent.h"
 #include "zelkord/storage/SessionUnarchiver.h"

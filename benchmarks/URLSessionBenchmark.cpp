@@ -16,7 +16,7 @@
 #include <vector>
 
 #include "platform/linux/queues/LinuxWorkQueues.h"
-#include "platform/linux/url/CurlURLSessions.h"
+#include "platform/linux/url_sessions/CurlURLSessions.h"
 #include "platform/testing/TestHTTPServer.h"
 
 // What a request on a warm HTTPS connection costs. The floor is a bare libcurl multi loop on the

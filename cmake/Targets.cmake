@@ -23,13 +23,26 @@ function(zk_note_links path name deps test_deps)
   set_property(GLOBAL APPEND_STRING PROPERTY ZK_LAYERS "${path}\t${name}\t${deps}\t${test_deps}\n")
 endfunction()
 
-# zk_library(<name> [RECURSE] [PUBLISHED] [DEPS <target>...] [DEFINES <definition>...] [TEST_DEPS <target>...])
+# Notes the rooms of the current folder's library: zk_note_rooms(<library> <what it links> <rooms>)
+function(zk_note_rooms library deps rooms)
+  foreach(room IN LISTS rooms)
+    string(REGEX MATCH "^([^:]+)(: *(.*))?$" matched "${room}")
+    set(folder "${CMAKE_MATCH_1}")
+    string(REPLACE " " ";" uses "${CMAKE_MATCH_3}")
+    list(TRANSFORM uses PREPEND "${library}/")
+    zk_note_links(${folder} ${library}/${folder} "${deps};${uses}" ${library}_tests)
+  endforeach()
+endfunction()
+
+# zk_library(<name> [RECURSE] [PUBLISHED] [DEPS <target>...] [DEFINES <definition>...] [TEST_DEPS <target>...]
+#            [ROOMS "<folder>: <folder>..."...])
 #
 # The current folder (with RECURSE: and those below) as a library, and its tests as <name>_tests.
 # A PUBLISHED one can be linked into other programs and their plug-ins: its code is position-independent, and only what
 # ZK_EXPORT marks is seen outside. DEPS are handed on to whoever links the library; DEFINES are seen in this folder only, also by its tests.
+# ROOMS are the folders below, each with those that it may include from; only tests, and what stands in no room, may include from all.
 function(zk_library name)
-  cmake_parse_arguments(PARSE_ARGV 1 arg "RECURSE;PUBLISHED" "" "DEPS;DEFINES;TEST_DEPS")
+  cmake_parse_arguments(PARSE_ARGV 1 arg "RECURSE;PUBLISHED" "" "DEPS;DEFINES;TEST_DEPS;ROOMS")
   set(glob GLOB)
   if(arg_RECURSE)
     set(glob GLOB_RECURSE)
@@ -54,7 +67,9 @@ function(zk_library name)
     "$<BUILD_INTERFACE:${PROJECT_SOURCE_DIR}>" "$<INSTALL_INTERFACE:${CMAKE_INSTALL_INCLUDEDIR}/corezelkor>")
   target_link_libraries(${name} ${scope} ${arg_DEPS})
 
-  zk_note_links("" ${name} "${arg_DEPS}" "${arg_TEST_DEPS}")
+  list(TRANSFORM arg_ROOMS REPLACE "^([^:]+).*$" "${name}/\\1" OUTPUT_VARIABLE rooms)
+  zk_note_links("" ${name} "${arg_DEPS};${rooms}" "${arg_TEST_DEPS}")
+  zk_note_rooms(${name} "${arg_DEPS}" "${arg_ROOMS}")
   zk_tests(${name}_tests SOURCES ${tests} DEPS ${name} ${arg_TEST_DEPS} DEFINES ${arg_DEFINES})
 endfunction()
 

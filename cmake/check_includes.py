@@ -1,11 +1,13 @@
 #!/usr/bin/env python3
-"""Checks that includes follow the links: a folder includes only from folders whose library it links.
+"""Checks that includes follow the links: a folder includes only from folders whose library it links, and a room of a
+library only from the rooms that are declared for it. No library or room leads back to itself.
 
 usage: check_includes.py LAYERS FILE...
 
 All headers are reachable from the root of the repository, and a header needs no link, so the linker alone would not
-notice an include that goes upward. LAYERS is what the build writes: one line a library or main file, with its path,
-its name, what it links, and what its tests link besides, separated by tabs.
+notice an include that goes upward. LAYERS is what the build writes: one line a library, room or main file, with its
+path, its name, what it links, and what its tests link besides, separated by tabs. A room's name is its library's, a
+slash and its folder.
 """
 
 import re
@@ -37,28 +39,48 @@ def reachable(name, links):
     return found
 
 
+def circles(links):
+    """The names that lead back to themselves."""
+    return [name for name in links if any(name in reachable(used, links) for used in links[name])]
+
+
 def owner(file, names):
-    """The library or main file to which a file belongs: the entry with the longest matching path."""
+    """The library, room or main file to which a file belongs: the entry with the longest matching path."""
     places = [place for place in names if file == place or file.startswith(place + "/")]
-    return names[max(places, key=len)] if places else None
+    return max(places, key=len) if places else None
+
+
+def stands_outside(file, place, names):
+    """Whether the file is in a folder of a library with rooms, and that folder is none of them."""
+    has_rooms = any(other.startswith(names[place] + "/") for other in names.values())
+    return has_rooms and "/" in file[len(place) + 1 :]
+
+
+def problems(file, names, links):
+    place = owner(file, names)
+    if place is None:
+        return
+    if stands_outside(file, place, names):
+        yield f"{file}: stands in no room of {names[place]}"
+        return
+    user = names[place]
+    allowed = reachable(user + "_tests" if OF_TESTS.search(file) else user, links)
+    with open(file, encoding="utf-8") as lines:
+        for number, line in enumerate(lines, 1):
+            match = INCLUDE.match(line)
+            used = match and owner(match[1], names)
+            if used and names[used] not in allowed:
+                yield f"{file}:{number}: {user} does not link {names[used]}, of which this includes {match[1]}"
 
 
 def main():
     names, links = read_layers(sys.argv[1])
-    failed = False
+    found = [f"{name} links itself, by way of {', '.join(links[name])}" for name in circles(links)]
     for file in sys.argv[2:]:
-        user = owner(file, names)
-        if user is None:
-            continue
-        allowed = reachable(user + "_tests" if OF_TESTS.search(file) else user, links)
-        with open(file, encoding="utf-8") as lines:
-            for number, line in enumerate(lines, 1):
-                match = INCLUDE.match(line)
-                used = match and owner(match[1], names)
-                if used and used not in allowed:
-                    print(f"{file}:{number}: {user} does not link {used}, of which this includes {match[1]}")
-                    failed = True
-    sys.exit(1 if failed else 0)
+        found += problems(file, names, links)
+    for problem in found:
+        print(problem)
+    sys.exit(1 if found else 0)
 
 
 main()

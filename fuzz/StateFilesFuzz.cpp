@@ -5,7 +5,7 @@
 #include <string_view>
 
 #include "base/Check.h"
-#include "platform/linux/device_profile/OsRelease.h"
+#include "platform/linux/device/OsRelease.h"
 #include "platform/linux/files/LinuxFileManager.h"
 #include "platform/linux/management/LinuxManagement.h"
 #include "platform/linux/settings/LinuxSettings.h"

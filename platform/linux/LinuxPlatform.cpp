@@ -11,8 +11,8 @@
 #include "platform/linux/account/LinuxAccounts.h"
 #include "platform/linux/bus/SystemBus.h"
 #include "platform/linux/counters/LinuxCounters.h"
+#include "platform/linux/device/LinuxDevice.h"
 #include "platform/linux/device_profile/DeviceProfileLoader.h"
-#include "platform/linux/device_profile/LinuxDevice.h"
 #include "platform/linux/files/LinuxContainerFiles.h"
 #include "platform/linux/files/LinuxFileManager.h"
 #include "platform/linux/files/OwnDirectory.h"
@@ -42,7 +42,7 @@
 #include "platform/linux/settings/LinuxSettings.h"
 #include "platform/linux/tagger/LinuxTagger.h"
 #include "platform/linux/text_input/LinuxTextInput.h"
-#include "platform/linux/url/CurlURLSessions.h"
+#include "platform/linux/url_sessions/CurlURLSessions.h"
 
 namespace zelkord {
 namespace {

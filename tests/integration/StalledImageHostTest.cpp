@@ -10,7 +10,7 @@
 
 #include "platform/linux/files/LinuxFileManager.h"
 #include "platform/linux/queues/LinuxWorkQueues.h"
-#include "platform/linux/url/CurlURLSessions.h"
+#include "platform/linux/url_sessions/CurlURLSessions.h"
 #include "platform/testing/FakePlatform.h"
 #include "platform/testing/PlatformOnQueues.h"
 #include "platform/testing/RecordingLog.h"

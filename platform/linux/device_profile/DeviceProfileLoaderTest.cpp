@@ -4,8 +4,6 @@
 #include <mutex>
 
 #include "platform/linux/device_profile/DeviceProfileLoader.h"
-#include "platform/linux/device_profile/LinuxDevice.h"
-#include "platform/linux/device_profile/OsRelease.h"
 #include "platform/linux/files/LinuxFileManager.h"
 #include "platform/linux/loop/Loop.h"
 #include "platform/linux/queues/LinuxWorkQueues.h"
@@ -139,41 +137,6 @@ TEST_F(WatchedProfileTest, SeesEveryWayInWhichAFileChanges) {
   EXPECT_TRUE(becomes("none")) << "directory moved away";
   std::filesystem::rename(root_ / "away", root_ / "config");
   EXPECT_TRUE(becomes("EE")) << "directory moved back";
-}
-
-TEST(LinuxDeviceTest, ProfileOverOsReleaseOverNothing) {
-  FakeFileManager files;
-  files.put("/usr/lib/os-release", "NAME=\"Old\"\nVERSION_ID=1\n");
-  files.put("/etc/os-release", "NAME=\"Quenta \\\"OS\\\"\"\nVERSION_ID='12'\n");
-  int asked = 0;
-  LinuxDevice::Host host;
-  host.hardwareModel = [&] { return ++asked == 1 ? "Board 3" : "bad\nmodel"; };
-
-  const LinuxDevice found({}, host, files);
-  EXPECT_EQ(found.productType(), "Board 3");
-  EXPECT_EQ(found.productName(), "Quenta \"OS\"");
-  EXPECT_EQ(found.buildVersion(), "12");
-  EXPECT_EQ(LinuxDevice({}, host, files).productType(), "Linux");
-
-  DeviceProfile profile;
-  profile.productType = "Phone";
-  profile.buildVersion = "7";
-  files.put("/etc/os-release", "BUILD_ID=rolling");
-  EXPECT_EQ(LinuxDevice(profile, host, files).productType(), "Phone");
-  EXPECT_EQ(LinuxDevice(profile, host, files).buildVersion(), "7");
-  EXPECT_EQ(LinuxDevice({}, host, files).buildVersion(), "rolling");
-  EXPECT_EQ(asked, 3);
-}
-
-TEST(OsReleaseTest, ReadsShellAssignments) {
-  const auto values = parseOsRelease(
-      "# NAME=no\n\nA=plain\nB=\"quo\\\"ted\"\nC='si\\ngle'\nD=\nE=x\\ y \r\n=no\nno\nF=last");
-  EXPECT_EQ(values, (std::map<std::string, std::string>{{"A", "plain"},
-                                                        {"B", "quo\"ted"},
-                                                        {"C", "si\\ngle"},
-                                                        {"D", ""},
-                                                        {"E", "x y"},
-                                                        {"F", "last"}}));
 }
 
 }  // namespace

@@ -2,7 +2,7 @@
 
 #include "platform/api/NotificationCenter.h"
 #include "platform/linux/device_profile/DeviceProfile.h"
-#include "platform/linux/locale/LocaleText.h"
+#include "platform/linux/locale_text/LocaleText.h"
 
 namespace zelkord {
 namespace {

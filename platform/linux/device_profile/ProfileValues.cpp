@@ -4,7 +4,7 @@
 #include <cmath>
 
 #include "base/Text.h"
-#include "platform/linux/locale/LocaleText.h"
+#include "platform/linux/locale_text/LocaleText.h"
 
 namespace zelkord::profile {
 namespace {

@@ -7,8 +7,8 @@
 #include <algorithm>
 #include <cerrno>
 
-#include "platform/linux/files/Descriptor.h"
 #include "platform/linux/queues/BlockingScope.h"
+#include "platform/linux/system/Descriptor.h"
 
 namespace zelkord {
 namespace {

@@ -8,9 +8,9 @@
 #include <cstdlib>
 #include <memory>
 
-#include "platform/linux/files/Descriptor.h"
 #include "platform/linux/files/LinuxFileHandle.h"
 #include "platform/linux/queues/BlockingScope.h"
+#include "platform/linux/system/Descriptor.h"
 
 namespace zelkord {
 namespace {

@@ -7,7 +7,7 @@
 #include <cerrno>
 #include <cstring>
 
-#include "platform/linux/files/Descriptor.h"
+#include "platform/linux/system/Descriptor.h"
 
 namespace zelkord {
 namespace {

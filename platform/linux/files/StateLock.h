@@ -4,7 +4,7 @@
 #include <string>
 
 #include "base/Error.h"
-#include "platform/linux/files/Descriptor.h"
+#include "platform/linux/system/Descriptor.h"
 
 namespace zelkord {
 

@@ -3,7 +3,7 @@
 #include <cstddef>
 #include <vector>
 
-#include "platform/linux/files/Descriptor.h"
+#include "platform/linux/system/Descriptor.h"
 
 namespace zelkord::ipc {
 

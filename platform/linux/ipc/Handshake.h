@@ -4,9 +4,9 @@
 #include <string>
 
 #include "base/Subscription.h"
-#include "platform/linux/files/Descriptor.h"
 #include "platform/linux/ipc/Authenticator.h"
 #include "platform/linux/loop/Loop.h"
+#include "platform/linux/system/Descriptor.h"
 
 namespace zelkord::ipc {
 

@@ -25,11 +25,11 @@
 #include <utility>
 #include <vector>
 
-#include "platform/linux/files/Descriptor.h"
 #include "platform/linux/ipc/BusPointers.h"
 #include "platform/linux/ipc/SdBusInterprocess.h"
 #include "platform/linux/queues/LinuxClock.h"
 #include "platform/linux/queues/LinuxWorkQueues.h"
+#include "platform/linux/system/Descriptor.h"
 #include "platform/testing/FakeCounters.h"
 #include "platform/testing/RecordingLog.h"
 

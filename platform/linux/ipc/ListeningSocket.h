@@ -7,7 +7,7 @@
 #include <variant>
 
 #include "base/Error.h"
-#include "platform/linux/files/Descriptor.h"
+#include "platform/linux/system/Descriptor.h"
 
 namespace zelkord::ipc {
 

@@ -1,7 +1,7 @@
 #pragma once
 
-#include "platform/linux/files/Descriptor.h"
 #include "platform/linux/ipc/BusPointers.h"
+#include "platform/linux/system/Descriptor.h"
 
 namespace zelkord::ipc {
 

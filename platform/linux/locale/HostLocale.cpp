@@ -6,7 +6,7 @@
 #include <cstdlib>
 #include <fstream>
 
-#include "platform/linux/locale/LocaleText.h"
+#include "platform/linux/locale_text/LocaleText.h"
 
 namespace zelkord {
 namespace {

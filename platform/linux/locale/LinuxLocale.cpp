@@ -3,7 +3,7 @@
 #include <tuple>
 
 #include "platform/linux/locale/LocaleFacts.h"
-#include "platform/linux/locale/LocaleText.h"
+#include "platform/linux/locale_text/LocaleText.h"
 
 namespace zelkord {
 namespace {

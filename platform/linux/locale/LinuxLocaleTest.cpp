@@ -3,7 +3,7 @@
 #include "platform/linux/locale/HostLocaleWatcher.h"
 #include "platform/linux/locale/LinuxLocale.h"
 #include "platform/linux/locale/LocaleFacts.h"
-#include "platform/linux/locale/LocaleText.h"
+#include "platform/linux/locale_text/LocaleText.h"
 #include "platform/testing/TemporaryDirectory.h"
 
 namespace zelkord {

@@ -9,7 +9,7 @@
 
 #include <memory>
 
-#include "platform/linux/locale/LocaleText.h"
+#include "platform/linux/locale_text/LocaleText.h"
 
 namespace zelkord {
 namespace {

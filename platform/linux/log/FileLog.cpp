@@ -8,8 +8,8 @@
 #include <cerrno>
 #include <cstdio>
 
-#include "platform/linux/files/Descriptor.h"
 #include "platform/linux/log/LogLine.h"
+#include "platform/linux/system/Descriptor.h"
 
 namespace zelkord {
 namespace {

@@ -3,7 +3,7 @@
 #include <utility>
 
 #include "platform/linux/loop/LoopCrew.h"
-#include "platform/linux/loop/ServiceThread.h"
+#include "platform/linux/system/ServiceThread.h"
 
 namespace zelkord {
 namespace {

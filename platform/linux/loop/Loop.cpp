@@ -3,7 +3,7 @@
 #include <utility>
 
 #include "base/Check.h"
-#include "platform/linux/loop/ServiceThread.h"
+#include "platform/linux/system/ServiceThread.h"
 
 namespace zelkord {
 

@@ -8,7 +8,7 @@
 #include <vector>
 
 #include "base/Mutex.h"
-#include "platform/linux/files/Descriptor.h"
+#include "platform/linux/system/Descriptor.h"
 
 namespace zelkord {
 

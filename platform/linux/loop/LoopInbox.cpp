@@ -6,7 +6,7 @@
 
 #include "base/Check.h"
 #include "platform/linux/loop/CarriedWork.h"
-#include "platform/linux/loop/ServiceThread.h"
+#include "platform/linux/system/ServiceThread.h"
 
 namespace zelkord {
 

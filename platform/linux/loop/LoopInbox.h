@@ -7,7 +7,7 @@
 #include "base/CondVar.h"
 #include "base/Mutex.h"
 #include "platform/api/WorkQueue.h"
-#include "platform/linux/files/Descriptor.h"
+#include "platform/linux/system/Descriptor.h"
 
 namespace zelkord {
 

@@ -9,7 +9,7 @@
 #include <unordered_map>
 
 #include "base/FunctionRef.h"
-#include "platform/linux/files/Descriptor.h"
+#include "platform/linux/system/Descriptor.h"
 
 namespace zelkord {
 

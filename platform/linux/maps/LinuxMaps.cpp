@@ -1,7 +1,7 @@
 #include "platform/linux/maps/LinuxMaps.h"
 
 #include "platform/api/RandomUUID.h"
-#include "platform/linux/locale/LocaleText.h"
+#include "platform/linux/locale_text/LocaleText.h"
 
 namespace zelkord {
 

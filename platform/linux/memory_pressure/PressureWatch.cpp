@@ -6,7 +6,7 @@
 #include <cstring>
 #include <utility>
 
-#include "platform/linux/files/Descriptor.h"
+#include "platform/linux/system/Descriptor.h"
 
 namespace zelkord {
 namespace {

@@ -18,7 +18,7 @@
 
 #include "base/Check.h"
 #include "base/Mutex.h"
-#include "platform/linux/loop/ServiceThread.h"
+#include "platform/linux/system/ServiceThread.h"
 
 namespace zelkord {
 

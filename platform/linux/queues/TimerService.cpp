@@ -5,8 +5,8 @@
 #include <algorithm>
 #include <tuple>
 
-#include "platform/linux/loop/ServiceThread.h"
 #include "platform/linux/queues/Alarm.h"
+#include "platform/linux/system/ServiceThread.h"
 
 namespace zelkord {
 

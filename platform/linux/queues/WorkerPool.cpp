@@ -6,8 +6,8 @@
 #include <utility>
 
 #include "platform/linux/loop/CarriedWork.h"
-#include "platform/linux/loop/ServiceThread.h"
 #include "platform/linux/queues/QueueCore.h"
+#include "platform/linux/system/ServiceThread.h"
 
 namespace zelkord {
 

@@ -7,7 +7,7 @@
 #include <string_view>
 
 #include "base/Text.h"
-#include "platform/linux/locale/LocaleText.h"
+#include "platform/linux/locale_text/LocaleText.h"
 
 namespace zelkord {
 namespace {

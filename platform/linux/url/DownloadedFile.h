@@ -1,7 +1,7 @@
 #pragma once
 
 #include "platform/api/URLRequest.h"
-#include "platform/linux/files/Descriptor.h"
+#include "platform/linux/system/Descriptor.h"
 
 namespace zelkord {
 

@@ -8,7 +8,7 @@
 #include "base/Mutex.h"
 #include "platform/linux/queues/LinuxClock.h"
 #include "platform/linux/queues/LinuxWorkQueues.h"
-#include "platform/linux/url/CurlURLSessions.h"
+#include "platform/linux/url_sessions/CurlURLSessions.h"
 
 namespace zelkord {
 

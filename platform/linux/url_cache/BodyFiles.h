@@ -8,7 +8,7 @@
 #include "base/Data.h"
 #include "base/Error.h"
 #include "base/FunctionRef.h"
-#include "platform/linux/files/Descriptor.h"
+#include "platform/linux/system/Descriptor.h"
 
 namespace zelkord {
 

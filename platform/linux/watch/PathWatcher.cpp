@@ -10,8 +10,8 @@
 #include <vector>
 
 #include "base/Mutex.h"
-#include "platform/linux/files/Descriptor.h"
 #include "platform/linux/loop/Loop.h"
+#include "platform/linux/system/Descriptor.h"
 #include "platform/linux/watch/WatchPlan.h"
 
 namespace zelkord {

@@ -5,7 +5,7 @@
 #include <utility>
 
 #include "platform/linux/url/CurlOptions.h"
-#include "platform/linux/url/CurlURLSessions.h"
+#include "platform/linux/url_sessions/CurlURLSessions.h"
 
 namespace zelkord::bench {
 namespace {

@@ -1,4 +1,4 @@
-#include "platform/linux/url/CurlURLSessions.h"
+#include "platform/linux/url_sessions/CurlURLSessions.h"
 
 #include <curl/curl.h>
 

@@ -1,4 +1,4 @@
-#include "platform/linux/device_profile/OsRelease.h"
+#include "platform/linux/device/OsRelease.h"
 
 #include <algorithm>
 

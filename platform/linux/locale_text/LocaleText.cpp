@@ -1,4 +1,4 @@
-#include "platform/linux/locale/LocaleText.h"
+#include "platform/linux/locale_text/LocaleText.h"
 
 #include <unicode/bytestream.h>
 #include <unicode/locid.h>

@@ -1,7 +1,7 @@
-#include "platform/linux/device_profile/LinuxDevice.h"
+#include "platform/linux/device/LinuxDevice.h"
 
 #include "base/Text.h"
-#include "platform/linux/device_profile/OsRelease.h"
+#include "platform/linux/device/OsRelease.h"
 
 namespace zelkord {
 namespace {

@@ -1,4 +1,4 @@
-#include "platform/linux/loop/ServiceThread.h"
+#include "platform/linux/system/ServiceThread.h"
 
 #include <pthread.h>
 #include <signal.h>
