@@ -9,10 +9,10 @@
 #include "platform/testing/FakePlatform.h"
 #include "platform/testing/PlatformOnQueues.h"
 #include "zelkord/assembly/Assembly.h"
-#include "zelkord/network/BagRequests.h"
-#include "zelkord/network/ZelkorBagController.h"
-#include "zelkord/network/ZelkorURLRequestBuilder.h"
-#include "zelkord/network/ZelkorUserGUIDController.h"
+#include "zelkord/network/bag/BagRequests.h"
+#include "zelkord/network/bag/ZelkorBagController.h"
+#include "zelkord/network/context/ZelkorUserGUIDController.h"
+#include "zelkord/network/request/ZelkorURLRequestBuilder.h"
 
 namespace zelkord {
 namespace {

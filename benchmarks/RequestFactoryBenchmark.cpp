@@ -9,8 +9,8 @@
 #include "platform/testing/PlatformOnQueues.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/assembly/NotificationNames.h"
-#include "zelkord/network/ZLKNetworkRequestFactory.h"
-#include "zelkord/network/ZelkorBagController.h"
+#include "zelkord/network/bag/ZelkorBagController.h"
+#include "zelkord/network/request/ZLKNetworkRequestFactory.h"
 
 namespace zelkord {
 namespace {

@@ -6,8 +6,8 @@
 
 #include "base/Check.h"
 #include "corezelkor/ZLKBag.h"
-#include "zelkord/network/BagRefreshRule.h"
-#include "zelkord/network/BagResponse.h"
+#include "zelkord/network/bag/BagRefreshRule.h"
+#include "zelkord/network/bag/BagResponse.h"
 
 namespace zelkord {
 namespace {

@@ -5,7 +5,7 @@
 
 #include "base/Check.h"
 #include "base/Text.h"
-#include "zelkord/network/ZelkorURLRequestBuilder.h"
+#include "zelkord/network/request/ZelkorURLRequestBuilder.h"
 
 namespace zelkord {
 namespace {

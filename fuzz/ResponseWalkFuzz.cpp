@@ -4,7 +4,7 @@
 #include <string_view>
 
 #include "base/Check.h"
-#include "zelkord/network/URLHost.h"
+#include "zelkord/network/exchange/URLHost.h"
 #include "zelkord/query/ImageWalk.h"
 
 namespace zelkord {

@@ -1,7 +1,7 @@
 #pragma once
 
 #include "base/UUID.h"
-#include "platform/api/Device.h"
+#include "platform/api/RandomSource.h"
 
 namespace zelkord {
 

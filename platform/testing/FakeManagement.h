@@ -4,7 +4,7 @@
 #include <string>
 
 #include "base/Mutex.h"
-#include "platform/api/Device.h"
+#include "platform/api/DeviceManagement.h"
 
 namespace zelkord {
 

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "platform/api/Device.h"
+#include "platform/api/MapsService.h"
 
 namespace zelkord {
 

@@ -3,7 +3,7 @@
 #include <map>
 #include <string>
 
-#include "platform/api/Device.h"
+#include "platform/api/LinguisticTagger.h"
 
 namespace zelkord {
 

@@ -2,7 +2,7 @@
 
 #include <string>
 
-#include "platform/api/Device.h"
+#include "platform/api/TextInputService.h"
 
 namespace zelkord {
 

@@ -5,7 +5,7 @@
 #include <random>
 
 #include "base/Mutex.h"
-#include "platform/api/Device.h"
+#include "platform/api/RandomSource.h"
 
 namespace zelkord {
 

@@ -19,9 +19,9 @@
 #include "zelkord/core/BagTeller.h"
 #include "zelkord/core/ClientStateManager.h"
 #include "zelkord/feedback/RecordingSessions.h"
-#include "zelkord/network/BagRequests.h"
-#include "zelkord/network/ZelkorBagController.h"
-#include "zelkord/network/ZelkorUserGUIDController.h"
+#include "zelkord/network/bag/BagRequests.h"
+#include "zelkord/network/bag/ZelkorBagController.h"
+#include "zelkord/network/context/ZelkorUserGUIDController.h"
 
 namespace zelkord {
 namespace {

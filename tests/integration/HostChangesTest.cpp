@@ -12,8 +12,8 @@
 #include "platform/testing/TemporaryDirectory.h"
 #include "platform/testing/TestHTTPServer.h"
 #include "zelkord/assembly/Assembly.h"
-#include "zelkord/network/ZLKNetworkRequestFactory.h"
-#include "zelkord/network/ZelkorBagController.h"
+#include "zelkord/network/bag/ZelkorBagController.h"
+#include "zelkord/network/request/ZLKNetworkRequestFactory.h"
 
 namespace zelkord {
 namespace {

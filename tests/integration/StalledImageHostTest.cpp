@@ -20,10 +20,10 @@
 #include "zelkord/core/ClientStateManager.h"
 #include "zelkord/core/EndpointConnection.h"
 #include "zelkord/feedback/RecordingSessions.h"
-#include "zelkord/network/ImageFetcher.h"
-#include "zelkord/network/ZLKNetworkRequestFactory.h"
-#include "zelkord/network/ZelkorBagController.h"
-#include "zelkord/network/ZelkorUserGUIDController.h"
+#include "zelkord/network/bag/ZelkorBagController.h"
+#include "zelkord/network/context/ZelkorUserGUIDController.h"
+#include "zelkord/network/exchange/ImageFetcher.h"
+#include "zelkord/network/request/ZLKNetworkRequestFactory.h"
 #include "zelkord/query/ResponseImages.h"
 
 namespace zelkord {

@@ -6,7 +6,7 @@
 
 #include "base/Mutex.h"
 #include "base/UUID.h"
-#include "platform/api/Device.h"
+#include "platform/api/MapsService.h"
 
 namespace zelkord {
 

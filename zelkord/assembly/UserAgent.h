@@ -4,7 +4,7 @@
 #include <string>
 #include <string_view>
 
-#include "platform/api/Device.h"
+#include "platform/api/DeviceProperties.h"
 
 namespace zelkord {
 

@@ -4,7 +4,7 @@
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/core/ClientStateManager.h"
 #include "zelkord/core/Wire.h"
-#include "zelkord/network/RequestLogText.h"
+#include "zelkord/network/exchange/RequestLogText.h"
 
 namespace zelkord {
 BagTeller::BagTeller(Assembly& assembly, std::shared_ptr<ipc::Connection> connection)

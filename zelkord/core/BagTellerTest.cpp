@@ -4,7 +4,7 @@
 #include "zelkord/core/BagTeller.h"
 #include "zelkord/core/ClientStateManager.h"
 #include "zelkord/core/DaemonTestSupport.h"
-#include "zelkord/network/ZelkorBagController.h"
+#include "zelkord/network/bag/ZelkorBagController.h"
 
 namespace zelkord {
 namespace {

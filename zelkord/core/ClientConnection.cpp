@@ -7,7 +7,7 @@
 #include "zelkord/assembly/UserAgent.h"
 #include "zelkord/core/ClientStateManager.h"
 #include "zelkord/feedback/SessionManager.h"
-#include "zelkord/network/ErrorFeedback.h"
+#include "zelkord/network/exchange/ErrorFeedback.h"
 #include "zelkord/query/ErrorCodes.h"
 
 namespace zelkord {

@@ -1,7 +1,7 @@
 #include "zelkord/core/DaemonTestSupport.h"
 
 #include "corezelkor/Constants.h"
-#include "zelkord/network/ZelkorBagController.h"
+#include "zelkord/network/bag/ZelkorBagController.h"
 
 namespace zelkord {
 

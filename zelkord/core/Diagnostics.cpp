@@ -7,8 +7,8 @@
 #include "zelkord/core/ClientConnection.h"
 #include "zelkord/core/ClientStateManager.h"
 #include "zelkord/core/Wire.h"
-#include "zelkord/network/BagRefreshRule.h"
-#include "zelkord/network/ZelkorBagController.h"
+#include "zelkord/network/bag/BagRefreshRule.h"
+#include "zelkord/network/bag/ZelkorBagController.h"
 
 namespace zelkord {
 namespace {

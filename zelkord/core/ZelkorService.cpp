@@ -6,7 +6,7 @@
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/core/ClientConnection.h"
 #include "zelkord/feedback/SessionManager.h"
-#include "zelkord/network/ZelkorUserGUIDController.h"
+#include "zelkord/network/context/ZelkorUserGUIDController.h"
 
 namespace zelkord {
 namespace {

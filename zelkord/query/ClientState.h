@@ -15,7 +15,7 @@
 #include "platform/api/Budget.h"
 #include "platform/api/WorkQueues.h"
 #include "zelkord/assembly/InstalledBag.h"
-#include "zelkord/network/FieldMask.h"
+#include "zelkord/network/context/FieldMask.h"
 
 namespace zelkord {
 

@@ -4,7 +4,7 @@
 #include <unordered_set>
 
 #include "zelkord/assembly/Assembly.h"
-#include "zelkord/network/RequestLogText.h"
+#include "zelkord/network/exchange/RequestLogText.h"
 
 namespace zelkord {
 namespace {

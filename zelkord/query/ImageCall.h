@@ -10,7 +10,7 @@
 #include "base/Subscription.h"
 #include "base/Time.h"
 #include "corezelkor/ZLKBag.h"
-#include "zelkord/network/ImageFetcher.h"
+#include "zelkord/network/exchange/ImageFetcher.h"
 #include "zelkord/query/ArrivedImages.h"
 #include "zelkord/query/ImageWalk.h"
 

@@ -1,6 +1,6 @@
 #include "zelkord/query/ImageWalk.h"
 
-#include "zelkord/network/URLHost.h"
+#include "zelkord/network/exchange/URLHost.h"
 
 namespace zelkord {
 namespace {

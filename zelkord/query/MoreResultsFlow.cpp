@@ -3,7 +3,7 @@
 #include <algorithm>
 
 #include "base/Text.h"
-#include "zelkord/network/URLComponents.h"
+#include "zelkord/network/exchange/URLComponents.h"
 
 namespace zelkord {
 

@@ -5,8 +5,8 @@
 #include "zelkord/encoding/ErrorEncoding.h"
 #include "zelkord/feedback/SessionManager.h"
 #include "zelkord/feedback/UserGUIDSource.h"
-#include "zelkord/network/NetworkSearchRecords.h"
-#include "zelkord/network/NetworkTiming.h"
+#include "zelkord/network/exchange/NetworkSearchRecords.h"
+#include "zelkord/network/exchange/NetworkTiming.h"
 #include "zelkord/query/ClientState.h"
 
 namespace zelkord {

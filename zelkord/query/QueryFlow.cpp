@@ -2,9 +2,9 @@
 
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/feedback/UserGUIDSource.h"
-#include "zelkord/network/RequestLogText.h"
-#include "zelkord/network/ZLKNetworkRequestFactory.h"
-#include "zelkord/network/ZLKRetryableNetworkRequest.h"
+#include "zelkord/network/exchange/RequestLogText.h"
+#include "zelkord/network/exchange/ZLKRetryableNetworkRequest.h"
+#include "zelkord/network/request/ZLKNetworkRequestFactory.h"
 #include "zelkord/query/ErrorCodes.h"
 #include "zelkord/query/NetworkRecords.h"
 #include "zelkord/query/ResponseImages.h"

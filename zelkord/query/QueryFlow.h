@@ -6,7 +6,7 @@
 #include <string_view>
 
 #include "platform/api/URLSession.h"
-#include "zelkord/network/NetworkSearchRecords.h"
+#include "zelkord/network/exchange/NetworkSearchRecords.h"
 #include "zelkord/query/ClientState.h"
 #include "zelkord/query/QueryKind.h"
 

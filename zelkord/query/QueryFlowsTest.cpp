@@ -2,7 +2,7 @@
 #include <gtest/gtest.h>
 
 #include "halvane/DaemonFeedback.h"
-#include "zelkord/network/ImageFetcher.h"
+#include "zelkord/network/exchange/ImageFetcher.h"
 #include "zelkord/query/FlowKindsTestSupport.h"
 #include "zelkord/query/QueryCache.h"
 #include "zelkord/query/ResponseImages.h"

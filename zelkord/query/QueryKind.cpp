@@ -3,7 +3,7 @@
 #include <algorithm>
 
 #include "base/Check.h"
-#include "zelkord/network/ZLKNetworkRequestFactory.h"
+#include "zelkord/network/request/ZLKNetworkRequestFactory.h"
 #include "zelkord/query/LookupFlow.h"
 #include "zelkord/query/MoreResultsFlow.h"
 #include "zelkord/query/SearchFlow.h"

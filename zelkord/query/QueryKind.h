@@ -13,7 +13,7 @@
 #include "platform/api/URLRequest.h"
 #include "zelkord/ZelkorLogging/Tracing.h"
 #include "zelkord/ZelkorLogging/ZelkorLogging.h"
-#include "zelkord/network/FieldMask.h"
+#include "zelkord/network/context/FieldMask.h"
 
 namespace zelkord {
 

@@ -1,7 +1,7 @@
 #include "zelkord/query/QueryTestSupport.h"
 
 #include "base/Json.h"
-#include "zelkord/network/ZelkorUserGUIDController.h"
+#include "zelkord/network/context/ZelkorUserGUIDController.h"
 
 namespace zelkord {
 

@@ -8,8 +8,8 @@
 #include "platform/testing/FakePlatform.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/feedback/RecordingSessions.h"
-#include "zelkord/network/ZLKNetworkRequestFactory.h"
-#include "zelkord/network/ZelkorBagController.h"
+#include "zelkord/network/bag/ZelkorBagController.h"
+#include "zelkord/network/request/ZLKNetworkRequestFactory.h"
 #include "zelkord/query/ClientState.h"
 #include "zelkord/query/QueryKind.h"
 

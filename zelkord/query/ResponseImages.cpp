@@ -3,8 +3,8 @@
 #include <algorithm>
 
 #include "zelkord/assembly/Assembly.h"
-#include "zelkord/network/URLHost.h"
-#include "zelkord/network/ZelkorBagController.h"
+#include "zelkord/network/bag/ZelkorBagController.h"
+#include "zelkord/network/exchange/URLHost.h"
 
 namespace zelkord {
 namespace {

@@ -1,7 +1,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include "zelkord/network/ImageFetcher.h"
+#include "zelkord/network/exchange/ImageFetcher.h"
 #include "zelkord/query/QueryTestSupport.h"
 #include "zelkord/query/ResponseImages.h"
 

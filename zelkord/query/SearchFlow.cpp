@@ -6,7 +6,7 @@
 #include "halvane/DaemonFeedback.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/feedback/UserGUIDSource.h"
-#include "zelkord/network/ZelkorBagController.h"
+#include "zelkord/network/bag/ZelkorBagController.h"
 #include "zelkord/query/QueryCache.h"
 
 namespace zelkord {

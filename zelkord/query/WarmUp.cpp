@@ -4,8 +4,8 @@
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/assembly/UserAgent.h"
 #include "zelkord/feedback/SessionManager.h"
-#include "zelkord/network/NetworkSearchRecords.h"
-#include "zelkord/network/ZLKNetworkRequestFactory.h"
+#include "zelkord/network/exchange/NetworkSearchRecords.h"
+#include "zelkord/network/request/ZLKNetworkRequestFactory.h"
 #include "zelkord/query/RoutingProxy.h"
 
 namespace zelkord {

@@ -3,8 +3,8 @@
 #include <exception>
 #include <utility>
 
+#include "platform/api/mmapFileHandle.h"
 #include "zelkord/storage/SessionUnarchiver.h"
-#include "zelkord/storage/mmapFileHandle.h"
 
 namespace zelkord {
 namespace {

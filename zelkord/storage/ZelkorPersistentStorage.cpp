@@ -5,10 +5,10 @@
 #include <limits>
 #include <utility>
 
+#include "platform/api/mmapFileHandle.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/assembly/UserAgent.h"
 #include "zelkord/storage/ContainerFormat.h"
-#include "zelkord/storage/mmapFileHandle.h"
 
 namespace zelkord {
 namespace {

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "platform/api/Device.h"
+#include "platform/api/AccountService.h"
 #include "platform/linux/device_profile/DeviceProfileStore.h"
 
 namespace zelkord {

@@ -4,7 +4,7 @@
 #include <string>
 #include <vector>
 
-#include "platform/api/Device.h"
+#include "platform/api/DeviceProperties.h"
 #include "platform/api/FileManager.h"
 #include "platform/linux/device_profile/DeviceProfile.h"
 

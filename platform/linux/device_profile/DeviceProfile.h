@@ -6,7 +6,7 @@
 #include <vector>
 
 #include "base/Json.h"
-#include "platform/api/Device.h"
+#include "platform/api/DeviceManagement.h"
 #include "platform/api/LocationService.h"
 
 namespace zelkord {

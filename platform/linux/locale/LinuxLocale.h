@@ -5,7 +5,7 @@
 #include <string>
 
 #include "base/Mutex.h"
-#include "platform/api/Device.h"
+#include "platform/api/LocaleService.h"
 #include "platform/api/NotificationCenter.h"
 #include "platform/linux/device_profile/DeviceProfileStore.h"
 #include "platform/linux/locale/HostLocale.h"

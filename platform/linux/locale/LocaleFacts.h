@@ -1,6 +1,6 @@
 #pragma once
 
-#include "platform/api/Device.h"
+#include "platform/api/LocaleService.h"
 #include "platform/linux/device_profile/DeviceProfile.h"
 #include "platform/linux/locale/HostLocale.h"
 

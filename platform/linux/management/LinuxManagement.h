@@ -1,7 +1,7 @@
 #pragma once
 
 #include "base/Mutex.h"
-#include "platform/api/Device.h"
+#include "platform/api/DeviceManagement.h"
 #include "platform/api/FileManager.h"
 #include "platform/api/Log.h"
 #include "platform/linux/device_profile/DeviceProfileStore.h"

@@ -3,7 +3,9 @@
 #include <string>
 
 #include "base/Mutex.h"
-#include "platform/api/Device.h"
+#include "platform/api/LocaleService.h"
+#include "platform/api/MapsService.h"
+#include "platform/api/RandomSource.h"
 #include "platform/linux/device_profile/DeviceProfileStore.h"
 
 namespace zelkord {

@@ -5,8 +5,8 @@
 #include <string>
 
 #include "base/Mutex.h"
-#include "platform/api/Device.h"
 #include "platform/api/Log.h"
+#include "platform/api/NetworkProxyService.h"
 #include "platform/linux/device_profile/DeviceProfileStore.h"
 #include "platform/linux/url/ProxyConfiguration.h"
 

@@ -2,7 +2,8 @@
 
 #include <string>
 
-#include "platform/api/Device.h"
+#include "platform/api/LocaleService.h"
+#include "platform/api/TextInputService.h"
 #include "platform/linux/device_profile/DeviceProfileStore.h"
 
 namespace zelkord {

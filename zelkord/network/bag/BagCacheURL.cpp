@@ -1,8 +1,8 @@
-#include "zelkord/network/BagCacheURL.h"
+#include "zelkord/network/bag/BagCacheURL.h"
 
 #include "zelkord/assembly/Assembly.h"
-#include "zelkord/network/BagFetchURL.h"
-#include "zelkord/network/BagRequests.h"
+#include "zelkord/network/bag/BagFetchURL.h"
+#include "zelkord/network/bag/BagRequests.h"
 
 namespace zelkord {
 

@@ -1,10 +1,10 @@
-#include "zelkord/network/BagDiskCache.h"
+#include "zelkord/network/bag/BagDiskCache.h"
 
 #include <algorithm>
 #include <cerrno>
 
 #include "zelkord/assembly/Assembly.h"
-#include "zelkord/network/BagResponse.h"
+#include "zelkord/network/bag/BagResponse.h"
 
 namespace zelkord {
 namespace {

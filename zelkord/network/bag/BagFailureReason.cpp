@@ -1,4 +1,4 @@
-#include "zelkord/network/BagFailureReason.h"
+#include "zelkord/network/bag/BagFailureReason.h"
 
 #include <algorithm>
 

@@ -1,6 +1,6 @@
 #include <gtest/gtest.h>
 
-#include "zelkord/network/BagFailureReason.h"
+#include "zelkord/network/bag/BagFailureReason.h"
 
 namespace zelkord {
 namespace {

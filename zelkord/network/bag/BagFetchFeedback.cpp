@@ -1,10 +1,10 @@
-#include "zelkord/network/BagFetchFeedback.h"
+#include "zelkord/network/bag/BagFetchFeedback.h"
 
 #include "platform/api/RandomUUID.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/encoding/ErrorEncoding.h"
 #include "zelkord/feedback/UserGUIDSource.h"
-#include "zelkord/network/NetworkSearchRecords.h"
+#include "zelkord/network/exchange/NetworkSearchRecords.h"
 
 namespace zelkord {
 namespace {

@@ -1,7 +1,7 @@
-#include "zelkord/network/BagFetchURL.h"
+#include "zelkord/network/bag/BagFetchURL.h"
 
 #include "base/Text.h"
-#include "zelkord/network/URLComponents.h"
+#include "zelkord/network/exchange/URLComponents.h"
 
 namespace zelkord {
 

@@ -1,10 +1,10 @@
-#include "zelkord/network/BagFollower.h"
+#include "zelkord/network/bag/BagFollower.h"
 
 #include <utility>
 
 #include "zelkord/assembly/Assembly.h"
-#include "zelkord/network/LocationController.h"
-#include "zelkord/network/VisibilityRestrictions.h"
+#include "zelkord/network/context/LocationController.h"
+#include "zelkord/network/context/VisibilityRestrictions.h"
 
 namespace zelkord {
 

@@ -5,7 +5,7 @@
 
 #include "base/Subscription.h"
 #include "zelkord/assembly/InstalledBag.h"
-#include "zelkord/network/RequestContextStore.h"
+#include "zelkord/network/context/RequestContextStore.h"
 
 namespace zelkord {
 

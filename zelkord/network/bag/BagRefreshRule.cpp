@@ -1,4 +1,4 @@
-#include "zelkord/network/BagRefreshRule.h"
+#include "zelkord/network/bag/BagRefreshRule.h"
 
 namespace zelkord {
 

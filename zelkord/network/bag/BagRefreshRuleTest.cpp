@@ -1,6 +1,6 @@
 #include <gtest/gtest.h>
 
-#include "zelkord/network/BagRefreshRule.h"
+#include "zelkord/network/bag/BagRefreshRule.h"
 
 namespace zelkord {
 namespace {

@@ -1,8 +1,8 @@
-#include "zelkord/network/BagResponse.h"
+#include "zelkord/network/bag/BagResponse.h"
 
 #include <fmt/core.h>
 
-#include "zelkord/network/RequestLogText.h"
+#include "zelkord/network/exchange/RequestLogText.h"
 
 namespace zelkord {
 namespace {

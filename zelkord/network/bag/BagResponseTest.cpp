@@ -2,7 +2,7 @@
 
 #include "platform/testing/FakeSettings.h"
 #include "platform/testing/RecordingLog.h"
-#include "zelkord/network/BagResponse.h"
+#include "zelkord/network/bag/BagResponse.h"
 
 namespace zelkord {
 namespace {

@@ -1,4 +1,4 @@
-#include "zelkord/network/ZelkorBagController.h"
+#include "zelkord/network/bag/ZelkorBagController.h"
 
 #include <utility>
 
@@ -7,14 +7,14 @@
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/assembly/NotificationNames.h"
 #include "zelkord/assembly/UserAgent.h"
-#include "zelkord/network/BagFailureReason.h"
-#include "zelkord/network/BagFetchFeedback.h"
-#include "zelkord/network/BagFetchURL.h"
-#include "zelkord/network/BagRefreshRule.h"
-#include "zelkord/network/BagRequests.h"
-#include "zelkord/network/BagResponse.h"
-#include "zelkord/network/RequestLogText.h"
-#include "zelkord/network/ZLKRetryableNetworkRequest.h"
+#include "zelkord/network/bag/BagFailureReason.h"
+#include "zelkord/network/bag/BagFetchFeedback.h"
+#include "zelkord/network/bag/BagFetchURL.h"
+#include "zelkord/network/bag/BagRefreshRule.h"
+#include "zelkord/network/bag/BagRequests.h"
+#include "zelkord/network/bag/BagResponse.h"
+#include "zelkord/network/exchange/RequestLogText.h"
+#include "zelkord/network/exchange/ZLKRetryableNetworkRequest.h"
 
 namespace zelkord {
 namespace {

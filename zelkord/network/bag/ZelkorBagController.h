@@ -12,9 +12,9 @@
 #include "base/Json.h"
 #include "platform/api/URLSession.h"
 #include "zelkord/assembly/InstalledBag.h"
-#include "zelkord/network/BagCacheURL.h"
-#include "zelkord/network/BagDiskCache.h"
-#include "zelkord/network/BagFetchStatus.h"
+#include "zelkord/network/bag/BagCacheURL.h"
+#include "zelkord/network/bag/BagDiskCache.h"
+#include "zelkord/network/bag/BagFetchStatus.h"
 
 namespace zelkord {
 

@@ -9,9 +9,9 @@
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/assembly/NotificationNames.h"
 #include "zelkord/feedback/SessionManager.h"
-#include "zelkord/network/BagRequests.h"
-#include "zelkord/network/ZelkorBagController.h"
-#include "zelkord/network/ZelkorUserGUIDController.h"
+#include "zelkord/network/bag/BagRequests.h"
+#include "zelkord/network/bag/ZelkorBagController.h"
+#include "zelkord/network/context/ZelkorUserGUIDController.h"
 
 namespace zelkord {
 namespace {

@@ -1,10 +1,10 @@
-#include "zelkord/network/ContextUpdater.h"
+#include "zelkord/network/context/ContextUpdater.h"
 
 #include <utility>
 
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/assembly/NotificationNames.h"
-#include "zelkord/network/DebugParameters.h"
+#include "zelkord/network/context/DebugParameters.h"
 
 namespace zelkord {
 

@@ -7,7 +7,7 @@
 
 #include "base/Mutex.h"
 #include "base/Subscription.h"
-#include "zelkord/network/RequestContextStore.h"
+#include "zelkord/network/context/RequestContextStore.h"
 
 namespace zelkord {
 

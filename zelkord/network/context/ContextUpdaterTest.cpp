@@ -3,10 +3,10 @@
 #include <map>
 
 #include "zelkord/assembly/NotificationNames.h"
-#include "zelkord/network/ContextUpdater.h"
-#include "zelkord/network/RequestFactoryTestSupport.h"
-#include "zelkord/network/VisibilityRestrictions.h"
-#include "zelkord/network/ZelkorUserGUIDController.h"
+#include "zelkord/network/context/ContextUpdater.h"
+#include "zelkord/network/context/VisibilityRestrictions.h"
+#include "zelkord/network/context/ZelkorUserGUIDController.h"
+#include "zelkord/network/request/RequestFactoryTestSupport.h"
 
 namespace zelkord {
 namespace {

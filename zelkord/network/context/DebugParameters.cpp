@@ -1,4 +1,4 @@
-#include "zelkord/network/DebugParameters.h"
+#include "zelkord/network/context/DebugParameters.h"
 
 #include <algorithm>
 

@@ -1,6 +1,6 @@
 #include <gtest/gtest.h>
 
-#include "zelkord/network/DebugParameters.h"
+#include "zelkord/network/context/DebugParameters.h"
 
 namespace zelkord {
 namespace {

@@ -1,4 +1,4 @@
-#include "zelkord/network/HeaderJson.h"
+#include "zelkord/network/context/HeaderJson.h"
 
 #include <array>
 #include <charconv>

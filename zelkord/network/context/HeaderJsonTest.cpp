@@ -2,7 +2,7 @@
 
 #include <limits>
 
-#include "zelkord/network/HeaderJson.h"
+#include "zelkord/network/context/HeaderJson.h"
 
 namespace zelkord {
 namespace {

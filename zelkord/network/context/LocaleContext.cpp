@@ -1,8 +1,8 @@
-#include "zelkord/network/LocaleContext.h"
+#include "zelkord/network/context/LocaleContext.h"
 
 #include <algorithm>
 
-#include "zelkord/network/HeaderJson.h"
+#include "zelkord/network/context/HeaderJson.h"
 
 namespace zelkord {
 namespace {

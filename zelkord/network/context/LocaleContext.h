@@ -5,7 +5,7 @@
 #include <vector>
 
 #include "base/Namespace.h"
-#include "platform/api/Device.h"
+#include "platform/api/LocaleService.h"
 
 namespace zelkord {
 

@@ -1,6 +1,6 @@
 #include <gtest/gtest.h>
 
-#include "zelkord/network/LocaleContext.h"
+#include "zelkord/network/context/LocaleContext.h"
 
 namespace zelkord {
 namespace {

@@ -1,4 +1,4 @@
-#include "zelkord/network/LocationContext.h"
+#include "zelkord/network/context/LocationContext.h"
 
 #include <fmt/core.h>
 

@@ -1,6 +1,6 @@
 #include <gtest/gtest.h>
 
-#include "zelkord/network/LocationContext.h"
+#include "zelkord/network/context/LocationContext.h"
 
 namespace zelkord {
 namespace {

@@ -1,4 +1,4 @@
-#include "zelkord/network/LocationController.h"
+#include "zelkord/network/context/LocationController.h"
 
 #include <utility>
 

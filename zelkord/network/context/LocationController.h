@@ -8,7 +8,7 @@
 #include "base/Guarded.h"
 #include "platform/api/LocationService.h"
 #include "platform/api/WorkQueues.h"
-#include "zelkord/network/RequestContextStore.h"
+#include "zelkord/network/context/RequestContextStore.h"
 
 namespace zelkord {
 

@@ -1,7 +1,7 @@
 #include <gtest/gtest.h>
 
-#include "zelkord/network/LocationController.h"
-#include "zelkord/network/RequestFactoryTestSupport.h"
+#include "zelkord/network/context/LocationController.h"
+#include "zelkord/network/request/RequestFactoryTestSupport.h"
 
 namespace zelkord {
 namespace {

@@ -4,8 +4,8 @@
 #include <vector>
 
 #include "corezelkor/Messages.h"
-#include "zelkord/network/LocaleContext.h"
-#include "zelkord/network/LocationContext.h"
+#include "zelkord/network/context/LocaleContext.h"
+#include "zelkord/network/context/LocationContext.h"
 
 namespace zelkord {
 

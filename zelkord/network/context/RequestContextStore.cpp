@@ -1,4 +1,4 @@
-#include "zelkord/network/RequestContextStore.h"
+#include "zelkord/network/context/RequestContextStore.h"
 
 #include <utility>
 

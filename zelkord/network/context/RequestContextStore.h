@@ -7,7 +7,7 @@
 
 #include "base/FunctionRef.h"
 #include "platform/api/WorkQueues.h"
-#include "zelkord/network/RequestContext.h"
+#include "zelkord/network/context/RequestContext.h"
 
 namespace zelkord {
 

@@ -1,4 +1,4 @@
-#include "zelkord/network/VisibilityRestrictions.h"
+#include "zelkord/network/context/VisibilityRestrictions.h"
 
 #include <utility>
 

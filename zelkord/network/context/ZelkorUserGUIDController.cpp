@@ -1,4 +1,4 @@
-#include "zelkord/network/ZelkorUserGUIDController.h"
+#include "zelkord/network/context/ZelkorUserGUIDController.h"
 
 #include <utility>
 

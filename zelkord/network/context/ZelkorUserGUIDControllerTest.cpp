@@ -6,7 +6,7 @@
 #include "platform/testing/FakePlatform.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/assembly/NotificationNames.h"
-#include "zelkord/network/ZelkorUserGUIDController.h"
+#include "zelkord/network/context/ZelkorUserGUIDController.h"
 
 namespace zelkord {
 namespace {

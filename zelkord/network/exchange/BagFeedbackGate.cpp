@@ -1,4 +1,4 @@
-#include "zelkord/network/BagFeedbackGate.h"
+#include "zelkord/network/exchange/BagFeedbackGate.h"
 
 #include "zelkord/assembly/Assembly.h"
 

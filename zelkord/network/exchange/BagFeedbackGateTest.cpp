@@ -2,9 +2,9 @@
 
 #include "platform/testing/FakePlatform.h"
 #include "zelkord/assembly/Assembly.h"
-#include "zelkord/network/BagFeedbackGate.h"
-#include "zelkord/network/ZLKNetworkRequestFactory.h"
-#include "zelkord/network/ZelkorBagController.h"
+#include "zelkord/network/bag/ZelkorBagController.h"
+#include "zelkord/network/exchange/BagFeedbackGate.h"
+#include "zelkord/network/request/ZLKNetworkRequestFactory.h"
 
 namespace zelkord {
 namespace {

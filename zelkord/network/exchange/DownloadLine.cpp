@@ -1,4 +1,4 @@
-#include "zelkord/network/DownloadLine.h"
+#include "zelkord/network/exchange/DownloadLine.h"
 
 #include <algorithm>
 

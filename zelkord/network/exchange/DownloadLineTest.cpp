@@ -1,7 +1,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include "zelkord/network/DownloadLine.h"
+#include "zelkord/network/exchange/DownloadLine.h"
 
 namespace zelkord {
 namespace {

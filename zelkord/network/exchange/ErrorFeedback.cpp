@@ -1,4 +1,4 @@
-#include "zelkord/network/ErrorFeedback.h"
+#include "zelkord/network/exchange/ErrorFeedback.h"
 
 #include "halvane/ModelFeedback.h"
 #include "zelkord/assembly/Assembly.h"

@@ -1,4 +1,4 @@
-#include "zelkord/network/ImageFetcher.h"
+#include "zelkord/network/exchange/ImageFetcher.h"
 
 #include <strings.h>
 
@@ -6,13 +6,13 @@
 
 #include "base/Guarded.h"
 #include "platform/api/RandomUUID.h"
+#include "platform/api/mmapFileHandle.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/assembly/UserAgent.h"
 #include "zelkord/feedback/SessionManager.h"
-#include "zelkord/network/ErrorFeedback.h"
-#include "zelkord/network/NetworkSearchRecords.h"
-#include "zelkord/network/URLHost.h"
-#include "zelkord/storage/mmapFileHandle.h"
+#include "zelkord/network/exchange/ErrorFeedback.h"
+#include "zelkord/network/exchange/NetworkSearchRecords.h"
+#include "zelkord/network/exchange/URLHost.h"
 
 namespace zelkord {
 namespace {

@@ -14,7 +14,7 @@
 #include "platform/api/Budget.h"
 #include "platform/api/URLSession.h"
 #include "platform/api/WorkQueues.h"
-#include "zelkord/network/DownloadLine.h"
+#include "zelkord/network/exchange/DownloadLine.h"
 
 namespace zelkord {
 

@@ -9,8 +9,8 @@
 #include "zelkord/assembly/UserAgent.h"
 #include "zelkord/encoding/ErrorEncoding.h"
 #include "zelkord/feedback/RecordingSessions.h"
-#include "zelkord/network/ImageFetcher.h"
-#include "zelkord/network/ZelkorUserGUIDController.h"
+#include "zelkord/network/context/ZelkorUserGUIDController.h"
+#include "zelkord/network/exchange/ImageFetcher.h"
 
 namespace zelkord {
 namespace {

@@ -1,6 +1,6 @@
-#include "zelkord/network/NetworkSearchRecords.h"
+#include "zelkord/network/exchange/NetworkSearchRecords.h"
 
-#include "zelkord/network/NetworkTiming.h"
+#include "zelkord/network/exchange/NetworkTiming.h"
 
 namespace zelkord {
 namespace {

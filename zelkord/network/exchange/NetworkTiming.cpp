@@ -1,4 +1,4 @@
-#include "zelkord/network/NetworkTiming.h"
+#include "zelkord/network/exchange/NetworkTiming.h"
 
 namespace zelkord {
 

@@ -1,4 +1,4 @@
-#include "zelkord/network/RequestLogText.h"
+#include "zelkord/network/exchange/RequestLogText.h"
 
 namespace zelkord {
 namespace {

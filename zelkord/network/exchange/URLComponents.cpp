@@ -1,4 +1,4 @@
-#include "zelkord/network/URLComponents.h"
+#include "zelkord/network/exchange/URLComponents.h"
 
 #include <algorithm>
 #include <array>

@@ -1,8 +1,8 @@
-#include "zelkord/network/URLHost.h"
+#include "zelkord/network/exchange/URLHost.h"
 
 #include <algorithm>
 
-#include "zelkord/network/URLComponents.h"
+#include "zelkord/network/exchange/URLComponents.h"
 
 namespace zelkord {
 namespace {

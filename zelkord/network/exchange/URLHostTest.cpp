@@ -1,6 +1,6 @@
 #include <gtest/gtest.h>
 
-#include "zelkord/network/URLHost.h"
+#include "zelkord/network/exchange/URLHost.h"
 
 namespace zelkord {
 namespace {

@@ -1,4 +1,4 @@
-#include "zelkord/network/ZLKRetryableNetworkRequest.h"
+#include "zelkord/network/exchange/ZLKRetryableNetworkRequest.h"
 
 #include <utility>
 

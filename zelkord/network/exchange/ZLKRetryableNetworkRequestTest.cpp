@@ -2,7 +2,7 @@
 
 #include "platform/testing/FakeURLSession.h"
 #include "platform/testing/ManualTimeline.h"
-#include "zelkord/network/ZLKRetryableNetworkRequest.h"
+#include "zelkord/network/exchange/ZLKRetryableNetworkRequest.h"
 
 namespace zelkord {
 namespace {

@@ -1,4 +1,4 @@
-#include "zelkord/network/RequestFactoryTestSupport.h"
+#include "zelkord/network/request/RequestFactoryTestSupport.h"
 
 #include "zelkord/assembly/NotificationNames.h"
 

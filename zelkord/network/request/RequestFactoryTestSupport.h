@@ -8,9 +8,9 @@
 
 #include "platform/testing/FakePlatform.h"
 #include "zelkord/assembly/Assembly.h"
-#include "zelkord/network/AppSignatureSource.h"
-#include "zelkord/network/ZLKNetworkRequestFactory.h"
-#include "zelkord/network/ZelkorBagController.h"
+#include "zelkord/network/bag/ZelkorBagController.h"
+#include "zelkord/network/context/AppSignatureSource.h"
+#include "zelkord/network/request/ZLKNetworkRequestFactory.h"
 
 namespace zelkord {
 

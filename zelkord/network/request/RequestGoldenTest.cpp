@@ -5,7 +5,7 @@
 #include <fstream>
 #include <sstream>
 
-#include "zelkord/network/RequestFactoryTestSupport.h"
+#include "zelkord/network/request/RequestFactoryTestSupport.h"
 
 namespace zelkord {
 namespace {

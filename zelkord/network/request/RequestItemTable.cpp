@@ -1,4 +1,4 @@
-#include "zelkord/network/RequestItemTable.h"
+#include "zelkord/network/request/RequestItemTable.h"
 
 #include <fmt/core.h>
 

@@ -1,7 +1,7 @@
 #pragma once
 
 #include "zelkord/assembly/ServiceSessions.h"
-#include "zelkord/network/RequestItems.h"
+#include "zelkord/network/request/RequestItems.h"
 
 namespace zelkord::items {
 

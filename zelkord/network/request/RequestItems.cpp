@@ -1,10 +1,10 @@
-#include "zelkord/network/RequestItems.h"
+#include "zelkord/network/request/RequestItems.h"
 
 #include <algorithm>
 #include <utility>
 
-#include "zelkord/network/RequestItemTable.h"
-#include "zelkord/network/ZelkorURLRequestBuilder.h"
+#include "zelkord/network/request/RequestItemTable.h"
+#include "zelkord/network/request/ZelkorURLRequestBuilder.h"
 
 namespace zelkord {
 namespace items {

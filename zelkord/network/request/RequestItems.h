@@ -8,8 +8,8 @@
 #include "base/UUID.h"
 #include "corezelkor/Messages.h"
 #include "corezelkor/ZLKBag.h"
-#include "zelkord/network/FieldMask.h"
-#include "zelkord/network/RequestContext.h"
+#include "zelkord/network/context/FieldMask.h"
+#include "zelkord/network/context/RequestContext.h"
 
 namespace zelkord {
 

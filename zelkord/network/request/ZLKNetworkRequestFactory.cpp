@@ -1,19 +1,19 @@
-#include "zelkord/network/ZLKNetworkRequestFactory.h"
+#include "zelkord/network/request/ZLKNetworkRequestFactory.h"
 
 #include <utility>
 
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/assembly/NotificationNames.h"
 #include "zelkord/assembly/UserAgent.h"
-#include "zelkord/network/AppSignatureSource.h"
-#include "zelkord/network/BagFollower.h"
-#include "zelkord/network/ContextUpdater.h"
-#include "zelkord/network/HeaderJson.h"
-#include "zelkord/network/LocationController.h"
-#include "zelkord/network/RequestContextStore.h"
-#include "zelkord/network/RequestItems.h"
-#include "zelkord/network/ZelkorBagController.h"
-#include "zelkord/network/ZelkorURLRequestBuilder.h"
+#include "zelkord/network/bag/BagFollower.h"
+#include "zelkord/network/bag/ZelkorBagController.h"
+#include "zelkord/network/context/AppSignatureSource.h"
+#include "zelkord/network/context/ContextUpdater.h"
+#include "zelkord/network/context/HeaderJson.h"
+#include "zelkord/network/context/LocationController.h"
+#include "zelkord/network/context/RequestContextStore.h"
+#include "zelkord/network/request/RequestItems.h"
+#include "zelkord/network/request/ZelkorURLRequestBuilder.h"
 
 namespace zelkord {
 namespace {

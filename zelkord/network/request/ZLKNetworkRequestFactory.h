@@ -11,10 +11,10 @@
 #include "corezelkor/Messages.h"
 #include "corezelkor/ZLKBag.h"
 #include "platform/api/URLRequest.h"
-#include "zelkord/network/BagRequests.h"
-#include "zelkord/network/FieldMask.h"
-#include "zelkord/network/MapsUserSession.h"
-#include "zelkord/network/SubscriptionDelegate.h"
+#include "zelkord/network/bag/BagRequests.h"
+#include "zelkord/network/context/FieldMask.h"
+#include "zelkord/network/context/MapsUserSession.h"
+#include "zelkord/network/context/SubscriptionDelegate.h"
 
 namespace zelkord {
 

@@ -1,8 +1,8 @@
 #include <gtest/gtest.h>
 
-#include "zelkord/network/RequestFactoryTestSupport.h"
-#include "zelkord/network/URLComponents.h"
-#include "zelkord/network/ZLKNetworkRequestFactory.h"
+#include "zelkord/network/exchange/URLComponents.h"
+#include "zelkord/network/request/RequestFactoryTestSupport.h"
+#include "zelkord/network/request/ZLKNetworkRequestFactory.h"
 
 namespace zelkord {
 namespace {

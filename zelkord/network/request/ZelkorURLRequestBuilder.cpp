@@ -1,4 +1,4 @@
-#include "zelkord/network/ZelkorURLRequestBuilder.h"
+#include "zelkord/network/request/ZelkorURLRequestBuilder.h"
 
 #include <algorithm>
 #include <utility>

@@ -8,7 +8,7 @@
 
 #include "corezelkor/Messages.h"
 #include "platform/api/URLRequest.h"
-#include "zelkord/network/URLComponents.h"
+#include "zelkord/network/exchange/URLComponents.h"
 
 namespace zelkord {
 

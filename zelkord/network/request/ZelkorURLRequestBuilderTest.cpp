@@ -1,6 +1,6 @@
 #include <gtest/gtest.h>
 
-#include "zelkord/network/ZelkorURLRequestBuilder.h"
+#include "zelkord/network/request/ZelkorURLRequestBuilder.h"
 
 namespace zelkord {
 namespace {
