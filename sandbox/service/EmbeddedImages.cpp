@@ -86,7 +86,8 @@ std::optional<Failure> EmbeddedImages::set(const json::value& value) {
   if (!value.is_object()) return Failure{"not a JSON object"};
   KeyReader reader(value.get_object());
   const Wish wish = readWish(reader);
-  if (!reader.wrong().empty()) return Failure{"bad value of \"" + reader.wrong() + "\""};
+  const auto& wrong = reader.finish();
+  if (!wrong.empty()) return Failure{"bad value of \"" + wrong + "\", or no such key"};
   auto member = std::make_shared<const std::string>(memberText(wish));
   const std::lock_guard lock(mutex_);
   member_ = std::move(member);

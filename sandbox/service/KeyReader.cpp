@@ -3,7 +3,7 @@
 namespace sandbox {
 
 std::uint64_t KeyReader::number(std::string_view key, std::uint64_t otherwise, std::uint64_t most) {
-  const auto* value = object_.if_contains(key);
+  const auto* value = _value(key);
   if (value == nullptr) return otherwise;
   boost::system::error_code error;
   const auto number = value->to_number<std::uint64_t>(error);
@@ -12,7 +12,7 @@ std::uint64_t KeyReader::number(std::string_view key, std::uint64_t otherwise, s
 }
 
 std::optional<std::string> KeyReader::text(std::string_view key) {
-  const auto* value = object_.if_contains(key);
+  const auto* value = _value(key);
   if (value == nullptr) return std::nullopt;
   if (value->is_string()) return std::string(value->get_string());
   fail(key);
@@ -21,7 +21,7 @@ std::optional<std::string> KeyReader::text(std::string_view key) {
 
 std::vector<std::string> KeyReader::texts(std::string_view key) {
   std::vector<std::string> texts;
-  const auto* value = object_.if_contains(key);
+  const auto* value = _value(key);
   if (value == nullptr) return texts;
   if (!value->is_array())
     fail(key);
@@ -37,7 +37,7 @@ std::vector<std::string> KeyReader::texts(std::string_view key) {
 
 Headers KeyReader::headers(std::string_view key) {
   Headers headers;
-  const auto* value = object_.if_contains(key);
+  const auto* value = _value(key);
   if (value == nullptr) return headers;
   if (!value->is_object())
     fail(key);
@@ -49,6 +49,18 @@ Headers KeyReader::headers(std::string_view key) {
         fail(key);
     }
   return headers;
+}
+
+const boost::json::value* KeyReader::_value(std::string_view key) {
+  asked_.emplace(key);
+  return object_.if_contains(key);
+}
+
+const std::string& KeyReader::finish() {
+  for (const auto& member : object_) {
+    if (!asked_.contains(member.key())) fail(member.key());
+  }
+  return wrong_;
 }
 
 void KeyReader::fail(std::string_view key) {

@@ -2,7 +2,9 @@
 
 #include <boost/json/object.hpp>
 #include <cstdint>
+#include <functional>
 #include <optional>
+#include <set>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -11,7 +13,8 @@
 
 namespace sandbox {
 
-// Reads the keys of a control request's object; the first wrong one is remembered.
+// Reads the keys of a control request's object; the first wrong one is remembered. One that nobody
+// asks for is wrong too, so that a slip of the pen does not pass for a request.
 //
 // Threading: one thread. Ownership: borrows the object.
 class KeyReader final {
@@ -28,10 +31,14 @@ class KeyReader final {
 
   bool has(std::string_view key) const { return object_.contains(key); }
   void fail(std::string_view key);
-  const std::string& wrong() const { return wrong_; }
+  // After all reading: the key that is wrong, empty when there is none.
+  const std::string& finish();
 
  private:
+  const boost::json::value* _value(std::string_view key);
+
   const boost::json::object& object_;
+  std::set<std::string, std::less<>> asked_;
   std::string wrong_;
 };
 

@@ -135,13 +135,15 @@ Outcome<Misbehaviour> parseMisbehaviour(const json::value& value) {
   rule.delay = std::chrono::milliseconds(reader.number("delay_ms", 0, kLongestMs));
   rule.interval =
       std::chrono::milliseconds(reader.number("interval_ms", kStandardIntervalMs, kLongestMs));
-  if (reader.has("status")) rule.status = static_cast<unsigned>(reader.number("status", 200, 999));
+  const auto status = static_cast<unsigned>(reader.number("status", 200, 999));
+  if (reader.has("status")) rule.status = status;
   rule.body = reader.text("body");
   rule.location = reader.text("location").value_or("/");
   rule.bytes = reader.number("bytes", standardBytes(rule.kind), kMostBytes);
   rule.depth = reader.number("depth", kStandardDepth, kMostBytes);
   rule.headers = reader.headers("headers");
-  if (!reader.wrong().empty()) return Failure{"bad value of \"" + reader.wrong() + "\""};
+  const auto& wrong = reader.finish();
+  if (!wrong.empty()) return Failure{"bad value of \"" + wrong + "\", or no such key"};
   return rule;
 }
 

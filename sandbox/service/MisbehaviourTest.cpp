@@ -22,7 +22,8 @@ TEST(MisbehaviourTest, RefusesBadValuesByName) {
            {R"({"delay_ms":"soon"})", "delay_ms"},
            {R"({"bytes":1e12})", "bytes"},
            {R"({"headers":["a"]})", "headers"},
-           {R"({"headers":{"a":1}})", "headers"}}) {
+           {R"({"headers":{"a":1}})", "headers"},
+           {R"({"path":"/search","forever":true})", "forever"}}) {
     SCOPED_TRACE(text);
     const auto rule = parseMisbehaviour(boost::json::parse(text));
     ASSERT_FALSE(rule);

@@ -6,8 +6,8 @@
 
 namespace zelkord::ipc {
 
-// sd-bus objects with an owner. None of them is thread-safe: they live and die on the loop's
-// thread.
+// sd-bus objects with an owner. None of them is thread-safe: they live and die on the loop, which
+// one thread has at a time.
 struct BusDeleter {
   void operator()(sd_bus* bus) const { sd_bus_close_unref(bus); }
   void operator()(sd_bus_message* message) const { sd_bus_message_unref(message); }

@@ -21,9 +21,9 @@ namespace zelkord::ipc {
 // A socket goes through: accepted, the user checked, a place of the budget taken, admitted (where
 // the delegate bounds the connections, its place takes the other's turn), authenticated, open. What
 // ends earlier is closed without a byte, or with what the authentication said; up to there it may
-// have to make room for another. Threading: the loop's thread, except
-// `port`. Ownership: the transport; `close` first, then destroy. Errors: out of descriptors, the
-// reserve lets the next clients in; without that it stops accepting for a moment.
+// have to make room for another. Threading: the loop, except `port`. Ownership: the transport;
+// `close` first, then destroy. Errors: out of descriptors, the reserve lets the next clients in;
+// without that it stops accepting for a moment.
 class PrivateListener final : public std::enable_shared_from_this<PrivateListener> {
  public:
   // `serviceInterface`: the interface with Open; empty for none.

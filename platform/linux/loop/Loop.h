@@ -21,9 +21,9 @@
 
 namespace zelkord {
 
-// One thread that waits for descriptors, times and posted tasks, and sleeps while there are none.
-// What is posted while it sleeps runs on the posting thread, when that is a service thread without
-// a loop of its own.
+// Waits for descriptors, times and posted tasks, on one thread at a time, and sleeps while there
+// are none. What is posted while it sleeps runs on the posting thread, when that is a service
+// thread that leads no loop at the moment.
 //
 // States: not started (until the first `post` or `sync`), running, ended. Tasks run in the order in
 // which they were posted; a post costs at most one wake-up, none when somebody has the loop.
@@ -32,10 +32,9 @@ namespace zelkord {
 // himself, see CarriedWork.
 //
 // Threading: `post`, `sync`, `stop`, `inbox` and `isCurrent` on any thread; everything else on the
-// one that the loop belongs to: its own, or one that runs posted tasks; before the start and after
-// the end any one at a time.
-// Ownership: outlives its subscriptions and timers; destroying it (not from its tasks) ends it.
-// The crew outlives it.
+// one that the loop belongs to: its leader, or one that runs posted tasks; before the start and
+// after the end any one at a time. Ownership: outlives its subscriptions and timers; destroying it
+// (not from its tasks) ends it. The crew outlives it.
 class ZK_CAPABILITY("loop") Loop final : private LoopHost, private LedLoop {
  public:
   // Without a crew the loop has a thread of its own, which has the name, at most 15 bytes.

@@ -11,8 +11,9 @@
 
 namespace zelkord {
 
-// What belongs to one loop at a time is touched by one thread at a time: the loop's own while it is
-// awake, and while it sleeps whoever posts something. That saves waking it and switching to it.
+// What belongs to one loop is touched by one thread at a time: its leader while he is awake and
+// there, and while he sleeps or is away whoever posts something. That saves waking him and
+// switching to him.
 class LoopHost {
  public:
   virtual ~LoopHost() = default;
@@ -24,12 +25,13 @@ class LoopHost {
 
 // Tasks on their way to a loop, and the loop itself while its leader sleeps or is away.
 //
-// States: the loop's thread is awake and will look here before it sleeps; it sleeps; it sleeps and
-// the loop is lent to a thread that has posted; closed, when tasks are dropped. Tasks run in the
-// order in which they were posted, never from within another one. Only service threads
-// that have no loop are lent this one, for a bounded number of tasks; others wake its leader.
+// States: the loop's leader is awake and will look here before he sleeps; he sleeps or is away; the
+// loop is lent meanwhile to a thread that has posted; closed, when tasks are dropped. Tasks run in
+// the order in which they were posted, never from within another one. Only service threads that
+// lead no loop at the moment are lent this one, for a bounded number of tasks; others wake its
+// leader.
 //
-// Threading: `post` and `isCurrent` on any thread, the rest on the loop's.
+// Threading: `post` and `isCurrent` on any thread, the rest on the leader's.
 // Ownership: shared with everything that may post late; the host lives until `close`.
 class LoopInbox {
  public:
@@ -45,14 +47,14 @@ class LoopInbox {
   // Whether the calling thread is the one that the loop belongs to at the moment.
   bool isCurrent() const { return owner_.load() == std::this_thread::get_id(); }
 
-  // An edge at each wake-up of the loop's thread; there is nothing to read.
+  // An edge at each wake-up of the loop's leader, or of who follows him; there is nothing to read.
   int descriptor() const { return wakeUp_.get(); }
-  // The calling thread is the loop's own no more.
+  // The calling thread leads the loop no more.
   void end() { owner_ = std::thread::id(); }
   std::vector<Task> take();
   // From here to `endSleep` nothing of the loop's may be touched. False when there are tasks.
   bool beginSleep();
-  // The calling thread is the loop's own from now on. Waits for the end of a loan.
+  // The calling thread leads the loop from now on. Waits for the end of a loan.
   void endSleep();
   // What has come too late to be run by anybody else than the caller.
   std::vector<Task> close();
@@ -71,7 +73,7 @@ class LoopInbox {
   Mutex mutex_;
   CondVar returned_;
   State state_ ZK_GUARDED_BY(mutex_) = State::Awake;
-  bool awaited_ ZK_GUARDED_BY(mutex_) = false;  // the loop's thread is up and waits for its return
+  bool awaited_ ZK_GUARDED_BY(mutex_) = false;  // the leader is up and waits for its return
   std::vector<Task> tasks_ ZK_GUARDED_BY(mutex_);
 };
 

@@ -15,7 +15,8 @@ namespace zelkord {
 class MainLoop;
 class TimerService;
 
-// The process's queues, on one pool of workers and one timer thread.
+// The process's queues, on one pool of workers, the leaders of its crew's loops and one timer
+// thread.
 //
 // Threading: any thread.
 // Ownership: outlives the tasks of its queues. Destroying it ends its threads, so every task that

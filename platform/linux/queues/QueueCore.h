@@ -93,7 +93,7 @@ class QueueCore final : public std::enable_shared_from_this<QueueCore> {
   Mutex mutex_;
   CondVar left_;
   std::deque<Item> pending_ ZK_GUARDED_BY(mutex_);  // in order of arrival
-  std::deque<Item> granted_ ZK_GUARDED_BY(mutex_);  // have a place and wait for a worker
+  std::deque<Item> granted_ ZK_GUARDED_BY(mutex_);  // have a place and wait for a thread
   bool closed_ ZK_GUARDED_BY(mutex_) = false;
 };
 

@@ -27,7 +27,7 @@ namespace zelkord {
 // outlives the process: what an earlier one left in any is removed when the cache opens.
 //
 // What is stored is found at once. It is written soon after, many responses in one transaction; a
-// response over a tenth of the disk part is held in memory only. The rules of HTTP are its user's.
+// response over a tenth of the disk part is not written. The rules of HTTP are its user's.
 //
 // States: unopened, when nothing is known of the disk and no file is open; open, from the first use
 // on, with the index of all that is on disk in memory.
