@@ -38,8 +38,8 @@ struct ContainerStore {
 
   TemporaryDirectory root;
   LinuxClock clock;
+  FakePlatform fakes;  // outlives the queues' threads
   LinuxWorkQueues queues{clock};
-  FakePlatform fakes;
   FakeURLSessions sessions{queues};
   CountedTransactions transactions{clock};
   QuietLog log;

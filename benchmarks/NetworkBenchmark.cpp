@@ -47,8 +47,8 @@ class SteadyBagRequests final : public BagRequests {
 // The services on real queues and clocks.
 struct BenchedServices {
   LinuxClock clock;
+  FakePlatform fakes;  // outlives the queues' threads
   LinuxWorkQueues queues{clock};
-  FakePlatform fakes;
   FakeURLSessions sessions{queues};
   CountedTransactions transactions{clock};
   Platform platform = onQueues(fakes.platform(), clock, queues, sessions, transactions);

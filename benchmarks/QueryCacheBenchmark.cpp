@@ -25,8 +25,8 @@ constexpr std::size_t kEntries = 2'045;
 // A cache of completions that were fetched for their first letter.
 struct FullCache {
   LinuxClock clock;
+  FakePlatform fakes;  // outlives the queues' threads
   LinuxWorkQueues queues{clock};
-  FakePlatform fakes;
   FakeURLSessions sessions{queues};
   CountedTransactions transactions{clock};
   QuietLog log;

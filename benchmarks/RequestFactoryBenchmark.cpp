@@ -18,8 +18,8 @@ namespace {
 // A factory that knows its device, and a query that fills every item it can.
 struct BenchedFactory {
   LinuxClock clock;
+  FakePlatform fakes;  // outlives the queues' threads
   LinuxWorkQueues queues{clock};
-  FakePlatform fakes;
   Platform platform =
       onQueues(fakes.platform(), clock, queues, fakes.urlSessions, fakes.transactions);
   Assembly assembly{platform};
