@@ -21,6 +21,7 @@ class FeedbackSessions;
 class FeedbackStreams;
 class FlushActivities;
 class ImageFetcher;
+class LookupFilter;
 class ResourceVersions;
 class ResponseImages;
 class SessionManager;
@@ -69,6 +70,8 @@ class Assembly final {
 
   ZLKNetworkRequestFactory* requestFactory() const { return requestFactory_.get(); }
   ImageFetcher* imageFetcher() const { return imageFetcher_.get(); }
+  // Drops what does not fit of the answers to lookups.
+  LookupFilter* lookup() const { return lookup_.get(); }
   ZelkorBagController* bagController() const { return bagController_.get(); }
   ResponseImages* responseImages() const { return responseImages_.get(); }
   ClientStateManager* clientStateManager() const { return clientStateManager_.get(); }
@@ -90,6 +93,7 @@ class Assembly final {
   void setImageFetcher(std::shared_ptr<ImageFetcher> fetcher) {
     imageFetcher_.set(std::move(fetcher));
   }
+  void setLookup(std::shared_ptr<LookupFilter> lookup) { lookup_.set(std::move(lookup)); }
   void setBagController(std::shared_ptr<ZelkorBagController> controller) {
     bagController_.set(std::move(controller));
   }
@@ -171,6 +175,7 @@ class Assembly final {
   Slot<FeedbackSessions> feedbackSessions_;
   Slot<ZLKNetworkRequestFactory> requestFactory_;
   Slot<ImageFetcher> imageFetcher_;
+  Slot<LookupFilter> lookup_;
   Slot<ZelkorBagController> bagController_;
   Slot<ResponseImages> responseImages_;
   Slot<ClientStateManager> clientStateManager_;

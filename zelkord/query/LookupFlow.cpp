@@ -4,7 +4,9 @@
 
 #include "halvane/DaemonFeedback.h"
 #include "zelkord/assembly/Assembly.h"
+#include "zelkord/network/HeaderJson.h"
 #include "zelkord/query/NetworkRecords.h"
+#include "zelkord/resources/LookupFilter.h"
 
 namespace zelkord {
 namespace {
@@ -26,6 +28,15 @@ std::shared_ptr<const HVFeedback> LookupFlow::_makeStart(const URLRequest& reque
 std::optional<SteadyTime> LookupFlow::_deadline(const ZLKBag* bag) const {
   return lookupDeadline(assembly_.platform().clock.now(),
                         bag ? bag->searchRenderTimeout() : std::nullopt);
+}
+
+// A body of which nothing is dropped goes on byte for byte.
+void LookupFlow::_filter(Body& body) const {
+  const auto* filter = assembly_.lookup();
+  if (!filter || !body.parsed) return;
+  if (!filter->filterLookupResultsWithRequest(_as<ZLKLookupRequest>(), *body.parsed)) return;
+  auto text = headerJson(*body.parsed);
+  body.data = Data(text ? *std::move(text) : json::serialize(*body.parsed));
 }
 
 std::optional<SteadyTime> lookupDeadline(SteadyTime now, std::optional<Duration> renderTimeout) {

@@ -5,7 +5,8 @@
 namespace zelkord {
 
 // A lookup of a text that the user has selected. It may be repeated as long as its answer can still
-// be shown.
+// be shown. Results that do not fit the text around the selection are dropped, once there is
+// somebody who can tell.
 class LookupFlow final : public BagGatedFlow {
  public:
   using BagGatedFlow::BagGatedFlow;
@@ -14,6 +15,7 @@ class LookupFlow final : public BagGatedFlow {
   std::string _input() const override { return request_->queryString; }
   std::shared_ptr<const HVFeedback> _makeStart(const URLRequest& request) const override;
   std::optional<SteadyTime> _deadline(const ZLKBag* bag) const override;
+  void _filter(Body& body) const override;
   void _didSend() override { state_->_setPerformedSearch(); }
 };
 

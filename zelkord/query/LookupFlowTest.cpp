@@ -1,11 +1,57 @@
 #include <gtest/gtest.h>
 
 #include "halvane/DaemonFeedback.h"
+#include "zelkord/query/FlowKindsTestSupport.h"
 #include "zelkord/query/LookupFlow.h"
-#include "zelkord/query/QueryTestSupport.h"
+#include "zelkord/query/QueryCache.h"
+#include "zelkord/resources/LookupFilter.h"
 
 namespace zelkord {
 namespace {
+
+// Drops results whose "id" is the text that was looked up.
+struct DroppingFilter final : LookupFilter {
+  bool filterLookupResultsWithRequest(const ZLKLookupRequest& request,
+                                      json::value& response) const override {
+    bool dropped = false;
+    for (auto& set : response.as_array()) {
+      auto& results = set.at("results").as_array();
+      for (auto* result = results.begin(); result != results.end();) {
+        const bool isUnfit = stringIn(result->as_object(), "id") == request.queryString;
+        result = isUnfit ? results.erase(result) : result + 1;
+        dropped |= isUnfit;
+      }
+    }
+    return dropped;
+  }
+};
+
+TEST(LookupFlowTest, GivesOnWhatIsLeftOfTheResults) {
+  const std::string whole = R"([ {"query":"snow","status":"OK","fbq":"f",
+      "results":[{"id":"a/b","score":0.50},{"id":"snow"}]} ])";
+  const std::string left =
+      R"([{"query":"snow","status":"OK","fbq":"f","results":[{"id":"a/b","score":0.5}]}])";
+  const std::string fit = R"([ {"results":[{"id":"rain"}]} ])";
+  for (const auto& kind : flowKinds()) {
+    for (const auto& body : {whole, fit, std::string("[{")}) {
+      SCOPED_TRACE(std::string(kind.name) + body);
+      AskedQuery query(kind);
+      query.bed.assembly.setLookup(std::make_shared<DroppingFilter>());
+      query.ask().succeed(200, body);
+      if (kind.isStrict() && body == "[{") continue;
+      ASSERT_TRUE(query.answer->reply);
+      const bool isFiltered = kind.name == "lookup" && body == whole;
+      EXPECT_EQ(query.answer->reply->data.view(), isFiltered ? left : body);
+      // What is recorded is what came, and what is kept for later searches is the searches' own.
+      EXPECT_EQ(query.record<NetworkSearchEnd>(1).responseSize,
+                static_cast<std::int64_t>(body.size()));
+      if (body == whole) {
+        EXPECT_EQ(query.record<ZLKEndNetworkSearchFeedback>(1).fbq, "f");
+      }
+      EXPECT_EQ(query.state->queryCache()->count(), kind.isSearch() && body == whole ? 1u : 0u);
+    }
+  }
+}
 
 TEST(LookupFlowTest, RecordsTheWayTheTextWasSelected) {
   for (const auto& [type, recorded] :

@@ -100,6 +100,7 @@ void QueryFlow::_accept(const std::shared_ptr<URLTask>& task, const URLResult& r
   Body body{.data = result.data.value_or(Data())};
   body.parsed = parseJson(body.data.view(), &body.problem);
   if (const auto refusal = _refusalOfBody(body)) return _fail(*task, result, *refusal);
+  _filter(body);
   if (body.parsed) _use(*body.parsed, body.data);
   endNetworkFeedback(state_, *request_, body.parsed ? &*body.parsed : nullptr, result, task);
   auto reply = _makeReply(body.data);

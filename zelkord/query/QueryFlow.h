@@ -59,6 +59,8 @@ class QueryFlow : public std::enable_shared_from_this<QueryFlow> {
   // Both log the refusal.
   virtual std::optional<Refusal> _refusalOfAnswer(const URLResult& result) const = 0;
   virtual std::optional<Refusal> _refusalOfBody(const Body&) const { return std::nullopt; }
+  // Before anything is made of the body: what is changed here, the client gets changed.
+  virtual void _filter(Body&) const {}
   virtual void _didParse(const json::value&, const Data&) {}
   virtual void _willReply(const URLResponse&) {}
 
