@@ -106,6 +106,7 @@ TEST_F(ClientSessionTest, TestFeedbacksAreKeptInMemoryAndTold) {
   struct Streams final : FeedbackStreams {
     int records = 0;
     void sendDataToReceivingStreamListener(const ZelkorFeedback&) override { ++records; }
+    void willAskForMoreResults(const std::string&) override {}
   };
   const auto streams = std::make_shared<Streams>();
   bed_.assembly.setFlusherXPCListener(streams);

@@ -18,6 +18,8 @@ class FeedbackStreams {
  public:
   virtual ~FeedbackStreams() = default;
   virtual void sendDataToReceivingStreamListener(const ZelkorFeedback& feedback) = 0;
+  // More results of that query are about to be asked for; empty when nobody can tell which.
+  virtual void willAskForMoreResults(const std::string& query) = 0;
 };
 
 // The background work that uploads finished sessions.

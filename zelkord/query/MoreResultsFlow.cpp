@@ -3,17 +3,28 @@
 #include <algorithm>
 
 #include "base/Text.h"
+#include "zelkord/assembly/Assembly.h"
+#include "zelkord/feedback/FeedbackSeams.h"
 #include "zelkord/network/exchange/URLComponents.h"
 
 namespace zelkord {
+namespace {
 
-std::string MoreResultsFlow::_input() const {
-  const auto url = URLComponents::parse(_as<ZLKMoreResultsRequest>().moreResultsURL);
+std::string queryOf(const std::string& moreResultsURL) {
+  const auto url = URLComponents::parse(moreResultsURL);
   if (!url) return {};
   const auto found = std::ranges::find(url->queryItems, "q", &URLQueryItem::name);
   if (found == url->queryItems.end()) return {};
   auto text = found->value.value_or("");
   return isValidUtf8(text) ? text : std::string();
+}
+
+}  // namespace
+
+std::string MoreResultsFlow::_input() const {
+  auto query = queryOf(_as<ZLKMoreResultsRequest>().moreResultsURL);
+  if (auto* streams = assembly_.flusherXPCListener()) streams->willAskForMoreResults(query);
+  return query;
 }
 
 }  // namespace zelkord

@@ -10,7 +10,7 @@ class MoreResultsFlow final : public FollowUpFlow {
   using FollowUpFlow::FollowUpFlow;
 
  private:
-  // The query whose results these are: "q" of the request's own URL.
+  // The query whose results these are: "q" of the request's own URL. Tools that watch are told.
   std::string _input() const override;
 };
 

@@ -2,6 +2,7 @@
 #include <gtest/gtest.h>
 
 #include "halvane/DaemonFeedback.h"
+#include "zelkord/feedback/FeedbackSeams.h"
 #include "zelkord/network/exchange/ImageFetcher.h"
 #include "zelkord/query/FlowKindsTestSupport.h"
 #include "zelkord/query/QueryCache.h"
@@ -401,6 +402,33 @@ TEST(QueryFlowsTest, FollowUpsGoToTheBagsURLWhenTheyHaveNone) {
   ASSERT_EQ(tasks.size(), 2u);
   EXPECT_THAT(tasks[0]->request().url, HasSubstr("https://m.example/bag?"));
   EXPECT_THAT(tasks[1]->request().url, HasSubstr("https://c.example/card?"));
+}
+
+TEST(QueryFlowsTest, MoreResultsTellWhoWatchesWhoseTheyAre) {
+  struct Watching final : FeedbackStreams {
+    std::vector<std::string> queries;
+    void sendDataToReceivingStreamListener(const ZelkorFeedback&) override {}
+    void willAskForMoreResults(const std::string& query) override { queries.push_back(query); }
+  };
+  for (const bool isWatched : {false, true}) {
+    QueryBed bed;
+    bed.installBag(kFlowBag);
+    const auto state = bed.makeState();
+    state->_ensureBag();
+    const auto streams = std::make_shared<Watching>();
+    if (isWatched) bed.assembly.setFlusherXPCListener(streams);
+    for (const auto& kind : flowKinds()) kind.ask(bed, *state, false);
+    EXPECT_EQ(streams->queries, std::vector<std::string>(isWatched ? 1 : 0, "snow man"));
+    for (const auto* url : {"", "https://m.example/", "https://m.example/?q", "https://m/?q=%FF"}) {
+      SCOPED_TRACE(url);
+      ZLKMoreResultsRequest request;
+      request.moreResultsURL = url;
+      bed.ask(*state, request);
+      const auto start = bed.records().back().feedback;
+      EXPECT_EQ(dynamic_cast<const NetworkSearchStart&>(*start).input, "");
+    }
+    EXPECT_EQ(streams->queries.size(), isWatched ? 5u : 0u);
+  }
 }
 
 TEST(QueryFlowsTest, FlightsAreAnsweredAtOnceWithNothing) {
