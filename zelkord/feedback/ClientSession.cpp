@@ -267,25 +267,29 @@ std::vector<std::string> ClientSession::privacyFilteredFeedbacksWithRelativeTime
   return texts;
 }
 
-void ClientSession::_appendFilteredRecords(std::string& text) {
+std::size_t ClientSession::_appendFilteredRecords(std::string& text) {
   const auto& errors = assembly_.log(Category::FeedbackErrors);
-  const auto begin = text.size();
+  std::size_t appended = 0;
   _visitFilteredRecords([&](const ZelkorFeedback& record) {
     const auto old = text.size();
-    if (old > begin) text += ',';
-    if (record.appendDictionary(errors, text)) return;
-    text.resize(old);
-    _countNotSent();
+    if (appended > 0) text += ',';
+    if (record.appendDictionary(errors, text)) {
+      ++appended;
+    } else {
+      text.resize(old);
+      _countNotSent();
+    }
   });
+  return appended;
 }
 
 void ClientSession::_countNotSent() const { assembly_.reporter().addValue(1, kFeedbackNotSent); }
 
-std::string ClientSession::getFeedbacksToSend() {
+FeedbacksToSend ClientSession::getFeedbacksToSend() {
   const auto header = this->header();
   const bool hasBaseTime = !header.removeTimestamps && header.sessionStartSince1970;
   std::string text = R"({"fb":[)";
-  _appendFilteredRecords(text);
+  const auto records = _appendFilteredRecords(text);
   text += R"(],"agent":)";
   appendJsonString(header.agent, text);
   text += R"(,"user_guid":)";
@@ -301,7 +305,7 @@ std::string ClientSession::getFeedbacksToSend() {
   text += R"(,"previous_session_end_reason":)";
   appendJson(header.previousSessionEndReason, text);
   text += '}';
-  return text;
+  return {std::move(text), records};
 }
 
 }  // namespace zelkord

@@ -11,6 +11,7 @@
 #include "base/Mutex.h"
 #include "halvane/StoredFeedback.h"
 #include "platform/api/WorkQueue.h"
+#include "zelkord/feedback/FeedbacksToSend.h"
 #include "zelkord/feedback/FirstUse.h"
 #include "zelkord/feedback/SessionManager.h"
 #include "zelkord/feedback/SessionRecords.h"
@@ -61,9 +62,8 @@ class ClientSession final : public FeedbackSession,
   std::vector<std::string> feedbacksWithRelativeTimestamp() override;
   std::vector<std::string> privacyFilteredFeedbacksWithRelativeTimestamp() override;
 
-  // What is sent of the session: a JSON object. Records that JSON cannot express are left out and
-  // counted as not sent.
-  std::string getFeedbacksToSend();
+  // Records that JSON cannot express are left out and counted as not sent.
+  FeedbacksToSend getFeedbacksToSend();
 
  private:
   struct Opening {
@@ -80,8 +80,8 @@ class ClientSession final : public FeedbackSession,
   // Keeps the record in memory once it is on disk.
   std::function<void()> _keepForTests(const ZelkorFeedback& feedback);
   bool _isOfAnotherUser(const ZelkorFeedback& feedback) const;
-  // The members of "fb", joined by commas.
-  void _appendFilteredRecords(std::string& text);
+  // The members of "fb", joined by commas; how many.
+  std::size_t _appendFilteredRecords(std::string& text);
   template <typename Visit>
   void _visitFilteredRecords(const Visit& visit);
   template <typename Missing, typename Items, typename Visit>

@@ -34,8 +34,12 @@ class ClientSessionTest : public testing::Test {
   const RecordingContainer& container(std::size_t index = 0) {
     return *bed_.storage->containers.at(index);
   }
+  // What is sent, once its number of records is what it says.
   json::object sent(ClientSession& session) {
-    return parseJson(session.getFeedbacksToSend())->as_object();
+    const auto sending = session.getFeedbacksToSend();
+    auto object = parseJson(sending.text)->as_object();
+    EXPECT_EQ(object.at("fb").as_array().size(), sending.records);
+    return object;
   }
   // A session as it is read back.
   std::shared_ptr<ClientSession> stored(std::vector<ZelkorFeedback> records,
@@ -129,13 +133,13 @@ TEST_F(ClientSessionTest, SendsItsHeaderInOrder) {
   header.sessionStartSince1970 = 1234.9;
   header.firstUseOfTheDay = true;
   header.cpResourceVersions = {{"hints", "1"}, {"hints", "2"}};
-  EXPECT_EQ(stored({}, header)->getFeedbacksToSend(),
+  EXPECT_EQ(stored({}, header)->getFeedbacksToSend().text,
             R"({"fb":[],"agent":"A\"gent","user_guid":"07000000-0000-0000-0000-000000000000",)"
             R"("resource_versions":{"hints":"2"},"first_use":true,"base_time":1234,)"
             R"("previous_session_end_reason":"guid changed"})");
   header.removeTimestamps = true;
   EXPECT_EQ(sent(*stored({}, header))["base_time"], 0);
-  EXPECT_EQ(stored({})->getFeedbacksToSend(),
+  EXPECT_EQ(stored({})->getFeedbacksToSend().text,
             R"({"fb":[],"agent":"","user_guid":"","resource_versions":{},"first_use":false,)"
             R"("base_time":0,"previous_session_end_reason":"no previous session"})");
 }
@@ -159,9 +163,9 @@ TEST_F(ClientSessionTest, ReplacesIdentifiersAndAddsWhatIsMissing) {
   visible->results = {resultNamed("secret b")};
   const auto session =
       stored({at(1000, engagement), at(1001, second), at(1005, suggested), at(1500, visible)});
-  const auto text = session->getFeedbacksToSend();
+  const auto text = session->getFeedbacksToSend().text;
   EXPECT_EQ(text.find("secret"), std::string::npos);
-  const auto records = parseJson(text)->at("fb").as_array();
+  const auto records = sent(*session).at("fb").as_array();
   ASSERT_EQ(records.size(), 6u);
   EXPECT_EQ(records[0].at("type"), "session_missing_suggestions");
   EXPECT_EQ(records[0].at("suggestions").at(0).at("id"), "3");
@@ -174,7 +178,7 @@ TEST_F(ClientSessionTest, ReplacesIdentifiersAndAddsWhatIsMissing) {
   EXPECT_EQ(records[5].at("results").at(0).at("id"), "2");
   const std::vector<int> times = {0, 0, 0, 1, 5, 500};
   for (std::size_t i = 0; i < times.size(); ++i) EXPECT_EQ(records[i].at("timestamp"), times[i]);
-  EXPECT_EQ(session->getFeedbacksToSend(), text);  // again the same
+  EXPECT_EQ(session->getFeedbacksToSend().text, text);  // again the same
   EXPECT_EQ(*visible->results.front().identifier, "secret b");
 }
 
