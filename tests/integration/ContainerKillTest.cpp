@@ -120,10 +120,12 @@ class ContainerKillTest : public testing::Test {
     FakePlatform fakes;
     StorageOnDisk disk(root_.path(), fakes.timeline, fakes.timeline);
     auto handles = disk.storage->getAvailableSessionHandles();
-    std::sort(handles.begin(), handles.end(), [](const auto& a, const auto& b) {
-      return std::pair(a->fileUrl().size(), a->fileUrl()) <
-             std::pair(b->fileUrl().size(), b->fileUrl());
-    });
+    const auto number = [](const std::shared_ptr<SessionContainer>& handle) {
+      const auto& url = static_cast<const FileContainer&>(*handle).fileUrl();
+      return std::pair(url.size(), url);
+    };
+    std::sort(handles.begin(), handles.end(),
+              [&](const auto& a, const auto& b) { return number(a) < number(b); });
     std::array<std::uint64_t, kThreads> last{};
     for (const auto& handle : handles) {
       if (const auto session = handle->read()) checkOrder(*session, last);

@@ -30,6 +30,7 @@ struct RecordingContainer final : SessionContainer {
     records.back().held = nullptr;
     if (done) done();
   }
+  std::optional<StoredSession> read() override { return StoredSession{header, records}; }
   // What the session says of its end; none while it is open, and for the ends that are not
   // recorded.
   std::optional<std::string> endReason() const {
@@ -59,6 +60,16 @@ struct RecordingStorage final : SessionStorage {
   }
   void closeSession(std::shared_ptr<SessionContainer> container) override {
     static_cast<RecordingContainer&>(*container).isClosed = true;
+  }
+  std::vector<std::shared_ptr<SessionContainer>> getAvailableSessionHandles() override {
+    std::vector<std::shared_ptr<SessionContainer>> closed;
+    for (const auto& container : containers) {
+      if (container->isClosed) closed.push_back(container);
+    }
+    return closed;
+  }
+  void deleteSessionWithFileContainer(std::shared_ptr<SessionContainer> container) override {
+    std::erase(containers, container);
   }
   void waitForPendingWrites() override {}
 };

@@ -60,9 +60,7 @@ class FileContainer final : public SessionContainer,
 
   void writeSessionHeader(const CZClientSession& header) override;
   void writeFeedback(const ZelkorFeedback& feedback, std::function<void()> done) override;
-
-  // The session that the file holds; ends writing. Waits for the queue, so not from there.
-  std::optional<StoredSession> read();
+  std::optional<StoredSession> read() override;
   // What is written after this call is forgotten, what was written before it is not.
   void close();
   // The file's path.

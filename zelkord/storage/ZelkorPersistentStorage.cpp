@@ -108,28 +108,28 @@ void ZelkorPersistentStorage::closeSession(std::shared_ptr<SessionContainer> con
   });
 }
 
-std::vector<std::shared_ptr<FileContainer>> ZelkorPersistentStorage::getAvailableSessionHandles() {
-  std::vector<std::shared_ptr<FileContainer>> available;
-  queue_.sync([&] {
-    for (auto& path : services_->room->endedPaths()) {
-      available.push_back(std::make_shared<FileContainer>(services_, std::move(path)));
-    }
-  });
-  for (const auto& container : available) {
-    log_.info("available file url {}", container->fileUrl());
+std::vector<std::shared_ptr<SessionContainer>>
+ZelkorPersistentStorage::getAvailableSessionHandles() {
+  std::vector<std::string> paths;
+  queue_.sync([&] { paths = services_->room->endedPaths(); });
+  std::vector<std::shared_ptr<SessionContainer>> available;
+  for (auto& path : paths) {
+    log_.info("available file url {}", path);
+    available.push_back(std::make_shared<FileContainer>(services_, std::move(path)));
   }
   return available;
 }
 
 void ZelkorPersistentStorage::deleteSessionWithFileContainer(
-    std::shared_ptr<FileContainer> container) {
-  if (!container) return;
-  container->close();
-  queue_.async([self = shared_from_this(), container = std::move(container)] {
+    std::shared_ptr<SessionContainer> container) {
+  auto file = std::dynamic_pointer_cast<FileContainer>(std::move(container));
+  if (!file) return;
+  file->close();
+  queue_.async([self = shared_from_this(), file = std::move(file)] {
     self->queue_.assertCurrent();
-    if (container->place()) self->services_->room->forget(*container->place());
-    self->services_->room->forget(container->fileUrl());
-    self->_deleteSessionFile(container->fileUrl());
+    if (file->place()) self->services_->room->forget(*file->place());
+    self->services_->room->forget(file->fileUrl());
+    self->_deleteSessionFile(file->fileUrl());
   });
 }
 

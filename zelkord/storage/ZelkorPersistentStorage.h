@@ -36,9 +36,8 @@ class ZelkorPersistentStorage final : public SessionStorage,
   std::shared_ptr<SessionContainer> createFileContainerForWriting(
       SessionKind kind, const std::string& holder) override;
   void closeSession(std::shared_ptr<SessionContainer> container) override;
-  // Waits for the queue, so not from there.
-  std::vector<std::shared_ptr<FileContainer>> getAvailableSessionHandles();
-  void deleteSessionWithFileContainer(std::shared_ptr<FileContainer> container);
+  std::vector<std::shared_ptr<SessionContainer>> getAvailableSessionHandles() override;
+  void deleteSessionWithFileContainer(std::shared_ptr<SessionContainer> container) override;
   // Returns when everything handed over so far is in its file.
   void waitForPendingWrites() override;
 

@@ -5,6 +5,7 @@
 #include "platform/testing/FakePlatform.h"
 #include "zelkord/assembly/Assembly.h"
 #include "zelkord/assembly/UserAgent.h"
+#include "zelkord/feedback/ClientSession.h"
 #include "zelkord/storage/StorageTestSupport.h"
 #include "zelkord/storage/ZelkorPersistentStorage.h"
 
@@ -29,7 +30,7 @@ class ZelkorPersistentStorageTest : public testing::Test {
   std::vector<std::string> available(ZelkorPersistentStorage& storage) {
     std::vector<std::string> urls;
     for (const auto& container : storage.getAvailableSessionHandles()) {
-      urls.push_back(container->fileUrl());
+      urls.push_back(url(container));
     }
     return urls;
   }
@@ -113,6 +114,31 @@ TEST_F(ZelkorPersistentStorageTest, LeadsAContainerFromWritingToDeletion) {
   storage->deleteSessionWithFileContainer(handles[0]);
   fakes_.timeline.runUntilIdle();
   EXPECT_TRUE(fakes_.log.contains("File /caches/session.0 delete failed"));
+}
+
+// All that an upload needs of sessions it finds behind the assembly.
+TEST_F(ZelkorPersistentStorageTest, AnUploadTakesWhatEndedAndLeavesNothing) {
+  fakes_.files.put("/caches/session.3", "damaged");
+  fakes_.files.put("/caches/session.4", whole());
+  assembly_.setPersistentStorage(start());
+  const auto open = ClientSession::make(assembly_, numberedFeedback(1));
+  const auto ended = ClientSession::make(assembly_, numberedFeedback(1));
+  for (int i = 2; i <= 3; ++i) ended->addFeedback(numberedFeedback(i));
+  ended->sessionComplete();
+
+  std::vector<std::size_t> records;
+  auto& storage = *assembly_.persistentStorage();
+  for (const auto& container : storage.getAvailableSessionHandles()) {
+    auto session = container->read();
+    storage.deleteSessionWithFileContainer(container);
+    if (!session) continue;
+    const auto sending = ClientSession::make(assembly_, *std::move(session))->getFeedbacksToSend();
+    EXPECT_EQ(parseJson(sending.text)->at("fb").as_array().size(), sending.records);
+    records.push_back(sending.records);
+  }
+  EXPECT_THAT(records, ElementsAre(2, 3));
+  EXPECT_TRUE(storage.getAvailableSessionHandles().empty());
+  EXPECT_THAT(fakes_.files.paths(), ElementsAre("/caches/session.5"));  // the open one's
 }
 
 TEST_F(ZelkorPersistentStorageTest, WritesEverythingBeforeItEnds) {
