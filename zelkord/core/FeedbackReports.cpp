@@ -120,23 +120,30 @@ bool FeedbackReports::handleCustomFeedback(std::shared_ptr<const HVCustomFeedbac
                                            std::int64_t queryId, const ClientState& state,
                                            const Reporter& reporter,
                                            std::function<void()> callback) const {
-  switch (feedback->feedbackType.value) {
-    case kBrelinAutofill:
-    case kLantheResultFeatures: {
-      const bool fits = _makeSession({std::move(feedback), queryId, std::nullopt, state.userAgent(),
-                                      0, 0, reporter.pid, reporter.call});
-      if (callback) callback();
-      return fits;
-    }
-    case kCrowdsourcing:
-      assembly_.reporter().addValue(1, "com.quenta.zelkord.dp.submit");
-      if (auto* flusher = assembly_.crowdsourcingFeedbackFlusher()) {
-        flusher->flush(std::move(feedback), std::move(callback));
-      }
-      return true;
-    default:
-      return true;
+  const auto type = feedback->feedbackType.value;
+  if (type == kCrowdsourcing) {
+    assembly_.reporter().addValue(1, "com.quenta.zelkord.dp.submit");
+  } else if (type != kBrelinAutofill && type != kLantheResultFeatures) {
+    return true;
   }
+  if (!_canBeSent(*feedback)) return true;
+  if (type == kCrowdsourcing) {
+    if (auto* flusher = assembly_.crowdsourcingFeedbackFlusher()) {
+      flusher->flush(std::move(feedback), std::move(callback));
+    }
+    return true;
+  }
+  const bool fits = _makeSession({std::move(feedback), queryId, std::nullopt, state.userAgent(), 0,
+                                  0, reporter.pid, reporter.call});
+  if (callback) callback();
+  return fits;
+}
+
+bool FeedbackReports::_canBeSent(const HVCustomFeedback& feedback) const {
+  if (isJsonObject(feedback.jsonFeedback)) return true;
+  assembly_.log(Category::FeedbackErrors).error("custom feedback is not a JSON object");
+  assembly_.reporter().addValue(1, kFeedbackNotSent);
+  return false;
 }
 
 }  // namespace zelkord

@@ -154,6 +154,7 @@ TEST_F(FeedbackReportsTest, ACallerThatWaitsHearsThatThereIsNoRoom) {
   const auto client = bed_.connectAndConfigure();
   HVCustomFeedback autofill;
   autofill.feedbackType = 1;
+  autofill.jsonFeedback = "{}";
   EXPECT_EQ(report(client, HVClearInputFeedback())->errorName, "");
   EXPECT_EQ(report(client, autofill)->errorName, "");
   manager_->isFull.set(true);
@@ -343,6 +344,28 @@ TEST_F(FeedbackReportsTest, CustomFeedbackGoesItsOwnWays) {
   EXPECT_EQ(bed_.fakes.log.texts("Zelkor_Flusher").back(), "flushed custom feedback");
   EXPECT_EQ(callbacks(), 3u);
   EXPECT_THAT(manager_->records().all(), IsEmpty());
+}
+
+TEST_F(FeedbackReportsTest, CustomFeedbackThatIsNoObjectIsDropped) {
+  const auto client = bed_.connectAndConfigure();
+  const auto flusher = std::make_shared<HoldingFlusher>();
+  bed_.daemon.assembly().setCrowdsourcingFeedbackFlusher(flusher);
+  bed_.fakes.log.clear();
+  for (const auto* text : {"", "[1]", "{", "null", R"({"a":1} {})"}) {
+    for (const std::int32_t type : {0, 1, 2, 3}) {
+      HVCustomFeedback custom;
+      custom.feedbackType = type;
+      custom.jsonFeedback = text;
+      EXPECT_TRUE(report(client, custom)->succeeded());
+    }
+  }
+  EXPECT_THAT(sessions_->completed().all(), IsEmpty());
+  EXPECT_THAT(flusher->flushed, IsEmpty());
+  EXPECT_THAT(bed_.fakes.log.texts("Zelkor_Flusher"), IsEmpty());
+  EXPECT_EQ(bed_.fakes.log.count("custom feedback is not a JSON object"), 15);
+  EXPECT_EQ(bed_.fakes.log.count(LogLevel::Error), 15);
+  EXPECT_EQ(counter("feedbacknotsent"), 15);
+  EXPECT_EQ(counter("dp.submit"), 5);
 }
 
 TEST(ClientQueryIdTest, IsThatOfTheFirstResult) {
