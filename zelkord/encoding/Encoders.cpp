@@ -17,6 +17,14 @@ bool appendMember(std::string_view key, const Value& value, std::size_t begin, s
   return appendJson(value, text);
 }
 
+// What somebody did in a card of that type.
+template <typename Target>
+bool appendTap(const char* cardType, const Target& target, std::size_t begin, std::string& text) {
+  return appendMember("trigger_event", std::string("tap"), begin, text) &&
+         appendMember("card_type", std::string(cardType), begin, text) &&
+         appendMember("action_target", target, begin, text);
+}
+
 bool isOfOutsideEngine(const HVSearchResult& result) {
   const auto type = result.resultType.value;
   return type >= kFirstOutsideEngine && type <= kLastOutsideEngine;
@@ -66,16 +74,12 @@ bool appendMembersOf(const HVResultEngagementFeedback& feedback, std::size_t beg
 
 bool appendMembersOf(const HVMapsCardSectionEngagementFeedback& feedback, std::size_t begin,
                      std::string& text) {
-  return appendMember("trigger_event", std::string("tap"), begin, text) &&
-         appendMember("card_type", std::string("maps"), begin, text) &&
-         appendMember("action_target", feedback.feedbackType, begin, text);
+  return appendTap("maps", feedback.feedbackType, begin, text);
 }
 
 bool appendMembersOf(const HVStoreCardSectionEngagementFeedback& feedback, std::size_t begin,
                      std::string& text) {
-  return appendMember("trigger_event", std::string("tap"), begin, text) &&
-         appendMember("card_type", std::string("tunevo_sheet"), begin, text) &&
-         appendMember("action_target", feedback.productPageResult, begin, text);
+  return appendTap("tunevo_sheet", feedback.productPageResult, begin, text);
 }
 
 bool appendMembersOf(const HVSuggestionEngagementFeedback& feedback, std::size_t begin,
