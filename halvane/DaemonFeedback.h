@@ -16,31 +16,23 @@ namespace zelkor {
 struct ZLKLookupStartNetworkSearchFeedback final
     : FeedbackRecord<ZLKLookupStartNetworkSearchFeedback>,
       NetworkSearchStart {
-  static constexpr auto kKind = FeedbackKind::LookupStartNetworkSearch;
-  static constexpr std::string_view kName = "ZLKLookupStartNetworkSearchFeedback";
-  static constexpr std::string_view kMessageName = "CZLookupStartNetworkSearchFeedback";
+  static constexpr FeedbackDescription kDescription = {"ZLKLookupStartNetworkSearchFeedback", 1};
 
   Term<vocabulary::kLookupSelectionTypes> lookupSelectionType;
 
   static constexpr auto fields() {
     using T = ZLKLookupStartNetworkSearchFeedback;
-    using Start = NetworkSearchStart;
-    return std::tuple{sent(8, "trigger_event", &T::lookupSelectionType),
-                      sent(3, "input", &Start::input),
-                      sent(4, "uuid", &Start::uuid),
-                      sent(5, "headers", &Start::headers),
-                      sent(6, "url", &Start::url),
-                      sent(7, "endpoint_type", &Start::endpointType),
-                      stored(2, "search_trigger_event", &Start::triggerEvent)};
+    return std::tuple_cat(
+        std::tuple{sent(8, "trigger_event", &T::lookupSelectionType)}, startFields(),
+        std::tuple{stored(2, "search_trigger_event", &NetworkSearchStart::triggerEvent)});
   }
 };
 
 // The end of a network search whose answer carried the service's own fields.
 struct ZLKEndNetworkSearchFeedback final : FeedbackRecord<ZLKEndNetworkSearchFeedback>,
                                            NetworkSearchEnd {
-  static constexpr auto kKind = FeedbackKind::ZelkorEndNetworkSearch;
-  static constexpr std::string_view kName = "ZLKEndNetworkSearchFeedback";
-  static constexpr std::string_view kMessageName = "CZEndNetworkSearchFeedback";
+  static constexpr FeedbackDescription kDescription = {"ZLKEndNetworkSearchFeedback", 2,
+                                                       QueryIds::None};
 
   std::optional<std::string> zelkorStatus;
   std::optional<double> zelkorDuration;  // milliseconds, as the service says
@@ -59,9 +51,7 @@ struct ZLKEndNetworkSearchFeedback final : FeedbackRecord<ZLKEndNetworkSearchFee
 
 // A query that was not sent, and why.
 struct ZLKSkipSearchFeedback final : FeedbackRecord<ZLKSkipSearchFeedback> {
-  static constexpr auto kKind = FeedbackKind::SkipSearch;
-  static constexpr std::string_view kName = "ZLKSkipSearchFeedback";
-  static constexpr std::string_view kMessageName = "CZSkipSearchFeedback";
+  static constexpr FeedbackDescription kDescription = {"ZLKSkipSearchFeedback", 26};
 
   ZLKSkipSearchFeedback() = default;
   ZLKSkipSearchFeedback(std::int32_t event, std::string text)
@@ -78,9 +68,7 @@ struct ZLKSkipSearchFeedback final : FeedbackRecord<ZLKSkipSearchFeedback> {
 
 // A query answered from the cache; `uuid` is the request's that fetched the answer.
 struct ZLKCacheHitFeedback final : FeedbackRecord<ZLKCacheHitFeedback> {
-  static constexpr auto kKind = FeedbackKind::CacheHit;
-  static constexpr std::string_view kName = "ZLKCacheHitFeedback";
-  static constexpr std::string_view kMessageName = "CZCacheHitFeedback";
+  static constexpr FeedbackDescription kDescription = {"ZLKCacheHitFeedback", 26};
 
   ZLKCacheHitFeedback() = default;
   ZLKCacheHitFeedback(std::int32_t event, std::string text, std::string identifier)
@@ -99,9 +87,8 @@ struct ZLKCacheHitFeedback final : FeedbackRecord<ZLKCacheHitFeedback> {
 
 // The session ended; the last record of one.
 struct ZelkorSessionEndFeedback final : FeedbackRecord<ZelkorSessionEndFeedback> {
-  static constexpr auto kKind = FeedbackKind::SessionEnd;
-  static constexpr std::string_view kName = "ZelkorSessionEndFeedback";
-  static constexpr std::string_view kMessageName = "CZSessionEndFeedback";
+  static constexpr FeedbackDescription kDescription = {"ZelkorSessionEndFeedback", 25,
+                                                       QueryIds::None};
 
   ZelkorSessionEndFeedback() = default;
   explicit ZelkorSessionEndFeedback(std::int64_t trigger) : reason(trigger) {}
@@ -120,9 +107,8 @@ struct ZelkorSessionEndFeedback final : FeedbackRecord<ZelkorSessionEndFeedback>
 
 // Results that records refer to by identifier and that no record describes.
 struct ZelkorSessionMissingResults final : FeedbackRecord<ZelkorSessionMissingResults> {
-  static constexpr auto kKind = FeedbackKind::SessionMissingResults;
-  static constexpr std::string_view kName = "ZelkorSessionMissingResults";
-  static constexpr std::string_view kMessageName = "CZSessionMissingResultsFeedback";
+  static constexpr FeedbackDescription kDescription = {"ZelkorSessionMissingResults", 29,
+                                                       QueryIds::None};
 
   ZelkorSessionMissingResults() = default;
   explicit ZelkorSessionMissingResults(PackedList<HVSearchResult> missing)
@@ -137,9 +123,8 @@ struct ZelkorSessionMissingResults final : FeedbackRecord<ZelkorSessionMissingRe
 
 // The same for suggestions.
 struct ZelkorSessionMissingSuggestions final : FeedbackRecord<ZelkorSessionMissingSuggestions> {
-  static constexpr auto kKind = FeedbackKind::SessionMissingSuggestions;
-  static constexpr std::string_view kName = "ZelkorSessionMissingSuggestions";
-  static constexpr std::string_view kMessageName = "CZSessionMissingSuggestionsFeedback";
+  static constexpr FeedbackDescription kDescription = {"ZelkorSessionMissingSuggestions", 30,
+                                                       QueryIds::None};
 
   ZelkorSessionMissingSuggestions() = default;
   explicit ZelkorSessionMissingSuggestions(PackedList<HVSuggestion> missing)
@@ -154,9 +139,8 @@ struct ZelkorSessionMissingSuggestions final : FeedbackRecord<ZelkorSessionMissi
 
 // A client's connection went away. Nothing of it is sent but that it happened.
 struct ZelkorConnectionInvalidated final : FeedbackRecord<ZelkorConnectionInvalidated> {
-  static constexpr auto kKind = FeedbackKind::ConnectionInvalidated;
-  static constexpr std::string_view kName = "ZelkorConnectionInvalidated";
-  static constexpr std::string_view kMessageName = "CZConnectionInvalidatedFeedback";
+  static constexpr FeedbackDescription kDescription = {"ZelkorConnectionInvalidated", 32,
+                                                       QueryIds::None};
 
   static constexpr auto fields() { return std::tuple<>(); }
 };

@@ -6,53 +6,14 @@
 #include <string_view>
 
 #include "base/Namespace.h"
+#include "halvane/FeedbackKinds.h"
 
 namespace zelkor {
 
 class RecordReader;
 
-// Every kind of feedback. Both families of a kind ("HV…" of the search model, "CZ…" of the
-// messages) are one record.
-enum class FeedbackKind : std::uint8_t {
-  VisibleResults,
-  StartNetworkSearch,
-  LookupStartNetworkSearch,
-  EndNetworkSearch,
-  ZelkorEndNetworkSearch,
-  StartLocalSearch,
-  EndLocalSearch,
-  SearchViewAppear,
-  SearchViewDisappear,
-  Ranking,
-  Ranker,
-  ResultEngagement,
-  CardSectionEngagement,
-  MapsCardSectionEngagement,
-  StoreCardSectionEngagement,
-  Error,
-  SuggestionEngagement,
-  CardViewDisappear,
-  StartSearch,
-  EndSearch,
-  VisibleSuggestions,
-  Custom,
-  ResultsReceivedAfterTimeout,
-  LateSectionsAppended,
-  ClearInput,
-  SessionEnd,
-  SkipSearch,
-  CacheHit,
-  SectionEngagement,
-  VisibleSectionHeader,
-  SessionMissingResults,
-  SessionMissingSuggestions,
-  DidGoToSite,
-  DidGoToSearch,
-  ConnectionInvalidated,
-  ResultGrading,
-};
-inline constexpr std::size_t kFeedbackKinds =
-    static_cast<std::size_t>(FeedbackKind::ResultGrading) + 1;
+// The type of feedback that has none of its own.
+inline constexpr std::uint32_t kGenericFeedbackType = 21;
 
 // Which of its two names a record goes by. The records are alike; a few keys are sent for one
 // family only.
@@ -68,6 +29,10 @@ struct HVFeedback {
   virtual FeedbackKind kind() const = 0;
   // The class's name, such as "HVErrorFeedback"; for the message family "CZErrorFeedback".
   virtual std::string_view className() const = 0;
+  // Its row in the table of event types.
+  virtual std::uint32_t type() const { return kGenericFeedbackType; }
+  // Whether what is sent carries the query identifiers.
+  virtual bool requiresQueryId() const { return true; }
   virtual std::unique_ptr<HVFeedback> clone() const = 0;
   // Appends the record's message (protocol buffers, proto3).
   virtual void appendTo(std::string& bytes) const = 0;
@@ -79,5 +44,11 @@ struct HVFeedback {
   std::uint64_t timestamp = 0;  // boot-time nanoseconds; 0: set when it is recorded
   FeedbackFamily family = FeedbackFamily::Model;
 };
+
+// The record itself, if it is of that kind; else null.
+template <typename Record>
+const Record* feedbackAs(const HVFeedback& feedback) {
+  return feedback.kind() == kKindOf<Record> ? static_cast<const Record*>(&feedback) : nullptr;
+}
 
 }  // namespace zelkor

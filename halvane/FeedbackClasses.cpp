@@ -23,35 +23,21 @@ bool hasName(const std::vector<FeedbackClass>& classes, std::string_view name) {
 
 // Adds a kind's classes; a message class that is there already stays as it is.
 template <typename T>
-void addClasses(std::vector<FeedbackClass>& classes, FeedbackOrigin origin) {
+void addClasses(std::vector<FeedbackClass>& classes) {
   using enum FeedbackFamily;
-  if (!T::kName.empty()) classes.push_back({T::kName, Model, origin, &make<T, Model>});
-  if (hasName(classes, T::kMessageName)) return;
-  classes.push_back({T::kMessageName, Message, origin, &make<T, Message>});
+  constexpr auto kKind = T::kDescription;
+  if (!kKind.isMessageOnly()) {
+    classes.push_back({kKind.name, Model, kKind.origin(), &make<T, Model>});
+  }
+  const auto message = kMessageNameOf<T>.view();
+  if (hasName(classes, message)) return;
+  classes.push_back({message, Message, kKind.origin(), &make<T, Message>});
 }
 
 template <typename... Kinds>
-void addAll(std::vector<FeedbackClass>& classes, FeedbackOrigin origin) {
-  (addClasses<Kinds>(classes, origin), ...);
-}
-
-std::vector<FeedbackClass> allClasses() {
+std::vector<FeedbackClass> classesOf(FeedbackList<Kinds...>) {
   std::vector<FeedbackClass> classes;
-  addAll<HVVisibleResultsFeedback, HVStartNetworkSearchFeedback, HVEndNetworkSearchFeedback,
-         HVStartLocalSearchFeedback, HVEndLocalSearchFeedback, HVSearchViewAppearFeedback,
-         HVSearchViewDisappearFeedback, HVRankingFeedback, CZZLKRankerFeedback,
-         HVResultEngagementFeedback, HVCardSectionEngagementFeedback,
-         HVMapsCardSectionEngagementFeedback, HVStoreCardSectionEngagementFeedback, HVErrorFeedback,
-         HVSuggestionEngagementFeedback, HVCardViewDisappearFeedback, HVStartSearchFeedback,
-         HVEndSearchFeedback, HVVisibleSuggestionsFeedback, HVCustomFeedback,
-         HVResultsReceivedAfterTimeoutFeedback, HVLateSectionsAppendedFeedback,
-         HVClearInputFeedback, HVSectionEngagementFeedback, HVVisibleSectionHeaderFeedback,
-         HVDidGoToSiteFeedback, HVDidGoToSearchFeedback, HVResultGradingFeedback>(
-      classes, FeedbackOrigin::Client);
-  addAll<ZLKLookupStartNetworkSearchFeedback, ZLKEndNetworkSearchFeedback, ZLKSkipSearchFeedback,
-         ZLKCacheHitFeedback, ZelkorSessionEndFeedback, ZelkorSessionMissingResults,
-         ZelkorSessionMissingSuggestions, ZelkorConnectionInvalidated>(classes,
-                                                                       FeedbackOrigin::Daemon);
+  (addClasses<Kinds>(classes), ...);
   std::sort(classes.begin(), classes.end(),
             [](const auto& a, const auto& b) { return a.name < b.name; });
   return classes;
@@ -59,8 +45,13 @@ std::vector<FeedbackClass> allClasses() {
 
 }  // namespace
 
+std::span<const FeedbackClass> feedbackClasses() {
+  static const auto classes = classesOf(FeedbackKinds());
+  return classes;
+}
+
 const FeedbackClass* feedbackClassNamed(std::string_view name) {
-  static const auto classes = allClasses();
+  const auto classes = feedbackClasses();
   const auto found =
       std::lower_bound(classes.begin(), classes.end(), name,
                        [](const auto& known, std::string_view text) { return known.name < text; });

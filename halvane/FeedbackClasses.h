@@ -1,15 +1,14 @@
 #pragma once
 
 #include <memory>
+#include <span>
 #include <string_view>
 
 #include "halvane/Feedback.h"
+#include "halvane/FeedbackDescription.h"
 #include "halvane/RecordReader.h"
 
 namespace zelkor {
-
-// Who makes feedback of a class.
-enum class FeedbackOrigin { Client, Daemon };
 
 // A class of feedback by its name, such as "HVErrorFeedback", "CZErrorFeedback" (its message) or
 // "ZLKCacheHitFeedback".
@@ -19,6 +18,9 @@ struct FeedbackClass {
   FeedbackOrigin origin = FeedbackOrigin::Client;
   std::unique_ptr<HVFeedback> (*make)() = nullptr;
 };
+
+// Every class, by name.
+std::span<const FeedbackClass> feedbackClasses();
 
 // Null for a name that no class has. The message of two classes, the ends of network searches, is
 // the clients'.

@@ -2,6 +2,7 @@
 
 #include <cstdint>
 #include <string_view>
+#include <type_traits>
 
 #include "base/Namespace.h"
 
@@ -19,6 +20,8 @@ enum class FieldUse {
 // keys; the stored form, the checks and the sent form all follow from that.
 template <typename Record, typename Value>
 struct Field {
+  using ValueType = Value;
+
   std::uint32_t number;
   std::string_view key;
   Value Record::*member;
@@ -42,6 +45,10 @@ constexpr Field<Record, Value> stored(std::uint32_t number, std::string_view key
                                       Value Record::*member) {
   return {number, key, member, FieldUse::StoredOnly};
 }
+
+// Of a field's type.
+template <typename OneField>
+using ValueOf = typename std::remove_cvref_t<OneField>::ValueType;
 
 // A record's fields, made once: a message may hold many short records.
 template <typename Record>

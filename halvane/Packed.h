@@ -16,6 +16,8 @@ namespace zelkor {
 template <typename Record>
 class Packed {
  public:
+  using value_type = Record;
+
   // What `->` holds while it is used.
   class Arrow {
    public:

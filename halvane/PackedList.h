@@ -20,6 +20,8 @@ namespace zelkor {
 template <typename Item>
 class PackedList {
  public:
+  using value_type = Item;
+
   class Iterator {
    public:
     using iterator_category = std::input_iterator_tag;

@@ -202,7 +202,7 @@ bool RecordReader::_readInto(PackedList<Item>& items) {
 
 template <typename Record, typename OneField>
 bool RecordReader::_matches(std::uint32_t tag, const OneField& field, Record& record, bool& good) {
-  using Value = std::remove_cvref_t<decltype(record.*field.member)>;
+  using Value = ValueOf<OneField>;
   if (tag != wire::tagOf(field.number, wire::Element<Value>::kType)) return false;
   good = _readInto(record.*field.member);
   return true;

@@ -37,32 +37,19 @@ MaybeResult firstIn(const PackedList<HVSectionRanking>& rankings) {
   return std::nullopt;
 }
 
-template <typename T>
-const T& as(const HVFeedback& feedback) {
-  return static_cast<const T&>(feedback);
-}
-
 MaybeResult firstResultOf(const HVFeedback& feedback) {
-  switch (feedback.kind()) {
-    case FeedbackKind::VisibleResults:
-      return firstIn(as<HVVisibleResultsFeedback>(feedback).results);
-    case FeedbackKind::Ranking:
-      return firstIn(as<HVRankingFeedback>(feedback).sections);
-    case FeedbackKind::Ranker:
-      return firstIn(as<CZZLKRankerFeedback>(feedback).sections);
-    case FeedbackKind::ResultEngagement:
-      return firstIn(as<HVResultEngagementFeedback>(feedback).result);
-    case FeedbackKind::ResultsReceivedAfterTimeout:
-      return firstIn(as<HVResultsReceivedAfterTimeoutFeedback>(feedback).results);
-    case FeedbackKind::LateSectionsAppended:
-      return firstIn(as<HVLateSectionsAppendedFeedback>(feedback).sections);
-    case FeedbackKind::SectionEngagement:
-      return firstIn(as<HVSectionEngagementFeedback>(feedback).section);
-    case FeedbackKind::VisibleSectionHeader:
-      return firstIn(as<HVVisibleSectionHeaderFeedback>(feedback).section);
-    default:
-      return std::nullopt;
-  }
+  if (const auto* f = feedbackAs<HVVisibleResultsFeedback>(feedback)) return firstIn(f->results);
+  if (const auto* f = feedbackAs<HVRankingFeedback>(feedback)) return firstIn(f->sections);
+  if (const auto* f = feedbackAs<CZZLKRankerFeedback>(feedback)) return firstIn(f->sections);
+  if (const auto* f = feedbackAs<HVResultEngagementFeedback>(feedback)) return firstIn(f->result);
+  if (const auto* f = feedbackAs<HVResultsReceivedAfterTimeoutFeedback>(feedback))
+    return firstIn(f->results);
+  if (const auto* f = feedbackAs<HVLateSectionsAppendedFeedback>(feedback))
+    return firstIn(f->sections);
+  if (const auto* f = feedbackAs<HVSectionEngagementFeedback>(feedback)) return firstIn(f->section);
+  if (const auto* f = feedbackAs<HVVisibleSectionHeaderFeedback>(feedback))
+    return firstIn(f->section);
+  return std::nullopt;
 }
 
 }  // namespace

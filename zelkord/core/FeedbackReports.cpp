@@ -25,19 +25,14 @@ constexpr std::int32_t kWarmingEvents[] = {2, 5, 6, 9, 10, 11, 22, 23, 24};
 
 constexpr std::int32_t kCountedEngagementType = 1;
 
-// Types of custom feedback.
-constexpr std::int32_t kBrelinAutofill = 1;
-constexpr std::int32_t kCrowdsourcing = 2;
-constexpr std::int32_t kLantheResultFeatures = 3;
-
 // Clients whose engagements are donated, and the domain under which.
 constexpr std::pair<std::string_view, std::string_view> kDonors[] = {{"brelin", "Brelin"},
                                                                      {"lanthe", "Lanthe"}};
 
 bool isWarming(const HVFeedback& feedback) {
-  if (feedback.kind() != FeedbackKind::SearchViewAppear) return false;
-  const auto& view = static_cast<const HVSearchViewAppearFeedback&>(feedback);
-  return !view.onLockScreen && std::ranges::count(kWarmingEvents, view.triggerEvent.value) > 0;
+  const auto* view = feedbackAs<HVSearchViewAppearFeedback>(feedback);
+  return view && !view->onLockScreen &&
+         std::ranges::count(kWarmingEvents, view->triggerEvent.value) > 0;
 }
 
 std::uint64_t nanosecondsSinceBoot(const Clock& clock) {
@@ -57,7 +52,7 @@ bool FeedbackReports::reportPayload(std::shared_ptr<HVFeedback> feedback, std::i
   if (!state) {
     fits = _recordError("client state nil", reporter);
     assembly_.log(Category::Feedback).error("state must not be nil");
-  } else if (feedback->kind() == FeedbackKind::Custom) {
+  } else if (feedback->kind() == kKindOf<HVCustomFeedback>) {
     const auto& log = assembly_.log(Category::Flusher);
     fits = handleCustomFeedback(
         std::static_pointer_cast<const HVCustomFeedback>(std::move(feedback)), queryId, *state,
@@ -87,8 +82,8 @@ bool FeedbackReports::_report(std::shared_ptr<const HVFeedback> feedback, std::i
                               ClientState& state, const Reporter& reporter) const {
   if (isWarming(*feedback)) state.warm();
   const auto clientQueryId = clientQueryIdOf(*feedback);
-  if (feedback->kind() == FeedbackKind::ResultEngagement) {
-    _noteEngagement(static_cast<const HVResultEngagementFeedback&>(*feedback), state);
+  if (const auto* engagement = feedbackAs<HVResultEngagementFeedback>(*feedback)) {
+    _noteEngagement(*engagement, state);
   }
   return state.sessionManager().addZelkorFeedback(
       {std::move(feedback), queryId, state.guidController().currentUserGUID(), state.userAgent(),
@@ -121,13 +116,14 @@ bool FeedbackReports::handleCustomFeedback(std::shared_ptr<const HVCustomFeedbac
                                            const Reporter& reporter,
                                            std::function<void()> callback) const {
   const auto type = feedback->feedbackType.value;
-  if (type == kCrowdsourcing) {
+  if (type == HVCustomFeedback::kCrowdsourcing) {
     assembly_.reporter().addValue(1, "com.quenta.zelkord.dp.submit");
-  } else if (type != kBrelinAutofill && type != kLantheResultFeatures) {
+  } else if (type != HVCustomFeedback::kBrelinAutofill &&
+             type != HVCustomFeedback::kLantheResultFeatures) {
     return true;
   }
   if (!_canBeSent(*feedback)) return true;
-  if (type == kCrowdsourcing) {
+  if (type == HVCustomFeedback::kCrowdsourcing) {
     if (auto* flusher = assembly_.crowdsourcingFeedbackFlusher()) {
       flusher->flush(std::move(feedback), std::move(callback));
     }

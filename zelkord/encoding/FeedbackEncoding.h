@@ -12,19 +12,10 @@
 
 namespace zelkord {
 
-// What every kind of feedback answers. Both families of a kind share all of it.
+// How every kind of feedback is sent. Both families of a kind share all of it.
 //
 // Threading: any thread. Requires records whose enumerations are in their tables, as the readers of
 // messages see to.
-
-// The type of kinds that have none of their own.
-inline constexpr std::uint32_t kGenericFeedbackType = 21;
-
-// The feedback type: the row of the record in the table of event types.
-std::uint32_t typeOf(const HVFeedback& feedback);
-
-// Whether what is sent carries the query identifiers.
-bool requiresQueryId(const HVFeedback& feedback);
 
 // Appends the members of what is sent, `"key":value` joined by commas, without braces, to a text
 // in which the object's first member would stand at `begin`. False, with `text` as it was, when

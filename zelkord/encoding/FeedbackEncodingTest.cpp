@@ -266,28 +266,28 @@ class FeedbackEncodingTest : public testing::Test {
 };
 
 TEST_F(FeedbackEncodingTest, EveryKindHasItsTypeAndItsKeys) {
-  std::set<FeedbackKind> kinds = {FeedbackKind::ResultEngagement, FeedbackKind::Custom};
+  std::set<FeedbackKind> kinds = {kKindOf<HVResultEngagementFeedback>, kKindOf<HVCustomFeedback>};
   for (const auto& row : rows()) {
     SCOPED_TRACE(row.feedback->className());
-    EXPECT_EQ(typeOf(*row.feedback), row.type);
-    EXPECT_EQ(requiresQueryId(*row.feedback), row.needsQueryId);
+    EXPECT_EQ(row.feedback->type(), row.type);
+    EXPECT_EQ(row.feedback->requiresQueryId(), row.needsQueryId);
     EXPECT_EQ(members(*row.feedback), row.members);
     EXPECT_EQ(json::value(dictionaryOf(*row.feedback, errors_)),
               *parseJson("{" + row.members + "}"));
     kinds.insert(row.feedback->kind());
   }
-  EXPECT_EQ(kinds.size(), kFeedbackKinds);
+  EXPECT_EQ(kinds.size(), FeedbackKinds::kSize);
   EXPECT_TRUE(log_.entries().empty());
 }
 
 TEST_F(FeedbackEncodingTest, BothFamiliesOfAKindAreSentAlike) {
   for (const auto& row : rows()) {
-    if (row.feedback->kind() == FeedbackKind::ResultGrading) continue;
+    if (row.feedback->kind() == kKindOf<HVResultGradingFeedback>) continue;
     SCOPED_TRACE(row.feedback->className());
     const auto message = row.feedback->clone();
     message->family = FeedbackFamily::Message;
     EXPECT_EQ(members(*message), row.members);
-    EXPECT_EQ(typeOf(*message), row.type);
+    EXPECT_EQ(message->type(), row.type);
   }
 }
 
@@ -355,7 +355,7 @@ TEST_F(FeedbackEncodingTest, AnEngagementTellsWhereItLed) {
     feedback.triggerEvent = 13;
     feedback.destination = 10;
     wanted.fill(feedback);
-    EXPECT_EQ(typeOf(feedback), 8u);
+    EXPECT_EQ(feedback.type(), 8u);
     EXPECT_EQ(
         members(feedback),
         R"("trigger_event":"shortcut","destination":"more_locations_in_maps",)" + wanted.rest);
@@ -377,8 +377,8 @@ TEST_F(FeedbackEncodingTest, CustomFeedbackPassesThroughUntouched) {
   for (const auto& [customType, expected] : types) {
     HVCustomFeedback feedback;
     feedback.feedbackType = customType;
-    EXPECT_EQ(typeOf(feedback), expected.first);
-    EXPECT_EQ(requiresQueryId(feedback), expected.second);
+    EXPECT_EQ(feedback.type(), expected.first);
+    EXPECT_EQ(feedback.requiresQueryId(), expected.second);
   }
 }
 
@@ -438,7 +438,7 @@ TEST_F(FeedbackEncodingTest, EmbeddedTextsCountAsNothingWhenTheyAreNoJson) {
 }
 
 struct UnencodedFeedback final : HVFeedback {
-  FeedbackKind kind() const override { return static_cast<FeedbackKind>(kFeedbackKinds); }
+  FeedbackKind kind() const override { return static_cast<FeedbackKind>(FeedbackKinds::kSize); }
   std::string_view className() const override { return "HVStrangeFeedback"; }
   std::unique_ptr<HVFeedback> clone() const override { return nullptr; }
   void appendTo(std::string&) const override {}
@@ -452,8 +452,8 @@ TEST_F(FeedbackEncodingTest, AKindWithoutAnEncoderIsNoticed) {
   EXPECT_TRUE(log_.entries().empty());  // only a message's is an error
   feedback.family = FeedbackFamily::Message;
   EXPECT_EQ(members(feedback), "");
-  EXPECT_EQ(typeOf(feedback), 21u);
-  EXPECT_TRUE(requiresQueryId(feedback));
+  EXPECT_EQ(feedback.type(), 21u);
+  EXPECT_TRUE(feedback.requiresQueryId());
   const std::vector<RecordingLog::Entry> expected = {
       {LogLevel::Error, "Zelkor_Feedback_Errors",
        "Feedback dictionary translation for HVStrangeFeedback fell back to default "
@@ -503,19 +503,19 @@ struct RecordingProcessor final : IdentifierProcessor {
 
 TEST_F(FeedbackEncodingTest, IdentifiersAreReplacedInACopyAndReported) {
   std::map<FeedbackKind, std::vector<std::string>> expected = {
-      {FeedbackKind::VisibleResults, {"r"}},
-      {FeedbackKind::Ranking, {"r"}},
-      {FeedbackKind::Ranker, {"r"}},
-      {FeedbackKind::SuggestionEngagement, {"suggestion s is new s"}},
-      {FeedbackKind::VisibleSuggestions, {"s", "s"}},
-      {FeedbackKind::ResultsReceivedAfterTimeout, {"r"}},
-      {FeedbackKind::LateSectionsAppended, {"r"}},
-      {FeedbackKind::ResultGrading, {"r"}},
+      {kKindOf<HVVisibleResultsFeedback>, {"r"}},
+      {kKindOf<HVRankingFeedback>, {"r"}},
+      {kKindOf<CZZLKRankerFeedback>, {"r"}},
+      {kKindOf<HVSuggestionEngagementFeedback>, {"suggestion s is new s"}},
+      {kKindOf<HVVisibleSuggestionsFeedback>, {"s", "s"}},
+      {kKindOf<HVResultsReceivedAfterTimeoutFeedback>, {"r"}},
+      {kKindOf<HVLateSectionsAppendedFeedback>, {"r"}},
+      {kKindOf<HVResultGradingFeedback>, {"r"}},
   };
   for (const auto& row : rows()) {
     SCOPED_TRACE(row.feedback->className());
     if (row.members.find(R"("id":)") == std::string::npos) continue;
-    if (row.feedback->kind() == FeedbackKind::SessionMissingResults) continue;
+    if (row.feedback->kind() == kKindOf<ZelkorSessionMissingResults>) continue;
     RecordingProcessor processor;
     const auto prepared = processed(row.feedback, processor);
     const auto text = members(*prepared);

@@ -42,6 +42,25 @@ bool processExpanded(PackedList<Item>& items, IdentifierProcessor& processor) {
   return replaced;
 }
 
+// Whether there may be items in what is sent of such a value.
+template <typename Value>
+constexpr bool mayHoldItems() {
+  if constexpr (std::is_same_v<Value, HVSearchResult> || std::is_same_v<Value, HVSuggestion>) {
+    return true;
+  } else if constexpr (requires { Value::fields(); }) {
+    return std::apply(
+        [](const auto&... field) {
+          return ((field.use != FieldUse::StoredOnly && mayHoldItems<ValueOf<decltype(field)>>()) ||
+                  ...);
+        },
+        Value::fields());
+  } else if constexpr (requires { typename Value::value_type; }) {
+    return mayHoldItems<typename Value::value_type>();
+  } else {
+    return false;
+  }
+}
+
 // What is sent of a record describes its items in full, unless its kind is one of those below.
 template <typename Record>
 bool processItemsOf(Record& record, IdentifierProcessor& processor) {
@@ -55,6 +74,12 @@ bool processItemsOf(Record& record, IdentifierProcessor& processor) {
 }
 
 // These only name the item.
+template <typename Record>
+inline constexpr bool kNamesAnItem = false;
+template <>
+inline constexpr bool kNamesAnItem<HVResultEngagementFeedback> = true;
+template <>
+inline constexpr bool kNamesAnItem<HVSuggestionEngagementFeedback> = true;
 bool processItemsOf(HVResultEngagementFeedback& feedback, IdentifierProcessor& processor);
 bool processItemsOf(HVSuggestionEngagementFeedback& feedback, IdentifierProcessor& processor);
 

@@ -229,7 +229,7 @@ TEST(VocabularyTest, CustomFeedbackHasTheTypesThatTheServiceKnows) {
     const auto record =
         readFeedback(*feedbackClassNamed(row.className), messageWithValue(row, custom), fault);
     ASSERT_TRUE(record);
-    EXPECT_EQ(typeOf(*record), types[custom]) << custom;
+    EXPECT_EQ(record->type(), types[custom]) << custom;
   }
 }
 

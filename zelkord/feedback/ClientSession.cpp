@@ -14,7 +14,6 @@
 namespace zelkord {
 namespace {
 
-constexpr std::uint32_t kLantheResultFeatures = 20;
 constexpr std::int64_t kDifferentUser = 500;  // in kZLKErrorDomain
 // A container that was closed meanwhile never says that a record is on disk.
 constexpr Duration kLongestWaitOfTests = 5s;
@@ -26,6 +25,11 @@ ZelkorFeedback errorRecord(const Error& error, std::optional<UUID> guid,
   record.userGuid = guid;
   record.userAgent = std::move(agent);
   return record;
+}
+
+bool hidesTheTime(const HVFeedback& opening) {
+  const auto* custom = feedbackAs<HVCustomFeedback>(opening);
+  return custom && custom->feedbackType.value == HVCustomFeedback::kLantheResultFeatures;
 }
 
 std::vector<CZResourceVersion> versionsOf(const std::map<std::string, std::string>& versions) {
@@ -93,7 +97,7 @@ ClientSession::Opening ClientSession::_opening(Assembly& assembly,
   header.agent = agent.value_or("");
   if (feedback && feedback->userGuid) header.userGuidString = feedback->userGuid->string();
   header.previousSessionEndReason = static_cast<std::int32_t>(previousSessionEndReason);
-  header.removeTimestamps = feedback && feedback->type() == kLantheResultFeatures;
+  header.removeTimestamps = feedback && hidesTheTime(*feedback->feedback);
   header.sessionStartSince1970 = secondsSince1970(assembly.platform().clock.wallNow());
   FirstUse firstUse(assembly, agent);
   if (agent) assembly.reporter().addValue(1, createAggdKey(*agent, "sessions"));

@@ -1,6 +1,8 @@
 #include "zelkord/feedback/ZelkorFeedback.h"
 
 #include "base/Check.h"
+#include "halvane/DaemonFeedback.h"
+#include "halvane/ModelFeedback.h"
 #include "halvane/Vocabulary.h"
 #include "platform/api/Budget.h"
 #include "zelkord/encoding/FeedbackEncoding.h"
@@ -47,13 +49,19 @@ constexpr std::array<std::string_view, 35> kFeedbackTypeNames = {
     "did_go_to_search",
 };
 
+template <typename... Kinds>
+constexpr bool haveNames(FeedbackList<Kinds...>) {
+  return ((Kinds::kDescription.type < kFeedbackTypeNames.size()) && ...);
+}
+static_assert(haveNames(FeedbackKinds()), "every type has its name");
+
 // Members that a record sets over the feedback's own.
 constexpr std::array<std::string_view, 4> kSetMembers = {"type", "timestamp", "query_id",
                                                          "client_query_id"};
 
 LeftOut membersSetBy(const ZelkorFeedback& record) {
   const LeftOut all = kSetMembers;
-  if (!requiresQueryId(*record.feedback)) return all.first(2);
+  if (!record.feedback->requiresQueryId()) return all.first(2);
   return all.first(record.clientQueryId != 0 ? 4 : 3);
 }
 
@@ -67,7 +75,7 @@ bool appendObject(const ZelkorFeedback& record, std::uint64_t timestamp, const L
     text.resize(old);
     return false;
   }
-  if (requiresQueryId(*record.feedback)) {
+  if (record.feedback->requiresQueryId()) {
     appendJsonKey("query_id", begin, text);
     appendJsonInteger(record.queryId, text);
     if (record.clientQueryId != 0) {
@@ -85,7 +93,7 @@ bool appendObject(const ZelkorFeedback& record, std::uint64_t timestamp, const L
 
 }  // namespace
 
-std::uint32_t ZelkorFeedback::type() const { return typeOf(*feedback); }
+std::uint32_t ZelkorFeedback::type() const { return feedback->type(); }
 
 void ZelkorFeedback::process(IdentifierProcessor& processor) {
   feedback = processed(std::move(feedback), processor);

@@ -4,7 +4,7 @@
 
 #include "halvane/DaemonFeedback.h"
 #include "zelkord/assembly/Assembly.h"
-#include "zelkord/network/HeaderJson.h"
+#include "zelkord/network/context/HeaderJson.h"
 #include "zelkord/query/NetworkRecords.h"
 #include "zelkord/resources/LookupFilter.h"
 

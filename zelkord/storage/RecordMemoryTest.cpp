@@ -129,59 +129,17 @@ Cost costOf(const std::string& records) {
           session->feedbacks.size()};
 }
 
-std::vector<std::string> classNames() {
-  std::vector<std::string> names;
-  for (const auto* stem : {"VisibleResults",
-                           "StartNetworkSearch",
-                           "EndNetworkSearch",
-                           "StartLocalSearch",
-                           "EndLocalSearch",
-                           "SearchViewAppear",
-                           "SearchViewDisappear",
-                           "Ranking",
-                           "ResultEngagement",
-                           "CardSectionEngagement",
-                           "MapsCardSectionEngagement",
-                           "StoreCardSectionEngagement",
-                           "Error",
-                           "SuggestionEngagement",
-                           "CardViewDisappear",
-                           "StartSearch",
-                           "EndSearch",
-                           "VisibleSuggestions",
-                           "Custom",
-                           "ResultsReceivedAfterTimeout",
-                           "LateSectionsAppended",
-                           "ClearInput",
-                           "SectionEngagement",
-                           "VisibleSectionHeader",
-                           "DidGoToSite",
-                           "DidGoToSearch",
-                           "ResultGrading"}) {
-    names.push_back("HV" + std::string(stem) + "Feedback");
-  }
-  for (const auto* name :
-       {"CZZLKRankerFeedback", "ZLKLookupStartNetworkSearchFeedback", "ZLKEndNetworkSearchFeedback",
-        "ZLKSkipSearchFeedback", "ZLKCacheHitFeedback", "ZelkorSessionEndFeedback",
-        "ZelkorSessionMissingResults", "ZelkorSessionMissingSuggestions",
-        "ZelkorConnectionInvalidated"}) {
-    names.emplace_back(name);
-  }
-  return names;
-}
-
 TEST(RecordMemoryTest, ARecordTakesAtMostTwentyTimesItsMessage) {
   if (!ZK_HEAP_IS_COUNTED) GTEST_SKIP() << "this build's allocator does not say what is in use";
   Cost worst;
   std::size_t taken = 0;
   const auto messages = worstMessages(800);
-  for (const auto& name : classNames()) {
-    ASSERT_TRUE(feedbackClassNamed(name)) << name;
+  for (const auto& known : feedbackClasses()) {
     for (std::size_t i = 0; i < messages.size(); ++i) {
-      const auto cost = costOf(storedRecord(name, messages[i]));
+      const auto cost = costOf(storedRecord(known.name, messages[i]));
       taken += cost.records;
       worst.ofAByte = std::max(worst.ofAByte, cost.ofAByte);
-      EXPECT_LE(cost.ofAByte, kMostBytesOfAByte) << name << ", message " << i;
+      EXPECT_LE(cost.ofAByte, kMostBytesOfAByte) << known.name << ", message " << i;
     }
   }
   EXPECT_GT(taken, 5000u);  // most messages are read, however odd
@@ -191,9 +149,9 @@ TEST(RecordMemoryTest, ARecordTakesAtMostTwentyTimesItsMessage) {
 // Many small ones, and a single one as large as a message may be.
 TEST(RecordMemoryTest, ASessionTakesAtMostTwentyTimesItsContainer) {
   if (!ZK_HEAP_IS_COUNTED) GTEST_SKIP() << "this build's allocator does not say what is in use";
-  for (const auto& name : classNames()) {
-    SCOPED_TRACE(name);
-    const auto cost = costOf(repeated(storedRecord(name, ""), 200'000));
+  for (const auto& known : feedbackClasses()) {
+    SCOPED_TRACE(known.name);
+    const auto cost = costOf(repeated(storedRecord(known.name, ""), 200'000));
     EXPECT_LE(cost.ofAByte, kMostBytesOfAByte);
     EXPECT_GT(cost.records, 2000u);
   }
