@@ -115,31 +115,32 @@ bool FeedbackReports::handleCustomFeedback(std::shared_ptr<const HVCustomFeedbac
                                            std::int64_t queryId, const ClientState& state,
                                            const Reporter& reporter,
                                            std::function<void()> callback) const {
-  const auto type = feedback->feedbackType.value;
-  if (type == HVCustomFeedback::kCrowdsourcing) {
-    assembly_.reporter().addValue(1, "com.quenta.zelkord.dp.submit");
-  } else if (type != HVCustomFeedback::kBrelinAutofill &&
-             type != HVCustomFeedback::kLantheResultFeatures) {
-    return true;
-  }
-  if (!_canBeSent(*feedback)) return true;
-  if (type == HVCustomFeedback::kCrowdsourcing) {
-    if (auto* flusher = assembly_.crowdsourcingFeedbackFlusher()) {
-      flusher->flush(std::move(feedback), std::move(callback));
+  switch (feedback->feedbackType.value) {
+    case HVCustomFeedback::kBrelinAutofill:
+    case HVCustomFeedback::kLantheResultFeatures: {
+      const bool fits = _makeSession({std::move(feedback), queryId, std::nullopt, state.userAgent(),
+                                      0, 0, reporter.pid, reporter.call});
+      if (callback) callback();
+      return fits;
     }
-    return true;
+    case HVCustomFeedback::kCrowdsourcing:
+      _flush(std::move(feedback), std::move(callback));
+      return true;
+    default:
+      return true;
   }
-  const bool fits = _makeSession({std::move(feedback), queryId, std::nullopt, state.userAgent(), 0,
-                                  0, reporter.pid, reporter.call});
-  if (callback) callback();
-  return fits;
 }
 
-bool FeedbackReports::_canBeSent(const HVCustomFeedback& feedback) const {
-  if (isJsonObject(feedback.jsonFeedback)) return true;
-  assembly_.log(Category::FeedbackErrors).error("custom feedback is not a JSON object");
-  assembly_.reporter().addValue(1, kFeedbackNotSent);
-  return false;
+void FeedbackReports::_flush(std::shared_ptr<const HVCustomFeedback> crowdsourcing,
+                             std::function<void()> callback) const {
+  assembly_.reporter().addValue(1, "com.quenta.zelkord.dp.submit");
+  if (!isJsonObject(crowdsourcing->jsonFeedback)) {
+    assembly_.log(Category::FeedbackErrors).error("custom feedback is not a JSON object");
+    assembly_.reporter().addValue(1, kFeedbackNotSent);
+    if (callback) callback();
+  } else if (auto* flusher = assembly_.crowdsourcingFeedbackFlusher()) {
+    flusher->flush(std::move(crowdsourcing), std::move(callback));
+  }
 }
 
 }  // namespace zelkord

@@ -38,15 +38,16 @@ class FeedbackReports final {
   bool reportPayload(std::shared_ptr<HVFeedback> feedback, std::int64_t queryId,
                      const std::shared_ptr<ClientState>& state, const Reporter& reporter) const;
   // Autofill and result features become sessions of their own, crowdsourcing goes to its flusher;
-  // then `callback`, if there is one, runs. Of these, what is not a JSON object is dropped and
-  // counted as not sent. Anything else is ignored.
+  // then `callback`, if there is one, runs. Crowdsourcing that is not a JSON object is dropped
+  // and counted as not sent. Anything else is ignored.
   bool handleCustomFeedback(std::shared_ptr<const HVCustomFeedback> feedback, std::int64_t queryId,
                             const ClientState& state, const Reporter& reporter,
                             std::function<void()> callback) const;
 
  private:
   bool _recordError(const char* reason, const Reporter& reporter) const;
-  bool _canBeSent(const HVCustomFeedback& feedback) const;
+  void _flush(std::shared_ptr<const HVCustomFeedback> crowdsourcing,
+              std::function<void()> callback) const;
   // A session of that record alone.
   bool _makeSession(ZelkorFeedback record) const;
   bool _report(std::shared_ptr<const HVFeedback> feedback, std::int64_t queryId, ClientState& state,
