@@ -24,7 +24,7 @@ struct OneUser final : UserGUIDSource {
 
 struct ManagedStore : ContainerStore {
   ManagedStore() {
-    assembly.setPersistentStorage(storage);
+    assembly.persistentStorage.set(storage);
     manager = std::make_shared<ClientSessionManager>(assembly, std::make_shared<OneUser>(), "bench",
                                                      std::make_shared<FeedbackRoom>(assembly));
   }

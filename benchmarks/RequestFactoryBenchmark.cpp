@@ -40,12 +40,12 @@ struct BenchedFactory {
     fakes.maps.metadata = "bWV0YWRhdGEgb2YgdGhlIG1hcHMgY2xpZW50";
     fakes.maps.environment = "production";
     fakes.location.setAuthorization("/System/Library/LocationBundles/CoreZelkor.framework", 3);
-    assembly.setRequestFactory(std::make_shared<ZLKNetworkRequestFactory>(assembly));
+    assembly.requestFactory.set(std::make_shared<ZLKNetworkRequestFactory>(assembly));
     factory = assembly.requestFactory();
     factory->start();
     factory->didUpdateStorefrontIdentifier("143441-1,29");
     factory->didUpdateSubscriptionDictionaries({{{"provider", "acme"}, {"tier", 2}}});
-    assembly.setBagController(std::make_shared<ZelkorBagController>(assembly, *factory));
+    assembly.bagController.set(std::make_shared<ZelkorBagController>(assembly, *factory));
     query.queryString = "caf\xC3\xA9 in Paris";
     query.keyboardInputMode = "en_US@sw=QWERTY";
     query.scale = 2;

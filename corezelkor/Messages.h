@@ -75,7 +75,7 @@ struct ZK_EXPORT ZLKHTTPResponse {
 
 struct ZK_EXPORT ZLKReply {
   double scale = 0;
-  Data data;  // the service's JSON, byte for byte
+  Data data;  // the service's JSON, byte for byte unless results of a lookup were dropped
   std::optional<std::string> geoSessionEntityString;
   std::optional<ZLKHTTPRequest> httpRequest;
   std::optional<ZLKHTTPResponse> httpResponse;

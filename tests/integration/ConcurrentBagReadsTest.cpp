@@ -156,9 +156,9 @@ TEST_F(ConcurrentBagReadsTest, WhoObservesMeanwhileHearsThePresentAndEveryChange
 
 TEST_F(ConcurrentBagReadsTest, AClientThatConfiguresItselfDuringChangesIsNeverToldAnOlderBag) {
   constexpr int kChanges = 500;
-  assembly_.setFeedbackSessions(std::make_shared<RecordingSessions>(true));
-  assembly_.setBagController(bag_);
-  assembly_.setClientStateManager(std::make_shared<ClientStateManager>(assembly_));
+  assembly_.feedbackSessions.set(std::make_shared<RecordingSessions>(true));
+  assembly_.bagController.set(bag_);
+  assembly_.clientStateManager.set(std::make_shared<ClientStateManager>(assembly_));
   const auto state = std::make_shared<ClientState>("lanthe", assembly_);
   const auto client = std::make_shared<ToldClient>();
   auto teller = std::make_shared<BagTeller>(assembly_, client);

@@ -46,10 +46,10 @@ class HostChangesTest : public testing::Test {
     platform().settings.set("ZLKBagURL", json::string(server_.url("/bag")));
     assembly_.emplace(platform());
     const auto factory = std::make_shared<ZLKNetworkRequestFactory>(*assembly_);
-    assembly_->setRequestFactory(factory);
+    assembly_->requestFactory.set(factory);
     factory->start();
     const auto controller = std::make_shared<ZelkorBagController>(*assembly_, *factory);
-    assembly_->setBagController(controller);
+    assembly_->bagController.set(controller);
     controller->start();
     controller->currentBag();
     mainLoop_ = std::thread([this] { host_->queues().runMainLoop(); });

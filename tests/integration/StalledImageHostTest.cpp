@@ -78,13 +78,13 @@ class StalledImageHostTest : public testing::Test {
     stalled_.reply("/image", TestHTTPReply::hanging());
     good_.reply("/image", TestHTTPReply::make(200, "bytes"));
     factory_->start();
-    assembly_.setRequestFactory(factory_);
+    assembly_.requestFactory.set(factory_);
     bags_->start();
-    assembly_.setBagController(bags_);
-    assembly_.setGuidController(std::make_shared<ZelkorUserGUIDController>(assembly_));
-    assembly_.setClientSessionManager(std::make_shared<RecordingSessionManager>("zelkor", true));
-    assembly_.setImageFetcher(std::make_shared<ImageFetcher>(assembly_));
-    assembly_.setResponseImages(std::make_shared<ResponseImages>(assembly_));
+    assembly_.bagController.set(bags_);
+    assembly_.guidController.set(std::make_shared<ZelkorUserGUIDController>(assembly_));
+    assembly_.clientSessionManager.set(std::make_shared<RecordingSessionManager>("zelkor", true));
+    assembly_.imageFetcher.set(std::make_shared<ImageFetcher>(assembly_));
+    assembly_.responseImages.set(std::make_shared<ResponseImages>(assembly_));
     manager_ = std::make_shared<ClientStateManager>(assembly_);
     installBag();
   }

@@ -45,21 +45,21 @@ std::optional<Error> Daemon::start() {
 void Daemon::_makeServices() {
   auto& assembly = *assembly_;
   const auto factory = std::make_shared<ZLKNetworkRequestFactory>(assembly);
-  assembly.setRequestFactory(factory);
+  assembly.requestFactory.set(factory);
   factory->start();
   const auto storage = std::make_shared<ZelkorPersistentStorage>(assembly);
-  assembly.setPersistentStorage(storage);
+  assembly.persistentStorage.set(storage);
   storage->start();
-  assembly.setFeedbackGate(std::make_shared<BagFeedbackGate>(assembly));
-  assembly.setFeedbackSessions(std::make_shared<StoredSessions>(assembly));
+  assembly.feedbackGate.set(std::make_shared<BagFeedbackGate>(assembly));
+  assembly.feedbackSessions.set(std::make_shared<StoredSessions>(assembly));
   assembly.reporter().addValue(1, "com.quenta.zelkord.launch");
-  assembly.setImageFetcher(std::make_shared<ImageFetcher>(assembly));
+  assembly.imageFetcher.set(std::make_shared<ImageFetcher>(assembly));
   const auto bagController = std::make_shared<ZelkorBagController>(assembly, *factory);
-  assembly.setBagController(bagController);
+  assembly.bagController.set(bagController);
   bagController->start();
-  assembly.setResponseImages(std::make_shared<ResponseImages>(assembly));
+  assembly.responseImages.set(std::make_shared<ResponseImages>(assembly));
   const auto states = std::make_shared<ClientStateManager>(assembly);
-  assembly.setClientStateManager(states);
+  assembly.clientStateManager.set(states);
   states->start();
 }
 

@@ -66,8 +66,8 @@ class FeedbackReportsTest : public testing::Test {
  protected:
   FeedbackReportsTest() {
     auto& assembly = bed_.daemon.assembly();
-    assembly.setClientSessionManager(manager_);
-    assembly.setFeedbackSessions(sessions_);
+    assembly.clientSessionManager.set(manager_);
+    assembly.feedbackSessions.set(sessions_);
   }
 
   DaemonBed::Answer report(const DaemonBed::Client& client, const std::string& feedbackClass,
@@ -335,7 +335,7 @@ TEST_F(FeedbackReportsTest, CustomFeedbackGoesItsOwnWays) {
   }
   EXPECT_EQ(callbacks(), 2u);
 
-  bed_.daemon.assembly().setCrowdsourcingFeedbackFlusher(flusher);
+  bed_.daemon.assembly().crowdsourcingFeedbackFlusher.set(flusher);
   EXPECT_TRUE(reportType(2));
   EXPECT_EQ(counter("dp.submit"), 2);
   ASSERT_EQ(flusher->flushed.size(), 1u);
@@ -349,7 +349,7 @@ TEST_F(FeedbackReportsTest, CustomFeedbackGoesItsOwnWays) {
 TEST_F(FeedbackReportsTest, CrowdsourcingThatIsNoObjectIsDropped) {
   const auto client = bed_.connectAndConfigure();
   const auto flusher = std::make_shared<HoldingFlusher>();
-  bed_.daemon.assembly().setCrowdsourcingFeedbackFlusher(flusher);
+  bed_.daemon.assembly().crowdsourcingFeedbackFlusher.set(flusher);
   bed_.fakes.log.clear();
   for (const auto* text : {"", "[1]", "{", "null", R"({"a":1} {})"}) {
     HVCustomFeedback custom;

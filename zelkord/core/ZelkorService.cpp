@@ -24,8 +24,8 @@ ZelkorService::ZelkorService(Assembly& assembly, std::shared_ptr<ipc::CallHandle
       queue_(assembly.platform().queues.makeSerialQueue("com.quenta.zelkor.serviceQueue")) {
   assembly.setSharedSession(boolSetting(assembly.userDefaults(), "ZLKSharedSession"));
   const auto guidController = std::make_shared<ZelkorUserGUIDController>(assembly);
-  assembly.setGuidController(guidController);
-  assembly.setClientSessionManager(
+  assembly.guidController.set(guidController);
+  assembly.clientSessionManager.set(
       assembly.feedbackSessions()->makeManager("zelkor", guidController));
 }
 

@@ -207,7 +207,7 @@ TEST(EndpointTest, AnswersMoreResultsAndCardsAsTheClientThatIsNamed) {
   DaemonBed bed;
   bed.installBag(kServedBag);
   const auto sessions = std::make_shared<RecordingSessionManager>("zelkor", true);
-  bed.daemon.assembly().setClientSessionManager(sessions);
+  bed.daemon.assembly().clientSessionManager.set(sessions);
   bed.connectAndConfigure("lanthe");
   auto& manager = *bed.daemon.assembly().clientStateManager();
   const auto client = bed.fakes.interprocess.connect(manager.endpoint());
@@ -339,7 +339,7 @@ TEST(DaemonTest, LeavesAlthoughWhatIsRecordedIsNotFinished) {
     fakes.timeline.advance(200ms);
     after = fakes.process.exitStatus();
   };
-  daemon.assembly().setClientSessionManager(hanging);
+  daemon.assembly().clientSessionManager.set(hanging);
   fakes.signals.raise(SIGTERM);
   fakes.signals.raise(SIGINT);  // somebody is impatient
   fakes.timeline.runUntilIdle();

@@ -347,7 +347,7 @@ TEST_F(ClientSessionManagerTest, DropsWhatTheServiceDoesNotWant) {
       return agent == "Brelin/1";
     }
   };
-  bed_->assembly.setFeedbackGate(std::make_shared<Gate>());
+  bed_->assembly.feedbackGate.set(std::make_shared<Gate>());
   add<HVStartSearchFeedback>("Brelin/1");
   EXPECT_EQ(containers(), 0u);
   EXPECT_EQ(manager_->currentState(), SessionState::NoSession);

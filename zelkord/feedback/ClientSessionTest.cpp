@@ -56,7 +56,7 @@ TEST_F(ClientSessionTest, BeginsWithAHeader) {
       return {{"hints", "7"}, {"apps", "2"}};
     }
   };
-  bed_.assembly.setDownloadManager(std::make_shared<Versions>());
+  bed_.assembly.downloadManager.set(std::make_shared<Versions>());
   const UUID guid{{9}};
   const auto session = ClientSession::make(
       bed_.assembly, at(3, std::make_shared<HVErrorFeedback>(), guid), SessionEndReason::Idle);
@@ -113,7 +113,7 @@ TEST_F(ClientSessionTest, TestFeedbacksAreKeptInMemoryAndTold) {
     void willAskForMoreResults(const std::string&) override {}
   };
   const auto streams = std::make_shared<Streams>();
-  bed_.assembly.setFlusherXPCListener(streams);
+  bed_.assembly.flusherXPCListener.set(streams);
   bed_.assembly.enableTestFeedbacks();
   const auto session =
       ClientSession::make(bed_.assembly, at(2000, std::make_shared<HVEndSearchFeedback>()));

@@ -90,8 +90,8 @@ struct CountedGUIDs final : UserGUIDSource {
 struct SessionsBed {
   explicit SessionsBed(bool shared = true) : assembly(fakes.platform()) {
     assembly.setSharedSession(shared);
-    assembly.setPersistentStorage(storage);
-    assembly.setGuidController(guids);
+    assembly.persistentStorage.set(storage);
+    assembly.guidController.set(guids);
   }
 
   static ZelkorFeedback record(std::shared_ptr<const HVFeedback> feedback,

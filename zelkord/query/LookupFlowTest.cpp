@@ -36,7 +36,7 @@ TEST(LookupFlowTest, GivesOnWhatIsLeftOfTheResults) {
     for (const auto& body : {whole, fit, std::string("[{")}) {
       SCOPED_TRACE(std::string(kind.name) + body);
       AskedQuery query(kind);
-      query.bed.assembly.setLookup(std::make_shared<DroppingFilter>());
+      query.bed.assembly.lookup.set(std::make_shared<DroppingFilter>());
       query.ask().succeed(200, body);
       if (kind.isStrict() && body == "[{") continue;
       ASSERT_TRUE(query.answer->reply);

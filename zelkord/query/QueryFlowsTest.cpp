@@ -354,8 +354,8 @@ TEST(QueryFlowsTest, LearnTheImageHostsOfAnswersTheyTake) {
       SCOPED_TRACE(std::string(kind.name) + body);
       AskedQuery query(kind);
       auto& assembly = query.bed.assembly;
-      assembly.setImageFetcher(std::make_shared<ImageFetcher>(assembly));
-      assembly.setResponseImages(std::make_shared<ResponseImages>(assembly));
+      assembly.imageFetcher.set(std::make_shared<ImageFetcher>(assembly));
+      assembly.responseImages.set(std::make_shared<ResponseImages>(assembly));
       query.state->_ensureBag();
       query.ask().succeed(200, body);
       assembly.responseImages()
@@ -416,7 +416,7 @@ TEST(QueryFlowsTest, MoreResultsTellWhoWatchesWhoseTheyAre) {
     const auto state = bed.makeState();
     state->_ensureBag();
     const auto streams = std::make_shared<Watching>();
-    if (isWatched) bed.assembly.setFlusherXPCListener(streams);
+    if (isWatched) bed.assembly.flusherXPCListener.set(streams);
     for (const auto& kind : flowKinds()) kind.ask(bed, *state, false);
     EXPECT_EQ(streams->queries, std::vector<std::string>(isWatched ? 1 : 0, "snow man"));
     for (const auto* url : {"", "https://m.example/", "https://m.example/?q", "https://m/?q=%FF"}) {

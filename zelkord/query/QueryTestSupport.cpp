@@ -6,16 +6,16 @@
 namespace zelkord {
 
 QueryBed::QueryBed() : assembly(fakes.platform()) {
-  assembly.setFeedbackSessions(std::make_shared<RecordingSessions>(true));
+  assembly.feedbackSessions.set(std::make_shared<RecordingSessions>(true));
   const auto factory = std::make_shared<ZLKNetworkRequestFactory>(assembly);
-  assembly.setRequestFactory(factory);
+  assembly.requestFactory.set(factory);
   factory->start();
   const auto bagController = std::make_shared<ZelkorBagController>(assembly, *factory);
-  assembly.setBagController(bagController);
+  assembly.bagController.set(bagController);
   bagController->start();
-  assembly.setGuidController(std::make_shared<ZelkorUserGUIDController>(assembly));
+  assembly.guidController.set(std::make_shared<ZelkorUserGUIDController>(assembly));
   sessions = std::make_shared<RecordingSessionManager>("zelkor", true);
-  assembly.setClientSessionManager(sessions);
+  assembly.clientSessionManager.set(sessions);
   assembly.urlSession();
   fakes.timeline.runUntilIdle();
 }

@@ -20,8 +20,8 @@ constexpr const char* kImagesBag = R"({
 class ResponseImagesTest : public testing::Test {
  protected:
   ResponseImagesTest() {
-    bed_.assembly.setImageFetcher(std::make_shared<ImageFetcher>(bed_.assembly));
-    bed_.assembly.setResponseImages(std::make_shared<ResponseImages>(bed_.assembly));
+    bed_.assembly.imageFetcher.set(std::make_shared<ImageFetcher>(bed_.assembly));
+    bed_.assembly.responseImages.set(std::make_shared<ResponseImages>(bed_.assembly));
   }
 
   void learn(const std::string& response) {

@@ -120,7 +120,7 @@ TEST_F(ZelkorPersistentStorageTest, LeadsAContainerFromWritingToDeletion) {
 TEST_F(ZelkorPersistentStorageTest, AnUploadTakesWhatEndedAndLeavesNothing) {
   fakes_.files.put("/caches/session.3", "damaged");
   fakes_.files.put("/caches/session.4", whole());
-  assembly_.setPersistentStorage(start());
+  assembly_.persistentStorage.set(start());
   const auto open = ClientSession::make(assembly_, numberedFeedback(1));
   const auto ended = ClientSession::make(assembly_, numberedFeedback(1));
   for (int i = 2; i <= 3; ++i) ended->addFeedback(numberedFeedback(i));

@@ -545,8 +545,8 @@ TEST_F(ZelkorBagControllerTest, RecordsAFetchAsFeedback) {
   const auto guids = std::make_shared<ZelkorUserGUIDController>(assembly_);
   make();
   readVersion();  // before these services have been made: recorded nowhere
-  assembly_.setFeedbackSessions(sessions);
-  assembly_.setGuidController(guids);
+  assembly_.feedbackSessions.set(sessions);
+  assembly_.guidController.set(guids);
   reply(500, "");
   EXPECT_THAT(sessions->events, IsEmpty());
 

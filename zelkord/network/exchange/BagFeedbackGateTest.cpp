@@ -14,8 +14,8 @@ class BagFeedbackGateTest : public testing::Test {
   void install(const char* text) {
     const auto factory = std::make_shared<ZLKNetworkRequestFactory>(assembly_);
     if (!assembly_.bagController()) {
-      assembly_.setRequestFactory(factory);
-      assembly_.setBagController(std::make_shared<ZelkorBagController>(assembly_, *factory));
+      assembly_.requestFactory.set(factory);
+      assembly_.bagController.set(std::make_shared<ZelkorBagController>(assembly_, *factory));
     }
     assembly_.bagController()->cacheBagState(
         std::make_shared<const ZLKBag>(

@@ -22,9 +22,9 @@ class ImageFetcherTest : public testing::Test {
   using Image = ImageFetcher::Image;
 
   ImageFetcherTest() {
-    assembly_.setGuidController(std::make_shared<ZelkorUserGUIDController>(assembly_));
-    assembly_.setClientSessionManager(sessions_);
-    assembly_.setImageFetcher(std::make_shared<ImageFetcher>(assembly_));
+    assembly_.guidController.set(std::make_shared<ZelkorUserGUIDController>(assembly_));
+    assembly_.clientSessionManager.set(sessions_);
+    assembly_.imageFetcher.set(std::make_shared<ImageFetcher>(assembly_));
     assembly_.urlSession();
   }
 
@@ -339,7 +339,7 @@ TEST_F(ImageFetcherTest, LeavesNobodyWaitingWhenItIsGone) {
     }
     return fetch("https://img.example/last");
   }();
-  assembly_.setImageFetcher(nullptr);
+  assembly_.imageFetcher.set(nullptr);
   ASSERT_TRUE(waiting.isFulfilled());
   EXPECT_EQ(waiting.get(), std::nullopt);
   for (const auto& task : session().pending()) task->succeed(200, "bytes");

@@ -86,12 +86,12 @@ void FactoryWorld::setBag(const std::string& key, json::value value) {
 }
 
 void FactoryWorld::startWithoutBag() {
-  assembly.setRequestFactory(std::make_shared<ZLKNetworkRequestFactory>(assembly));
+  assembly.requestFactory.set(std::make_shared<ZLKNetworkRequestFactory>(assembly));
   factory().start();
   factory().setAppSignatureSource(signatureSource_.get());
   factory().didUpdateSubscriptionDictionaries(subscriptions);
   factory().didUpdateStorefrontIdentifier(storefront);
-  assembly.setBagController(std::make_shared<ZelkorBagController>(assembly, factory()));
+  assembly.bagController.set(std::make_shared<ZelkorBagController>(assembly, factory()));
   fake.timeline.runUntilIdle();
 }
 
