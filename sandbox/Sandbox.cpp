@@ -14,9 +14,9 @@ Outcome<std::unique_ptr<Sandbox>> Sandbox::start(const Setup& setup) {
   std::filesystem::create_directories(setup.state, error);
   if (error) return Failure{setup.state.string() + ": " + error.message()};
   std::unique_ptr<Sandbox> sandbox(new Sandbox());
-  if (auto failure = sandbox->lockState(setup.state)) return *failure;
-  if (auto failure = sandbox->openStores(setup)) return *failure;
-  if (auto failure = sandbox->serve(setup)) return *failure;
+  if (auto failure = sandbox->_lockState(setup.state)) return *failure;
+  if (auto failure = sandbox->_openStores(setup)) return *failure;
+  if (auto failure = sandbox->_serve(setup)) return *failure;
   return sandbox;
 }
 
@@ -26,7 +26,7 @@ Sandbox::~Sandbox() {
   if (lock_ >= 0) ::close(lock_);
 }
 
-std::optional<Failure> Sandbox::lockState(const std::filesystem::path& folder) {
+std::optional<Failure> Sandbox::_lockState(const std::filesystem::path& folder) {
   lock_ = ::open((folder / "lock").c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600);
   if (lock_ < 0) return Failure{"cannot write in " + folder.string()};
   if (::flock(lock_, LOCK_EX | LOCK_NB) != 0)
@@ -34,7 +34,7 @@ std::optional<Failure> Sandbox::lockState(const std::filesystem::path& folder) {
   return std::nullopt;
 }
 
-std::optional<Failure> Sandbox::openStores(const Setup& setup) {
+std::optional<Failure> Sandbox::_openStores(const Setup& setup) {
   for (const auto& package : setup.sources.missingPackages()) {
     notes_.push_back("no data of the package " + package + ": going on without it");
   }
@@ -52,7 +52,7 @@ std::optional<Failure> Sandbox::openStores(const Setup& setup) {
   return std::nullopt;
 }
 
-std::optional<Failure> Sandbox::serve(const Setup& setup) {
+std::optional<Failure> Sandbox::_serve(const Setup& setup) {
   const auto certificate = ensureCertificate(setup.state);
   if (!certificate) return certificate.failure();
   auto server = Server::listen(*certificate, setup.port);

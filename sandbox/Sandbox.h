@@ -40,9 +40,9 @@ class Sandbox final {
 
  private:
   Sandbox() = default;
-  std::optional<Failure> lockState(const std::filesystem::path& folder);
-  std::optional<Failure> openStores(const Setup& setup);
-  std::optional<Failure> serve(const Setup& setup);
+  std::optional<Failure> _lockState(const std::filesystem::path& folder);
+  std::optional<Failure> _openStores(const Setup& setup);
+  std::optional<Failure> _serve(const Setup& setup);
 
   int lock_ = -1;
   std::string url_;

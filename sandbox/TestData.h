@@ -47,10 +47,11 @@ class TinyDictionary final {
     std::snprintf(line, sizeof line, "%08zu 03 n 01 %s 0 000 | %s  \n", data_.size(), word.c_str(),
                   gloss.c_str());
     char entry[256];
-    std::snprintf(entry, sizeof entry, "%s n 1 0 1 1 %08zu  \n", lower(word).c_str(), data_.size());
+    std::snprintf(entry, sizeof entry, "%s n 1 0 1 1 %08zu  \n", _lower(word).c_str(),
+                  data_.size());
     data_ += line;
     index_ += entry;
-    if (tags > 0) counts_ += lower(word) + "%1:03:00:: 1 " + std::to_string(tags) + "\n";
+    if (tags > 0) counts_ += _lower(word) + "%1:03:00:: 1 " + std::to_string(tags) + "\n";
   }
 
   void write(const std::filesystem::path& folder) const {
@@ -60,7 +61,7 @@ class TinyDictionary final {
   }
 
  private:
-  static std::string lower(std::string text) {
+  static std::string _lower(std::string text) {
     for (char& c : text) c = static_cast<char>(c >= 'A' && c <= 'Z' ? c + 32 : c);
     return text;
   }

@@ -22,7 +22,7 @@ class Walk {
  public:
   void visit(const json::value& value) {
     if (const auto* object = value.if_object()) {
-      for (const auto& [key, member] : *object) visitMember(key, member);
+      for (const auto& [key, member] : *object) _visitMember(key, member);
     } else if (const auto* array = value.if_array()) {
       for (const auto& element : *array) visit(element);
     }
@@ -31,17 +31,17 @@ class Walk {
   std::vector<ImageDescriptor> take() { return std::move(found_); }
 
  private:
-  void visitMember(std::string_view key, const json::value& member) {
+  void _visitMember(std::string_view key, const json::value& member) {
     if (std::find(kImageKeys.begin(), kImageKeys.end(), key) == kImageKeys.end()) {
       visit(member);
     } else if (const auto* list = member.if_array()) {
-      for (const auto& element : *list) add(element);
+      for (const auto& element : *list) _add(element);
     } else {
-      add(member);
+      _add(member);
     }
   }
 
-  void add(const json::value& value) {
+  void _add(const json::value& value) {
     const auto* object = value.if_object();
     if (!object) return;
     auto url = stringIn(*object, "url").value_or("");

@@ -60,7 +60,7 @@ class ImagesRun {
   int run() {
     auto wanted = namedImages(invocation_.options);
     if (!invocation_.options.arguments.empty()) {
-      const auto searched = search();
+      const auto searched = _search();
       if (!searched.answer.reply) {
         showOutcome(invocation_, searched);
         return searched.answer.error ? statusOf(searched) : kErrorReply;
@@ -68,16 +68,16 @@ class ImagesRun {
       for (auto& image : imagesIn(searched.answer.reply->data.view()))
         wanted.push_back(std::move(image));
     }
-    return load(std::move(wanted));
+    return _load(std::move(wanted));
   }
 
  private:
-  Outcome search() {
+  Outcome _search() {
     QueryRun run(client_, invocation_.options);
     return run.ask({QueryKind::Search, joinedWords(invocation_.options.arguments), {}});
   }
 
-  int load(std::vector<ImageDescriptor> wanted) {
+  int _load(std::vector<ImageDescriptor> wanted) {
     const auto start = std::chrono::steady_clock::now();
     const auto future = EndpointClient(client_).loadImages(wanted, invocation_.options.deadline);
     const auto& result = future.get();
@@ -86,12 +86,12 @@ class ImagesRun {
     if (!result.value) return reportError(invocation_, result.error.value_or(Error{}));
     std::vector<LoadedImage> loaded;
     for (const auto& image : wanted) loaded.push_back(imageOf(image, *result.value));
-    save(loaded);
-    show(loaded);
-    return statusOfImages(loaded);
+    _save(loaded);
+    _show(loaded);
+    return _statusOfImages(loaded);
   }
 
-  void save(std::vector<LoadedImage>& images) const {
+  void _save(std::vector<LoadedImage>& images) const {
     if (invocation_.options.folder.empty()) return;
     ImageFiles files(invocation_.options.folder);
     for (auto& image : images) {
@@ -99,27 +99,27 @@ class ImagesRun {
     }
   }
 
-  void show(const std::vector<LoadedImage>& images) const {
+  void _show(const std::vector<LoadedImage>& images) const {
     if (invocation_.options.json) {
-      invocation_.surroundings.out << json::serialize(toJson(images)) << '\n';
+      invocation_.surroundings.out << json::serialize(_toJson(images)) << '\n';
       return;
     }
-    for (const auto& image : images) showOne(image);
+    for (const auto& image : images) _showOne(image);
     const auto came = std::count_if(images.begin(), images.end(),
                                     [](const auto& image) { return image.bytes.has_value(); });
     invocation_.surroundings.out << fmt::format("{} of {} in {:.1f} ms\n", came, images.size(),
                                                 milliseconds_);
   }
 
-  void showOne(const LoadedImage& image) const {
+  void _showOne(const LoadedImage& image) const {
     auto& out = invocation_.surroundings.out;
-    out << "  " << printable(image.key) << "  " << remark(image) << '\n';
+    out << "  " << printable(image.key) << "  " << _remark(image) << '\n';
     if (!image.bytes || !invocation_.surroundings.showsImages) return;
     if (imageType(image.bytes->view()).extension != ".png") return;
     out << "  " << inlineImage(image.bytes->view()) << '\n';
   }
 
-  static std::string remark(const LoadedImage& image) {
+  static std::string _remark(const LoadedImage& image) {
     if (!image.bytes) return "did not come";
     auto text =
         fmt::format("{} bytes, {}", image.bytes->size(), imageType(image.bytes->view()).name);
@@ -127,12 +127,12 @@ class ImagesRun {
     return image.saved.path.empty() ? text : text + ", saved as " + printable(image.saved.path);
   }
 
-  json::object toJson(const std::vector<LoadedImage>& images) const {
+  json::object _toJson(const std::vector<LoadedImage>& images) const {
     json::array loaded;
     json::array missing;
     for (const auto& image : images) {
       if (image.bytes) {
-        loaded.push_back(toJson(image));
+        loaded.push_back(_toJson(image));
       } else {
         missing.push_back(json::string(image.key));
       }
@@ -142,7 +142,7 @@ class ImagesRun {
             {"missing", std::move(missing)}};
   }
 
-  static json::object toJson(const LoadedImage& image) {
+  static json::object _toJson(const LoadedImage& image) {
     json::object object{{"key", image.key},
                         {"bytes", image.bytes->size()},
                         {"type", imageType(image.bytes->view()).name}};
@@ -154,7 +154,7 @@ class ImagesRun {
     return object;
   }
 
-  static int statusOfImages(const std::vector<LoadedImage>& images) {
+  static int _statusOfImages(const std::vector<LoadedImage>& images) {
     for (const auto& image : images) {
       if (!image.bytes || image.saved.error) return kErrorReply;
     }

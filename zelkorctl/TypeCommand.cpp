@@ -36,11 +36,11 @@ class TypingSession {
     {
       const RawTerminal raw(invocation_.surroundings.input);
       if (atTerminal_ && invocation_.surroundings.outputIsTerminal && !invocation_.options.json) {
-        screen_.emplace(out(), invocation_.surroundings.output);
+        screen_.emplace(_out(), invocation_.surroundings.output);
       }
-      draw();
+      _draw();
       bool typing = true;
-      while (mayGoOn(typing)) typing = turn(typing);
+      while (_mayGoOn(typing)) typing = _turn(typing);
       screen_.reset();
     }
     if (unreachable_) reportError(invocation_, *unreachable_);
@@ -51,34 +51,34 @@ class TypingSession {
   int endingSignal() const { return endingSignal_; }
 
  private:
-  std::ostream& out() const { return invocation_.surroundings.out; }
+  std::ostream& _out() const { return invocation_.surroundings.out; }
 
   // Who ends typing at a terminal does not wait for answers.
-  bool mayGoOn(bool typing) const {
-    if (unreachable_ || endingSignal_ != 0 || !out().good()) return false;
+  bool _mayGoOn(bool typing) const {
+    if (unreachable_ || endingSignal_ != 0 || !_out().good()) return false;
     return typing || (!atTerminal_ && run_.hasOutstanding());
   }
 
   // Waits for something and deals with it; whether there may be more keys.
-  bool turn(bool typing) {
+  bool _turn(bool typing) {
     pollfd waiting[] = {{run_.descriptor(), POLLIN, 0},
                         {signals_ ? signals_->descriptor() : -1, POLLIN, 0},
                         {typing ? invocation_.surroundings.input : -1, POLLIN, 0}};
     ::poll(waiting, 3, -1);
-    if (waiting[1].revents != 0) takeSignals();
-    for (const auto& outcome : run_.take()) show(outcome);
-    return typing && (waiting[2].revents == 0 || takeKey());
+    if (waiting[1].revents != 0) _takeSignals();
+    for (const auto& outcome : run_.take()) _show(outcome);
+    return typing && (waiting[2].revents == 0 || _takeKey());
   }
 
-  void takeSignals() {
+  void _takeSignals() {
     while (const auto signal = signals_->take()) {
       if (*signal != SIGWINCH) endingSignal_ = *signal;
     }
-    draw();
+    _draw();
   }
 
   // False at the end of what is typed.
-  bool takeKey() {
+  bool _takeKey() {
     char byte = 0;
     const auto count = ::read(invocation_.surroundings.input, &byte, 1);
     if (count < 0 && (errno == EINTR || errno == EAGAIN)) return true;
@@ -92,14 +92,14 @@ class TypingSession {
         latest_.reset();
         break;
       case LineEditor::Event::Changed:
-        sendText();
+        _sendText();
         break;
     }
-    draw();
+    _draw();
     return true;
   }
 
-  void sendText() {
+  void _sendText() {
     if (editor_.text().empty()) {
       latest_.reset();
       return;
@@ -108,25 +108,25 @@ class TypingSession {
     if (!atTerminal_) std::this_thread::sleep_for(invocation_.options.delayPerKey);
   }
 
-  void show(const Outcome& outcome) {
+  void _show(const Outcome& outcome) {
     if (const auto& error = outcome.answer.error) {
       status_ = statusOf(outcome);
       if (status_ == kNotReachable) unreachable_ = error;
     }
     if (!screen_) {
-      print(outcome);
+      _print(outcome);
     } else if (outcome.kind != Outcome::Kind::Stale) {
       latest_ = outcome;
-      draw();
+      _draw();
     }
   }
 
-  void print(const Outcome& outcome) const {
+  void _print(const Outcome& outcome) const {
     showOutcome(invocation_, outcome);
-    out() << std::flush;
+    _out() << std::flush;
   }
 
-  void draw() {
+  void _draw() {
     if (!screen_) return;
     std::vector<std::string> lines = {"> " + printable(editor_.text())};
     const auto width = screen_->size().columns - 1;

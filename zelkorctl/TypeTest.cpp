@@ -39,7 +39,7 @@ class TypingProcess {
     posix_spawn_file_actions_addopen(&files, 0, name, O_RDWR, 0);
     posix_spawn_file_actions_adddup2(&files, 0, 1);
     posix_spawn_file_actions_adddup2(&files, 0, 2);
-    spawn(socket, &files);
+    _spawn(socket, &files);
     posix_spawn_file_actions_destroy(&files);
     ::close(far);
   }
@@ -49,7 +49,7 @@ class TypingProcess {
     posix_spawn_file_actions_init(&files);
     posix_spawn_file_actions_addclose(&files, 0);
     posix_spawn_file_actions_addopen(&files, 1, "/dev/null", O_WRONLY, 0);
-    spawn(socket, &files);
+    _spawn(socket, &files);
     posix_spawn_file_actions_destroy(&files);
   }
   ~TypingProcess() {
@@ -71,7 +71,7 @@ class TypingProcess {
   // Reads until the screen says so; everything that was read so far.
   const std::string& readUntil(const std::function<bool(const std::string&)>& enough) {
     const auto deadline = std::chrono::steady_clock::now() + kPatience;
-    while (!enough(read_) && std::chrono::steady_clock::now() < deadline) readMore(100);
+    while (!enough(read_) && std::chrono::steady_clock::now() < deadline) _readMore(100);
     EXPECT_TRUE(enough(read_)) << printable(read_);
     return read_;
   }
@@ -85,10 +85,10 @@ class TypingProcess {
     int status = 0;
     while (::waitpid(process_, &status, WNOHANG) == 0) {
       if (std::chrono::steady_clock::now() > deadline) return -1;
-      readMore(20);
+      _readMore(20);
     }
     process_ = -1;
-    readMore(20);
+    _readMore(20);
     return status;
   }
   const std::string& read() const { return read_; }
@@ -99,7 +99,7 @@ class TypingProcess {
   }
 
  private:
-  void spawn(const std::string& socket, posix_spawn_file_actions_t* files) {
+  void _spawn(const std::string& socket, posix_spawn_file_actions_t* files) {
     posix_spawnattr_t attributes;
     posix_spawnattr_init(&attributes);
     posix_spawnattr_setflags(&attributes, POSIX_SPAWN_SETSID);
@@ -111,7 +111,7 @@ class TypingProcess {
     posix_spawnattr_destroy(&attributes);
   }
 
-  void readMore(int milliseconds) {
+  void _readMore(int milliseconds) {
     pollfd waiting{near_, POLLIN, 0};
     if (::poll(&waiting, 1, milliseconds) <= 0) return;
     char bytes[4096];

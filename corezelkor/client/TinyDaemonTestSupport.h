@@ -38,11 +38,11 @@ class TinyDaemon {
     ::bind(listener_, reinterpret_cast<const sockaddr*>(&address), sizeof address);
     ::listen(listener_, 16);
     on("Hello", [](sd_bus_message* call) { sd_bus_reply_method_return(call, "s", ":1.1"); });
-    thread_ = std::thread([this] { run(); });
+    thread_ = std::thread([this] { _run(); });
   }
 
   ~TinyDaemon() {
-    post([this] { stopped_ = true; });
+    _post([this] { stopped_ = true; });
     thread_.join();
     ::close(listener_);
     ::close(wakeUp_);
@@ -68,7 +68,7 @@ class TinyDaemon {
   // Runs it with all connections; returns when it is done.
   void withConnections(const std::function<void(std::vector<sd_bus*>&)>& use) {
     std::promise<void> done;
-    post([&] {
+    _post([&] {
       use(connections_);
       done.set_value();
     });
@@ -90,12 +90,12 @@ class TinyDaemon {
   int makePrivateConnection() {
     int ends[2];
     ::socketpair(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0, ends);
-    serve(ends[0]);
+    _serve(ends[0]);
     return ends[1];
   }
 
  private:
-  void post(std::function<void()> task) {
+  void _post(std::function<void()> task) {
     {
       const std::lock_guard lock(mutex_);
       tasks_.push_back(std::move(task));
@@ -103,7 +103,7 @@ class TinyDaemon {
     ::eventfd_write(wakeUp_, 1);
   }
 
-  void serve(int descriptor) {
+  void _serve(int descriptor) {
     sd_bus* bus = nullptr;
     sd_bus_new(&bus);
     sd_id128_t id{};
@@ -114,14 +114,14 @@ class TinyDaemon {
     sd_bus_add_filter(
         bus, nullptr,
         [](sd_bus_message* message, void* self, sd_bus_error*) {
-          return static_cast<TinyDaemon*>(self)->handle(message);
+          return static_cast<TinyDaemon*>(self)->_handle(message);
         },
         this);
     sd_bus_start(bus);
     connections_.push_back(bus);
   }
 
-  int handle(sd_bus_message* message) {
+  int _handle(sd_bus_message* message) {
     std::uint8_t type = 0;
     sd_bus_message_get_type(message, &type);
     if (type != SD_BUS_MESSAGE_METHOD_CALL) return 0;
@@ -137,16 +137,16 @@ class TinyDaemon {
     return 1;
   }
 
-  void run() {
+  void _run() {
     while (!stopped_) {
-      runTasks();
-      processConnections();
-      wait();
+      _runTasks();
+      _processConnections();
+      _wait();
     }
     for (auto* bus : connections_) sd_bus_close_unref(bus);
   }
 
-  void runTasks() {
+  void _runTasks() {
     std::vector<std::function<void()>> tasks;
     {
       const std::lock_guard lock(mutex_);
@@ -155,7 +155,7 @@ class TinyDaemon {
     for (const auto& task : tasks) task();
   }
 
-  void processConnections() {
+  void _processConnections() {
     const auto current = connections_;  // a handler may add one
     for (auto* bus : current) {
       int result = 1;
@@ -166,7 +166,7 @@ class TinyDaemon {
     }
   }
 
-  void wait() {
+  void _wait() {
     std::vector<pollfd> descriptors{{wakeUp_, POLLIN, 0}, {listener_, POLLIN, 0}};
     for (auto* bus : connections_) {
       descriptors.push_back({sd_bus_get_fd(bus), static_cast<short>(sd_bus_get_events(bus)), 0});
@@ -176,7 +176,7 @@ class TinyDaemon {
     eventfd_t count = 0;
     ::eventfd_read(wakeUp_, &count);
     const int accepted = ::accept4(listener_, nullptr, nullptr, SOCK_CLOEXEC | SOCK_NONBLOCK);
-    if (accepted >= 0) serve(accepted);
+    if (accepted >= 0) _serve(accepted);
   }
 
   std::string folder_;

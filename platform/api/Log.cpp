@@ -4,8 +4,8 @@
 
 namespace zelkord {
 
-void Logger::writeFormatted(LogLevel level, fmt::string_view format,
-                            fmt::format_args arguments) const {
+void Logger::_writeFormatted(LogLevel level, fmt::string_view format,
+                             fmt::format_args arguments) const {
   fmt::memory_buffer buffer;
   fmt::vformat_to(std::back_inserter(buffer), format, arguments);
   sink_->writeFrom(format.data(), level, category_, {buffer.data(), buffer.size()});

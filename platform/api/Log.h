@@ -52,39 +52,39 @@ class Logger {
 
   template <typename... A>
   void debug(fmt::format_string<const A&...> format, const A&... arguments) const {
-    log(LogLevel::Debug, format, arguments...);
+    _log(LogLevel::Debug, format, arguments...);
   }
   template <typename... A>
   void info(fmt::format_string<const A&...> format, const A&... arguments) const {
-    log(LogLevel::Info, format, arguments...);
+    _log(LogLevel::Info, format, arguments...);
   }
   // The level "default".
   template <typename... A>
   void notice(fmt::format_string<const A&...> format, const A&... arguments) const {
-    log(LogLevel::Default, format, arguments...);
+    _log(LogLevel::Default, format, arguments...);
   }
   template <typename... A>
   void error(fmt::format_string<const A&...> format, const A&... arguments) const {
-    log(LogLevel::Error, format, arguments...);
+    _log(LogLevel::Error, format, arguments...);
   }
   template <typename... A>
   void fault(fmt::format_string<const A&...> format, const A&... arguments) const {
-    log(LogLevel::Fault, format, arguments...);
+    _log(LogLevel::Fault, format, arguments...);
   }
 
  private:
   template <typename... A>
-  void log(LogLevel level, fmt::format_string<const A&...> format, const A&... arguments) const {
+  void _log(LogLevel level, fmt::format_string<const A&...> format, const A&... arguments) const {
     if (!sink_->isEnabled(level)) return;
     [[maybe_unused]] const bool show = sink_->showsPrivateData();
-    writeFormatted(level, format, fmt::make_format_args(resolve(arguments, show)...));
+    _writeFormatted(level, format, fmt::make_format_args(_resolve(arguments, show)...));
   }
   template <typename T>
-  static const T& resolve(const T& argument, bool) {
+  static const T& _resolve(const T& argument, bool) {
     return argument;
   }
-  static Private resolve(const Private& argument, bool show) { return {argument.text, show}; }
-  void writeFormatted(LogLevel level, fmt::string_view format, fmt::format_args arguments) const;
+  static Private _resolve(const Private& argument, bool show) { return {argument.text, show}; }
+  void _writeFormatted(LogLevel level, fmt::string_view format, fmt::format_args arguments) const;
 
   LogSink* sink_;
   std::string category_;

@@ -89,7 +89,7 @@ void FakeLocation::setEnabledSystemWide(bool enabled) {
   state_->enabled = enabled;
 }
 
-void FakeLocation::tell(bool onlyUpdating, std::function<void(LocationDelegate&)> event) {
+void FakeLocation::_tell(bool onlyUpdating, std::function<void(LocationDelegate&)> event) {
   const MutexLock lock(state_->mutex);
   for (const auto& weak : state_->clients) {
     const auto client = weak.lock();
@@ -103,11 +103,11 @@ void FakeLocation::tell(bool onlyUpdating, std::function<void(LocationDelegate&)
 }
 
 void FakeLocation::deliver(std::vector<LocationFix> fixes) {
-  tell(true, [fixes = std::move(fixes)](LocationDelegate& to) { to.didUpdateLocations(fixes); });
+  _tell(true, [fixes = std::move(fixes)](LocationDelegate& to) { to.didUpdateLocations(fixes); });
 }
 
 void FakeLocation::fail(Error error) {
-  tell(true, [error = std::move(error)](LocationDelegate& to) { to.didFailWithError(error); });
+  _tell(true, [error = std::move(error)](LocationDelegate& to) { to.didFailWithError(error); });
 }
 
 void FakeLocation::changeAuthorization(const std::string& bundlePath,
@@ -116,7 +116,7 @@ void FakeLocation::changeAuthorization(const std::string& bundlePath,
     const MutexLock lock(state_->mutex);
     state_->authorizations[bundlePath] = status;
   }
-  tell(false, [status](LocationDelegate& to) { to.didChangeAuthorizationStatus(status); });
+  _tell(false, [status](LocationDelegate& to) { to.didChangeAuthorizationStatus(status); });
 }
 
 int FakeLocation::managers() const { return state_->count(false); }

@@ -41,7 +41,7 @@ class FakeLocation final : public LocationService {
   struct State;
 
  private:
-  void tell(bool onlyUpdating, std::function<void(LocationDelegate&)> event);
+  void _tell(bool onlyUpdating, std::function<void(LocationDelegate&)> event);
 
   const std::shared_ptr<State> state_;
 };

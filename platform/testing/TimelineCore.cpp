@@ -6,35 +6,35 @@
 
 namespace zelkord {
 
-void TimelineCore::checkThread() const {
+void TimelineCore::_checkThread() const {
   ZK_CHECK(std::this_thread::get_id() == thread_, "a manual timeline belongs to one thread");
 }
 
 TimelineCore::Key TimelineCore::post(const QueuePointer& queue, Duration delay, Access access,
                                      Task task) {
-  checkThread();
+  _checkThread();
   const Key key{deadlineAfter(now_, delay), nextSequence_++};
   agenda_.emplace(key, Entry{queue, access, std::move(task)});
-  if (queue->runsAtOnce) runAllDue(*queue);
+  if (queue->runsAtOnce) _runAllDue(*queue);
   return key;
 }
 
-void TimelineCore::runAllDue(const Queue& queue) {
+void TimelineCore::_runAllDue(const Queue& queue) {
   const Key end{now_, nextSequence_};
-  for (auto i = firstOf(queue, end); i != agenda_.end() && isFree(queue, i->second.access);
-       i = firstOf(queue, end)) {
-    run(i, true);
+  for (auto i = _firstOf(queue, end); i != agenda_.end() && _isFree(queue, i->second.access);
+       i = _firstOf(queue, end)) {
+    _run(i, true);
   }
 }
 
 void TimelineCore::cancel(Key key) {
-  checkThread();
+  _checkThread();
   // The node outlives the look-up: the task's captures may cancel in turn.
   const auto released = agenda_.extract(key);
 }
 
 void TimelineCore::drop(const Queue* queue) {
-  checkThread();
+  _checkThread();
   for (auto i = agenda_.begin(); i != agenda_.end();) {
     if (queue && i->second.queue.get() != queue) {
       ++i;
@@ -45,33 +45,33 @@ void TimelineCore::drop(const Queue* queue) {
   }
 }
 
-bool TimelineCore::isFree(const Queue& queue, Access access) {
+bool TimelineCore::_isFree(const Queue& queue, Access access) {
   return !queue.exclusiveRunning && (access == Access::Shared || queue.sharedRunning == 0);
 }
 
 // The first task due by `limit` whose queue lets it begin; a task that is held back holds those
 // behind it.
-TimelineCore::Agenda::iterator TimelineCore::runnable(SteadyTime limit) {
+TimelineCore::Agenda::iterator TimelineCore::_runnable(SteadyTime limit) {
   std::vector<const Queue*> held;
   for (auto i = agenda_.begin(); i != agenda_.end() && i->first.first <= limit; ++i) {
     const Queue* queue = i->second.queue.get();
     if (std::find(held.begin(), held.end(), queue) != held.end()) continue;
-    if (isFree(*queue, i->second.access)) return i;
+    if (_isFree(*queue, i->second.access)) return i;
     held.push_back(queue);
   }
   return agenda_.end();
 }
 
-TimelineCore::Agenda::iterator TimelineCore::firstOf(const Queue& queue, Key before) {
+TimelineCore::Agenda::iterator TimelineCore::_firstOf(const Queue& queue, Key before) {
   for (auto i = agenda_.begin(); i != agenda_.end() && i->first < before; ++i) {
     if (i->second.queue.get() == &queue) return i;
   }
   return agenda_.end();
 }
 
-void TimelineCore::enter(Frame frame) {
+void TimelineCore::_enter(Frame frame) {
   Queue& queue = *frame.queue;
-  ZK_CHECK(isFree(queue, frame.access),
+  ZK_CHECK(_isFree(queue, frame.access),
            "a task would wait for a queue whose own task waits further out on the manual timeline");
   if (frame.access == Access::Exclusive) {
     queue.exclusiveRunning = true;
@@ -81,7 +81,7 @@ void TimelineCore::enter(Frame frame) {
   frames_.push_back(std::move(frame));
 }
 
-void TimelineCore::leave() {
+void TimelineCore::_leave() {
   const Frame frame = std::move(frames_.back());
   frames_.pop_back();
   if (frame.access == Access::Exclusive) {
@@ -91,27 +91,27 @@ void TimelineCore::leave() {
   }
 }
 
-void TimelineCore::run(Agenda::iterator place, bool startsChain) {
+void TimelineCore::_run(Agenda::iterator place, bool startsChain) {
   auto node = agenda_.extract(place);
   moveTo(node.key().first);
   Entry& entry = node.mapped();
-  enter({entry.queue, entry.access, startsChain});
+  _enter({entry.queue, entry.access, startsChain});
   entry.task();
   entry.task = nullptr;  // released on its queue
-  leave();
+  _leave();
 }
 
 void TimelineCore::sync(const QueuePointer& queue, Access access, FunctionRef<void()> task) {
-  checkThread();
+  _checkThread();
   ZK_CHECK(queue->global || !isCurrent(*queue, Access::Shared), "sync on the caller's own queue");
   if (!queue->global) {
     const Key mine{now_, nextSequence_++};
-    for (auto i = firstOf(*queue, mine); i != agenda_.end(); i = firstOf(*queue, mine))
-      run(i, true);
+    for (auto i = _firstOf(*queue, mine); i != agenda_.end(); i = _firstOf(*queue, mine))
+      _run(i, true);
   }
-  enter({queue, access, frames_.empty()});
+  _enter({queue, access, frames_.empty()});
   task();
-  leave();
+  _leave();
 }
 
 bool TimelineCore::isCurrent(const Queue& queue, Access access) const {
@@ -127,23 +127,23 @@ bool TimelineCore::isCurrent(const Queue& queue, Access access) const {
 }
 
 bool TimelineCore::pump(FunctionRef<bool()> ready, SteadyTime deadline) {
-  checkThread();
+  _checkThread();
   while (!ready()) {
     if (now_ > deadline) return false;
-    const auto place = runnable(deadline);
+    const auto place = _runnable(deadline);
     if (place == agenda_.end()) {
       ZK_CHECK(deadline != SteadyTime::max(), "an endless wait with nothing left to run");
       moveTo(deadline);
       return ready();
     }
-    run(place, true);
+    _run(place, true);
   }
   return true;
 }
 
 void TimelineCore::runDue(SteadyTime limit) {
-  checkThread();
-  for (auto i = runnable(limit); i != agenda_.end(); i = runnable(limit)) run(i, true);
+  _checkThread();
+  for (auto i = _runnable(limit); i != agenda_.end(); i = _runnable(limit)) _run(i, true);
 }
 
 void TimelineCore::moveTo(SteadyTime time) { now_ = std::max(now_, time); }

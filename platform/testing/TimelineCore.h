@@ -79,14 +79,14 @@ class TimelineCore final {
     bool startsChain;  // what is further out is another task that waits, not the caller
   };
 
-  void checkThread() const;
-  static bool isFree(const Queue& queue, Access access);
-  Agenda::iterator runnable(SteadyTime limit);
-  Agenda::iterator firstOf(const Queue& queue, Key before);
-  void runAllDue(const Queue& queue);
-  void run(Agenda::iterator place, bool startsChain);
-  void enter(Frame frame);
-  void leave();
+  void _checkThread() const;
+  static bool _isFree(const Queue& queue, Access access);
+  Agenda::iterator _runnable(SteadyTime limit);
+  Agenda::iterator _firstOf(const Queue& queue, Key before);
+  void _runAllDue(const Queue& queue);
+  void _run(Agenda::iterator place, bool startsChain);
+  void _enter(Frame frame);
+  void _leave();
 
   const std::thread::id thread_ = std::this_thread::get_id();
   SteadyTime now_{1000s};

@@ -59,14 +59,14 @@ Outcome<bool> IndexBuilder::ensure(const DataSources& sources, const std::filesy
   auto database = Database::open(temporary, Database::Mode::Write);
   if (!database) return database.failure();
   IndexBuilder builder(std::move(*database));
-  const bool built = builder.begin() && builder.fill(sources) && builder.finish(signature);
+  const bool built = builder._begin() && builder._fill(sources) && builder._finish(signature);
   if (!built) return Failure{"building " + path.string() + ": " + builder.database_.error()};
   std::filesystem::rename(temporary, path, error);
   if (error) return Failure{path.string() + ": " + error.message()};
   return true;
 }
 
-bool IndexBuilder::begin() {
+bool IndexBuilder::_begin() {
   if (!database_.run(kIndexTables)) return false;
   insertEntry_ = database_.prepare("INSERT INTO entry VALUES(?, ?, ?, ?, ?, ?, ?, ?, ?)");
   insertSearch_ =
@@ -74,22 +74,22 @@ bool IndexBuilder::begin() {
   return true;
 }
 
-bool IndexBuilder::fill(const DataSources& sources) {
-  const auto yield = [this](SourceEntry source) { add(std::move(source)); };
+bool IndexBuilder::_fill(const DataSources& sources) {
+  const auto yield = [this](SourceEntry source) { _add(std::move(source)); };
   readIsoCodes(sources.isoCodes(), sources.flags(), yield);
   readWordNet(sources.wordnet(), yield);
   readCharacters(sources.unicode(), yield);
-  writeTerms();
+  _writeTerms();
   return !failed_;
 }
 
-bool IndexBuilder::finish(const std::string& signature) {
+bool IndexBuilder::_finish(const std::string& signature) {
   auto meta = database_.prepare("INSERT INTO meta VALUES('signature', ?)");
   return meta.bind(1, signature).run() &&
          database_.run("COMMIT; ANALYZE; PRAGMA journal_mode = DELETE");
 }
 
-void IndexBuilder::add(SourceEntry source) {
+void IndexBuilder::_add(SourceEntry source) {
   Entry& entry = source.entry;
   entry.id = ++lastId_;
   insertEntry_.bind(1, entry.id)
@@ -102,11 +102,11 @@ void IndexBuilder::add(SourceEntry source) {
   insertEntry_.bind(8, static_cast<std::int64_t>(entry.weight)).bind(9, entry.facts);
   insertSearch_.bind(1, entry.id).bind(2, entry.title).bind(3, entry.description);
   if (!insertEntry_.run() || !insertSearch_.run()) failed_ = true;
-  addTerms(entry, {entry.title, 0}, source.findByInnerWords);
-  for (const Alias& alias : source.aliases) addTerms(entry, alias, source.findByInnerWords);
+  _addTerms(entry, {entry.title, 0}, source.findByInnerWords);
+  for (const Alias& alias : source.aliases) _addTerms(entry, alias, source.findByInnerWords);
 }
 
-void IndexBuilder::addTerms(const Entry& entry, const Alias& alias, bool innerWords) {
+void IndexBuilder::_addTerms(const Entry& entry, const Alias& alias, bool innerWords) {
   const std::string folded = foldTerm(alias.text);
   if (folded.empty() || folded.size() > kLongestTerm) return;
   const int weight =
@@ -123,7 +123,7 @@ void IndexBuilder::addTerms(const Entry& entry, const Alias& alias, bool innerWo
   }
 }
 
-void IndexBuilder::writeTerms() {
+void IndexBuilder::_writeTerms() {
   auto insertHead = database_.prepare("INSERT INTO head VALUES(?, ?, ?, ?, ?, ?)");
   std::int64_t number = 0;
   listPrefixHeads(terms_, [&](std::string_view prefix, const Term& term) {

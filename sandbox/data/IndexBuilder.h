@@ -27,12 +27,12 @@ class IndexBuilder final {
  private:
   explicit IndexBuilder(Database database) : database_(std::move(database)) {}
 
-  bool begin();
-  bool fill(const DataSources& sources);
-  bool finish(const std::string& signature);
-  void add(SourceEntry source);
-  void addTerms(const Entry& entry, const Alias& alias, bool innerWords);
-  void writeTerms();
+  bool _begin();
+  bool _fill(const DataSources& sources);
+  bool _finish(const std::string& signature);
+  void _add(SourceEntry source);
+  void _addTerms(const Entry& entry, const Alias& alias, bool innerWords);
+  void _writeTerms();
 
   Database database_;
   Statement insertEntry_;

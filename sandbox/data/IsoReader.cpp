@@ -65,15 +65,15 @@ class IsoTables final {
       : folder_(std::move(folder)), flags_(std::move(flags)) {}
 
   void read(const std::function<void(SourceEntry)>& yield) {
-    forEach("3166-1", [&](const auto& record) { yield(country(record)); });
-    forEach("3166-2", [&](const auto& record) { yield(region(record)); });
-    forEach("4217", [&](const auto& record) { yield(currency(record)); });
-    forEach("639-2", [&](const auto& record) { yield(language(record)); });
+    _forEach("3166-1", [&](const auto& record) { yield(_country(record)); });
+    _forEach("3166-2", [&](const auto& record) { yield(_region(record)); });
+    _forEach("4217", [&](const auto& record) { yield(_currency(record)); });
+    _forEach("639-2", [&](const auto& record) { yield(_language(record)); });
   }
 
  private:
-  void forEach(const std::string& list,
-               const std::function<void(const json::object&)>& visit) const {
+  void _forEach(const std::string& list,
+                const std::function<void(const json::object&)>& visit) const {
     const auto text = readFile(folder_ / ("iso_" + list + ".json"));
     boost::system::error_code error;
     const json::value document = text ? json::parse(*text, error) : json::value();
@@ -86,7 +86,7 @@ class IsoTables final {
     }
   }
 
-  std::string flagFor(const std::string& country) const {
+  std::string _flagFor(const std::string& country) const {
     const std::string name = lowerCased(country);
     std::error_code error;
     return !name.empty() && std::filesystem::exists(flags_ / (name + ".png"), error)
@@ -94,7 +94,7 @@ class IsoTables final {
                : std::string();
   }
 
-  SourceEntry country(const json::object& record) {
+  SourceEntry _country(const json::object& record) {
     const std::string name = field(record, "name");
     const std::string common = field(record, "common_name");
     const std::string code = field(record, "alpha_2");
@@ -103,7 +103,7 @@ class IsoTables final {
                     .title = common.empty() ? name : common,
                     .code = code,
                     .glyph = field(record, "flag"),
-                    .flag = flagFor(code),
+                    .flag = _flagFor(code),
                     .weight = kCountryWeight};
     source.entry.description = "Country · " + code + " · " + field(record, "alpha_3");
     addAlias(source, name, common.empty() ? 0 : kInvertedNamePenalty);
@@ -123,7 +123,7 @@ class IsoTables final {
     return source;
   }
 
-  SourceEntry region(const json::object& record) const {
+  SourceEntry _region(const json::object& record) const {
     const std::string code = field(record, "code");
     const std::string country = code.substr(0, code.find('-'));
     const auto found = countries_.find(country);
@@ -132,7 +132,7 @@ class IsoTables final {
     source.entry = {.kind = Kind::Region,
                     .title = field(record, "name"),
                     .code = code,
-                    .flag = flagFor(country),
+                    .flag = _flagFor(country),
                     .weight = kRegionWeight};
     source.entry.description = field(record, "type") + " · " + within;
     json::array facts;
@@ -143,14 +143,14 @@ class IsoTables final {
     return source;
   }
 
-  SourceEntry currency(const json::object& record) const {
+  SourceEntry _currency(const json::object& record) const {
     const std::string code = field(record, "alpha_3");
     SourceEntry source;
     // The first two letters of most currency codes are the country.
     source.entry = {.kind = Kind::Currency,
                     .title = field(record, "name"),
                     .code = code,
-                    .flag = flagFor(code.substr(0, 2)),
+                    .flag = _flagFor(code.substr(0, 2)),
                     .weight = kCurrencyWeight};
     source.entry.description = "Currency · " + code;
     addAlias(source, code, kCodePenalty);
@@ -161,7 +161,7 @@ class IsoTables final {
     return source;
   }
 
-  SourceEntry language(const json::object& record) const {
+  SourceEntry _language(const json::object& record) const {
     const std::string code = field(record, "alpha_3");
     const bool common = !field(record, "alpha_2").empty();
     SourceEntry source;

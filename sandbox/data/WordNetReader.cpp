@@ -57,10 +57,10 @@ class WordNetFiles final {
     for (std::size_t part = 0; part < kParts; ++part) {
       data_[part] = readFile(folder / (std::string("data.") + kPartFiles[part])).value_or("");
       index_[part] = readFile(folder / (std::string("index.") + kPartFiles[part])).value_or("");
-      readIndex(part);
+      _readIndex(part);
     }
     counts_ = readFile(folder / "cntlist.rev").value_or("");
-    readCounts();
+    _readCounts();
   }
 
   const std::map<std::string_view, Lemma>& lemmas() const { return lemmas_; }
@@ -89,7 +89,7 @@ class WordNetFiles final {
 
  private:
   // "lemma pos synset_count pointer_count [pointer ...] sense_count tagged_count offset ..."
-  void readIndex(std::size_t part) {
+  void _readIndex(std::size_t part) {
     for (const std::string_view line : split(index_[part], '\n')) {
       if (line.empty() || line.front() == ' ') continue;
       const auto fields = split(line, ' ');
@@ -105,7 +105,7 @@ class WordNetFiles final {
   }
 
   // "lemma%part:... sense_number tag_count"; part 5 are adjectives too.
-  void readCounts() {
+  void _readCounts() {
     for (const std::string_view line : split(counts_, '\n')) {
       const std::size_t mark = line.find('%');
       if (mark == std::string_view::npos || mark + 1 >= line.size()) continue;

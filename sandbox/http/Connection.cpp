@@ -44,42 +44,42 @@ void Connection::start() {
   beast::get_lowest_layer(stream_).expires_after(kHandshakeTime);
   stream_.async_handshake(asio::ssl::stream_base::server,
                           [self = shared_from_this()](ErrorCode error) {
-                            if (!error) self->read();
+                            if (!error) self->_read();
                           });
 }
 
-void Connection::read() {
+void Connection::_read() {
   parser_.emplace();
   parser_->header_limit(kLargestHead);
   parser_->body_limit(kLargestBody);
   beast::get_lowest_layer(stream_).expires_after(kIdleTime);
   http::async_read(
       stream_, buffer_, *parser_,
-      [self = shared_from_this()](ErrorCode error, std::size_t) { self->didRead(error); });
+      [self = shared_from_this()](ErrorCode error, std::size_t) { self->_didRead(error); });
 }
 
-void Connection::didRead(ErrorCode error) {
-  if (error) return refuse(error);
+void Connection::_didRead(ErrorCode error) {
+  if (error) return _refuse(error);
   beast::get_lowest_layer(stream_).expires_never();
   keepAlive_ = parser_->get().keep_alive();
   headOnly_ = parser_->get().method() == http::verb::head;
   const auto target = parseTarget(std::string_view(parser_->get().target()));
-  if (!target) return send(Reply::error(400, "malformed target"));
-  Request request = takeRequest();
+  if (!target) return _send(Reply::error(400, "malformed target"));
+  Request request = _takeRequest();
   request.path = target->path;
   request.items = target->items;
-  send(handler_(std::move(request)));
+  _send(handler_(std::move(request)));
 }
 
-void Connection::refuse(ErrorCode error) {
-  if (error == http::error::end_of_stream) return shutdown();
+void Connection::_refuse(ErrorCode error) {
+  if (error == http::error::end_of_stream) return _shutdown();
   if (error.category() != http::make_error_code(http::error::bad_target).category()) return;
   keepAlive_ = false;
   headOnly_ = false;
-  send(Reply::error(error == http::error::body_limit ? 413 : 400, error.message()));
+  _send(Reply::error(error == http::error::body_limit ? 413 : 400, error.message()));
 }
 
-Request Connection::takeRequest() {
+Request Connection::_takeRequest() {
   auto message = parser_->release();
   Request request;
   request.method = message.method_string();
@@ -92,16 +92,16 @@ Request Connection::takeRequest() {
   return request;
 }
 
-void Connection::send(Reply reply) {
+void Connection::_send(Reply reply) {
   reply_ = std::move(reply);
-  if (reply_.delay.count() == 0) return deliver();
+  if (reply_.delay.count() == 0) return _deliver();
   timer_.expires_after(reply_.delay);
   timer_.async_wait([self = shared_from_this()](ErrorCode error) {
-    if (!error) self->deliver();
+    if (!error) self->_deliver();
   });
 }
 
-void Connection::deliver() {
+void Connection::_deliver() {
   const bool endless = reply_.delivery == Delivery::Endless;
   const bool ordinary = reply_.delivery == Delivery::Ordinary || reply_.delivery == Delivery::Slow;
   const bool lies = reply_.delivery == Delivery::WrongLength;
@@ -112,62 +112,62 @@ void Connection::deliver() {
   begun_ = std::chrono::steady_clock::now();
   switch (reply_.delivery) {
     case Delivery::Ordinary:
-      return sendOrdinary();
+      return _sendOrdinary();
     case Delivery::Close:
-      return abandon();
+      return _abandon();
     case Delivery::CloseAfterHeaders:
-      return sendHeadThenClose(0);
+      return _sendHeadThenClose(0);
     case Delivery::Truncated:
-      return sendHeadThenClose(size / 2);
+      return _sendHeadThenClose(size / 2);
     case Delivery::Endless:
-      return write(0, &Connection::sendChunk);
+      return _write(0, &Connection::_sendChunk);
     case Delivery::Slow:
-      return write(0, &Connection::waitAndDrip);
+      return _write(0, &Connection::_waitAndDrip);
     case Delivery::NotHttp:
-      return sendGarbage();
+      return _sendGarbage();
     case Delivery::WrongLength:
-      return sendMisannounced();
+      return _sendMisannounced();
   }
 }
 
-void Connection::sendOrdinary() {
-  write(headOnly_ ? 0 : reply_.bodyText().size(), &Connection::didSend);
+void Connection::_sendOrdinary() {
+  _write(headOnly_ ? 0 : reply_.bodyText().size(), &Connection::_didSend);
 }
 
-void Connection::sendHeadThenClose(std::size_t bodyBytes) {
-  write(bodyBytes, &Connection::abandon);
+void Connection::_sendHeadThenClose(std::size_t bodyBytes) {
+  _write(bodyBytes, &Connection::_abandon);
 }
 
-void Connection::sendGarbage() {
+void Connection::_sendGarbage() {
   head_.clear();
-  write(reply_.bodyText().size(), &Connection::abandon);
+  _write(reply_.bodyText().size(), &Connection::_abandon);
 }
 
-void Connection::sendMisannounced() {
+void Connection::_sendMisannounced() {
   const std::size_t size = reply_.bodyText().size();
   const bool missing = reply_.announcedLength > size;
-  write(size, missing ? &Connection::stayStill : &Connection::abandon);
+  _write(size, missing ? &Connection::_stayStill : &Connection::_abandon);
 }
 
-void Connection::stayStill() {
+void Connection::_stayStill() {
   timer_.expires_after(kStillTime);
-  timer_.async_wait([self = shared_from_this()](ErrorCode) { self->abandon(); });
+  timer_.async_wait([self = shared_from_this()](ErrorCode) { self->_abandon(); });
 }
 
 // A short body goes out with the head in one piece; a longer one follows it without being copied.
-void Connection::write(std::size_t bodyBytes, void (Connection::*next)()) {
+void Connection::_write(std::size_t bodyBytes, void (Connection::*next)()) {
   if (bodyBytes <= kJoinedBody) {
     head_.append(reply_.bodyText(), 0, bodyBytes);
-    return writeBytes(asio::buffer(head_), [this, next] { (this->*next)(); });
+    return _writeBytes(asio::buffer(head_), [this, next] { (this->*next)(); });
   }
-  writeBytes(asio::buffer(head_), [this, bodyBytes, next] {
-    writeBytes(asio::buffer(reply_.bodyText().data(), bodyBytes),
-               [this, next] { (this->*next)(); });
+  _writeBytes(asio::buffer(head_), [this, bodyBytes, next] {
+    _writeBytes(asio::buffer(reply_.bodyText().data(), bodyBytes),
+                [this, next] { (this->*next)(); });
   });
 }
 
 // `next` is called while this object is kept alive.
-void Connection::writeBytes(asio::const_buffer bytes, std::function<void()> next) {
+void Connection::_writeBytes(asio::const_buffer bytes, std::function<void()> next) {
   beast::get_lowest_layer(stream_).expires_after(kIdleTime);
   asio::async_write(
       stream_, bytes,
@@ -176,44 +176,44 @@ void Connection::writeBytes(asio::const_buffer bytes, std::function<void()> next
       });
 }
 
-void Connection::waitAndDrip() {
-  if (headOnly_ || sent_ == reply_.bodyText().size()) return didSend();
+void Connection::_waitAndDrip() {
+  if (headOnly_ || sent_ == reply_.bodyText().size()) return _didSend();
   timer_.expires_after(reply_.interval);
   timer_.async_wait([self = shared_from_this()](ErrorCode error) {
-    if (!error) self->sendNextByte();
+    if (!error) self->_sendNextByte();
   });
 }
 
-void Connection::sendNextByte() {
-  writeBytes(asio::buffer(reply_.bodyText().data() + sent_++, 1), [this] { waitAndDrip(); });
+void Connection::_sendNextByte() {
+  _writeBytes(asio::buffer(reply_.bodyText().data() + sent_++, 1), [this] { _waitAndDrip(); });
 }
 
-void Connection::sendChunk() {
+void Connection::_sendChunk() {
   const bool enough =
       sent_ >= kEndlessBytes || std::chrono::steady_clock::now() - begun_ >= kEndlessTime;
-  if (enough) return abandon();
+  if (enough) return _abandon();
   sent_ += kChunkBytes;
   head_ = endlessChunk();
   timer_.expires_after(kChunkInterval);
   timer_.async_wait([self = shared_from_this()](ErrorCode error) {
-    if (!error) self->write(0, &Connection::sendChunk);
+    if (!error) self->_write(0, &Connection::_sendChunk);
   });
 }
 
-void Connection::didSend() {
+void Connection::_didSend() {
   reply_ = {};
   if (keepAlive_)
-    read();
+    _read();
   else
-    shutdown();
+    _shutdown();
 }
 
-void Connection::shutdown() {
+void Connection::_shutdown() {
   beast::get_lowest_layer(stream_).expires_after(kShutdownTime);
-  stream_.async_shutdown([self = shared_from_this()](ErrorCode) { self->abandon(); });
+  stream_.async_shutdown([self = shared_from_this()](ErrorCode) { self->_abandon(); });
 }
 
-void Connection::abandon() {
+void Connection::_abandon() {
   ErrorCode ignored;
   beast::get_lowest_layer(stream_).socket().shutdown(asio::ip::tcp::socket::shutdown_both, ignored);
   beast::get_lowest_layer(stream_).close();

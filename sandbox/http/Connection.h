@@ -37,27 +37,27 @@ class Connection final : public std::enable_shared_from_this<Connection> {
   using ErrorCode = boost::beast::error_code;
   using Parser = boost::beast::http::request_parser<boost::beast::http::string_body>;
 
-  void read();
-  void didRead(ErrorCode error);
-  void refuse(ErrorCode error);
-  Request takeRequest();
-  void send(Reply reply);
-  void deliver();
-  void sendOrdinary();
-  void sendHeadThenClose(std::size_t bodyBytes);
-  void sendGarbage();
-  void sendMisannounced();
-  void stayStill();
-  void sendNextByte();
-  void sendChunk();
-  void waitAndDrip();
+  void _read();
+  void _didRead(ErrorCode error);
+  void _refuse(ErrorCode error);
+  Request _takeRequest();
+  void _send(Reply reply);
+  void _deliver();
+  void _sendOrdinary();
+  void _sendHeadThenClose(std::size_t bodyBytes);
+  void _sendGarbage();
+  void _sendMisannounced();
+  void _stayStill();
+  void _sendNextByte();
+  void _sendChunk();
+  void _waitAndDrip();
   // Writes `head_` and the first `bodyBytes` of the body, then calls the operation if all went
   // well.
-  void write(std::size_t bodyBytes, void (Connection::*next)());
-  void writeBytes(boost::asio::const_buffer bytes, std::function<void()> next);
-  void didSend();
-  void shutdown();
-  void abandon();
+  void _write(std::size_t bodyBytes, void (Connection::*next)());
+  void _writeBytes(boost::asio::const_buffer bytes, std::function<void()> next);
+  void _didSend();
+  void _shutdown();
+  void _abandon();
 
   boost::beast::ssl_stream<boost::beast::tcp_stream> stream_;
   boost::asio::steady_timer timer_;

@@ -72,7 +72,7 @@ class Server::Core final : public std::enable_shared_from_this<Core> {
 
   void start(Handler handler, unsigned threads) {
     handler_ = std::move(handler);
-    accept();
+    _accept();
     for (unsigned count = 0; count < threads; ++count) threads_.emplace_back([this] { io_.run(); });
   }
 
@@ -83,14 +83,14 @@ class Server::Core final : public std::enable_shared_from_this<Core> {
   }
 
  private:
-  void accept() {
+  void _accept() {
     acceptor_.async_accept(
         asio::make_strand(io_), [this](error_code error, asio::ip::tcp::socket socket) {
           if (error == asio::error::operation_aborted) return;
           if (!error)
             std::make_shared<Connection>(std::move(socket), context_, handler_, ++connections_)
                 ->start();
-          accept();
+          _accept();
         });
   }
 

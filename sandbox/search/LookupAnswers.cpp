@@ -61,7 +61,7 @@ json::array LookupAnswers::lookup(std::string_view selected) const {
     if (!entry) continue;
     const double score = scoreOfWeight(match.weight);
     if (entry->kind == Kind::Word)
-      appendSenses(results, *entry, score);
+      _appendSenses(results, *entry, score);
     else
       results.push_back(writer_.result(*entry, score));
   }
@@ -72,7 +72,7 @@ json::array LookupAnswers::lookup(std::string_view selected) const {
   return sets;
 }
 
-void LookupAnswers::appendSenses(json::array& results, const Entry& entry, double score) const {
+void LookupAnswers::_appendSenses(json::array& results, const Entry& entry, double score) const {
   boost::system::error_code error;
   const json::value senses = json::parse(entry.facts, error);
   if (error || !senses.is_array()) return;

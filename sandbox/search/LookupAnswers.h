@@ -24,7 +24,7 @@ class LookupAnswers final {
   boost::json::array lookup(std::string_view selected) const;
 
  private:
-  void appendSenses(boost::json::array& results, const Entry& entry, double score) const;
+  void _appendSenses(boost::json::array& results, const Entry& entry, double score) const;
 
   SuggestionIndexPool& pool_;
   const ResultWriter& writer_;

@@ -34,7 +34,7 @@ json::object ResultWriter::result(const Entry& entry, double score) const {
           {"card_url", baseUrl_ + "/card?id=" + id}};
 }
 
-json::array ResultWriter::factRows(const Entry& entry) const {
+json::array ResultWriter::_factRows(const Entry& entry) const {
   boost::system::error_code error;
   json::value facts = json::parse(entry.facts, error);
   if (error || !facts.is_array()) return {};
@@ -52,7 +52,7 @@ json::object ResultWriter::card(const Entry& entry) const {
       {"glyph_text", entry.glyph},
       {"thumbnail", icon(entry)},
       {"more_glyphs", json::array{json::object{{"id", nameOfKind(entry.kind)}}}}};
-  json::object facts = {{"type", "facts"}, {"rows", factRows(entry)}};
+  json::object facts = {{"type", "facts"}, {"rows", _factRows(entry)}};
   return {{"type", "card"},
           {"id", std::string(nameOfKind(entry.kind)) + ":" + std::to_string(entry.id)},
           {"title", entry.title},

@@ -31,7 +31,7 @@ class ResultWriter final {
   std::string moreUrl(std::string_view query, std::size_t offset) const;
 
  private:
-  boost::json::array factRows(const Entry& entry) const;
+  boost::json::array _factRows(const Entry& entry) const;
 
   const std::string baseUrl_;
 };

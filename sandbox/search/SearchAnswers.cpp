@@ -29,15 +29,15 @@ json::array SearchAnswers::search(std::string_view typed) const {
   for (const Match& match : pickCompletions(ordered, kCompletions)) {
     const std::string completed = lower + match.text.substr(folded.size());
     const std::size_t limit = sets.empty() ? kResultsOfBest : kResultsOfOthers;
-    sets.push_back(completionSet(*index, completed, scoreOfWeight(match.weight), limit));
+    sets.push_back(_completionSet(*index, completed, scoreOfWeight(match.weight), limit));
   }
-  if (sets.empty()) sets = mentions(*index, lower);
+  if (sets.empty()) sets = _mentions(*index, lower);
   stampDuration(sets, start);
   return sets;
 }
 
-json::object SearchAnswers::completionSet(SuggestionIndex& index, const std::string& completed,
-                                          double score, std::size_t limit) const {
+json::object SearchAnswers::_completionSet(SuggestionIndex& index, const std::string& completed,
+                                           double score, std::size_t limit) const {
   auto set = resultSet(
       {completed, score, kSearchMaxAge},
       resultsOf(index, writer_, pickMixed(index.startingWith(foldQuery(completed)), limit)));
@@ -46,7 +46,7 @@ json::object SearchAnswers::completionSet(SuggestionIndex& index, const std::str
 }
 
 // Nothing begins like this: entries that mention the words, under the query as typed.
-json::array SearchAnswers::mentions(SuggestionIndex& index, std::string_view typed) const {
+json::array SearchAnswers::_mentions(SuggestionIndex& index, std::string_view typed) const {
   const std::string folded = foldQuery(typed);
   std::vector<Match> matches;
   if (folded.size() >= kShortestMention && typed.size() <= kLongestQuery) {

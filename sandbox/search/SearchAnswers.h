@@ -31,9 +31,9 @@ class SearchAnswers final {
   std::optional<boost::json::array> card(std::int64_t entry) const;
 
  private:
-  boost::json::object completionSet(SuggestionIndex& index, const std::string& completed,
-                                    double score, std::size_t limit) const;
-  boost::json::array mentions(SuggestionIndex& index, std::string_view typed) const;
+  boost::json::object _completionSet(SuggestionIndex& index, const std::string& completed,
+                                     double score, std::size_t limit) const;
+  boost::json::array _mentions(SuggestionIndex& index, std::string_view typed) const;
 
   SuggestionIndexPool& pool_;
   const ResultWriter& writer_;

@@ -111,7 +111,7 @@ std::optional<Entry> SuggestionIndex::entry(std::int64_t id) {
 std::optional<Failure> SuggestionIndexPool::open() {
   auto index = SuggestionIndex::open(path_);
   if (!index) return index.failure();
-  giveBack(std::move(*index));
+  _giveBack(std::move(*index));
   return std::nullopt;
 }
 
@@ -132,7 +132,7 @@ SuggestionIndexPool::Loan SuggestionIndexPool::borrow() {
   return Loan(*this, std::move(*index));
 }
 
-void SuggestionIndexPool::giveBack(std::unique_ptr<SuggestionIndex> index) {
+void SuggestionIndexPool::_giveBack(std::unique_ptr<SuggestionIndex> index) {
   const std::lock_guard lock(mutex_);
   idle_.push_back(std::move(index));
 }

@@ -60,7 +60,7 @@ class SuggestionIndexPool final {
         : pool_(pool), index_(std::move(index)) {}
     Loan(const Loan&) = delete;
     Loan& operator=(const Loan&) = delete;
-    ~Loan() { pool_.giveBack(std::move(index_)); }
+    ~Loan() { pool_._giveBack(std::move(index_)); }
     SuggestionIndex* operator->() const { return index_.get(); }
     SuggestionIndex& operator*() const { return *index_; }
 
@@ -76,7 +76,7 @@ class SuggestionIndexPool final {
   std::optional<Failure> open();
 
  private:
-  void giveBack(std::unique_ptr<SuggestionIndex> index);
+  void _giveBack(std::unique_ptr<SuggestionIndex> index);
 
   const std::filesystem::path path_;
   std::mutex mutex_;

@@ -48,7 +48,7 @@ void mergePatch(json::value& target, const json::value& patch) {
   }
 }
 
-json::object Bag::standard(const std::string& country) const {
+json::object Bag::_standard(const std::string& country) const {
   json::object bag = {
       {"version", kStandardVersion},
       {"enabled", true},
@@ -88,15 +88,15 @@ json::object Bag::standard(const std::string& country) const {
   return bag;
 }
 
-json::value Bag::document(const std::string& country) const {
-  json::value bag = standard(country);
+json::value Bag::_document(const std::string& country) const {
+  json::value bag = _standard(country);
   const std::lock_guard lock(mutex_);
   for (const auto& patch : patches_) mergePatch(bag, patch);
   return bag;
 }
 
 Reply Bag::answer(const Request& request) const {
-  json::value bag = document(lowerCased(request.itemOr("cc")));
+  json::value bag = _document(lowerCased(request.itemOr("cc")));
   if (bag.is_object()) {
     auto& version = bag.get_object()["version"];
     if (textOfVersion(version) == "echo")

@@ -34,8 +34,8 @@ class Bag final {
   std::optional<std::string> announcement() const;
 
  private:
-  boost::json::object standard(const std::string& country) const;
-  boost::json::value document(const std::string& country) const;
+  boost::json::object _standard(const std::string& country) const;
+  boost::json::value _document(const std::string& country) const;
 
   const std::string baseUrl_;
   mutable std::mutex mutex_;

@@ -40,17 +40,17 @@ Reply Control::answer(const Request& request) {
   const std::string& path = request.path;
   const bool get = request.method == "GET";
   const bool post = request.method == "POST";
-  if (path == "/control/requests" && get) return requests(request);
-  if (path == "/control/uploads" && get) return uploads(request);
-  if (path == "/control/misbehave" && post) return misbehave(request);
-  if (path == "/control/behave" && post) return behave();
-  if (path == "/control/bag" && post) return patchBag(request);
-  if (path == "/control/images" && post) return embedImages(request);
-  if (path == "/control/reset" && post) return reset();
+  if (path == "/control/requests" && get) return _requests(request);
+  if (path == "/control/uploads" && get) return _uploads(request);
+  if (path == "/control/misbehave" && post) return _misbehave(request);
+  if (path == "/control/behave" && post) return _behave();
+  if (path == "/control/bag" && post) return _patchBag(request);
+  if (path == "/control/images" && post) return _embedImages(request);
+  if (path == "/control/reset" && post) return _reset();
   return Reply::error(404, "no such control request");
 }
 
-Reply Control::requests(const Request& request) {
+Reply Control::_requests(const Request& request) {
   LogQuery query;
   query.since = numberItem(request, "since", 0);
   query.path = request.itemOr("path");
@@ -58,11 +58,11 @@ Reply Control::requests(const Request& request) {
   return listReply("requests", it_.log.read(query));
 }
 
-Reply Control::uploads(const Request& request) {
+Reply Control::_uploads(const Request& request) {
   return listReply("uploads", it_.uploads.list(numberItem(request, "since", 0)));
 }
 
-Reply Control::misbehave(const Request& request) {
+Reply Control::_misbehave(const Request& request) {
   const auto body = controlBody(request);
   if (!body) return Reply::error(400, "the body is not a JSON object");
   auto rule = parseMisbehaviour(*body);
@@ -71,27 +71,27 @@ Reply Control::misbehave(const Request& request) {
   return doneReply();
 }
 
-Reply Control::behave() {
+Reply Control::_behave() {
   it_.misbehaviours.clear();
   it_.embeddedImages.clear();
   return doneReply();
 }
 
-Reply Control::patchBag(const Request& request) {
+Reply Control::_patchBag(const Request& request) {
   const auto body = controlBody(request);
   if (!body) return Reply::error(400, "the body is not a JSON object");
   it_.bag.patch(*body);
   return doneReply();
 }
 
-Reply Control::embedImages(const Request& request) {
+Reply Control::_embedImages(const Request& request) {
   const auto body = controlBody(request);
   if (!body) return Reply::error(400, "the body is not a JSON object");
   if (const auto failure = it_.embeddedImages.set(*body)) return Reply::error(400, failure->reason);
   return doneReply();
 }
 
-Reply Control::reset() {
+Reply Control::_reset() {
   it_.misbehaviours.clear();
   it_.embeddedImages.clear();
   it_.bag.reset();

@@ -30,13 +30,13 @@ class Control final {
   Reply answer(const Request& request);
 
  private:
-  Reply requests(const Request& request);
-  Reply uploads(const Request& request);
-  Reply misbehave(const Request& request);
-  Reply behave();
-  Reply patchBag(const Request& request);
-  Reply embedImages(const Request& request);
-  Reply reset();
+  Reply _requests(const Request& request);
+  Reply _uploads(const Request& request);
+  Reply _misbehave(const Request& request);
+  Reply _behave();
+  Reply _patchBag(const Request& request);
+  Reply _embedImages(const Request& request);
+  Reply _reset();
 
   const Steered it_;
 };

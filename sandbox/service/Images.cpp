@@ -29,24 +29,24 @@ constexpr std::array<std::pair<const char*, std::uint32_t>, 7> kGlyphColours = {
 }  // namespace
 
 Images::Images(const std::filesystem::path& flags) {
-  addFlags(flags);
+  _addFlags(flags);
   for (const auto& [name, colour] : kGlyphColours) {
-    add("/image/glyph/" + std::string(name) + ".png", pngOfColour(colour, kGlyphSize), kGlyphTime);
+    _add("/image/glyph/" + std::string(name) + ".png", pngOfColour(colour, kGlyphSize), kGlyphTime);
   }
 }
 
-void Images::addFlags(const std::filesystem::path& folder) {
+void Images::_addFlags(const std::filesystem::path& folder) {
   std::error_code error;
   for (const auto& file : std::filesystem::directory_iterator(folder, error)) {
     struct stat status {};
     auto bytes = readFile(file.path());
     if (file.path().extension() != ".png" || !bytes || ::stat(file.path().c_str(), &status) != 0)
       continue;
-    add("/image/flags/" + file.path().filename().string(), std::move(*bytes), status.st_mtime);
+    _add("/image/flags/" + file.path().filename().string(), std::move(*bytes), status.st_mtime);
   }
 }
 
-void Images::add(const std::string& path, std::string bytes, std::time_t modified) {
+void Images::_add(const std::string& path, std::string bytes, std::time_t modified) {
   const std::string tag = entityTagOf(bytes);
   pictures_[path] = {std::make_shared<const std::string>(std::move(bytes)), tag, modified};
 }

@@ -28,8 +28,8 @@ class Images final {
     std::time_t modified = 0;
   };
 
-  void add(const std::string& path, std::string bytes, std::time_t modified);
-  void addFlags(const std::filesystem::path& folder);
+  void _add(const std::string& path, std::string bytes, std::time_t modified);
+  void _addFlags(const std::filesystem::path& folder);
 
   std::map<std::string, Picture, std::less<>> pictures_;
 };

@@ -70,13 +70,13 @@ Queries::Queries(SuggestionIndexPool& pool, std::string baseUrl)
 
 Reply Queries::search(const Request& request) {
   const int hour = hourNow();
-  Reply reply = cached(searchKey(request, hour), "private, no-cache",
-                       [&] { return searchSets(request, hour); });
+  Reply reply = _cached(searchKey(request, hour), "private, no-cache",
+                        [&] { return _searchSets(request, hour); });
   const std::size_t pad = sizeItem(request, "pad", kMostPad);
   return pad > 0 ? paddedReply(std::move(reply), pad) : reply;
 }
 
-json::array Queries::searchSets(const Request& request, int hour) const {
+json::array Queries::_searchSets(const Request& request, int hour) const {
   if (request.item("qtype") == "zkw") return popular_.zeroKeyword(request.itemOr("cc"), hour);
   if (request.item("ltype")) return lookup_.lookup(request.itemOr("q"));
   return search_.search(request.itemOr("q"));
@@ -85,8 +85,8 @@ json::array Queries::searchSets(const Request& request, int hour) const {
 Reply Queries::more(const Request& request) {
   const std::size_t offset = sizeItem(request, "offset", kFarthestOffset);
   const std::string query = request.itemOr("q");
-  return cached("m\n" + query + "\n" + std::to_string(offset), "private, max-age=60",
-                [&] { return search_.more(query, offset); });
+  return _cached("m\n" + query + "\n" + std::to_string(offset), "private, max-age=60",
+                 [&] { return search_.more(query, offset); });
 }
 
 Reply Queries::card(const Request& request) {
@@ -99,8 +99,8 @@ Reply Queries::card(const Request& request) {
   return reply;
 }
 
-Reply Queries::cached(const std::string& key, const std::string& cacheControl,
-                      const std::function<json::array()>& make) {
+Reply Queries::_cached(const std::string& key, const std::string& cacheControl,
+                       const std::function<json::array()>& make) {
   auto answer = key.size() <= kLongestKey ? cache_.find(key) : std::nullopt;
   if (!answer) {
     answer.emplace();

@@ -28,9 +28,9 @@ class Queries final {
   Reply card(const Request& request);
 
  private:
-  boost::json::array searchSets(const Request& request, int hour) const;
-  Reply cached(const std::string& key, const std::string& cacheControl,
-               const std::function<boost::json::array()>& make);
+  boost::json::array _searchSets(const Request& request, int hour) const;
+  Reply _cached(const std::string& key, const std::string& cacheControl,
+                const std::function<boost::json::array()>& make);
 
   const ResultWriter writer_;
   const SearchAnswers search_;

@@ -70,7 +70,7 @@ RequestLog::RequestLog(Database database) : database_(std::move(database)) {
       "SELECT id, time, method, path, items, target, headers, body_size, status, connection, "
       "tls_session_reused, "
       "microseconds FROM requests WHERE id > ?1 AND (?2 = '' OR path = ?2) ORDER BY id LIMIT ?3");
-  thread_ = std::thread([this] { run(); });
+  thread_ = std::thread([this] { _run(); });
 }
 
 RequestLog::~RequestLog() {
@@ -102,7 +102,7 @@ void RequestLog::flush() {
   written_.wait(lock, [&] { return writtenCount_ >= target; });
 }
 
-void RequestLog::run() {
+void RequestLog::_run() {
   std::unique_lock lock(mutex_);
   while (!stopping_ || !queue_.empty()) {
     wake_.wait(lock, [this] { return stopping_ || !queue_.empty(); });
@@ -111,24 +111,24 @@ void RequestLog::run() {
     std::vector<LoggedRequest> batch;
     batch.swap(queue_);
     lock.unlock();
-    write(batch);
+    _write(batch);
     lock.lock();
     writtenCount_ += batch.size();
     written_.notify_all();
   }
 }
 
-void RequestLog::write(const std::vector<LoggedRequest>& batch) {
+void RequestLog::_write(const std::vector<LoggedRequest>& batch) {
   if (batch.empty()) return;
   const std::lock_guard lock(databaseMutex_);
   database_.run("BEGIN");
-  for (const auto& request : batch) insert(request);
+  for (const auto& request : batch) _insert(request);
   if (database_.run("COMMIT") || reported_) return;
   reported_ = true;
   std::fprintf(stderr, "zelkor-sandbox: request log: %s\n", database_.error().c_str());
 }
 
-void RequestLog::insert(const LoggedRequest& request) {
+void RequestLog::_insert(const LoggedRequest& request) {
   insert_.bind(1, request.time)
       .bind(2, request.method)
       .bind(3, request.path)

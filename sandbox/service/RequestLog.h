@@ -67,9 +67,9 @@ class RequestLog final {
  private:
   explicit RequestLog(Database database);
 
-  void run();
-  void write(const std::vector<LoggedRequest>& batch);
-  void insert(const LoggedRequest& request);
+  void _run();
+  void _write(const std::vector<LoggedRequest>& batch);
+  void _insert(const LoggedRequest& request);
 
   // Of the writing thread, or of whoever holds `databaseMutex_`.
   std::mutex databaseMutex_;

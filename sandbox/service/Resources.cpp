@@ -120,7 +120,7 @@ std::string placeOf(std::string_view latitudeAndLongitude) {
   return place;
 }
 
-Reply Resources::redirectToHints(const Request& request, std::string_view period) const {
+Reply Resources::_redirectToHints(const Request& request, std::string_view period) const {
   const std::string place = placeOf(request.header("X-Quenta-FuzzedLatLong").value_or(""));
   Reply reply = Reply::empty(302);
   reply.headers.emplace_back("Location", baseUrl_ + "/resource/" + std::string(period) + "/" +
@@ -137,7 +137,7 @@ Reply Resources::answer(const Request& request) const {
   const std::string_view name = parts[2];
   const std::string tag = "\"" + std::string(resourceVersion()) + "\"";
   if (name.starts_with(kHintsPrefix) && (name.ends_with("_weekly") || name.ends_with("_monthly"))) {
-    return redirectToHints(request, name.substr(kHintsPrefix.size()));
+    return _redirectToHints(request, name.substr(kHintsPrefix.size()));
   }
   if (name == "installed_app_whitelist") return resourceFile(request, installedAppWhitelist(), tag);
   if (name == "crowdsourcing_whitelist")

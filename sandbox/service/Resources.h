@@ -28,7 +28,7 @@ class Resources final {
   Reply answer(const Request& request) const;
 
  private:
-  Reply redirectToHints(const Request& request, std::string_view period) const;
+  Reply _redirectToHints(const Request& request, std::string_view period) const;
 
   const std::string baseUrl_;
 };

@@ -67,19 +67,19 @@ Reply Service::handle(Request request) {
   if (request.path.starts_with("/control/")) return control_.answer(request);
   const double arrival = secondsSince1970();
   const auto start = std::chrono::steady_clock::now();
-  Reply reply = respond(request);
+  Reply reply = _respond(request);
   pack(request, reply);
   const auto elapsed = std::chrono::steady_clock::now() - start;
-  log(std::move(request), reply, arrival,
-      std::chrono::duration_cast<std::chrono::microseconds>(elapsed).count());
+  _log(std::move(request), reply, arrival,
+       std::chrono::duration_cast<std::chrono::microseconds>(elapsed).count());
   return reply;
 }
 
-Reply Service::respond(const Request& request) {
+Reply Service::_respond(const Request& request) {
   const auto misbehaviour = misbehaviours_.take(request.path);
-  if (!misbehaviour) return route(request);
+  if (!misbehaviour) return _route(request);
   auto replacement = replacementFor(*misbehaviour);
-  Reply reply = replacement ? std::move(*replacement) : route(request);
+  Reply reply = replacement ? std::move(*replacement) : _route(request);
   if (misbehaviour->kind == MisbehaviourKind::Pad) {
     reply.body = std::make_shared<const std::string>(padded(reply.bodyText(), misbehaviour->bytes));
     reply.gzipBody = nullptr;
@@ -89,19 +89,19 @@ Reply Service::respond(const Request& request) {
   return reply;
 }
 
-Reply Service::route(const Request& request) {
+Reply Service::_route(const Request& request) {
   const std::string& path = request.path;
   if (!needsNoKey(path) && request.item("key") != kRequestKey)
     return Reply::error(403, "no valid key");
   if (isUploadPath(path))
     return request.method == "POST" ? uploads_.accept(request) : methodNotAllowed("POST");
   if (!isReadMethod(request)) return methodNotAllowed("GET, HEAD");
-  return routeRead(request);
+  return _routeRead(request);
 }
 
-Reply Service::routeRead(const Request& request) {
+Reply Service::_routeRead(const Request& request) {
   const std::string& path = request.path;
-  if (isResultPath(path)) return results(request);
+  if (isResultPath(path)) return _results(request);
   if (path == "/bag") return bag_.answer(request);
   if (path.starts_with("/image/")) return images_.answer(request);
   if (path == "/warm") return Reply::empty(204);
@@ -109,15 +109,15 @@ Reply Service::routeRead(const Request& request) {
   return Reply::error(404, "no such path");
 }
 
-Reply Service::results(const Request& request) {
-  Reply reply = request.path == "/search" ? search(request)
+Reply Service::_results(const Request& request) {
+  Reply reply = request.path == "/search" ? _search(request)
                 : request.path == "/card" ? queries_.card(request)
                                           : queries_.more(request);
   embeddedImages_.addTo(reply);
   return reply;
 }
 
-Reply Service::search(const Request& request) {
+Reply Service::_search(const Request& request) {
   Reply reply = queries_.search(request);
   if (auto announcement = bag_.announcement()) {
     reply.headers.emplace_back("X-Quenta-ForceFetch", std::move(*announcement));
@@ -125,7 +125,7 @@ Reply Service::search(const Request& request) {
   return reply;
 }
 
-void Service::log(Request request, const Reply& reply, double arrival, std::int64_t microseconds) {
+void Service::_log(Request request, const Reply& reply, double arrival, std::int64_t microseconds) {
   log_.record({.time = arrival,
                .method = std::move(request.method),
                .path = std::move(request.path),

@@ -37,12 +37,12 @@ class Service final {
   Reply handle(Request request);
 
  private:
-  Reply respond(const Request& request);
-  Reply route(const Request& request);
-  Reply routeRead(const Request& request);
-  Reply results(const Request& request);
-  Reply search(const Request& request);
-  void log(Request request, const Reply& reply, double arrival, std::int64_t microseconds);
+  Reply _respond(const Request& request);
+  Reply _route(const Request& request);
+  Reply _routeRead(const Request& request);
+  Reply _results(const Request& request);
+  Reply _search(const Request& request);
+  void _log(Request request, const Reply& reply, double arrival, std::int64_t microseconds);
 
   RequestLog& log_;
   UploadStore& uploads_;

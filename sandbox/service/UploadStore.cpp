@@ -54,12 +54,12 @@ UploadStore::UploadStore(Database database) : database_(std::move(database)) {
 
 Reply UploadStore::accept(const Request& request) {
   const UploadVerdict verdict = checkUpload(request);
-  if (!store(request, verdict)) return Reply::error(500, "the upload could not be stored");
+  if (!_store(request, verdict)) return Reply::error(500, "the upload could not be stored");
   if (!verdict.problem.empty()) return Reply::error(400, verdict.problem);
   return Reply::json(200, R"({"status":"OK"})");
 }
 
-bool UploadStore::store(const Request& request, const UploadVerdict& verdict) {
+bool UploadStore::_store(const Request& request, const UploadVerdict& verdict) {
   const std::lock_guard lock(mutex_);
   const std::string transfer(request.header("X-Quenta-Transfer-Identifier").value_or(""));
   known_.bind(1, transfer).bind(2, request.path);

@@ -34,7 +34,7 @@ class UploadStore final {
 
  private:
   explicit UploadStore(Database database);
-  bool store(const Request& request, const UploadVerdict& verdict);
+  bool _store(const Request& request, const UploadVerdict& verdict);
 
   std::mutex mutex_;
   Database database_;

@@ -67,8 +67,7 @@ class ClientConnection final : public ipc::CallHandler,
   // ended.
   void flushSessionInvalidation(std::function<void(bool flushed)> callback);
 
- private:
-  // The members of the interface.
+  // The members of the interface, one for each of its rows.
   void configure(const ipc::Call& call);
   void bag(const ipc::Call& call);
   void request(const ipc::Call& call);
@@ -78,6 +77,7 @@ class ClientConnection final : public ipc::CallHandler,
   void feedback(const ipc::Call& call);
   void listSessions(const ipc::Call& call);
 
+ private:
   // Whether the call stands behind one that waits for a bag, or may wait for one itself. Null: it
   // is of another interface.
   bool _mayHaveToWait(const Member<ClientConnection>* member) const;

@@ -51,7 +51,7 @@ void ClientStateManager::start() {
   configuration.delegateBoundsConnections = true;
   listener_ = assembly_.platform().interprocess.makeAnonymousListener(std::move(configuration),
                                                                       endpointListener_);
-  stateCacheQueue_->sync([this] { loadState(); });
+  stateCacheQueue_->sync([this] { _loadState(); });
 }
 
 const std::string& ClientStateManager::endpoint() const {
@@ -123,7 +123,7 @@ std::shared_ptr<ClientState> ClientStateManager::configuredState(const std::stri
   return state;
 }
 
-void ClientStateManager::loadState() {
+void ClientStateManager::_loadState() {
   stateCacheQueue_->assertCurrent();
   if (!persistSessions_) return;
   for (const auto& entry : listSetting(assembly_.userDefaults(), kSessionsKey)) {

@@ -79,7 +79,7 @@ class ClientStateManager final : public std::enable_shared_from_this<ClientState
                                       const std::string& holder);
   // False, after a log line, for an empty identifier.
   bool _isUsable(const std::string& identifier) const;
-  void loadState();
+  void _loadState();
   void _save();
   std::vector<ipc::StringMap> _sessions() const;
 

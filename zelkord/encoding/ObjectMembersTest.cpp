@@ -35,30 +35,30 @@ class RandomJson {
   std::string object(int depth) {
     std::string text = "{";
     for (auto left = random_() % 5; left > 0; --left) {
-      text += space() + string() + space() + ":" + value(depth) + (left > 1 ? "," : "");
+      text += _space() + _string() + _space() + ":" + _value(depth) + (left > 1 ? "," : "");
     }
-    return text + space() + "}";
+    return text + _space() + "}";
   }
 
  private:
   template <std::size_t Count>
-  std::string oneOf(const char* const (&texts)[Count]) {
+  std::string _oneOf(const char* const (&texts)[Count]) {
     return texts[random_() % Count];
   }
-  std::string space() { return oneOf({"", "", " ", "\n\t"}); }
-  std::string string() {
-    return oneOf({R"("type")", R"("t\u0079pe")", R"("timestamp")", R"("\\")", R"("\"")", R"(",")",
-                  R"("}")", R"("]{:")", R"("type\\")", R"("\\\"type")", R"("")"});
+  std::string _space() { return _oneOf({"", "", " ", "\n\t"}); }
+  std::string _string() {
+    return _oneOf({R"("type")", R"("t\u0079pe")", R"("timestamp")", R"("\\")", R"("\"")", R"(",")",
+                   R"("}")", R"("]{:")", R"("type\\")", R"("\\\"type")", R"("")"});
   }
-  std::string value(int depth) {
-    if (depth == 0) return space() + oneOf({"1e3", "null", "-0.5"});
+  std::string _value(int depth) {
+    if (depth == 0) return _space() + _oneOf({"1e3", "null", "-0.5"});
     switch (random_() % 3) {
       case 0:
-        return string() + space();
+        return _string() + _space();
       case 1:
-        return "[" + value(depth - 1) + "," + value(depth - 1) + "]";
+        return "[" + _value(depth - 1) + "," + _value(depth - 1) + "]";
       default:
-        return object(depth - 1) + space();
+        return object(depth - 1) + _space();
     }
   }
 

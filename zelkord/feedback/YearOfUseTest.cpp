@@ -61,56 +61,56 @@ class Model {
 
   // `dayOfMonth` is the one of the wall clock.
   void use(const Use& use, unsigned dayOfMonth) {
-    if (isOpen_ && use.at >= openedAt_ + 900) close("max session time passed");
-    if (use.at - identifierAt_ >= 900) renew(use.at);
+    if (isOpen_ && use.at >= openedAt_ + 900) _close("max session time passed");
+    if (use.at - identifierAt_ >= 900) _renew(use.at);
     if (isOpen_ && sessionIdentifier_ != identifier_) {
-      close("guid changed");
+      _close("guid changed");
     } else if (isOpen_ && use.at >= openedAt_ + 600) {
       if (use.isEngagement) {
-        add(use, dayOfMonth);
-        close("engagement received");
-        renew(use.at);
+        _add(use, dayOfMonth);
+        _close("engagement received");
+        _renew(use.at);
         lastAt_ = use.at;
         return;
       }
       if (use.at - lastAt_ >= 180) {
-        close("session idle");
-        renew(use.at);
+        _close("session idle");
+        _renew(use.at);
       }
     }
-    if (!isOpen_) open(use.at);
-    add(use, dayOfMonth);
+    if (!isOpen_) _open(use.at);
+    _add(use, dayOfMonth);
     lastAt_ = use.at;
   }
   void finish() {
-    if (isOpen_) close("max session time passed");
+    if (isOpen_) _close("max session time passed");
   }
 
  private:
-  void renew(double now) {
+  void _renew(double now) {
     ++identifier_;
     identifierAt_ = now;
   }
-  void open(double now) {
+  void _open(double now) {
     isOpen_ = true;
     openedAt_ = now;
     sessionIdentifier_ = identifier_;
     members_.clear();
   }
-  void add(const Use& use, unsigned dayOfMonth) {
+  void _add(const Use& use, unsigned dayOfMonth) {
     const std::string agent = use.isBrowser ? "Brelin/1" : "Lanthe/9";
     const auto [member, isNew] = members_.try_emplace(agent, sessions.size());
-    if (isNew) sessions.push_back({agent, "", previous_, isFirstUse(agent, dayOfMonth), 0});
+    if (isNew) sessions.push_back({agent, "", previous_, _isFirstUse(agent, dayOfMonth), 0});
     ++sessions[member->second].records;
   }
-  bool isFirstUse(const std::string& agent, unsigned dayOfMonth) {
+  bool _isFirstUse(const std::string& agent, unsigned dayOfMonth) {
     const auto [day, isNew] = days_.try_emplace(agent, dayOfMonth);
     if (!isNew && day->second == dayOfMonth) return false;
     day->second = dayOfMonth;
     ++activeDays[agent];
     return true;
   }
-  void close(const std::string& reason) {
+  void _close(const std::string& reason) {
     for (const auto& member : members_) sessions[member.second].end = reason;
     previous_ = reason;
     isOpen_ = false;

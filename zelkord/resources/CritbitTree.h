@@ -17,7 +17,7 @@ class CritbitTree final {
  public:
   using Pointer = boost::intrusive_ptr<Object>;
 
-  CritbitTree() { tree_.releaseValue = valueRelease; }
+  CritbitTree() { tree_.releaseValue = _valueRelease; }
   CritbitTree(const CritbitTree&) = delete;
   CritbitTree& operator=(const CritbitTree&) = delete;
   ~CritbitTree() { critbit_clear(tree_); }
@@ -27,7 +27,7 @@ class CritbitTree final {
   bool setObject(const Pointer& object, std::string_view key) {
     // The reference that the tree is going to hold exists before the old value's last one may go.
     intrusive_ptr_add_ref(object.get());
-    if (critbit_insert(tree_, key, erased(object.get()), true) != CritbitInsertion::NothingDone)
+    if (critbit_insert(tree_, key, _erased(object.get()), true) != CritbitInsertion::NothingDone)
       return true;
     intrusive_ptr_release(object.get());
     return false;
@@ -58,10 +58,10 @@ class CritbitTree final {
   }
 
  private:
-  static void* erased(Object* object) {
+  static void* _erased(Object* object) {
     return const_cast<void*>(static_cast<const void*>(object));
   }
-  static void valueRelease(void* value) { intrusive_ptr_release(static_cast<Object*>(value)); }
+  static void _valueRelease(void* value) { intrusive_ptr_release(static_cast<Object*>(value)); }
 
   CritbitRecord tree_;
 };

@@ -2,7 +2,7 @@
 
 namespace zelkord {
 
-std::optional<sqlite::Failure> CounterDatabase::open() {
+std::optional<sqlite::Failure> CounterDatabase::_open() {
   if (database_) return std::nullopt;
   sqlite::Failure failure;
   auto database = sqlite::Database::open(path_, &failure);
@@ -16,7 +16,7 @@ std::optional<sqlite::Failure> CounterDatabase::open() {
 }
 
 // Keys that are too long stay in the file: their text may be of any size.
-std::optional<sqlite::Failure> CounterDatabase::readInto(BoundedCounters& counters) {
+std::optional<sqlite::Failure> CounterDatabase::_readInto(BoundedCounters& counters) {
   auto rows = database_->prepare(
       "SELECT iif(length(CAST(key AS BLOB)) <= ?1, key, ?2), value FROM counters");
   rows.bind(1, static_cast<std::int64_t>(BoundedCounters::kMaximumKeySize))
@@ -25,31 +25,31 @@ std::optional<sqlite::Failure> CounterDatabase::readInto(BoundedCounters& counte
   return rows.failure();
 }
 
-std::optional<sqlite::Failure> CounterDatabase::cutDownTo(const BoundedCounters& counters) {
+std::optional<sqlite::Failure> CounterDatabase::_cutDownTo(const BoundedCounters& counters) {
   if (rows_ == static_cast<std::int64_t>(counters.values().size())) return std::nullopt;
   log_.error("{} has {} counters; it is cut down to {}", path_, rows_, counters.values().size());
   auto failure = database_->transaction([&] {
     auto problem = database_->execute("DELETE FROM counters");
-    return problem ? problem : put(counters.values());
+    return problem ? problem : _put(counters.values());
   });
   return failure ? failure : database_->execute("VACUUM");
 }
 
 BoundedCounters CounterDatabase::load() {
   BoundedCounters counters;
-  auto failure = open();
-  if (!failure) failure = readInto(counters);
+  auto failure = _open();
+  if (!failure) failure = _readInto(counters);
   if (!failure) {
-    if (const auto problem = cutDownTo(counters)) {
+    if (const auto problem = _cutDownTo(counters)) {
       log_.error("cannot cut {} down: {}", path_, problem->text);
     }
     return counters;
   }
-  if (!replaceDamaged(*failure)) log_.error("cannot read {}: {}", path_, failure->text);
+  if (!_replaceDamaged(*failure)) log_.error("cannot read {}: {}", path_, failure->text);
   return {};
 }
 
-bool CounterDatabase::replaceDamaged(const sqlite::Failure& failure) {
+bool CounterDatabase::_replaceDamaged(const sqlite::Failure& failure) {
   if (!failure.isDamage() && !(database_ && failure.isMisfit())) return false;
   database_.reset();
   const auto aside = sqlite::setAside(path_);
@@ -59,7 +59,7 @@ bool CounterDatabase::replaceDamaged(const sqlite::Failure& failure) {
 }
 
 template <typename AnyValues>
-std::optional<sqlite::Failure> CounterDatabase::put(const AnyValues& values) {
+std::optional<sqlite::Failure> CounterDatabase::_put(const AnyValues& values) {
   auto put = database_->prepare("INSERT OR REPLACE INTO counters VALUES(?1, ?2)");
   for (const auto& [key, value] : values) {
     if (auto failure = put.bind(1, std::string_view(key)).bind(2, value).run()) return failure;
@@ -67,14 +67,14 @@ std::optional<sqlite::Failure> CounterDatabase::put(const AnyValues& values) {
   return std::nullopt;
 }
 
-std::optional<sqlite::Failure> CounterDatabase::write(const Values& values) {
-  if (auto failure = open()) return failure;
-  return database_->transaction([&] { return put(values); });
+std::optional<sqlite::Failure> CounterDatabase::_write(const Values& values) {
+  if (auto failure = _open()) return failure;
+  return database_->transaction([&] { return _put(values); });
 }
 
 std::optional<sqlite::Failure> CounterDatabase::store(const Values& values) {
-  auto failure = write(values);
-  if (failure && replaceDamaged(*failure)) failure = write(values);
+  auto failure = _write(values);
+  if (failure && _replaceDamaged(*failure)) failure = _write(values);
   if (failure) database_.reset();
   return failure;
 }

@@ -27,13 +27,13 @@ class CounterDatabase final {
   std::optional<sqlite::Failure> store(const Values& values);
 
  private:
-  std::optional<sqlite::Failure> open();
-  std::optional<sqlite::Failure> readInto(BoundedCounters& counters);
-  std::optional<sqlite::Failure> cutDownTo(const BoundedCounters& counters);
-  std::optional<sqlite::Failure> write(const Values& values);
+  std::optional<sqlite::Failure> _open();
+  std::optional<sqlite::Failure> _readInto(BoundedCounters& counters);
+  std::optional<sqlite::Failure> _cutDownTo(const BoundedCounters& counters);
+  std::optional<sqlite::Failure> _write(const Values& values);
   template <typename AnyValues>
-  std::optional<sqlite::Failure> put(const AnyValues& values);
-  bool replaceDamaged(const sqlite::Failure& failure);
+  std::optional<sqlite::Failure> _put(const AnyValues& values);
+  bool _replaceDamaged(const sqlite::Failure& failure);
 
   const std::string path_;
   const Logger log_;

@@ -28,13 +28,13 @@ LinuxCounters::~LinuxCounters() { save(); }
 void LinuxCounters::add(std::string_view key, std::int64_t amount) {
   const MutexLock lock(mutex_);
   values_.add(key, amount);
-  markChanged();
+  _markChanged();
 }
 
 void LinuxCounters::set(std::string_view key, std::int64_t value) {
   const MutexLock lock(mutex_);
   values_.set(key, value);
-  markChanged();
+  _markChanged();
 }
 
 std::map<std::string, std::int64_t> LinuxCounters::all() const {
@@ -42,28 +42,28 @@ std::map<std::string, std::int64_t> LinuxCounters::all() const {
   return {values_.values().begin(), values_.values().end()};
 }
 
-void LinuxCounters::markChanged() {
+void LinuxCounters::_markChanged() {
   if (std::exchange(changed_, true)) return;
-  timer_ = queue_->after(kCounterWriteDelay, [this] { write(); });
+  timer_ = queue_->after(kCounterWriteDelay, [this] { _write(); });
 }
 
 void LinuxCounters::save() {
-  queue_->sync([this] { write(); });
+  queue_->sync([this] { _write(); });
 }
 
-void LinuxCounters::write() {
+void LinuxCounters::_write() {
   queue_->assertCurrent();
   {
     const MutexLock lock(mutex_);
     timer_.reset();
     if (!std::exchange(changed_, false)) return;
   }
-  if (writeFiles(all())) return;
+  if (_writeFiles(all())) return;
   const MutexLock lock(mutex_);
-  markChanged();
+  _markChanged();
 }
 
-bool LinuxCounters::writeFiles(const std::map<std::string, std::int64_t>& values) {
+bool LinuxCounters::_writeFiles(const std::map<std::string, std::int64_t>& values) {
   queue_->assertCurrent();
   const auto failure = database_.store(values);
   auto error = files_.createDirectory(files_.directories().runtime);
@@ -71,11 +71,11 @@ bool LinuxCounters::writeFiles(const std::map<std::string, std::int64_t>& values
     error = files_.writeAtomically(files_.directories().runtime + "/metrics.prom",
                                    openMetricsText(values), 0600);
   }
-  note(failure ? failure->text : error ? error->description() : std::string());
+  _note(failure ? failure->text : error ? error->description() : std::string());
   return !failure && !error;
 }
 
-void LinuxCounters::note(const std::string& problem) {
+void LinuxCounters::_note(const std::string& problem) {
   queue_->assertCurrent();
   if (!problem.empty() && problem != lastProblem_)
     log_.error("counters are not saved: {}", problem);

@@ -36,10 +36,10 @@ class LinuxCounters final : public Counters {
   void save();
 
  private:
-  void markChanged() ZK_REQUIRES(mutex_);
-  void write();
-  bool writeFiles(const std::map<std::string, std::int64_t>& values);
-  void note(const std::string& problem);
+  void _markChanged() ZK_REQUIRES(mutex_);
+  void _write();
+  bool _writeFiles(const std::map<std::string, std::int64_t>& values);
+  void _note(const std::string& problem);
 
   // Fixed after construction.
   FileManager& files_;

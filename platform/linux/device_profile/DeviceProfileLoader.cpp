@@ -24,7 +24,7 @@ DeviceProfileLoader::DeviceProfileLoader(std::vector<std::string> candidates,
   for (const auto& path : candidates_) {
     if (watcher) watches_.push_back(watcher->watch(path, [this] { noteChange(); }));
   }
-  queue_->sync([this] { reload(); });
+  queue_->sync([this] { _reload(); });
 }
 
 DeviceProfileLoader::~DeviceProfileLoader() {
@@ -36,23 +36,23 @@ DeviceProfileLoader::~DeviceProfileLoader() {
 }
 
 void DeviceProfileLoader::noteChange() {
-  queue_->async([this] { arm(); });
+  queue_->async([this] { _arm(); });
 }
 
-void DeviceProfileLoader::arm() {
+void DeviceProfileLoader::_arm() {
   queue_->assertCurrent();
   if (timer_) return;
   timer_ = queue_->after(
-      kProfileSettleTime, [this] { reload(); }, TimeBase::Real);
+      kProfileSettleTime, [this] { _reload(); }, TimeBase::Real);
 }
 
-void DeviceProfileLoader::reload() {
+void DeviceProfileLoader::_reload() {
   queue_->assertCurrent();
   timer_.reset();
-  store_.replace(read());
+  store_.replace(_read());
 }
 
-DeviceProfile DeviceProfileLoader::read() {
+DeviceProfile DeviceProfileLoader::_read() {
   for (const auto& path : candidates_) {
     Error error;
     const auto text = files_.read(path, kMaximumProfile, &error);
@@ -64,14 +64,14 @@ DeviceProfile DeviceProfileLoader::read() {
     } else {
       problems.push_back("not usable: " + error.reason().value_or("unreadable"));
     }
-    complain(path, problems);
+    _complain(path, problems);
     return profile;
   }
   return {};
 }
 
-void DeviceProfileLoader::complain(const std::string& path,
-                                   const std::vector<std::string>& problems) {
+void DeviceProfileLoader::_complain(const std::string& path,
+                                    const std::vector<std::string>& problems) {
   queue_->assertCurrent();
   for (const auto& problem : problems) {
     if (complaints_.size() >= kMaximumComplaints) return;

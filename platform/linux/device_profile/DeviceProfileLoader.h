@@ -34,10 +34,10 @@ class DeviceProfileLoader final {
   void noteChange();
 
  private:
-  void arm();
-  void reload();
-  DeviceProfile read() ZK_REQUIRES(queue_);
-  void complain(const std::string& path, const std::vector<std::string>& problems);
+  void _arm();
+  void _reload();
+  DeviceProfile _read() ZK_REQUIRES(queue_);
+  void _complain(const std::string& path, const std::vector<std::string>& problems);
 
   // Fixed after construction.
   const std::vector<std::string> candidates_;

@@ -28,16 +28,16 @@ std::vector<std::string> readTextArrayProperty(sd_bus_message* message) {
 
 struct HostLocaleWatcher::BusCallbacks {
   static int timeZoneChanged(sd_bus_message*, void* self, sd_bus_error*) {
-    static_cast<HostLocaleWatcher*>(self)->noteChange();
+    static_cast<HostLocaleWatcher*>(self)->_noteChange();
     return 0;
   }
   static int localeChanged(sd_bus_message* signal, void* self, sd_bus_error*) {
-    static_cast<HostLocaleWatcher*>(self)->readLocale(::sd_bus_message_get_bus(signal));
+    static_cast<HostLocaleWatcher*>(self)->_readLocale(::sd_bus_message_get_bus(signal));
     return 0;
   }
   static int localeRead(sd_bus_message* reply, void* self, sd_bus_error*) {
     if (::sd_bus_message_is_method_error(reply, nullptr)) return 0;
-    static_cast<HostLocaleWatcher*>(self)->localeArrived(
+    static_cast<HostLocaleWatcher*>(self)->_localeArrived(
         localeVariables(readTextArrayProperty(reply)));
     return 0;
   }
@@ -61,10 +61,10 @@ HostLocaleWatcher::HostLocaleWatcher(HostLocaleSources sources,
       changed_(std::move(changed)),
       log_(log, ""),
       queue_(queues.makeSerialQueue("com.quenta.zelkord.hostlocale")),
-      bus_(host, {[this](sd_bus* bus) { connected(bus); },
-                  [this](const std::string& problem) { away(problem); }}) {
+      bus_(host, {[this](sd_bus* bus) { _connected(bus); },
+                  [this](const std::string& problem) { _away(problem); }}) {
   for (const auto& path : {sources_.localtimePath, sources_.timezonePath}) {
-    watches_.push_back(watcher.watch(path, [this] { noteChange(); }));
+    watches_.push_back(watcher.watch(path, [this] { _noteChange(); }));
   }
   bus_.start();
 }
@@ -78,7 +78,7 @@ HostLocaleWatcher::~HostLocaleWatcher() {
   });
 }
 
-void HostLocaleWatcher::connected(sd_bus* bus) {
+void HostLocaleWatcher::_connected(sd_bus* bus) {
   const auto match = [this, bus](const char* path, sd_bus_message_handler_t handler) {
     ::sd_bus_match_signal_async(bus, nullptr, nullptr, path, "org.freedesktop.DBus.Properties",
                                 "PropertiesChanged", handler, nullptr, this);
@@ -87,38 +87,38 @@ void HostLocaleWatcher::connected(sd_bus* bus) {
   match("/org/freedesktop/timedate1", BusCallbacks::timeZoneChanged);
   // At first the environment counts, whatever locale1 would say; what it says while the bus is away
   // is not heard.
-  if (std::exchange(wasConnected_, true)) readLocale(bus);
+  if (std::exchange(wasConnected_, true)) _readLocale(bus);
 }
 
-void HostLocaleWatcher::away(const std::string& problem) {
+void HostLocaleWatcher::_away(const std::string& problem) {
   if (std::exchange(complained_, true)) return;
   log_.notice("no system bus: changes of the system's locale are not seen ({})", problem);
 }
 
-void HostLocaleWatcher::readLocale(sd_bus* bus) {
+void HostLocaleWatcher::_readLocale(sd_bus* bus) {
   ::sd_bus_call_method_async(bus, nullptr, "org.freedesktop.locale1", "/org/freedesktop/locale1",
                              "org.freedesktop.DBus.Properties", "Get", BusCallbacks::localeRead,
                              this, "ss", "org.freedesktop.locale1", "Locale");
 }
 
-void HostLocaleWatcher::localeArrived(std::map<std::string, std::string> variables) {
+void HostLocaleWatcher::_localeArrived(std::map<std::string, std::string> variables) {
   queue_->async([this, variables = std::move(variables)] {
     queue_->assertCurrent();
     variables_ = variables;
   });
-  noteChange();
+  _noteChange();
 }
 
-void HostLocaleWatcher::noteChange() {
+void HostLocaleWatcher::_noteChange() {
   queue_->async([this] {
     queue_->assertCurrent();
     if (timer_) return;
     timer_ = queue_->after(
-        kHostLocaleSettleTime, [this] { reread(); }, TimeBase::Real);
+        kHostLocaleSettleTime, [this] { _reread(); }, TimeBase::Real);
   });
 }
 
-void HostLocaleWatcher::reread() {
+void HostLocaleWatcher::_reread() {
   queue_->assertCurrent();
   timer_.reset();
   auto sources = sources_;

@@ -29,12 +29,12 @@ class HostLocaleWatcher final {
   ~HostLocaleWatcher();
 
  private:
-  void connected(sd_bus* bus);
-  void away(const std::string& problem);
-  void readLocale(sd_bus* bus);
-  void localeArrived(std::map<std::string, std::string> variables);
-  void noteChange();
-  void reread();
+  void _connected(sd_bus* bus);
+  void _away(const std::string& problem);
+  void _readLocale(sd_bus* bus);
+  void _localeArrived(std::map<std::string, std::string> variables);
+  void _noteChange();
+  void _reread();
 
   // Fixed after construction.
   const HostLocaleSources sources_;

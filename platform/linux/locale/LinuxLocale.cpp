@@ -22,8 +22,8 @@ LinuxLocale::LinuxLocale(DeviceProfileStore& store, HostLocale host, Notificatio
     state_.host = std::move(host);
   }
   profileChanges_ =
-      store.observe([this](const DeviceProfile&, const DeviceProfile&) { refresh(); });
-  refresh();
+      store.observe([this](const DeviceProfile&, const DeviceProfile&) { _refresh(); });
+  _refresh();
 }
 
 LocaleSnapshot LinuxLocale::current() const {
@@ -41,7 +41,7 @@ HostLocale LinuxLocale::host() const {
   return state_.host;
 }
 
-void LinuxLocale::refresh() {
+void LinuxLocale::_refresh() {
   const MutexLock refreshing(refreshMutex_);
   const auto profile = store_.current();
   const auto now = host();
@@ -60,7 +60,7 @@ void LinuxLocale::hostChanged(HostLocale host) {
     const MutexLock lock(mutex_);
     state_.host = host;
   }
-  refresh();
+  _refresh();
   const bool countryChanged = store_.replaceHostLocale(host.locale);
   const auto profile = store_.current();
   // All of it counts before the first of these is posted.

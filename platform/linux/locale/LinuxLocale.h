@@ -35,7 +35,7 @@ class LinuxLocale final : public LocaleService {
     std::string timeZone;
   };
 
-  void refresh();
+  void _refresh();
 
   NotificationCenter& center_;
   DeviceProfileStore& store_;

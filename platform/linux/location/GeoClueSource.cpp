@@ -60,23 +60,23 @@ std::optional<LocationFix> fixOf(const std::map<std::string, double>& values) {
 
 struct GeoClueSource::Callbacks {
   static int client(sd_bus_message* reply, void* self, sd_bus_error*) {
-    static_cast<GeoClueSource*>(self)->gotClient(reply);
+    static_cast<GeoClueSource*>(self)->_gotClient(reply);
     return 0;
   }
   static int done(sd_bus_message* reply, void* self, sd_bus_error*) {
-    static_cast<GeoClueSource*>(self)->failed(reply);
+    static_cast<GeoClueSource*>(self)->_failed(reply);
     return 0;
   }
   static int updated(sd_bus_message* signal, void* self, sd_bus_error*) {
-    static_cast<GeoClueSource*>(self)->locationUpdated(signal);
+    static_cast<GeoClueSource*>(self)->_locationUpdated(signal);
     return 0;
   }
   static int location(sd_bus_message* reply, void* self, sd_bus_error*) {
-    static_cast<GeoClueSource*>(self)->gotLocation(reply);
+    static_cast<GeoClueSource*>(self)->_gotLocation(reply);
     return 0;
   }
   static int owner(sd_bus_message* signal, void* self, sd_bus_error*) {
-    static_cast<GeoClueSource*>(self)->ownerChanged(signal);
+    static_cast<GeoClueSource*>(self)->_ownerChanged(signal);
     return 0;
   }
 };
@@ -98,7 +98,7 @@ std::unique_ptr<LocationSource> GeoClueSource::make(
   }
   std::unique_ptr<GeoClueSource> source(
       new GeoClueSource(std::move(bus), options, std::move(events), clock, std::move(missing)));
-  source->begin();
+  source->_begin();
   return source;
 }
 
@@ -114,16 +114,16 @@ GeoClueSource::GeoClueSource(BusConnection bus, const LocationOptions& options,
 // GeoClue forgets the client with its connection.
 GeoClueSource::~GeoClueSource() = default;
 
-void GeoClueSource::begin() {
+void GeoClueSource::_begin() {
   ::sd_bus_add_match_async(thread_.bus(), nullptr, kGeoClueOwnerChanged, Callbacks::owner, nullptr,
                            this);
   ::sd_bus_call_method_async(thread_.bus(), nullptr, kGeoClue, "/org/freedesktop/GeoClue2/Manager",
                              "org.freedesktop.GeoClue2.Manager", "GetClient", Callbacks::client,
                              this, "");
-  thread_.start([this] { endMissing("the system bus has gone"); });
+  thread_.start([this] { _endMissing("the system bus has gone"); });
 }
 
-bool GeoClueSource::failed(sd_bus_message* reply) {
+bool GeoClueSource::_failed(sd_bus_message* reply) {
   const auto* error = ::sd_bus_message_get_error(reply);
   if (!error) return false;
   const std::string name = error->name ? error->name : "";
@@ -132,28 +132,28 @@ bool GeoClueSource::failed(sd_bus_message* reply) {
     events_.failure(posixError(EACCES));
     events_.ended();
   } else {
-    endMissing(text);
+    _endMissing(text);
   }
   return true;
 }
 
-void GeoClueSource::endMissing(const std::string& problem) {
+void GeoClueSource::_endMissing(const std::string& problem) {
   missing_(problem);
   events_.ended();
 }
 
 // Our client went with its owner.
-void GeoClueSource::ownerChanged(sd_bus_message* signal) {
+void GeoClueSource::_ownerChanged(sd_bus_message* signal) {
   const char* name = nullptr;
   const char* before = nullptr;
   if (::sd_bus_message_read(signal, "ss", &name, &before) >= 0 && *before) {
-    endMissing("GeoClue has left the bus");
+    _endMissing("GeoClue has left the bus");
   }
 }
 
-void GeoClueSource::gotClient(sd_bus_message* reply) {
+void GeoClueSource::_gotClient(sd_bus_message* reply) {
   const char* path = nullptr;
-  if (failed(reply) || ::sd_bus_message_read(reply, "o", &path) < 0) return;
+  if (_failed(reply) || ::sd_bus_message_read(reply, "o", &path) < 0) return;
   client_ = path;
   auto* bus = thread_.bus();
   // In this order on one connection: GeoClue sees the settings before the start.
@@ -169,7 +169,7 @@ void GeoClueSource::gotClient(sd_bus_message* reply) {
                              Callbacks::done, this, "");
 }
 
-void GeoClueSource::locationUpdated(sd_bus_message* signal) {
+void GeoClueSource::_locationUpdated(sd_bus_message* signal) {
   const char* before = nullptr;
   const char* now = nullptr;
   if (::sd_bus_message_read(signal, "oo", &before, &now) < 0 || std::strcmp(now, "/") == 0) return;
@@ -177,7 +177,7 @@ void GeoClueSource::locationUpdated(sd_bus_message* signal) {
                              Callbacks::location, this, "s", kGeoClueLocation);
 }
 
-void GeoClueSource::gotLocation(sd_bus_message* reply) {
+void GeoClueSource::_gotLocation(sd_bus_message* reply) {
   // A location that has been replaced meanwhile is gone; the signal for the new one is on its way.
   if (::sd_bus_message_is_method_error(reply, nullptr)) return;
   auto fix = fixOf(readDoubles(reply));

@@ -30,14 +30,14 @@ class GeoClueSource final : public LocationSource {
                 const Clock& clock, std::function<void(const std::string&)> missing);
 
   struct Callbacks;
-  void begin();
-  void gotClient(sd_bus_message* reply);
-  void locationUpdated(sd_bus_message* signal);
-  void gotLocation(sd_bus_message* reply);
-  void ownerChanged(sd_bus_message* signal);
+  void _begin();
+  void _gotClient(sd_bus_message* reply);
+  void _locationUpdated(sd_bus_message* signal);
+  void _gotLocation(sd_bus_message* reply);
+  void _ownerChanged(sd_bus_message* signal);
   // True when the reply is an error, which ends this; tells what it means.
-  bool failed(sd_bus_message* reply);
-  void endMissing(const std::string& problem);
+  bool _failed(sd_bus_message* reply);
+  void _endMissing(const std::string& problem);
 
   const LocationOptions options_;
   const LocationSourceEvents events_;

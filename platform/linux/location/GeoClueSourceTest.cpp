@@ -71,10 +71,10 @@ class HostServicesDouble final {
   }
 
  private:
-  static int getClient(sd_bus_message* call, void*, sd_bus_error*) {
+  static int _getClient(sd_bus_message* call, void*, sd_bus_error*) {
     return ::sd_bus_reply_method_return(call, "o", "/client");
   }
-  static int startClient(sd_bus_message* call, void* self, sd_bus_error* error) {
+  static int _startClient(sd_bus_message* call, void* self, sd_bus_error* error) {
     const auto& state = *static_cast<HostServicesState*>(self);
     if (state.denies || !state.desktopId || state.accuracyLevel == 0) {
       return ::sd_bus_error_set(error, "org.freedesktop.DBus.Error.AccessDenied", "no");
@@ -83,8 +83,8 @@ class HostServicesDouble final {
     return ::sd_bus_emit_signal(state.bus, "/client", "org.freedesktop.GeoClue2.Client",
                                 "LocationUpdated", "oo", "/", "/location");
   }
-  static int getLocale(sd_bus*, const char*, const char*, const char*, sd_bus_message* reply,
-                       void* self, sd_bus_error*) {
+  static int _getLocale(sd_bus*, const char*, const char*, const char*, sd_bus_message* reply,
+                        void* self, sd_bus_error*) {
     const auto& state = *static_cast<HostServicesState*>(self);
     return ::sd_bus_message_append(reply, "as", 2, state.language, "LC_TIME=C");
   }
@@ -100,9 +100,10 @@ class HostServicesDouble final {
 
 const sd_bus_vtable HostServicesDouble::kManager[] = {
     SD_BUS_VTABLE_START(0),
-    SD_BUS_METHOD("GetClient", "", "o", getClient, SD_BUS_VTABLE_UNPRIVILEGED), SD_BUS_VTABLE_END};
+    SD_BUS_METHOD("GetClient", "", "o", _getClient, SD_BUS_VTABLE_UNPRIVILEGED), SD_BUS_VTABLE_END};
 const sd_bus_vtable HostServicesDouble::kClient[] = {
-    SD_BUS_VTABLE_START(0), SD_BUS_METHOD("Start", "", "", startClient, SD_BUS_VTABLE_UNPRIVILEGED),
+    SD_BUS_VTABLE_START(0),
+    SD_BUS_METHOD("Start", "", "", _startClient, SD_BUS_VTABLE_UNPRIVILEGED),
     SD_BUS_WRITABLE_PROPERTY("DesktopId", "s", nullptr, nullptr,
                              offsetof(HostServicesState, desktopId), SD_BUS_VTABLE_UNPRIVILEGED),
     SD_BUS_WRITABLE_PROPERTY("RequestedAccuracyLevel", "u", nullptr, nullptr,
@@ -117,7 +118,7 @@ const sd_bus_vtable HostServicesDouble::kLocation[] = {
     SD_BUS_VTABLE_END};
 const sd_bus_vtable HostServicesDouble::kLocale[] = {
     SD_BUS_VTABLE_START(0),
-    SD_BUS_PROPERTY("Locale", "as", getLocale, 0, SD_BUS_VTABLE_PROPERTY_EMITS_CHANGE),
+    SD_BUS_PROPERTY("Locale", "as", _getLocale, 0, SD_BUS_VTABLE_PROPERTY_EMITS_CHANGE),
     SD_BUS_VTABLE_END};
 
 // What a source tells, waited for.

@@ -43,13 +43,13 @@ LinuxLocation::LinuxLocation(DeviceProfileStore& store, SettingsStore& settings,
       queue_(queues.makeSerialQueue("com.quenta.zelkord.location")) {
   {
     const MutexLock lock(tellingMutex_);
-    told_ = permission();
+    told_ = _permission();
   }
   profileChanges_ = store.observe([this](const DeviceProfile& before, const DeviceProfile& after) {
-    profileChanged(before, after);
+    _profileChanged(before, after);
   });
   settingChanges_ =
-      settings.observe(kLocationAuthorizationKey, [this] { permissionMayHaveChanged(); });
+      settings.observe(kLocationAuthorizationKey, [this] { _permissionMayHaveChanged(); });
 }
 
 LinuxLocation::~LinuxLocation() {
@@ -58,15 +58,15 @@ LinuxLocation::~LinuxLocation() {
   queue_->sync([] {});  // the providers of managers that have gone end
 }
 
-LinuxLocation::Permission LinuxLocation::permission() const {
+LinuxLocation::Permission LinuxLocation::_permission() const {
   const auto profile = store_.current();
   return {profile->locationServicesEnabled.value_or(true), authorizationOf(settings_, *profile)};
 }
 
-bool LinuxLocation::isEnabledSystemWide() const { return permission().enabled; }
+bool LinuxLocation::isEnabledSystemWide() const { return _permission().enabled; }
 
 LocationAuthorization LinuxLocation::authorization(const std::string&) const {
-  return permission().status;
+  return _permission().status;
 }
 
 void LinuxLocation::setAuthorization(const std::string& bundlePath, LocationAuthorization status) {
@@ -78,7 +78,7 @@ std::unique_ptr<LocationManager> LinuxLocation::makeManager(
     const std::string&, const LocationOptions& options, std::weak_ptr<LocationDelegate> delegate,
     WorkQueue& queue) {
   const auto mayTell = [this] {
-    const auto now = permission();
+    const auto now = _permission();
     return now.enabled && now.status >= 3;
   };
   auto client = std::make_shared<LocationClient>(
@@ -89,7 +89,7 @@ std::unique_ptr<LocationManager> LinuxLocation::makeManager(
   return std::make_unique<Manager>(std::move(client));
 }
 
-std::vector<std::shared_ptr<LocationClient>> LinuxLocation::liveClients() {
+std::vector<std::shared_ptr<LocationClient>> LinuxLocation::_liveClients() {
   std::vector<std::shared_ptr<LocationClient>> live;
   const MutexLock lock(clientsMutex_);
   std::erase_if(clients_, [&](const auto& weak) {
@@ -100,19 +100,19 @@ std::vector<std::shared_ptr<LocationClient>> LinuxLocation::liveClients() {
   return live;
 }
 
-void LinuxLocation::permissionMayHaveChanged() {
+void LinuxLocation::_permissionMayHaveChanged() {
   // One change at a time: what is told last is what counts.
   const MutexLock lock(tellingMutex_);
-  const auto now = permission();
+  const auto now = _permission();
   if (now == told_) return;
   told_ = now;
-  for (const auto& client : liveClients()) client->permissionChanged(now.status);
+  for (const auto& client : _liveClients()) client->permissionChanged(now.status);
 }
 
-void LinuxLocation::profileChanged(const DeviceProfile& before, const DeviceProfile& after) {
-  permissionMayHaveChanged();
+void LinuxLocation::_profileChanged(const DeviceProfile& before, const DeviceProfile& after) {
+  _permissionMayHaveChanged();
   if (before.location == after.location) return;
-  for (const auto& client : liveClients()) client->profileMoved();
+  for (const auto& client : _liveClients()) client->profileMoved();
 }
 
 }  // namespace zelkord

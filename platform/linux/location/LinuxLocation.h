@@ -52,10 +52,10 @@ class LinuxLocation final : public LocationService {
     friend bool operator==(const Permission&, const Permission&) = default;
   };
 
-  Permission permission() const;
-  void permissionMayHaveChanged();
-  void profileChanged(const DeviceProfile& before, const DeviceProfile& after);
-  std::vector<std::shared_ptr<LocationClient>> liveClients();
+  Permission _permission() const;
+  void _permissionMayHaveChanged();
+  void _profileChanged(const DeviceProfile& before, const DeviceProfile& after);
+  std::vector<std::shared_ptr<LocationClient>> _liveClients();
 
   // Fixed after construction.
   DeviceProfileStore& store_;

@@ -56,13 +56,13 @@ FileLog::FileLog(const std::string& path) : complaint_(std::make_unique<Complain
                                                                    false, privateFileHandlers());
     sink_->set_pattern("%v");
   } catch (const std::exception& error) {
-    complain(error.what());
+    _complain(error.what());
   }
 }
 
 FileLog::~FileLog() = default;
 
-void FileLog::complain(const char* problem) {
+void FileLog::_complain(const char* problem) {
   if (!complaint_->made.test_and_set()) std::fprintf(stderr, "zelkord: no log: %s\n", problem);
 }
 
@@ -74,7 +74,7 @@ void FileLog::write(WallTime time, LogLevel level, std::string_view category,
     sink_->log(spdlog::details::log_msg({}, spdlog::level::info, {line.data(), line.size()}));
     sink_->flush();
   } catch (const std::exception& error) {
-    complain(error.what());
+    _complain(error.what());
   }
 }
 
@@ -82,7 +82,7 @@ void FileLog::flush() {
   try {
     if (sink_) sink_->flush();
   } catch (const std::exception& error) {
-    complain(error.what());
+    _complain(error.what());
   }
 }
 

@@ -33,7 +33,7 @@ class FileLog final : public LogOutput {
   void flush() override;
 
  private:
-  void complain(const char* problem);
+  void _complain(const char* problem);
 
   struct Complaint;
   const std::unique_ptr<Complaint> complaint_;

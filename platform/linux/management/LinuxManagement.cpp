@@ -31,7 +31,7 @@ RestrictionValue LinuxManagement::diagnosticsSubmissionAllowed() const {
   return store_.current()->diagnosticsSubmissionAllowed.value_or(RestrictionValue::Unset);
 }
 
-json::object LinuxManagement::readFile() {
+json::object LinuxManagement::_readFile() {
   Error error;
   const auto text = files_.read(path_, kMaximumRestrictions, &error);
   if (!text && error.code == ENOENT) return {};
@@ -45,7 +45,7 @@ json::object LinuxManagement::readFile() {
 std::optional<Error> LinuxManagement::setVisibilityRestrictions(const std::string& clientType,
                                                                 const json::object& restrictions) {
   const MutexLock lock(mutex_);
-  auto all = readFile();
+  auto all = _readFile();
   if (const auto* present = objectIn(all, clientType); present && *present == restrictions) {
     return std::nullopt;
   }

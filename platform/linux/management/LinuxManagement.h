@@ -28,7 +28,7 @@ class LinuxManagement final : public DeviceManagement {
                                                  const json::object& restrictions) override;
 
  private:
-  json::object readFile();
+  json::object _readFile();
 
   const DeviceProfileStore& store_;
   FileManager& files_;

@@ -9,10 +9,10 @@ LinuxMaps::LinuxMaps(const DeviceProfileStore& store, const LocaleService& local
                      RandomSource& random)
     : store_(store), locale_(locale), random_(random) {
   const MutexLock lock(mutex_);
-  session_ = freshSession();
+  session_ = _freshSession();
 }
 
-std::string LinuxMaps::freshSession() { return randomUUID(random_).string(); }
+std::string LinuxMaps::_freshSession() { return randomUUID(random_).string(); }
 
 std::string LinuxMaps::countryCode() const {
   const auto profile = store_.current();
@@ -29,7 +29,7 @@ std::optional<std::string> LinuxMaps::environmentName() const {
 
 std::optional<std::optional<std::string>> LinuxMaps::userSession(bool reset) {
   const MutexLock lock(mutex_);
-  if (reset) session_ = freshSession();
+  if (reset) session_ = _freshSession();
   const auto given = store_.current()->mapsSession;
   return std::optional<std::string>(given ? *given : session_);
 }

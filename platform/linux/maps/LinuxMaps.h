@@ -24,7 +24,7 @@ class LinuxMaps final : public MapsService {
   std::optional<std::optional<std::string>> userSession(bool reset) override;
 
  private:
-  std::string freshSession();
+  std::string _freshSession();
 
   const DeviceProfileStore& store_;
   const LocaleService& locale_;

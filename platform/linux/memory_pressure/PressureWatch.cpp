@@ -52,18 +52,18 @@ class LowMemoryWatch final : public PressureWatch {
  public:
   LowMemoryWatch(Loop& loop, std::function<void()> critical, std::function<void()> missing)
       : critical_(std::move(critical)),
-        bus_(loop, {[this](sd_bus* bus) { connected(bus); },
+        bus_(loop, {[this](sd_bus* bus) { _connected(bus); },
                     [missing = std::move(missing)](const std::string&) { missing(); }}) {
     bus_.start();
   }
 
  private:
-  void connected(sd_bus* bus) {
+  void _connected(sd_bus* bus) {
     sd_bus_match_signal_async(
         bus, nullptr, "org.freedesktop.LowMemoryMonitor", "/org/freedesktop/LowMemoryMonitor",
-        "org.freedesktop.LowMemoryMonitor", "LowMemoryWarning", warned, nullptr, this);
+        "org.freedesktop.LowMemoryMonitor", "LowMemoryWarning", _warned, nullptr, this);
   }
-  static int warned(sd_bus_message* message, void* self, sd_bus_error*) {
+  static int _warned(sd_bus_message* message, void* self, sd_bus_error*) {
     unsigned char level = 0;
     if (sd_bus_message_read_basic(message, 'y', &level) >= 0 && level == kCriticalLevel) {
       static_cast<LowMemoryWatch*>(self)->critical_();

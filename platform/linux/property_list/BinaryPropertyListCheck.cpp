@@ -42,9 +42,9 @@ class PlistWalk {
       : bytes_(bytes), limits_(limits) {}
 
   std::string run() {
-    if (!readTrailer()) return "broken trailer";
+    if (!_readTrailer()) return "broken trailer";
     stack_.push_back({root_, {}, 0});
-    while (problem_.empty() && !stack_.empty()) visit();
+    while (problem_.empty() && !stack_.empty()) _visit();
     return problem_;
   }
 
@@ -62,7 +62,7 @@ class PlistWalk {
     std::size_t next;
   };
 
-  bool readTrailer() {
+  bool _readTrailer() {
     if (!bytes_.starts_with(kPlistMagic) || bytes_.size() < kPlistMagic.size() + kPlistTrailer) {
       return false;
     }
@@ -81,29 +81,29 @@ class PlistWalk {
     return true;
   }
 
-  void fail(const char* problem) { problem_ = problem; }
+  void _fail(const char* problem) { problem_ = problem; }
 
-  void visit() {
+  void _visit() {
     auto& place = stack_.back();
     auto& object = objects_[place.object];
     if (object.state == State::New) {
       object.state = State::Open;
-      if (!readObject(place)) return fail("an object is broken or lies outside the file");
-      if (stack_.size() > limits_.depth) return fail("too deep");
+      if (!_readObject(place)) return _fail("an object is broken or lies outside the file");
+      if (stack_.size() > limits_.depth) return _fail("too deep");
     }
-    if (place.next < place.children.size()) return descend(place);
-    finish(place);
+    if (place.next < place.children.size()) return _descend(place);
+    _finish(place);
     stack_.pop_back();
   }
 
-  void descend(Place& place) {
+  void _descend(Place& place) {
     const auto child = place.children[place.next++];
     const auto state = objects_[child].state;
-    if (state == State::Open) return fail("an object contains itself");
+    if (state == State::Open) return _fail("an object contains itself");
     if (state == State::New) stack_.push_back({child, {}, 0});
   }
 
-  void finish(const Place& place) {
+  void _finish(const Place& place) {
     auto& object = objects_[place.object];
     object.state = State::Done;
     object.depth = 1;
@@ -112,15 +112,15 @@ class PlistWalk {
       object.depth = std::max(object.depth, objects_[child].depth + 1);
       object.values += objects_[child].values;
       object.bytes += objects_[child].bytes;
-      if (object.values > limits_.values) return fail("too many values");
-      if (object.bytes > limits_.bytes) return fail("too many bytes");
+      if (object.values > limits_.values) return _fail("too many values");
+      if (object.bytes > limits_.bytes) return _fail("too many bytes");
     }
-    if (object.depth > limits_.depth) fail("too deep");
+    if (object.depth > limits_.depth) _fail("too deep");
   }
 
   // The size that an object's head gives: in the marker's low half, or in an integer object behind
   // it.
-  std::optional<std::uint64_t> readSize(std::size_t& at, unsigned low) const {
+  std::optional<std::uint64_t> _readSize(std::size_t& at, unsigned low) const {
     if (low != 0xF) return low;
     if (at >= table_) return std::nullopt;
     const auto marker = static_cast<unsigned char>(bytes_[at++]);
@@ -130,7 +130,7 @@ class PlistWalk {
     return bigEndian(bytes_.substr(at - width, width));
   }
 
-  bool readObject(Place& place) {
+  bool _readObject(Place& place) {
     const auto offset = bigEndian(bytes_.substr(table_ + place.object * offsetSize_, offsetSize_));
     if (offset < kPlistMagic.size() || offset >= table_) return false;
     std::size_t at = offset + 1;
@@ -146,35 +146,35 @@ class PlistWalk {
       case 0x3:
         return 8 <= table_ - at;
       case 0x4:
-        return readBytes(at, low, 1, bytes).has_value();
+        return _readBytes(at, low, 1, bytes).has_value();
       case 0x5:
-        return isAsciiText(readBytes(at, low, 1, bytes));
+        return isAsciiText(_readBytes(at, low, 1, bytes));
       case 0x6:
-        return isUtf16Text(readBytes(at, low, 2, bytes));
+        return isUtf16Text(_readBytes(at, low, 2, bytes));
       case 0x8:
         return low + 1 <= table_ - at;
       case 0xA:
       case 0xC:
-        return readReferences(at, low, 1, place.children);
+        return _readReferences(at, low, 1, place.children);
       case 0xD:
-        return readReferences(at, low, 2, place.children);
+        return _readReferences(at, low, 2, place.children);
       default:
         return false;
     }
   }
 
   // What is in a text or data object, whose size is noted.
-  std::optional<std::string_view> readBytes(std::size_t at, unsigned low, std::size_t unit,
-                                            std::size_t& bytes) const {
-    const auto size = readSize(at, low);
+  std::optional<std::string_view> _readBytes(std::size_t at, unsigned low, std::size_t unit,
+                                             std::size_t& bytes) const {
+    const auto size = _readSize(at, low);
     if (!size || *size > (table_ - at) / unit) return std::nullopt;
     bytes = *size * unit;
     return bytes_.substr(at, bytes);
   }
 
-  bool readReferences(std::size_t at, unsigned low, std::size_t each,
-                      std::vector<std::size_t>& children) const {
-    const auto size = readSize(at, low);
+  bool _readReferences(std::size_t at, unsigned low, std::size_t each,
+                       std::vector<std::size_t>& children) const {
+    const auto size = _readSize(at, low);
     if (!size || *size > (table_ - at) / (referenceSize_ * each)) return false;
     for (std::uint64_t i = 0; i < *size * each; ++i, at += referenceSize_) {
       children.push_back(bigEndian(bytes_.substr(at, referenceSize_)));

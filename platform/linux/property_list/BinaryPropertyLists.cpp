@@ -27,7 +27,7 @@ class PlistWriter {
  public:
   // Null for a value that is dropped.
   plist_t write(const json::value& value, std::size_t depth) {
-    if (depth > kMaximumJsonDepth) return fail("nested too deep");
+    if (depth > kMaximumJsonDepth) return _fail("nested too deep");
     switch (value.kind()) {
       case json::kind::null:
         return nullptr;
@@ -36,13 +36,13 @@ class PlistWriter {
       case json::kind::int64:
         return plist_new_uint(static_cast<std::uint64_t>(value.get_int64()));
       case json::kind::uint64:
-        return writeUnsigned(value.get_uint64());
+        return _writeUnsigned(value.get_uint64());
       case json::kind::double_:
-        return writeReal(value.get_double());
+        return _writeReal(value.get_double());
       case json::kind::string:
-        return writeText(value.get_string());
+        return _writeText(value.get_string());
       case json::kind::array:
-        return writeArray(value.get_array(), depth);
+        return _writeArray(value.get_array(), depth);
       case json::kind::object:
         return writeDictionary(value.get_object(), depth);
     }
@@ -52,7 +52,7 @@ class PlistWriter {
   plist_t writeDictionary(const json::object& object, std::size_t depth) {
     const plist_t dictionary = plist_new_dict();
     for (const auto& [key, value] : object) {
-      if (!isWritable(key)) break;
+      if (!_isWritable(key)) break;
       if (const plist_t child = write(value, depth + 1)) {
         plist_dict_set_item(dictionary, std::string(key).c_str(), child);
       }
@@ -63,29 +63,29 @@ class PlistWriter {
   const std::string& problem() const { return problem_; }
 
  private:
-  plist_t fail(const char* problem) {
+  plist_t _fail(const char* problem) {
     if (problem_.empty()) problem_ = problem;
     return nullptr;
   }
 
   // The library takes zero-terminated text and stops at what is not UTF-8.
-  bool isWritable(std::string_view text) {
-    if (text.find('\0') != std::string_view::npos) fail("a text holds a zero character");
-    if (!isValidUtf8(text)) fail("a text is not UTF-8");
+  bool _isWritable(std::string_view text) {
+    if (text.find('\0') != std::string_view::npos) _fail("a text holds a zero character");
+    if (!isValidUtf8(text)) _fail("a text is not UTF-8");
     return problem_.empty();
   }
 
-  plist_t writeUnsigned(std::uint64_t number) {
+  plist_t _writeUnsigned(std::uint64_t number) {
     if (number <= INT64_MAX) return plist_new_uint(number);
     return plist_new_real(static_cast<double>(number));
   }
-  plist_t writeReal(double number) {
+  plist_t _writeReal(double number) {
     return std::isfinite(number) ? plist_new_real(number) : nullptr;
   }
-  plist_t writeText(std::string_view text) {
-    return isWritable(text) ? plist_new_string(std::string(text).c_str()) : nullptr;
+  plist_t _writeText(std::string_view text) {
+    return _isWritable(text) ? plist_new_string(std::string(text).c_str()) : nullptr;
   }
-  plist_t writeArray(const json::array& elements, std::size_t depth) {
+  plist_t _writeArray(const json::array& elements, std::size_t depth) {
     const plist_t array = plist_new_array();
     for (const auto& element : elements) {
       if (const plist_t child = write(element, depth + 1)) plist_array_append_item(array, child);

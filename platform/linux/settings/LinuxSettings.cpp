@@ -20,32 +20,32 @@ LinuxSettings::LinuxSettings(Options options, FileManager& files, WorkQueues& qu
 
 LinuxSettings::~LinuxSettings() { flush(); }
 
-SettingsLayers LinuxSettings::layers() const {
+SettingsLayers LinuxSettings::_layers() const {
   const MutexLock lock(mutex_);
   return layers_;
 }
 
 std::optional<json::value> LinuxSettings::value(std::string_view key,
                                                 std::string_view domain) const {
-  const auto now = layers();
+  const auto now = _layers();
   const auto* value = now.find(key, settingsDomain(domain));
   return value ? std::optional(*value) : std::nullopt;
 }
 
 json::object LinuxSettings::all(std::string_view domain) const {
-  return layers().all(settingsDomain(domain));
+  return _layers().all(settingsDomain(domain));
 }
 
 void LinuxSettings::set(std::string_view key, json::value value, std::string_view domain) {
-  change(key, domain, std::move(value));
+  _change(key, domain, std::move(value));
 }
 
 void LinuxSettings::remove(std::string_view key, std::string_view domain) {
-  change(key, domain, std::nullopt);
+  _change(key, domain, std::nullopt);
 }
 
-void LinuxSettings::change(std::string_view key, std::string_view domain,
-                           std::optional<json::value> value) {
+void LinuxSettings::_change(std::string_view key, std::string_view domain,
+                            std::optional<json::value> value) {
   domain = settingsDomain(domain);
   {
     const MutexLock lock(mutex_);
@@ -61,7 +61,7 @@ void LinuxSettings::change(std::string_view key, std::string_view domain,
     }
     layers_.user = std::move(user);
   }
-  queue_->async([this] { persist(); });
+  queue_->async([this] { _persist(); });
   changes_.post(settingName(key, domain));
 }
 
@@ -79,25 +79,25 @@ void LinuxSettings::registerDefaults(const json::object& values) {
   layers_.registered = std::move(registered);
 }
 
-std::map<LinuxSettings::Place, std::optional<std::string>> LinuxSettings::takePending() {
+std::map<LinuxSettings::Place, std::optional<std::string>> LinuxSettings::_takePending() {
   const MutexLock lock(mutex_);
   return std::exchange(pending_, {});
 }
 
-void LinuxSettings::persist() {
+void LinuxSettings::_persist() {
   queue_->assertCurrent();
-  auto taken = takePending();
+  auto taken = _takePending();
   if (taken.empty()) return;
   std::vector<SettingsDatabase::Change> changes;
   for (const auto& [place, stored] : taken) changes.push_back({place.first, place.second, stored});
-  if (database_.store(changes, [this] { return everything(); })) return;
+  if (database_.store(changes, [this] { return _everything(); })) return;
   const MutexLock lock(mutex_);
   pending_.merge(taken);  // what was set again meanwhile is newer and stays
 }
 
-std::vector<SettingsDatabase::Change> LinuxSettings::everything() const {
+std::vector<SettingsDatabase::Change> LinuxSettings::_everything() const {
   std::vector<SettingsDatabase::Change> all;
-  const auto now = layers();
+  const auto now = _layers();
   for (const auto& [domain, values] : *now.user) {
     for (const auto& [key, value] : values) all.push_back({domain, key, json::serialize(value)});
   }
@@ -105,7 +105,7 @@ std::vector<SettingsDatabase::Change> LinuxSettings::everything() const {
 }
 
 void LinuxSettings::flush() {
-  queue_->sync([this] { persist(); });
+  queue_->sync([this] { _persist(); });
 }
 
 }  // namespace zelkord

@@ -51,11 +51,11 @@ class LinuxSettings final : public SettingsStore {
  private:
   using Place = std::pair<std::string, std::string>;  // domain, key
 
-  SettingsLayers layers() const;
-  void change(std::string_view key, std::string_view domain, std::optional<json::value> value);
-  void persist();
-  std::map<Place, std::optional<std::string>> takePending();
-  std::vector<SettingsDatabase::Change> everything() const;
+  SettingsLayers _layers() const;
+  void _change(std::string_view key, std::string_view domain, std::optional<json::value> value);
+  void _persist();
+  std::map<Place, std::optional<std::string>> _takePending();
+  std::vector<SettingsDatabase::Change> _everything() const;
 
   // Queue state.
   const std::unique_ptr<SerialQueue> queue_;

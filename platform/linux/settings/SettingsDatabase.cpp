@@ -6,14 +6,14 @@ namespace zelkord {
 SettingsDatabase::SettingsDatabase(std::string path, Logger log, Duration busyTimeout)
     : path_(std::move(path)), log_(std::move(log)), busyTimeout_(busyTimeout) {}
 
-void SettingsDatabase::complain(const char* what, const sqlite::Failure& failure) {
+void SettingsDatabase::_complain(const char* what, const sqlite::Failure& failure) {
   auto text = fmt::format("{} {}: {}", what, path_, failure.text);
   if (text == lastComplaint_) return;
   log_.error("{}", text);
   lastComplaint_ = std::move(text);
 }
 
-std::optional<sqlite::Failure> SettingsDatabase::open() {
+std::optional<sqlite::Failure> SettingsDatabase::_open() {
   if (database_) return std::nullopt;
   sqlite::Failure failure;
   auto database = sqlite::Database::open(path_, &failure, {.busyTimeout = busyTimeout_});
@@ -23,7 +23,7 @@ std::optional<sqlite::Failure> SettingsDatabase::open() {
   return std::nullopt;
 }
 
-std::optional<sqlite::Failure> SettingsDatabase::readInto(SettingsByDomain& settings) {
+std::optional<sqlite::Failure> SettingsDatabase::_readInto(SettingsByDomain& settings) {
   auto rows = database_->prepare("SELECT domain, key, value FROM defaults");
   while (rows.step()) {
     auto value = parseJson(rows.text(2));
@@ -38,31 +38,31 @@ std::optional<sqlite::Failure> SettingsDatabase::readInto(SettingsByDomain& sett
 
 SettingsByDomain SettingsDatabase::load() {
   SettingsByDomain settings;
-  auto failure = open();
-  if (!failure) failure = readInto(settings);
+  auto failure = _open();
+  if (!failure) failure = _readInto(settings);
   if (!failure) return settings;
   // A table of another shape is as useless as a broken page.
   if (failure->isDamage() || (database_ && failure->isMisfit())) {
-    replaceDamaged(*failure);
+    _replaceDamaged(*failure);
   } else {
-    complain("cannot read", *failure);
+    _complain("cannot read", *failure);
   }
   return {};
 }
 
-void SettingsDatabase::replaceDamaged(const sqlite::Failure& failure) {
+void SettingsDatabase::_replaceDamaged(const sqlite::Failure& failure) {
   database_.reset();
   if (const auto aside = sqlite::setAside(path_)) {
     log_.error("{} is damaged ({}); it is now {}, and a new one begins", path_, failure.text,
                *aside);
   } else {
-    complain("cannot set aside the damaged", failure);
+    _complain("cannot set aside the damaged", failure);
   }
-  if (const auto problem = open()) complain("cannot make", *problem);
+  if (const auto problem = _open()) _complain("cannot make", *problem);
 }
 
-std::optional<sqlite::Failure> SettingsDatabase::write(const std::vector<Change>& changes) {
-  if (auto failure = open()) return failure;
+std::optional<sqlite::Failure> SettingsDatabase::_write(const std::vector<Change>& changes) {
+  if (auto failure = _open()) return failure;
   return database_->transaction([&]() -> std::optional<sqlite::Failure> {
     auto put = database_->prepare("INSERT OR REPLACE INTO defaults VALUES(?1, ?2, ?3)");
     auto drop = database_->prepare("DELETE FROM defaults WHERE domain = ?1 AND key = ?2");
@@ -78,10 +78,10 @@ std::optional<sqlite::Failure> SettingsDatabase::write(const std::vector<Change>
 
 bool SettingsDatabase::store(const std::vector<Change>& changes,
                              FunctionRef<std::vector<Change>()> everything) {
-  auto failure = write(changes);
+  auto failure = _write(changes);
   if (failure && failure->isDamage()) {
-    replaceDamaged(*failure);
-    failure = write(everything());
+    _replaceDamaged(*failure);
+    failure = _write(everything());
   }
   if (!failure) {
     lastComplaint_.clear();
@@ -89,7 +89,7 @@ bool SettingsDatabase::store(const std::vector<Change>& changes,
   }
   // Opened again next time: the file may have been replaced meanwhile.
   database_.reset();
-  complain(failure->isBusy() ? "somebody else holds" : "cannot write", *failure);
+  _complain(failure->isBusy() ? "somebody else holds" : "cannot write", *failure);
   return false;
 }
 

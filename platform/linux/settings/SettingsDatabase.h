@@ -36,11 +36,11 @@ class SettingsDatabase final {
   bool store(const std::vector<Change>& changes, FunctionRef<std::vector<Change>()> everything);
 
  private:
-  std::optional<sqlite::Failure> open();
-  std::optional<sqlite::Failure> readInto(SettingsByDomain& settings);
-  std::optional<sqlite::Failure> write(const std::vector<Change>& changes);
-  void replaceDamaged(const sqlite::Failure& failure);
-  void complain(const char* what, const sqlite::Failure& failure);
+  std::optional<sqlite::Failure> _open();
+  std::optional<sqlite::Failure> _readInto(SettingsByDomain& settings);
+  std::optional<sqlite::Failure> _write(const std::vector<Change>& changes);
+  void _replaceDamaged(const sqlite::Failure& failure);
+  void _complain(const char* what, const sqlite::Failure& failure);
 
   const std::string path_;
   const Logger log_;

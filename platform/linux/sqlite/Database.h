@@ -62,7 +62,7 @@ class Statement final {
   };
 
   Statement(sqlite3* database, std::string_view sql);
-  void check(int code);
+  void _check(int code);
 
   sqlite3* database_;
   std::unique_ptr<sqlite3_stmt, Closer> statement_;

@@ -8,41 +8,41 @@ void Statement::Closer::operator()(sqlite3_stmt* statement) const { sqlite3_fina
 
 Statement::Statement(sqlite3* database, std::string_view sql) : database_(database) {
   sqlite3_stmt* raw = nullptr;
-  check(sqlite3_prepare_v2(database, sql.data(), static_cast<int>(sql.size()), &raw, nullptr));
+  _check(sqlite3_prepare_v2(database, sql.data(), static_cast<int>(sql.size()), &raw, nullptr));
   statement_.reset(raw);
 }
 
-void Statement::check(int code) {
+void Statement::_check(int code) {
   if (code == SQLITE_OK || failure_) return;
   failure_ = Failure{code, sqlite3_errmsg(database_)};
 }
 
 Statement& Statement::bind(int parameter, std::int64_t value) {
-  if (!failure_) check(sqlite3_bind_int64(statement_.get(), parameter, value));
+  if (!failure_) _check(sqlite3_bind_int64(statement_.get(), parameter, value));
   return *this;
 }
 
 Statement& Statement::bind(int parameter, double value) {
-  if (!failure_) check(sqlite3_bind_double(statement_.get(), parameter, value));
+  if (!failure_) _check(sqlite3_bind_double(statement_.get(), parameter, value));
   return *this;
 }
 
 Statement& Statement::bind(int parameter, std::string_view text) {
   if (failure_) return *this;
-  check(sqlite3_bind_text64(statement_.get(), parameter, text.data() ? text.data() : "",
-                            text.size(), SQLITE_TRANSIENT, SQLITE_UTF8));
+  _check(sqlite3_bind_text64(statement_.get(), parameter, text.data() ? text.data() : "",
+                             text.size(), SQLITE_TRANSIENT, SQLITE_UTF8));
   return *this;
 }
 
 Statement& Statement::bindBytes(int parameter, std::string_view bytes) {
   if (failure_) return *this;
-  check(sqlite3_bind_blob64(statement_.get(), parameter, bytes.data() ? bytes.data() : "",
-                            bytes.size(), SQLITE_TRANSIENT));
+  _check(sqlite3_bind_blob64(statement_.get(), parameter, bytes.data() ? bytes.data() : "",
+                             bytes.size(), SQLITE_TRANSIENT));
   return *this;
 }
 
 Statement& Statement::bindNull(int parameter) {
-  if (!failure_) check(sqlite3_bind_null(statement_.get(), parameter));
+  if (!failure_) _check(sqlite3_bind_null(statement_.get(), parameter));
   return *this;
 }
 
@@ -50,7 +50,7 @@ bool Statement::step() {
   if (failure_) return false;
   const int code = sqlite3_step(statement_.get());
   if (code == SQLITE_ROW) return true;
-  if (code != SQLITE_DONE) check(code);
+  if (code != SQLITE_DONE) _check(code);
   return false;
 }
 

@@ -38,19 +38,19 @@ class HeadReader {
   explicit HeadReader(std::string_view bytes) : rest_(bytes) {}
 
   std::uint64_t number() {
-    const auto bytes = take(kNumberSize);
+    const auto bytes = _take(kNumberSize);
     std::uint64_t value = 0;
     for (std::size_t i = bytes.size(); i-- > 0;) {
       value = value << 8 | static_cast<unsigned char>(bytes[i]);
     }
     return value;
   }
-  std::string_view text() { return take(number()); }
+  std::string_view text() { return _take(number()); }
   bool failed() const { return failed_; }
   bool isAtEnd() const { return !failed_ && rest_.empty(); }
 
  private:
-  std::string_view take(std::uint64_t size) {
+  std::string_view _take(std::uint64_t size) {
     failed_ = failed_ || size > rest_.size();
     if (failed_) return {};
     const auto taken = rest_.substr(0, size);

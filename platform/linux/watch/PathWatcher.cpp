@@ -45,27 +45,27 @@ class PathWatcher::Inotify final : public std::enable_shared_from_this<Inotify> 
     auto& entry = entries_[id];
     entry.path = path;
     entry.handler = std::make_shared<const std::function<void()>>(std::move(handler));
-    place(id, entry);
+    _place(id, entry);
     if (inotify_ && !std::exchange(isWatched_, true)) {
-      loop_.post([self = shared_from_this()] { self->begin(); }, LoopInbox::Runner::OwnThread);
+      loop_.post([self = shared_from_this()] { self->_begin(); }, LoopInbox::Runner::OwnThread);
     }
     return id;
   }
 
   void remove(int id) {
-    forget(id);
+    _forget(id);
     // Whoever cancels may go now: a handler that was already taken has ended.
     if (loop_.isCurrent()) return;
     const MutexLock turn(handling_);
   }
 
  private:
-  void begin() {
+  void _begin() {
     loop_.assertCurrent();
-    watch_ = loop_.watch(inotify_.get(), EPOLLIN, [this](std::uint32_t) { tellChanged(); });
+    watch_ = loop_.watch(inotify_.get(), EPOLLIN, [this](std::uint32_t) { _tellChanged(); });
   }
 
-  void forget(int id) {
+  void _forget(int id) {
     const MutexLock lock(mutex_);
     entries_.erase(id);
     for (auto place = places_.begin(); place != places_.end();) {
@@ -94,25 +94,25 @@ class PathWatcher::Inotify final : public std::enable_shared_from_this<Inotify> 
 
   // Until the plan holds with its watches in place: what came between the look and the watches
   // has no event.
-  void place(int id, const Entry& entry) ZK_REQUIRES(mutex_) {
+  void _place(int id, const Entry& entry) ZK_REQUIRES(mutex_) {
     std::vector<WatchSpot> placed;
     for (auto plan = watchPlan(entry.path); plan != placed; plan = watchPlan(entry.path)) {
-      for (const auto& spot : plan) place(id, spot);
+      for (const auto& spot : plan) _place(id, spot);
       placed = std::move(plan);
     }
   }
 
-  void place(int id, const WatchSpot& spot) ZK_REQUIRES(mutex_) {
+  void _place(int id, const WatchSpot& spot) ZK_REQUIRES(mutex_) {
     const int watch = ::inotify_add_watch(inotify_.get(), spot.path.c_str(), kWatchedEvents);
     if (watch >= 0) places_[watch].names.emplace(id, spot.name);
   }
 
-  void tellChanged() {
+  void _tellChanged() {
     const MutexLock turn(handling_);
-    for (const auto& handler : takeChanged()) (*handler)();
+    for (const auto& handler : _takeChanged()) (*handler)();
   }
 
-  std::vector<Handler> takeChanged() {
+  std::vector<Handler> _takeChanged() {
     alignas(inotify_event) char buffer[16 * 1024];
     std::vector<Handler> handlers;
     const MutexLock lock(mutex_);
@@ -121,18 +121,18 @@ class PathWatcher::Inotify final : public std::enable_shared_from_this<Inotify> 
       for (const char* at = buffer; at < buffer + size;) {
         inotify_event event;
         std::memcpy(&event, at, sizeof event);
-        note(event, event.len > 0 ? at + sizeof event : "", changed);
+        _note(event, event.len > 0 ? at + sizeof event : "", changed);
         at += sizeof event + event.len;
       }
     }
     for (const int id : changed) {
-      place(id, entries_.at(id));
+      _place(id, entries_.at(id));
       handlers.push_back(entries_.at(id).handler);
     }
     return handlers;
   }
 
-  void note(const inotify_event& event, std::string_view name, std::set<int>& changed)
+  void _note(const inotify_event& event, std::string_view name, std::set<int>& changed)
       ZK_REQUIRES(mutex_) {
     if (event.mask & IN_Q_OVERFLOW) {
       for (const auto& entry : entries_) changed.insert(entry.first);

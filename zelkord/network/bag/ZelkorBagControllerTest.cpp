@@ -52,7 +52,7 @@ class FetchSessions final : public FeedbackSessions {
     return nullptr;
   }
   std::shared_ptr<FeedbackSession> makeSession(ZelkorFeedback first) override {
-    note(std::move(first));
+    _note(std::move(first));
     return std::make_shared<Session>(*this);
   }
 
@@ -60,14 +60,14 @@ class FetchSessions final : public FeedbackSessions {
   class Session final : public FeedbackSession {
    public:
     explicit Session(FetchSessions& owner) : owner_(owner) {}
-    void addFeedback(ZelkorFeedback feedback) override { owner_.note(std::move(feedback)); }
+    void addFeedback(ZelkorFeedback feedback) override { owner_._note(std::move(feedback)); }
     void sessionComplete() override { owner_.events.emplace_back("complete"); }
 
    private:
     FetchSessions& owner_;
   };
 
-  void note(ZelkorFeedback record) {
+  void _note(ZelkorFeedback record) {
     events.emplace_back(record.feedback->className());
     records.push_back(std::move(record));
   }

@@ -13,17 +13,17 @@ namespace {
 class HeaderJsonWriter {
  public:
   bool write(const json::value& value) {
-    if (const auto* array = value.if_array()) return writeArray(*array);
-    if (const auto* object = value.if_object()) return writeObject(*object);
-    if (const auto* text = value.if_string()) return writeString(*text);
-    if (const auto* number = value.if_double()) return writeDouble(*number);
+    if (const auto* array = value.if_array()) return _writeArray(*array);
+    if (const auto* object = value.if_object()) return _writeObject(*object);
+    if (const auto* text = value.if_string()) return _writeString(*text);
+    if (const auto* number = value.if_double()) return _writeDouble(*number);
     text_ += json::serialize(value);
     return true;
   }
   std::string take() { return std::move(text_); }
 
  private:
-  bool writeArray(const json::array& array) {
+  bool _writeArray(const json::array& array) {
     char before = '[';
     for (const auto& element : array) {
       text_ += std::exchange(before, ',');
@@ -33,11 +33,11 @@ class HeaderJsonWriter {
     return true;
   }
 
-  bool writeObject(const json::object& object) {
+  bool _writeObject(const json::object& object) {
     char before = '{';
     for (const auto& member : object) {
       text_ += std::exchange(before, ',');
-      if (!writeString(member.key())) return false;
+      if (!_writeString(member.key())) return false;
       text_ += ':';
       if (!write(member.value())) return false;
     }
@@ -45,7 +45,7 @@ class HeaderJsonWriter {
     return true;
   }
 
-  bool writeString(std::string_view text) {
+  bool _writeString(std::string_view text) {
     if (!isValidUtf8(text)) return false;
     for (const char c : json::serialize(json::string(text))) {
       if (c == '\x7f') {
@@ -57,7 +57,7 @@ class HeaderJsonWriter {
     return true;
   }
 
-  bool writeDouble(double number) {
+  bool _writeDouble(double number) {
     if (!std::isfinite(number)) return false;
     std::array<char, 32> digits;
     const auto end = std::to_chars(digits.data(), digits.data() + digits.size(), number).ptr;
