@@ -1,6 +1,8 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <future>
+#include <latch>
 #include <memory>
 #include <thread>
 #include <vector>
@@ -321,6 +323,31 @@ TEST_F(LinuxWorkQueuesTest, DestructionMayMeetWorkFromOtherThreads) {
     queue.reset();
     value = -1;  // nothing may run any more
   }
+}
+
+TEST(LinuxWorkQueuesEndTest, WhatRunsAtTheEndMayWaitForAQueueWhoseTaskIsDropped) {
+  LinuxClock clock;
+  auto queues = std::make_unique<LinuxWorkQueues>(clock, 2);
+  const auto waitedFor = queues->makeSerialQueue("waited for");
+  const std::unique_ptr<SerialQueue> busy[] = {queues->makeSerialQueue("busy"),
+                                               queues->makeSerialQueue("busy too")};
+  std::latch begun(2), release(1);
+  std::atomic<bool> entered = false;
+  std::promise<void> dropped;
+  for (const auto& queue : busy) {
+    queue->async([&] {
+      begun.count_down();
+      release.wait();
+      waitedFor->sync([&] { entered = true; });
+    });
+  }
+  begun.wait();
+  waitedFor->async([told = std::shared_ptr<void>(nullptr, [&](void*) { dropped.set_value(); })] {});
+  std::thread end([&] { queues.reset(); });
+  EXPECT_EQ(dropped.get_future().wait_for(20s), std::future_status::ready);
+  release.count_down();
+  end.join();
+  EXPECT_TRUE(entered);
 }
 
 TEST_F(LinuxWorkQueuesTest, TimersMayBeArmedCancelledAndDestroyedWhileTheyFire) {

@@ -144,6 +144,14 @@ void QueueCore::runTicket() {
   } while (_finish(item, --left > 0 && std::chrono::steady_clock::now() < end));
 }
 
+void QueueCore::dropTicket() {
+  Item item;
+  if (!_takeGranted(item)) return;
+  do {
+    item.task = nullptr;
+  } while (_finish(item, true));
+}
+
 bool QueueCore::_takeGranted(Item& item) {
   const MutexLock lock(mutex_);
   if (granted_.empty()) return false;  // dropped meanwhile

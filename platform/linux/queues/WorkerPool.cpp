@@ -76,13 +76,17 @@ void WorkerPool::_endCarrying() {
 
 void WorkerPool::_place(Ticket core) {
   Start start;
+  bool isPlaced = false;
   {
     const MutexLock lock(mutex_);
-    if (stopped_) return;
-    auto& waiting = ready_[static_cast<std::size_t>(core->quality())];
-    waiting.push_back(std::move(core));
-    start = _startOne();
+    isPlaced = !stopped_;
+    if (isPlaced) {
+      auto& waiting = ready_[static_cast<std::size_t>(core->quality())];
+      waiting.push_back(std::move(core));
+      start = _startOne();
+    }
   }
+  if (!isPlaced) return core->dropTicket();
   _perform(start);
 }
 
@@ -247,15 +251,22 @@ WorkerPool::Counts WorkerPool::counts() const {
 }
 
 void WorkerPool::stop() {
-  std::array<std::deque<Ticket>, 4> dropped;  // released after the lock
-  const MutexLock lock(mutex_);
-  stopped_ = true;
-  dropped.swap(ready_);
-  for (PoolWorker* worker : idle_) {
-    ++counts_.running;
-    worker->parker_.unpark();
+  std::array<std::deque<Ticket>, 4> dropped;
+  {
+    const MutexLock lock(mutex_);
+    stopped_ = true;
+    dropped.swap(ready_);
+    for (PoolWorker* worker : idle_) {
+      ++counts_.running;
+      worker->parker_.unpark();
+    }
+    idle_.clear();
   }
-  idle_.clear();
+  // What still runs may wait for their queues.
+  for (const auto& tickets : dropped) {
+    for (const auto& ticket : tickets) ticket->dropTicket();
+  }
+  const MutexLock lock(mutex_);
   while (counts_.total > 0 || carried_ > 0) gone_.wait(mutex_);
 }
 

@@ -50,8 +50,8 @@ class PoolWorker {
 // Work of Default or High that the leader of a loop has submitted, and nobody else waits before, he
 // carries out himself (see CarriedWork), beside the workers and without a place among them.
 //
-// Threading: any thread. `stop` returns when the workers are gone and nothing is carried any more;
-// it must not run on one.
+// Threading: any thread. `stop` drops what has not begun, and returns when the workers are gone and
+// nothing is carried any more; it must not run on one.
 // Errors: when no thread can be made, the work waits for a worker that becomes free.
 class WorkerPool final : public Executor {
  public:
