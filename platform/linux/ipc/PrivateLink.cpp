@@ -20,6 +20,8 @@ constexpr std::size_t kLongMessage = 65'536;
 constexpr std::uint32_t kLinkEvents = EPOLLIN | EPOLLRDHUP | EPOLLET;
 // What stands for a message that sd-bus sent by itself.
 constexpr std::size_t kUnknownMessageBytes = 256;
+// sd-bus makes room for twice what is put into a message, and keeps it until the message is sent.
+constexpr std::size_t kRoomForAByte = 2;
 
 std::size_t bytesToRead(int fd) {
   int bytes = 0;
@@ -133,8 +135,9 @@ bool PrivateLink::_isInLongMessage() const { return gate_.unfinishedBytes() > kL
 
 bool PrivateLink::_readMessages() {
   for (int messages = 0; messages < kMessagesInARow;) {
+    const bool begins = gate_.isBetweenMessages();
     if (ended_ || !_mayRead()) return true;
-    const auto progress = _process();
+    const auto progress = _process(begins);
     if (ended_ || progress == Progress::Nothing || progress == Progress::LastMessage) return true;
     if (progress == Progress::Message) ++messages;
     if (_isInLongMessage()) return false;
@@ -161,7 +164,7 @@ bool PrivateLink::_mayRead() {
   return waitsForWriting_;
 }
 
-PrivateLink::Progress PrivateLink::_process() {
+PrivateLink::Progress PrivateLink::_process(bool begins) {
   const bool writesFirst = _queuedMessages() > 0;
   const auto expected = gate_.unfinishedBytes();
   const auto bytes = bytesToRead(sd_bus_get_fd(bus_.get()));
@@ -174,7 +177,7 @@ PrivateLink::Progress PrivateLink::_process() {
     return Progress::Nothing;
   }
   // Of what came after `bytes` were counted there is an event.
-  const bool isLast = bytes == expected && !hungUp_ && !waitsForWriting_;
+  const bool isLast = begins && bytes == expected && !hungUp_ && !waitsForWriting_;
   if (arrived_) return isLast ? Progress::LastMessage : Progress::Message;
   if (r == 0) {
     if (hungUp_ && bytes == 0) end();
@@ -245,13 +248,13 @@ const std::shared_ptr<ServedConnection>& PrivateLink::served() const {
 
 std::size_t PrivateLink::messageBytes() const {
   context_.loop.assertCurrent();
-  return queuedBytes_ + unfinishedBytes_;
+  return kRoomForAByte * queuedBytes_ + unfinishedBytes_;
 }
 
 std::size_t PrivateLink::largestMessage() const {
   context_.loop.assertCurrent();
   const auto queued = std::max_element(queued_.begin(), queued_.end());
-  return std::max(unfinishedBytes_, queued == queued_.end() ? 0 : *queued);
+  return std::max(unfinishedBytes_, queued == queued_.end() ? 0 : kRoomForAByte * *queued);
 }
 
 // What waits besides the message that is being written and the largest other: an answer may be

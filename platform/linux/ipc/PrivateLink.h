@@ -72,7 +72,8 @@ class PrivateLink final : public Outlet,
   bool _readMessages() ZK_REQUIRES(context_.loop);
   bool _isInLongMessage() const ZK_REQUIRES(context_.loop);
   bool _mayRead() ZK_REQUIRES(context_.loop);
-  Progress _process() ZK_REQUIRES(context_.loop);
+  // `begins`: nothing of the next message has been read yet.
+  Progress _process(bool begins) ZK_REQUIRES(context_.loop);
   std::size_t _queuedMessages() const ZK_REQUIRES(context_.loop);
   void _accountWrites(std::size_t newestBytes) ZK_REQUIRES(context_.loop);
   void _accountMemory(std::size_t queuedBytes, std::size_t unfinishedBytes)

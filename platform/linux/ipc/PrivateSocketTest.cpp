@@ -1,4 +1,6 @@
 #include <gtest/gtest.h>
+#include <linux/sockios.h>
+#include <sys/ioctl.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
 
@@ -110,6 +112,29 @@ TEST_F(PrivateSocketTest, BytesMayArriveInPieces) {
     }
   }
   expectNothingLeft();
+}
+
+// As many bytes are then in the socket as the first message has, though two end in them.
+TEST_F(PrivateSocketTest, AMessageBehindTheRestOfAnotherIsReadToo) {
+  const auto longer = echoMessage("a longer text");
+  const auto shorter = echoMessage("x");
+  ASSERT_LT(shorter.size(), longer.size());
+  IpcRawClient client(server_.socketPath);
+  ASSERT_TRUE(client.send(kAuthentication + longer.substr(0, shorter.size())));
+  ASSERT_TRUE(eventually([&] {
+    int unread = 0;
+    return ::ioctl(client.descriptor(), SIOCOUTQ, &unread) == 0 && unread == 0;
+  }));
+  ASSERT_TRUE(client.send(longer.substr(shorter.size()) + shorter));
+  const timeval limit{20, 0};
+  ::setsockopt(client.descriptor(), SOL_SOCKET, SO_RCVTIMEO, &limit, sizeof limit);
+  std::string answer;
+  char buffer[4096];
+  while (answer.find("x\0"s) == std::string::npos) {
+    const auto count = ::recv(client.descriptor(), buffer, sizeof(buffer), 0);
+    ASSERT_GT(count, 0);
+    answer.append(buffer, static_cast<std::size_t>(count));
+  }
 }
 
 TEST_F(PrivateSocketTest, PeersThatLeaveHalfWayAreForgotten) {
