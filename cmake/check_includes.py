@@ -10,10 +10,11 @@ path, its name, what it links, and what its tests link besides, separated by tab
 slash and its folder.
 """
 
+import os
 import re
 import sys
 
-INCLUDE = re.compile(r'^\s*#\s*include\s+"([^"]+)"')
+INCLUDE = re.compile(r'^\s*#\s*include\s+["<]([^">]+)[">]')
 OF_TESTS = re.compile(r"Test(Support)?\.(cpp|h)$")
 
 
@@ -37,6 +38,18 @@ def reachable(name, links):
             found.add(current)
             waiting += links.get(current, [])
     return found
+
+
+def is_room(name):
+    return "/" in name
+
+
+def may_include(user, links):
+    """A room, from those rooms alone that are declared for it, and from what its library links."""
+    if not is_room(user):
+        return reachable(user, links)
+    declared = {name for name in links[user] if is_room(name)}
+    return {user} | declared | set().union(*(reachable(name, links) for name in links[user] if not is_room(name)))
 
 
 def circles(links):
@@ -64,11 +77,13 @@ def problems(file, names, links):
         yield f"{file}: stands in no room of {names[place]}"
         return
     user = names[place]
-    allowed = reachable(user + "_tests" if OF_TESTS.search(file) else user, links)
+    allowed = reachable(user + "_tests", links) if OF_TESTS.search(file) else may_include(user, links)
     with open(file, encoding="utf-8") as lines:
         for number, line in enumerate(lines, 1):
             match = INCLUDE.match(line)
             used = match and owner(match[1], names)
+            if match and not used and os.path.exists(os.path.join(os.path.dirname(file), match[1])):
+                yield f"{file}:{number}: {match[1]} is not named from the root of the repository"
             if used and names[used] not in allowed:
                 yield f"{file}:{number}: {user} does not link {names[used]}, of which this includes {match[1]}"
 

@@ -11,11 +11,16 @@ CHECKER = os.path.join(os.path.dirname(os.path.abspath(__file__)), "check_includ
 
 LAYERS = [
     ("base", "base", "", ""),
-    ("host", "host", "base host/files host/net", "testing"),
+    ("host", "host", "base host/files host/net host/web", "testing"),
     ("host/files", "host/files", "base", "host_tests"),
     ("host/net", "host/net", "base host/files", "host_tests"),
+    ("host/web", "host/web", "base host/net", "host_tests"),
     ("testing", "testing", "base", ""),
 ]
+
+
+def quoted(name):
+    return name if name.startswith("<") else f'"{name}"'
 
 
 class CheckIncludesTest(unittest.TestCase):
@@ -25,7 +30,7 @@ class CheckIncludesTest(unittest.TestCase):
             for path, included in files.items():
                 os.makedirs(os.path.join(root, os.path.dirname(path)), exist_ok=True)
                 with open(os.path.join(root, path), "w", encoding="utf-8") as file:
-                    file.write("#include <vector>\n" + "".join(f'#include "{other}"\n' for other in included))
+                    file.write("#include <vector>\n" + "".join(f"#include {quoted(other)}\n" for other in included))
             with open(os.path.join(root, "layers.txt"), "w", encoding="utf-8") as file:
                 file.writelines("\t".join(layer) + "\n" for layer in layers)
             command = [sys.executable, CHECKER, "layers.txt", *files]
@@ -52,6 +57,7 @@ class CheckIncludesTest(unittest.TestCase):
             ("host/files/File.cpp", "host/net/Socket.h"): "host/files does not link host/net",
             ("host/files/File.cpp", "host/Host.h"): "host/files does not link host,",
             ("host/net/Socket.h", "testing/Fake.h"): "host/net does not link testing",
+            ("host/web/Page.h", "host/files/File.h"): "host/web does not link host/files",
             ("base/Text.cpp", "host/files/File.h"): "base does not link host/files",
         }
         for (file, included), reason in cases.items():
@@ -59,6 +65,14 @@ class CheckIncludesTest(unittest.TestCase):
                 found = self.refusals({file: ["base/Text.h", included]})
                 self.assertEqual(len(found), 1)
                 self.assertIn(f"{file}:3: {reason}", found[0])
+
+    def test_no_way_of_writing_it_goes_through_a_wall(self):
+        for included in ("../net/Socket.h", "Other.h"):
+            with self.subTest(included=included):
+                found = self.refusals({"host/net/Socket.h": [], "host/files/Other.h": [], "host/files/File.cpp": [included]})
+                self.assertEqual(found, [f"host/files/File.cpp:2: {included} is not named from the root of the repository"])
+        found = self.refusals({"host/files/File.cpp": ["<host/net/Socket.h>"]})
+        self.assertEqual(len(found), 1)
 
     def test_every_folder_below_is_a_room(self):
         found = self.refusals({"host/other/Thing.cpp": [], "host/Host.cpp": []})
