@@ -26,8 +26,8 @@ class AppendFile {
  public:
   virtual ~AppendFile() = default;
   virtual std::uint64_t length() const = 0;
-  // Whether it still has a name, and the length that it was left with: nobody else has touched it,
-  // and no append has left half of something behind.
+  // Whether it still stands at its path, with the length that it was left with: nobody else has
+  // touched it, and no append has left half of something behind.
   virtual bool isIntact() const = 0;
   // All of the bytes or none: what was written of them is cut off again. Should even that fail,
   // nothing is appended any more.

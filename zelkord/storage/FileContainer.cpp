@@ -1,5 +1,6 @@
 #include "zelkord/storage/FileContainer.h"
 
+#include <cerrno>
 #include <exception>
 #include <utility>
 
@@ -122,6 +123,10 @@ std::unique_ptr<AppendFile> FileContainer::_openForAppending() {
     const auto problem = files.cut(fileUrl_, length_);
     if (problem) error = *problem;
     if (!problem) file = files.openForAppending(fileUrl_, &error);
+  }
+  if (file && file->length() < length_) {
+    file = nullptr;
+    error = posixError(EIO);  // others have cut it: what follows would not be read back
   }
   if (!file) _complain(error);
   return file;

@@ -173,14 +173,20 @@ TEST_F(FileContainerTest, OfAllFilesOnlyTheLastWrittenStaysOpen) {
   EXPECT_THAT(queryIds(containers[1]->read()), ElementsAre(2, 3));
 }
 
-TEST_F(FileContainerTest, TellsWhenItsFileIsGoneOnceItHasWritten) {
-  const auto container = forWriting();
-  container->writeSessionHeader(testHeader());
-  write(*container, {1});
-  fakes_.files.remove(kPath);
-  write(*container, {2});
-  EXPECT_EQ(fakes_.log.count("could not write to /caches/session.0"), 1);
-  EXPECT_EQ(fakes_.files.openForAppend(), 0);
+TEST_F(FileContainerTest, TellsWhenItsFileIsGoneOrCutOnceItHasWritten) {
+  for (const bool isGone : {true, false}) {
+    SCOPED_TRACE(isGone);
+    const auto container = forWriting();
+    container->writeSessionHeader(testHeader());
+    write(*container, {1});
+    if (isGone) fakes_.files.remove(kPath);
+    if (!isGone) fakes_.files.tear(kPath, 3);
+    fakes_.log.clear();
+    EXPECT_THAT(write(*container, {2, 3}), ElementsAre(2, 3));
+    EXPECT_EQ(fakes_.log.count("could not write to /caches/session.0"), 1);
+    EXPECT_EQ(fakes_.files.openForAppend(), 0);
+    EXPECT_EQ(fakes_.files.bytes(kPath).value_or("").size(), isGone ? 0u : 3u);
+  }
 }
 
 TEST_F(FileContainerTest, CutsOffWhatAFailedWriteLeft) {

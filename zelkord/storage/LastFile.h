@@ -15,7 +15,7 @@ namespace zelkord {
 // Threading: one thread at a time, the storage's queue.
 class LastFile final {
  public:
-  // Null unless `owner` wrote last and nobody else has removed, cut or extended his file since.
+  // Null unless `owner` wrote last and nobody else has moved, cut or extended his file since.
   AppendFile* of(ContainerRoom::Id owner) {
     if (file_ && (owner_ != owner || !file_->isIntact())) file_ = nullptr;
     return file_.get();

@@ -77,6 +77,8 @@ TEST_P(ContainerFilesContractTest, AFileThatOthersTouchedIsNotIntact) {
   EXPECT_TRUE(removed->isIntact());
   remove(path);
   EXPECT_FALSE(removed->isIntact());
+  ASSERT_EQ(files().createExclusively(path), std::nullopt);
+  EXPECT_FALSE(removed->isIntact()) << "another file, of another length";
 }
 
 TEST_P(ContainerFilesContractTest, TellsWhatIsThere) {

@@ -15,15 +15,19 @@ namespace {
 
 class LinuxAppendFile final : public AppendFile {
  public:
-  LinuxAppendFile(Descriptor file, std::uint64_t length)
-      : file_(std::move(file)), length_(length) {}
+  LinuxAppendFile(std::string path, Descriptor file, const struct stat& status)
+      : path_(std::move(path)),
+        file_(std::move(file)),
+        device_(status.st_dev),
+        number_(status.st_ino),
+        length_(static_cast<std::uint64_t>(status.st_size)) {}
 
   std::uint64_t length() const override { return length_; }
 
   bool isIntact() const override {
     struct stat status {};
-    return !broken_ && ::fstat(file_.get(), &status) == 0 && status.st_nlink > 0 &&
-           static_cast<std::uint64_t>(status.st_size) == length_;
+    return !broken_ && ::lstat(path_.c_str(), &status) == 0 && status.st_dev == device_ &&
+           status.st_ino == number_ && static_cast<std::uint64_t>(status.st_size) == length_;
   }
 
   std::optional<Error> append(std::string_view bytes) override {
@@ -39,7 +43,10 @@ class LinuxAppendFile final : public AppendFile {
   }
 
  private:
+  const std::string path_;
   const Descriptor file_;
+  const dev_t device_;
+  const ino_t number_;
   std::uint64_t length_;
   bool broken_ = false;  // there may be half a record at the end
 };
@@ -111,8 +118,7 @@ std::unique_ptr<AppendFile> LinuxContainerFiles::openForAppending(const std::str
   struct stat status {};
   auto file = openToWrite(path, status);
   if (file) {
-    return std::make_unique<LinuxAppendFile>(std::move(file),
-                                             static_cast<std::uint64_t>(status.st_size));
+    return std::make_unique<LinuxAppendFile>(path, std::move(file), status);
   }
   setLastError(error);
   return nullptr;
