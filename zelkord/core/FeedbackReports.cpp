@@ -137,7 +137,6 @@ void FeedbackReports::_flush(std::shared_ptr<const HVCustomFeedback> crowdsourci
   if (!isJsonObject(crowdsourcing->jsonFeedback)) {
     assembly_.log(Category::FeedbackErrors).error("custom feedback is not a JSON object");
     assembly_.reporter().addValue(1, kFeedbackNotSent);
-    if (callback) callback();
   } else if (auto* flusher = assembly_.crowdsourcingFeedbackFlusher()) {
     flusher->flush(std::move(crowdsourcing), std::move(callback));
   }

@@ -39,7 +39,7 @@ class FeedbackReports final {
                      const std::shared_ptr<ClientState>& state, const Reporter& reporter) const;
   // Autofill and result features become sessions of their own, crowdsourcing goes to its flusher;
   // then `callback`, if there is one, runs. Crowdsourcing that is not a JSON object is dropped
-  // and counted as not sent. Anything else is ignored.
+  // and counted as not sent. Anything else is ignored. `callback` does not run for either.
   bool handleCustomFeedback(std::shared_ptr<const HVCustomFeedback> feedback, std::int64_t queryId,
                             const ClientState& state, const Reporter& reporter,
                             std::function<void()> callback) const;

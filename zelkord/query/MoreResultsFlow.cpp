@@ -22,9 +22,12 @@ std::string queryOf(const std::string& moreResultsURL) {
 }  // namespace
 
 std::string MoreResultsFlow::_input() const {
-  auto query = queryOf(_as<ZLKMoreResultsRequest>().moreResultsURL);
-  if (auto* streams = assembly_.flusherXPCListener()) streams->willAskForMoreResults(query);
-  return query;
+  return queryOf(_as<ZLKMoreResultsRequest>().moreResultsURL);
+}
+
+std::shared_ptr<const HVFeedback> MoreResultsFlow::_makeStart(const URLRequest& request) const {
+  if (auto* streams = assembly_.flusherXPCListener()) streams->willAskForMoreResults(_input());
+  return FollowUpFlow::_makeStart(request);
 }
 
 }  // namespace zelkord

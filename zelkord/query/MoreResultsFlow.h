@@ -10,8 +10,10 @@ class MoreResultsFlow final : public FollowUpFlow {
   using FollowUpFlow::FollowUpFlow;
 
  private:
-  // The query whose results these are: "q" of the request's own URL. Tools that watch are told.
+  // The query whose results these are: "q" of the request's own URL.
   std::string _input() const override;
+  // Tools that watch are told that query.
+  std::shared_ptr<const HVFeedback> _makeStart(const URLRequest& request) const override;
 };
 
 }  // namespace zelkord
