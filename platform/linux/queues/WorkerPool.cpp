@@ -76,17 +76,16 @@ void WorkerPool::_endCarrying() {
 
 void WorkerPool::_place(Ticket core) {
   Start start;
-  bool isPlaced = false;
+  bool isStopped = false;
   {
     const MutexLock lock(mutex_);
-    isPlaced = !stopped_;
-    if (isPlaced) {
-      auto& waiting = ready_[static_cast<std::size_t>(core->quality())];
-      waiting.push_back(std::move(core));
+    isStopped = stopped_;
+    if (!isStopped) {
+      ready_[static_cast<std::size_t>(core->quality())].push_back(core);
       start = _startOne();
     }
   }
-  if (!isPlaced) return core->dropTicket();
+  if (isStopped) return core->dropTicket();
   _perform(start);
 }
 
