@@ -5,18 +5,14 @@
 #include <CLI/Formatter.hpp>
 #include <algorithm>
 #include <array>
-#include <charconv>
-#include <cmath>
 #include <initializer_list>
 #include <limits>
 
 #include "base/CommandLineWords.h"
+#include "zelkorctl/OptionValues.h"
 
 namespace zelkorctl {
 namespace {
-
-// What is wrong with a value; empty when nothing is.
-using Problem = std::string;
 
 // Commands as bits.
 using CommandSet = std::uint32_t;
@@ -75,77 +71,16 @@ constexpr std::array kKinds{
     std::pair{std::string_view("flightSearch"), QueryKind::FlightSearch},
 };
 
-Problem readCount(std::int64_t& target, const std::string& text, std::int64_t least,
-                  std::int64_t most) {
-  std::int64_t value = 0;
-  const auto* end = text.data() + text.size();
-  const auto [stop, code] = std::from_chars(text.data(), end, value);
-  if (code != std::errc() || stop != end || value < least || value > most) {
-    return "a number from " + std::to_string(least) + " to " + std::to_string(most);
-  }
-  target = value;
-  return {};
-}
-
-Problem readSeconds(Duration& target, const std::string& text) {
-  double value = 0;
-  const auto* end = text.data() + text.size();
-  const auto [stop, code] = std::from_chars(text.data(), end, value);
-  if (code != std::errc() || stop != end || !(value > 0) || value > 86400) {
-    return "seconds, above 0 and up to 86400";
-  }
-  target = durationOfSeconds(value);
-  return {};
-}
-
-Problem readMilliseconds(Duration& target, const std::string& text, std::int64_t most) {
-  std::int64_t milliseconds = 0;
-  auto problem = readCount(milliseconds, text, 0, most);
-  if (problem.empty()) target = std::chrono::milliseconds(milliseconds);
-  return problem;
-}
-
 constexpr std::array kSelections{
     std::pair{std::string_view("default"), std::uint32_t{0}},
     std::pair{std::string_view("explicit"), std::uint32_t{1}},
     std::pair{std::string_view("hint"), std::uint32_t{2}},
 };
 
-// One of the table's names.
-template <typename Value, std::size_t size>
-Problem readNamed(Value& target, const std::string& text,
-                  const std::array<std::pair<std::string_view, Value>, size>& table) {
-  std::string names;
-  for (const auto& [name, value] : table) {
-    if (name == text) {
-      target = value;
-      return {};
-    }
-    names += (names.empty() ? "one of " : ", ") + std::string(name);
-  }
-  return names;
-}
-
 Problem readItem(Options& options, const std::string& text) {
   const auto equals = text.find('=');
   if (equals == 0 || equals == std::string::npos) return "NAME=VALUE";
   options.items.emplace_back(text.substr(0, equals), text.substr(equals + 1));
-  return {};
-}
-
-Problem readText(std::string& target, const std::string& text) {
-  target = text;
-  return {};
-}
-
-Problem readTexts(std::vector<std::string>& target, const std::string& text) {
-  if (text.empty()) return "a text";
-  target.push_back(text);
-  return {};
-}
-
-Problem setFlag(bool& target) {
-  target = true;
   return {};
 }
 

@@ -53,8 +53,8 @@ class QueueCore final : public std::enable_shared_from_this<QueueCore> {
   // For the executor: runs a task that has a place, and those that get one right after it, up to a
   // batch.
   void runTicket();
-  // Instead, once the executor runs nothing any more: drops the task and what gets its place after
-  // it, so that whoever waits for the queue gets in.
+  // Instead, once the executor begins nothing any more: drops the task and what gets its place
+  // after it, so that whoever waits for the queue gets in.
   void dropTicket();
 
  private:
